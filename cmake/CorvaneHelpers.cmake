@@ -1,0 +1,98 @@
+# The one place that knows compiler settings and what a library, a test, a benchmark or a fuzz
+# target of this project is made of.
+
+include_guard(GLOBAL)
+include(CheckCXXCompilerFlag)
+
+set(CMAKE_CXX_STANDARD 20)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+set(CMAKE_RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin")
+set(CMAKE_LIBRARY_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin")
+
+find_program(CCACHE_PROGRAM ccache)
+if(CCACHE_PROGRAM)
+  set(CMAKE_CXX_COMPILER_LAUNCHER "${CCACHE_PROGRAM}")
+  set(CMAKE_C_COMPILER_LAUNCHER "${CCACHE_PROGRAM}")
+endif()
+
+add_library(corvane_settings INTERFACE)
+# Contraction would change the rounding of sample values from machine to machine.
+target_compile_options(corvane_settings INTERFACE
+  -Wall -Wextra -Wpedantic -Wconversion -Wsign-conversion -Wshadow -Wnon-virtual-dtor
+  -Woverloaded-virtual -Werror -ffp-contract=off)
+target_compile_definitions(corvane_settings INTERFACE
+  QT_NO_CAST_TO_ASCII QT_NO_URL_CAST_FROM_STRING QT_NO_FOREACH
+  QT_DISABLE_DEPRECATED_BEFORE=0x060400)
+if(CORVANE_SANITIZE)
+  target_compile_options(corvane_settings INTERFACE
+    -fsanitize=${CORVANE_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
+  string(REPLACE "fuzzer-no-link," "" link_sanitize "${CORVANE_SANITIZE}")
+  target_link_options(corvane_settings INTERFACE -fsanitize=${link_sanitize})
+endif()
+
+# corvane_add_folder(FOLDER): adds the folder's targets if the folder is there.
+function(corvane_add_folder folder)
+  if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
+    add_subdirectory(${folder})
+  endif()
+endfunction()
+
+# corvane_add_children(FOLDER): adds each child folder that has a CMakeLists.txt.
+function(corvane_add_children folder)
+  file(GLOB children CONFIGURE_DEPENDS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/*/CMakeLists.txt")
+  foreach(child IN LISTS children)
+    get_filename_component(child_folder "${child}" DIRECTORY)
+    add_subdirectory("${child_folder}")
+  endforeach()
+endfunction()
+
+# corvane_add_library(NAME SOURCES ... LINK ...): a static library of one folder. Its headers are
+# included as "folder/Header.h", or by their bare name inside the folder.
+function(corvane_add_library name)
+  cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
+  add_library(${name} STATIC ${arg_SOURCES})
+  set_target_properties(${name} PROPERTIES AUTOMOC ON AUTOUIC ON AUTORCC ON)
+  target_include_directories(${name} PUBLIC "${CMAKE_SOURCE_DIR}/src")
+  target_link_libraries(${name} PUBLIC ${arg_LINK} PRIVATE corvane_settings)
+endfunction()
+
+# corvane_add_program(NAME SOURCES ... LINK ...): an executable in the build's bin folder.
+function(corvane_add_program name)
+  cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
+  add_executable(${name} ${arg_SOURCES})
+  set_target_properties(${name} PROPERTIES AUTOMOC ON AUTOUIC ON AUTORCC ON)
+  target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/src")
+  target_link_libraries(${name} PRIVATE ${arg_LINK} corvane_settings)
+endfunction()
+
+# corvane_add_test(NAME LABEL unit|gui|instrument|e2e SOURCES ... LINK ... [ENVIRONMENT ...]):
+# a Qt Test program, run without a display and with settings and temporary files of its own.
+function(corvane_add_test name)
+  cmake_parse_arguments(arg "" "LABEL" "SOURCES;LINK;ENVIRONMENT" ${ARGN})
+  corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} Qt6::Test)
+  target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/tests")
+  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests")
+  add_test(NAME ${name} COMMAND ${name})
+  set_tests_properties(${name} PROPERTIES
+    LABELS "${arg_LABEL}"
+    ENVIRONMENT "QT_QPA_PLATFORM=offscreen;CORVANE_BIN=${CMAKE_BINARY_DIR}/bin;LC_ALL=C.UTF-8;UBSAN_OPTIONS=print_stacktrace=1;${arg_ENVIRONMENT}")
+endfunction()
+
+# corvane_add_bench(NAME SOURCES ... LINK ...): a Google Benchmark program; never part of ctest.
+function(corvane_add_bench name)
+  cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
+  corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} benchmark::benchmark)
+  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bench")
+endfunction()
+
+# corvane_add_fuzzer(NAME SOURCES ... LINK ...): a libFuzzer target; its seeds stand in the folder
+# "corpus/NAME" beside its CMakeLists.txt.
+function(corvane_add_fuzzer name)
+  cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
+  corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK})
+  target_link_options(${name} PRIVATE -fsanitize=fuzzer)
+  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/fuzz")
+  add_dependencies(fuzzers ${name})
+endfunction()

@@ -1,0 +1,87 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Tracer.h"
+
+#include <QLocale>
+#include <QMutex>
+#include <QMutexLocker>
+#include <QRecursiveMutex>
+#include <QTime>
+
+#include <utility>
+
+namespace {
+
+struct LogState
+{
+    unsigned mask = Tracer::DefaultMask;
+    QMutex queueMutex;
+    QList<Tracer::Entry> pending;
+    // Recursive, since a slot of a listener in the logging thread may log itself.
+    QRecursiveMutex listenerMutex;
+    QList<Tracer *> listeners;
+};
+
+LogState &state()
+{
+    static LogState theState;
+    return theState;
+}
+
+} // namespace
+
+Tracer::Tracer(QObject *parent)
+    : QObject(parent)
+{
+    const QMutexLocker locker(&state().listenerMutex);
+    state().listeners.append(this);
+}
+
+Tracer::~Tracer()
+{
+    const QMutexLocker locker(&state().listenerMutex);
+    state().listeners.removeOne(this);
+}
+
+bool Tracer::isEnabled(int level)
+{
+    return (static_cast<unsigned>(level) & state().mask) != 0;
+}
+
+void Tracer::Trace(int level, const char *text)
+{
+    if (isEnabled(level)) {
+        Trace(level, QString::fromUtf8(text));
+    }
+}
+
+void Tracer::Trace(int level, const QString &text)
+{
+    if (!isEnabled(level)) {
+        return;
+    }
+    const QString line =
+        QLocale::system().toString(QTime::currentTime(), QLocale::ShortFormat) + "  " + text;
+    {
+        const QMutexLocker locker(&state().queueMutex);
+        state().pending.append({line, level});
+    }
+    const QMutexLocker locker(&state().listenerMutex);
+    const QList<Tracer *> listeners = state().listeners;
+    for (Tracer *listener : listeners) {
+        // A slot may have destroyed a listener that the copy still names.
+        if (state().listeners.contains(listener)) {
+            emit listener->TraceDataAvailable();
+        }
+    }
+}
+
+void Tracer::setMask(unsigned mask)
+{
+    state().mask = mask;
+}
+
+QList<Tracer::Entry> Tracer::takeEntries()
+{
+    const QMutexLocker locker(&state().queueMutex);
+    return std::exchange(state().pending, {});
+}

@@ -1,0 +1,54 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QList>
+#include <QObject>
+#include <QPair>
+#include <QString>
+
+/// The process-wide log: the only diagnostic channel of the program.
+///
+/// A message is a finished text with a level, one of the bits below. The state is static; a Tracer
+/// object is a listener that is told by a signal when lines wait to be taken. Any thread may log;
+/// a listener in another thread gets the signal through its own event loop.
+class Tracer : public QObject
+{
+    Q_OBJECT
+
+public:
+    enum Level {
+        Information = 1,
+        Warning = 2,
+        Error = 4,
+        Severe = 8,
+        Debug = 16,
+    };
+
+    /// One logged line, stamped with the time of day, and its level.
+    using Entry = QPair<QString, int>;
+
+    static constexpr unsigned DefaultMask = Information | Warning | Error | Severe;
+    static constexpr unsigned DebugMask = DefaultMask | Debug;
+
+    explicit Tracer(QObject *parent = nullptr);
+    ~Tracer() override;
+
+    /// Logs a text. A level without a common bit with the mask drops it at the cost of one test.
+    static void Trace(int level, const QString &text);
+
+    /// As above, without converting the literal when the mask drops it.
+    static void Trace(int level, const char *text);
+
+    /// Whether a message of this level would be kept; spares the formatting of one that is not.
+    [[nodiscard]] static bool isEnabled(int level);
+
+    /// Replaces the mask; to be called before any worker thread exists.
+    static void setMask(unsigned mask);
+
+    /// Returns all waiting lines in order of arrival and forgets them.
+    [[nodiscard]] static QList<Entry> takeEntries();
+
+signals:
+    /// Lines wait to be taken. An earlier taker may have emptied the list meanwhile.
+    void TraceDataAvailable();
+};
