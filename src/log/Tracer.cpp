@@ -75,6 +75,12 @@ void Tracer::Trace(int level, const QString &text)
     }
 }
 
+bool Tracer::fail(const QString &text)
+{
+    Trace(Error, text);
+    return false;
+}
+
 void Tracer::setMask(unsigned mask)
 {
     state().mask = mask;

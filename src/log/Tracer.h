@@ -39,6 +39,9 @@ public:
     /// As above, without converting the literal when the mask drops it.
     static void Trace(int level, const char *text);
 
+    /// Logs an error and returns false, for `return Tracer::fail("Reason.")` where it was seen.
+    static bool fail(const QString &text);
+
     /// Whether a message of this level would be kept; spares the formatting of one that is not.
     [[nodiscard]] static bool isEnabled(int level);
 

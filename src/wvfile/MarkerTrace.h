@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "WvTypes.h"
+
+#include <QString>
+#include <QtGlobal>
+
+#include <array>
+#include <vector>
+
+class BufferedIO;
+class ByteSource;
+
+/// Merges the marker lists of a file into a marker stream, one pass a list.
+///
+/// Each list ORs its own bit into the bytes that are there already and appends behind them. A list
+/// shorter than the ones before it doesn't change the byte that is carried on at the end, so its
+/// marker falls there even if it ended high; such a cut is reported by warnAboutCuts.
+class MarkerTrace
+{
+public:
+    /// `fileLimit` is the largest position that a list of this file may name. The stream isn't
+    /// owned and has been restarted.
+    MarkerTrace(BufferedIO &stream, qint64 fileLimit);
+
+    /// Reads the list of the tag `name` up to its end and merges it. Logs and returns false on
+    /// malformed lists and on stream failures.
+    [[nodiscard]] bool mergeList(ByteSource &source, const QString &name);
+
+    /// Appends the carried byte until `length` bytes stand; false on a stream failure.
+    [[nodiscard]] bool extendTo(qint64 length);
+
+    /// Appends `count` carried bytes without counting them; false on a stream failure.
+    [[nodiscard]] bool pad(qint64 count);
+
+    /// One warning for each marker that ends high but falls before sample `samples`.
+    void warnAboutCuts(qint64 samples) const;
+
+    [[nodiscard]] qint64 written() const { return m_written; }
+    [[nodiscard]] quint8 lastByte() const { return m_lastByte; }
+
+private:
+    struct List
+    {
+        QString name;
+        quint8 bit = 0;
+        qint64 pos = 0;     ///< next position that the list hasn't handled
+        quint8 current = 0; ///< the bit, or 0 while the marker is low
+        quint8 byte = 0;    ///< the byte handled last
+    };
+
+    [[nodiscard]] bool applyTransition(List &list, const QString &token);
+    [[nodiscard]] bool positionIsValid(const List &list, qint64 position, quint8 state) const;
+    [[nodiscard]] bool walkTo(List &list, qint64 position);
+    [[nodiscard]] bool completeList(List &list);
+    [[nodiscard]] bool rewriteRun(qint64 begin, qint64 end, quint8 mask, bool lowCompletion);
+    [[nodiscard]] bool appendRun(qint64 begin, qint64 count, quint8 byte);
+    [[nodiscard]] bool takeOldByte(const List &list, qint64 position, quint8 &byte);
+    [[nodiscard]] bool spendWork(qint64 bytes);
+    void logReadFailure(qint64 position) const;
+    void noteCutByExtension(const List &list);
+
+    BufferedIO &m_stream;
+    qint64 m_fileLimit = 0;
+    qint64 m_workLeft = 0; ///< stream bytes that may still be handled
+    qint64 m_written = 0;  ///< bytes that the stream holds
+    quint8 m_lastByte = 0; ///< the byte appended last, carried on behind the lists
+    std::array<qint64, MarkerCount> m_cutAt;
+    std::vector<quint8> m_block;
+};

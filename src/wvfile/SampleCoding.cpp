@@ -1,0 +1,148 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "SampleCoding.h"
+
+#include "base/simd.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+
+#if Q_BYTE_ORDER != Q_LITTLE_ENDIAN
+#error "The sample loops take words as they stand in the file, least significant byte first."
+#endif
+
+namespace {
+
+constexpr float fullScale = 32767.0F;
+
+CORVANE_CLONES void decodeA(const qint16 *words, float *values, size_t count, float gain)
+{
+    for (size_t i = 0; i < count; ++i) {
+        values[i] = (static_cast<float>(words[i]) - 0.5F) / fullScale * gain;
+    }
+}
+
+CORVANE_CLONES void decodeB(const qint16 *words, float *values, size_t count, float gain)
+{
+    for (size_t i = 0; i < count; ++i) {
+        values[i] = static_cast<float>(words[i]) / fullScale * gain;
+    }
+}
+
+CORVANE_CLONES void decodeC(const qint16 *words, float *values, size_t count, float gain)
+{
+    for (size_t i = 0; i < count; ++i) {
+        const auto word = static_cast<qint16>(words[i] ^ qint16(-0x8000));
+        values[i] = static_cast<float>(word) / fullScale * gain;
+    }
+}
+
+CORVANE_CLONES void decodeD(const qint16 *words, float *values, size_t count, float gain)
+{
+    for (size_t i = 0; i < count; ++i) {
+        const int word = static_cast<quint16>(words[i]) & 0xFFFC;
+        values[i] = (static_cast<float>(word) - 32768.5F) / 32000.0F * gain;
+    }
+}
+
+inline float scaledToWord(float value)
+{
+    float scaled = value * fullScale + 0.5F;
+    scaled = value < -1.0F ? -fullScale : scaled;
+    // Written so that a NaN, which compares false, takes the upper limit.
+    return value <= 1.0F ? scaled : fullScale;
+}
+
+CORVANE_CLONES void encodeA(const float *values, qint16 *words, size_t count)
+{
+    for (size_t i = 0; i < count; ++i) {
+        words[i] = static_cast<qint16>(static_cast<int>(scaledToWord(values[i])));
+    }
+}
+
+constexpr size_t powerBlock = 256;
+
+CORVANE_CLONES void powersOf(const float *values, double *powers, size_t count)
+{
+    for (size_t i = 0; i < count; ++i) {
+        const double inPhase = values[2 * i];
+        const double quadrature = values[2 * i + 1];
+        powers[i] = inPhase * inPhase + quadrature * quadrature;
+    }
+}
+
+CORVANE_CLONES double largestOf(const double *powers, size_t count, double peak)
+{
+    // Eight independent maxima let the compiler vectorise; the order doesn't matter to a maximum.
+    std::array<double, 8> lanes{};
+    lanes.fill(peak);
+    size_t i = 0;
+    for (; i + lanes.size() <= count; i += lanes.size()) {
+        for (size_t lane = 0; lane < lanes.size(); ++lane) {
+            lanes[lane] = powers[i + lane] > lanes[lane] ? powers[i + lane] : lanes[lane];
+        }
+    }
+    for (; i < count; ++i) {
+        lanes[0] = powers[i] > lanes[0] ? powers[i] : lanes[0];
+    }
+    return *std::max_element(lanes.begin(), lanes.end());
+}
+
+} // namespace
+
+void decodeWords(SampleCoding coding, std::span<const std::byte> words, float gain,
+                 std::span<float> values)
+{
+    // Blocks come from buffers of bytes; a copy through an aligned block keeps the access defined.
+    constexpr size_t blockWords = 4096;
+    std::array<qint16, blockWords> block;
+    for (size_t done = 0; done < values.size(); done += blockWords) {
+        const size_t count = std::min(blockWords, values.size() - done);
+        std::memcpy(block.data(), words.data() + 2 * done, 2 * count);
+        float *target = values.data() + done;
+        switch (coding) {
+        case SampleCoding::A:
+            decodeA(block.data(), target, count, gain);
+            break;
+        case SampleCoding::B:
+            decodeB(block.data(), target, count, gain);
+            break;
+        case SampleCoding::C:
+            decodeC(block.data(), target, count, gain);
+            break;
+        case SampleCoding::D:
+            decodeD(block.data(), target, count, gain);
+            break;
+        }
+    }
+}
+
+void encodeWords(std::span<const float> values, std::span<std::byte> words)
+{
+    constexpr size_t blockWords = 4096;
+    std::array<qint16, blockWords> block;
+    for (size_t done = 0; done < values.size(); done += blockWords) {
+        const size_t count = std::min(blockWords, values.size() - done);
+        encodeA(values.data() + done, block.data(), count);
+        std::memcpy(words.data() + 2 * done, block.data(), 2 * count);
+    }
+}
+
+qint16 encodeWord(float value)
+{
+    return static_cast<qint16>(static_cast<int>(scaledToWord(value)));
+}
+
+void addLevels(std::span<const float> values, LevelSums &sums)
+{
+    std::array<double, powerBlock> powers;
+    const size_t samples = values.size() / 2;
+    for (size_t done = 0; done < samples; done += powerBlock) {
+        const size_t count = std::min(powerBlock, samples - done);
+        powersOf(values.data() + 2 * done, powers.data(), count);
+        for (size_t i = 0; i < count; ++i) {
+            sums.sum += powers[i];
+        }
+        sums.peak = largestOf(powers.data(), count, sums.peak);
+    }
+}

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QtGlobal>
+
+#include <cstddef>
+#include <span>
+
+/// How a 16-bit word of a sample block stands for a value of full scale 1.0.
+enum class SampleCoding {
+    A, ///< (s - 0.5) / 32767, of the TGX, TBX and TVX kinds; the only one that is written
+    B, ///< s / 32767, of the TQX-130 kind
+    C, ///< offset binary, 16 bit, of the WV kinds
+    D, ///< offset binary, 14 bit in the upper bits of the word, of the WV kinds
+};
+
+/// Power sums over samples, gathered in the order of the samples.
+struct LevelSums
+{
+    double sum = 0;  ///< sum of I² + Q²
+    double peak = 0; ///< largest I² + Q²
+};
+
+/// Decodes words, I and Q in turn, least significant byte first, and multiplies each by `gain`.
+/// `words` holds two bytes for each float of `values`.
+void decodeWords(SampleCoding coding, std::span<const std::byte> words, float gain,
+                 std::span<float> values);
+
+/// Encodes values by coding A into words, least significant byte first. Computed in single
+/// precision throughout: only so does a decoded word come back as itself. Values beyond full scale
+/// give -32767 or +32767, as does a NaN the latter.
+void encodeWords(std::span<const float> values, std::span<std::byte> words);
+
+/// Encodes one value by coding A.
+[[nodiscard]] qint16 encodeWord(float value);
+
+/// Adds I² + Q² of each sample, in double precision; `values` holds I and Q in turn.
+void addLevels(std::span<const float> values, LevelSums &sums);

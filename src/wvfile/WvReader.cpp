@@ -1,0 +1,366 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "WvReader.h"
+
+#include "BufferedIO.h"
+#include "FileKind.h"
+
+#include "base/ProgressClock.h"
+#include "log/Tracer.h"
+
+#include <QIODevice>
+
+#include <algorithm>
+#include <cmath>
+#include <vector>
+
+namespace {
+
+constexpr int maxNameLength = 99;
+constexpr int blockSamples = 64 * 1024;
+
+/// Level below full scale in dB; the small amount keeps silence finite.
+double measuredOffset(double level)
+{
+    return 20 * std::log10(1 / (level + 1e-7));
+}
+
+} // namespace
+
+WvReader::WvReader(WvFileInfo &info, QIODevice &device, ProgressClock &progress)
+    : m_info(info)
+    , m_progress(progress)
+    , m_source(device)
+    , m_fileLimit(m_source.size() / 4)
+    , m_markers(*info.markerStream, m_fileLimit)
+{
+}
+
+bool WvReader::read()
+{
+    QString name;
+    Round round = Round::Tag;
+    while (round == Round::Tag) {
+        round = readTag(name);
+    }
+    if (round == Round::Failed || !openSampleBlock(name) || !readSamples()) {
+        return false;
+    }
+    m_info.rmsOffset = measuredOffset(std::sqrt(m_levels.sum / m_info.samples));
+    m_info.peakOffset = measuredOffset(std::sqrt(m_levels.peak));
+    return true;
+}
+
+WvReader::Round WvReader::readTag(QString &name)
+{
+    if (!m_source.skipPast('{')) {
+        Tracer::fail("No tag mark found! Probably incorrect format.");
+        return Round::Failed;
+    }
+    QByteArray bytes;
+    int byte = m_source.next();
+    for (; byte != ':' && byte != ByteSource::NoByte && bytes.size() <= maxNameLength;
+         byte = m_source.next()) {
+        bytes.append(static_cast<char>(byte));
+    }
+    name = QString::fromLatin1(bytes);
+    if (byte != ':' || bytes.size() > maxNameLength) {
+        Tracer::fail("Tag name '" + name + "' is invalid.");
+        return Round::Failed;
+    }
+    if (name.toUpper().contains("WAVEFORM")) {
+        return Round::SampleBlock;
+    }
+    if (Tracer::isEnabled(Tracer::Debug)) {
+        Tracer::Trace(Tracer::Debug, "Processing tag '" + name + "' ...");
+    }
+    return processTag(name) ? Round::Tag : Round::Failed;
+}
+
+bool WvReader::processTag(const QString &name)
+{
+    if (name == "TYPE") {
+        return processType();
+    }
+    if (name.contains("MARKER LIST ")) {
+        return m_markers.mergeList(m_source, name);
+    }
+    if (name == "CRESTFACTOR") {
+        return m_source.skipPast('}') || Tracer::fail("Invalid tag. '}' is missing.");
+    }
+
+    enum class Content { Text, Ignored, Resolution, Clock, Samples, Levels, ControlLength };
+    struct Known
+    {
+        const char *name;
+        Content content;
+        QString WvFileInfo::*text;
+    };
+    static constexpr Known knownTags[] = {
+        {"SI COMPENSATED", Content::Ignored, nullptr},
+        {"RESOLUTION", Content::Resolution, nullptr},
+        {"SYSTEM", Content::Text, &WvFileInfo::system},
+        {"COMMENT", Content::Text, &WvFileInfo::comment},
+        {"COPYRIGHT", Content::Text, &WvFileInfo::copyright},
+        {"DATE", Content::Text, &WvFileInfo::date},
+        {"CLOCK", Content::Clock, nullptr},
+        {"SAMPLES", Content::Samples, nullptr},
+        {"LEVEL OFFS", Content::Levels, nullptr},
+        {"LEVEL OFFSET", Content::Levels, nullptr},
+        {"CONTROL LENGTH", Content::ControlLength, nullptr},
+    };
+    const auto *known =
+        std::find_if(std::begin(knownTags), std::end(knownTags),
+                     [&](const Known &tag) { return name == QLatin1String(tag.name); });
+    if (known == std::end(knownTags)) {
+        return keepUnknownTag(name);
+    }
+    TagText content;
+    if (!m_source.readText('}', content)) {
+        return Tracer::fail("Invalid tag data");
+    }
+    switch (known->content) {
+    case Content::Text:
+        m_info.*(known->text) = content.text;
+        return true;
+    case Content::Ignored:
+        return true;
+    case Content::Resolution:
+        m_sixteenBit = content.text.contains("16");
+        return true;
+    case Content::Clock:
+        return processClock(content.text);
+    case Content::Samples:
+        return processSamples(content.text);
+    case Content::Levels:
+        return processLevels(content.text);
+    case Content::ControlLength:
+        return processControlLength(content.text);
+    }
+    return false;
+}
+
+bool WvReader::processType()
+{
+    m_info.format = WvFormatUnknown;
+    TagText content;
+    if (!m_source.readText('}', content)) {
+        return Tracer::fail("Invalid TYPE tag.");
+    }
+    const QString field = content.text.section(',', 0, 0).simplified().toUpper();
+    const FileKind *kind = findFileKind(field);
+    if (kind == nullptr || kind->logText == nullptr) {
+        return Tracer::fail("File is not a valid waveform file (" + field + ") !");
+    }
+    m_info.format = kind->format;
+    Tracer::Trace(Tracer::Information, kind->logText);
+    return true;
+}
+
+bool WvReader::processClock(const QString &text)
+{
+    bool isNumber = false;
+    m_info.clock = text.simplified().toDouble(&isNumber);
+    if (!isNumber || !(m_info.clock > MinClockHz && m_info.clock <= MaxClockHz)) {
+        return Tracer::fail("Invalid clock rate! Range is 0.001-600MHz");
+    }
+    return true;
+}
+
+bool WvReader::processSamples(const QString &text)
+{
+    bool isNumber = false;
+    const qint64 count = text.simplified().toLongLong(&isNumber);
+    if (!isNumber || count <= 0) {
+        return Tracer::fail("Invalid number of samples! Use value > 0.");
+    }
+    return takeSampleCount(count);
+}
+
+bool WvReader::takeSampleCount(qint64 count)
+{
+    if (count > MaxSamples) {
+        return Tracer::fail(
+            QString("Number of samples %1 is too large. At most %2 samples can be read.")
+                .arg(count)
+                .arg(MaxSamples));
+    }
+    m_info.samples = static_cast<int>(count);
+    return true;
+}
+
+bool WvReader::processLevels(const QString &text)
+{
+    bool rmsIsNumber = false;
+    bool peakIsNumber = false;
+    const double rms = text.section(',', 0, 0).simplified().toDouble(&rmsIsNumber);
+    const double peak = text.section(',', 1, 1).simplified().toDouble(&peakIsNumber);
+    if (!rmsIsNumber || !peakIsNumber || !std::isfinite(rms) || !std::isfinite(peak)) {
+        return Tracer::fail("LEVEL OFFS tag is invalid ('" + text + "').");
+    }
+    m_info.rmsOffset = m_info.rmsOffsetTag = rms;
+    m_info.peakOffset = m_info.peakOffsetTag = peak;
+    return true;
+}
+
+bool WvReader::processControlLength(const QString &text)
+{
+    bool isNumber = false;
+    const qint64 length = text.simplified().toLongLong(&isNumber);
+    if (!isNumber || length < 0 || length > std::min(m_fileLimit, MaxSamples)) {
+        return Tracer::fail("CONTROL LENGTH tag is invalid ('" + text + "').");
+    }
+    m_info.controlLength = static_cast<int>(length);
+    return true;
+}
+
+bool WvReader::keepUnknownTag(const QString &name)
+{
+    if (m_info.tagsStream == nullptr) {
+        return m_source.skipPast('}') || Tracer::fail("Invalid tag. '}' is missing.");
+    }
+    const auto keep = [&](const QByteArray &bytes) {
+        return bytes.isEmpty() ||
+               m_info.tagsStream->writeBytes(static_cast<int>(bytes.size()), bytes.constData()) ||
+               Tracer::fail("Cannot save unknown tag.");
+    };
+    QByteArray bytes = '{' + name.toLatin1() + ": ";
+    // Blanks behind the colon are no content: without this a tag would grow with every copy.
+    int byte = m_source.next();
+    while (byte == ' ') {
+        byte = m_source.next();
+    }
+    for (; byte != '}'; byte = m_source.next()) {
+        if (byte == ByteSource::NoByte) {
+            return Tracer::fail("Invalid tag. '}' is missing.");
+        }
+        bytes.append(static_cast<char>(byte));
+        if (bytes.size() >= blockSamples) {
+            if (!keep(bytes)) {
+                return false;
+            }
+            bytes.clear();
+        }
+    }
+    bytes.append('}');
+    return keep(bytes);
+}
+
+bool WvReader::openSampleBlock(const QString &name)
+{
+    if (m_info.format == WvFormatUnknown) {
+        return Tracer::fail("Unsupported waveform file type!");
+    }
+    if (m_info.samples <= 0) {
+        Tracer::Trace(Tracer::Warning,
+                      "No SAMPLES tag found. Trying to determine the sample count later...");
+    }
+    TagText prefix;
+    if (!m_source.readText('#', prefix) || !prefix.endedOnDelimiter) {
+        return Tracer::fail("Cannot read WAVEFORM tag");
+    }
+    bool isNumber = false;
+    const qint64 blockBytes = name.section('-', 1, 1).simplified().toLongLong(&isNumber);
+    if (!isNumber) {
+        return Tracer::fail("Invalid WAVEFORM tag format (samples count).");
+    }
+    if (prefix.text.contains(',')) {
+        m_info.prefixNumber = prefix.text.section(',', 0, 0).simplified().toInt();
+    }
+    const qint64 count = blockBytes > prefix.consumed ? (blockBytes - prefix.consumed) / 4 : 0;
+    if (count < 1) {
+        return Tracer::fail("Invalid number of samples in WAVEFORM tag.");
+    }
+    if (count != m_info.samples) {
+        Tracer::Trace(Tracer::Warning,
+                      "Number of samples from xWAVEFORM tag and SAMPLES tag disagree");
+        Tracer::Trace(Tracer::Warning, "Using data from xWAVEFORM tag.");
+        if (!takeSampleCount(count)) {
+            return false;
+        }
+    }
+    if (m_info.controlLength == 0) {
+        Tracer::Trace(Tracer::Warning,
+                      QString("No CONTROL LENGTH tag found. Using sample count instead (%1).")
+                          .arg(m_info.samples));
+        m_info.controlLength = m_info.samples;
+    }
+    if (!finalizeMarkers()) {
+        return false;
+    }
+    if (!m_info.dataStream->writeHeader("IQF")) {
+        return Tracer::fail("Writing to temporary waveform storage failed.");
+    }
+    Tracer::Trace(Tracer::Information, QString("Reading %1 samples @ %2 bit from waveform...")
+                                           .arg(m_info.samples)
+                                           .arg(m_sixteenBit ? "16" : "14"));
+    return true;
+}
+
+bool WvReader::finalizeMarkers()
+{
+    if (m_markers.written() < m_info.controlLength) {
+        Tracer::Trace(Tracer::Information,
+                      QString("Finalizing marker stream up to position %1 using value 0x%2")
+                          .arg(m_info.controlLength)
+                          .arg(m_markers.lastByte(), 0, 16));
+        // A count that the file can't hold fails below, at the samples; the stream needn't grow to
+        // it.
+        if (!m_markers.extendTo(std::min<qint64>(m_info.controlLength, m_fileLimit))) {
+            return false;
+        }
+    }
+    m_markers.warnAboutCuts(m_info.samples);
+    return true;
+}
+
+SampleCoding WvReader::coding() const
+{
+    switch (m_info.format) {
+    case WvFormatTqx:
+        return SampleCoding::B;
+    case WvFormatWv:
+        return m_sixteenBit ? SampleCoding::C : SampleCoding::D;
+    default:
+        return SampleCoding::A;
+    }
+}
+
+bool WvReader::readSamples()
+{
+    const auto gain = static_cast<float>(std::pow(10.0, m_info.gainDb / 20));
+    const qint64 total = m_info.samples;
+    std::vector<std::byte> words(static_cast<size_t>(std::min<qint64>(total, blockSamples)) * 4);
+    std::vector<float> values(words.size() / 2);
+    for (qint64 done = 0; done < total;) {
+        if (m_progress.shouldStop(done, total)) {
+            return Tracer::fail("Action aborted by user.");
+        }
+        const auto wanted = static_cast<size_t>(std::min<qint64>(total - done, blockSamples));
+        const size_t got = m_source.read(std::span(words).first(4 * wanted)) / 4;
+        const auto block = std::span(values).first(2 * got);
+        decodeWords(coding(), std::span(words).first(4 * got), gain, block);
+        if (got > 0 && !storeBlock(done, block)) {
+            return false;
+        }
+        if (got < wanted) {
+            return Tracer::fail("Cannot read enough data from xWAVEFORM tag!");
+        }
+        done += static_cast<qint64>(got);
+    }
+    return true;
+}
+
+bool WvReader::storeBlock(qint64 begin, std::span<const float> values)
+{
+    if (!m_info.dataStream->writeBytes(static_cast<int>(values.size_bytes()), values.data())) {
+        return Tracer::fail("Cannot write to temporary file!");
+    }
+    // With marker lists shorter than the samples the carried byte goes on from the sample behind
+    // the next one: readers of the stream live with its missing last byte.
+    const qint64 end = begin + static_cast<qint64>(values.size() / 2);
+    if (!m_markers.pad(end - std::max(begin, m_markers.written() + 1))) {
+        return false;
+    }
+    addLevels(values, m_levels);
+    return true;
+}

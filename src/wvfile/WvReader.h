@@ -1,0 +1,52 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "ByteSource.h"
+#include "MarkerTrace.h"
+#include "SampleCoding.h"
+#include "WvTypes.h"
+
+#include <QString>
+
+class ProgressClock;
+class QIODevice;
+
+/// Unpacks one waveform file into the streams of its record. HvFileIO opens the file and owns the
+/// signals; this class knows the format alone, and so can read from memory too.
+class WvReader
+{
+public:
+    /// `info` and its streams are checked and cleared by the caller; all outlive the reader, which
+    /// takes the device from its start.
+    WvReader(WvFileInfo &info, QIODevice &device, ProgressClock &progress);
+
+    /// Reads all of the device. Logs the reason and returns false on a failure.
+    [[nodiscard]] bool read();
+
+private:
+    /// What became of one round of the tag loop.
+    enum class Round { Tag, SampleBlock, Failed };
+
+    [[nodiscard]] Round readTag(QString &name);
+    [[nodiscard]] bool processTag(const QString &name);
+    [[nodiscard]] bool processType();
+    [[nodiscard]] bool processClock(const QString &text);
+    [[nodiscard]] bool processSamples(const QString &text);
+    [[nodiscard]] bool processLevels(const QString &text);
+    [[nodiscard]] bool processControlLength(const QString &text);
+    [[nodiscard]] bool keepUnknownTag(const QString &name);
+    [[nodiscard]] bool openSampleBlock(const QString &name);
+    [[nodiscard]] bool takeSampleCount(qint64 count);
+    [[nodiscard]] bool finalizeMarkers();
+    [[nodiscard]] bool readSamples();
+    [[nodiscard]] bool storeBlock(qint64 begin, std::span<const float> values);
+    [[nodiscard]] SampleCoding coding() const;
+
+    WvFileInfo &m_info;
+    ProgressClock &m_progress;
+    ByteSource m_source;
+    qint64 m_fileLimit = 0; ///< largest position that a marker list may name
+    MarkerTrace m_markers;
+    LevelSums m_levels;
+    bool m_sixteenBit = true;
+};

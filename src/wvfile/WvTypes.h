@@ -1,0 +1,122 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QList>
+#include <QString>
+#include <QtGlobal>
+
+#include <limits>
+
+class BufferedIO;
+
+/// The most samples that a waveform can have here.
+inline constexpr qint64 MaxSamples = std::numeric_limits<qint32>::max();
+
+inline constexpr int MarkerCount = 4;
+
+/// Clock rates (Hz) that the reader accepts: above the first, up to and including the second.
+inline constexpr double MinClockHz = 0.001;
+inline constexpr double MaxClockHz = 600e6;
+
+/// Groups of file kinds that share a sample coding, as the reader reports them.
+enum WvFormat {
+    WvFormatUnknown = 0,
+    WvFormatWv = 1, ///< "WV" and "WV-ADD"
+    WvFormatTgx = 2,
+    WvFormatTbx = 3,
+    WvFormatTqx = 4, ///< "TQX-130-WV"
+    WvFormatTvx = 5,
+};
+
+/// File kinds that the writer produces.
+enum WvType {
+    WvTypeTgx = 1,
+    WvTypeTbx = 2,
+    WvTypeTvx = 3,
+};
+
+/// The type that a tool writes for the result of a file it has read: TVX stays, all others become
+/// TGX.
+[[nodiscard]] constexpr int typeForFormat(int format)
+{
+    return format == WvFormatTvx ? WvTypeTvx : WvTypeTgx;
+}
+
+/// Job record of HvFileIO::readWaveform. The caller fills the input fields; all others are cleared
+/// and filled by the reader.
+struct WvFileInfo
+{
+    double clock = 0;         ///< CLOCK tag, Hz
+    int samples = 0;          ///< from the SAMPLES tag, overruled by the sample block
+    int controlLength = 0;    ///< positions covered by the marker lists, else the sample count
+    int prefixNumber = 0;     ///< number before a comma in the sample block's prefix, else 0
+    double rmsOffset = 0;     ///< measured, dB below full scale
+    double peakOffset = 0;    ///< measured, dB below full scale
+    double rmsOffsetTag = 0;  ///< first value of LEVEL OFFS, dB
+    double peakOffsetTag = 0; ///< second value of LEVEL OFFS, dB
+    int format = WvFormatUnknown;
+    QString comment;
+    QString copyright;
+    QString system;
+    QString date;
+
+    double gainDb = 0;                  ///< in: gain applied to all samples while reading, dB
+    QString fileName;                   ///< in: path of the file
+    BufferedIO *dataStream = nullptr;   ///< in: initialised stream, required
+    BufferedIO *markerStream = nullptr; ///< in: initialised stream, required
+    BufferedIO *tagsStream = nullptr; ///< in: initialised stream; null if unknown tags don't matter
+};
+
+/// Job record of HvFileIO::writeWaveform.
+struct WvWriteJob
+{
+    int type = WvTypeTgx;     ///< a WvType; any other value is written as TGX
+    double clock = 0;         ///< sample clock, Hz
+    double markerClock = 0;   ///< clock of the marker lists, Hz
+    int samples = 0;          ///< must be above 0
+    double rmsOffset = 0;     ///< dB; in, and out when computed by the writer
+    double peakOffset = 0;    ///< dB; in, and out when computed by the writer
+    QString comment;          ///< empty: no tag
+    QString copyright;        ///< empty: no tag
+    bool levelsValid = false; ///< the two offsets are given and are not to be computed
+    QList<float> iSamples;    ///< I values in memory, or empty
+    QList<float> qSamples;    ///< Q values in memory, or empty
+    QList<int> markers;       ///< bits 0 to 3 are markers 1 to 4; or empty
+};
+
+/// One segment of a multi-segment waveform.
+struct WvSegment
+{
+    QString fileName;
+    double duration = 0;   ///< s
+    double rmsOffset = 0;  ///< dB
+    double peakOffset = 0; ///< dB
+    double clock = 0;      ///< Hz
+    qint64 start = 0;      ///< samples
+    qint64 length = 0;     ///< samples
+};
+
+/// Result of HvFileIO::readWaveformInfo.
+struct WvFileSummary
+{
+    QString fileName;
+    qint64 fileSize = 0; ///< bytes
+    QString created;     ///< creation date, yyyy-mm-dd
+    QString typeText;    ///< description of the file kind
+    QString comment;
+    QString copyright;
+    QString date;
+    qint64 samples = -1;      ///< -1 if unknown
+    double clock = -1;        ///< Hz, -1 if unknown
+    double playTime = -1;     ///< s, -1 if unknown
+    bool levelsValid = false; ///< a readable LEVEL OFFS was found
+    double peakOffset = 0;    ///< dB, from the tag
+    double rmsOffset = 0;     ///< dB, from the tag
+    bool hasChecksum = false;
+    bool hasMarkers = false;
+    QString settingsFile;
+    QString levelMode;
+    QString clockMode;
+    int segmentCount = 0;
+    QList<WvSegment> segments;
+};

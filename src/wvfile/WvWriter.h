@@ -1,0 +1,55 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "WvTypes.h"
+
+#include <QByteArray>
+#include <QString>
+
+#include <functional>
+#include <span>
+
+class BufferedIO;
+class ProgressClock;
+class QIODevice;
+
+/// Sources of a waveform to be written; each may be null. None is owned.
+struct WvStreams
+{
+    BufferedIO *data = nullptr;
+    BufferedIO *markers = nullptr;
+    BufferedIO *tags = nullptr;
+};
+
+/// Writes one waveform file. HvFileIO checks the job, opens the file and owns the signals; this
+/// class knows the format alone.
+class WvWriter
+{
+public:
+    /// `report` gets progress in percent; everything outlives the writer.
+    WvWriter(WvWriteJob &job, const WvStreams &streams, ProgressClock &progress,
+             std::function<void(int)> report);
+
+    /// Computes the level offsets of samples in memory, if wanted, and logs the statistics.
+    void prepareLevels();
+
+    /// Writes the whole file. Logs the reason and returns false on a failure.
+    [[nodiscard]] bool write(QIODevice &device);
+
+private:
+    [[nodiscard]] bool put(QIODevice &device, const QByteArray &bytes);
+    [[nodiscard]] bool writeTags(QIODevice &device);
+    [[nodiscard]] bool copyTagsStream(QIODevice &device);
+    [[nodiscard]] bool writeMarkers(QIODevice &device);
+    [[nodiscard]] bool writeMarkerList(QIODevice &device, int marker);
+    [[nodiscard]] bool fetchMarkers(int begin, std::span<quint8> bytes);
+    [[nodiscard]] bool writeSamples(QIODevice &device);
+    [[nodiscard]] int fetchSamples(int begin, std::span<float> values);
+
+    WvWriteJob &m_job;
+    WvStreams m_streams;
+    ProgressClock &m_progress;
+    std::function<void(int)> m_report;
+    bool m_markersFromMemory = false;
+    bool m_markersFromStream = false;
+};
