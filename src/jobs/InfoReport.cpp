@@ -1,0 +1,157 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "InfoReport.h"
+
+#include "base/EngineeringNumber.h"
+
+#include <QJsonArray>
+
+#include <algorithm>
+
+namespace {
+
+QString yesNo(bool value)
+{
+    return value ? "Yes" : "No";
+}
+
+QString decibels(double value)
+{
+    return QString("%1 dB").arg(value);
+}
+
+QString quoted(const QString &text)
+{
+    return '\'' + text + '\'';
+}
+
+QString tableRow(const InfoRow &row, bool odd)
+{
+    const QString label = row.heading ? "<b>" + row.label + "</b>" : row.label;
+    return QString("<tr class=\"d%1\"><td width=\"30%\">%2</td><td width=\"70%\">%3</td></tr>")
+        .arg(QString::number(odd ? 1 : 0), label, row.value.toHtmlEscaped());
+}
+
+QString table(const QList<InfoRow> &rows)
+{
+    QString html = "<p><table border=\"0\" width=\"100%\">";
+    bool odd = false;
+    for (const InfoRow &row : rows) {
+        html += tableRow(row, odd);
+        odd = !odd;
+    }
+    return html + "</table> </p> ";
+}
+
+} // namespace
+
+QList<InfoRow> fileRows(const WvFileSummary &summary)
+{
+    return {
+        {"Type", summary.typeText},
+        {"File Size", QString("%1 bytes").arg(summary.fileSize)},
+        {"Created", summary.created},
+        {"Comment", quoted(summary.comment)},
+        {"Copyright", quoted(summary.copyright)},
+        {"Date Info", quoted(summary.date)},
+        {"Samples", engineeringText(static_cast<double>(summary.samples))},
+        {"Clock", engineeringText(summary.clock, "Hz")},
+        {"Play Time", engineeringText(summary.playTime, "s")},
+        {"Peak Offset (Tag)", decibels(summary.peakOffset)},
+        {"Peak / RMS (Tag)", decibels(summary.rmsOffset - summary.peakOffset)},
+        {"Checksum", yesNo(summary.hasChecksum)},
+        {"Markers", yesNo(summary.hasMarkers)},
+    };
+}
+
+QList<InfoRow> segmentRows(const WvFileSummary &summary)
+{
+    if (summary.segmentCount <= 0) {
+        return {};
+    }
+    QList<InfoRow> rows{
+        {"Segments", QString::number(summary.segmentCount)},
+        {"Settings File", summary.settingsFile},
+        {"Level Mode", summary.levelMode},
+        {"Clock Mode", summary.clockMode},
+    };
+    for (qsizetype i = 0; i < summary.segments.size(); ++i) {
+        const WvSegment &segment = summary.segments.at(i);
+        rows << InfoRow{QString("Segment %1").arg(i), segment.fileName, true}
+             << InfoRow{"&nbsp;&nbsp; Clock", engineeringText(segment.clock, "Hz")}
+             << InfoRow{"&nbsp;&nbsp; Start Sample, Samples",
+                        QString("%1, %2").arg(segment.start).arg(segment.length)}
+             << InfoRow{"&nbsp;&nbsp; Play Time", engineeringText(segment.duration, "s")}
+             << InfoRow{"&nbsp;&nbsp; Peak Offset", decibels(segment.peakOffset)}
+             << InfoRow{"&nbsp;&nbsp; Peak/RMS", decibels(segment.rmsOffset - segment.peakOffset)};
+    }
+    return rows;
+}
+
+QString infoHtml(const WvFileSummary &summary, const QString &folder, const InfoColors &colors)
+{
+    QString html = "<style type=\"text/css\">";
+    html +=
+        "tr.d0 td {; color: " + colors.text0 + ";  background-color: " + colors.background0 + "}";
+    html +=
+        "tr.d1 td {; color: " + colors.text1 + ";  background-color: " + colors.background1 + "}";
+    html += "</style>";
+    html += "<h2>" + folder.toHtmlEscaped() + "</h2>";
+    html += "<h2>&nbsp;&nbsp;" + summary.fileName.toHtmlEscaped() + "</h2>";
+    html += table(fileRows(summary));
+    if (summary.segmentCount > 0) {
+        html += "<h3> Multi Segment Waveform </h3>" + table(segmentRows(summary));
+    }
+    return html;
+}
+
+QString infoText(const WvFileSummary &summary)
+{
+    QList<InfoRow> rows{{"File", summary.fileName}};
+    rows += fileRows(summary);
+    rows += segmentRows(summary);
+    qsizetype width = 0;
+    for (InfoRow &row : rows) {
+        row.label.replace("&nbsp;", " ");
+        width = std::max(width, row.label.size());
+    }
+    QString text;
+    for (const InfoRow &row : rows) {
+        text += (row.label + ':').leftJustified(width + 2) + row.value + '\n';
+    }
+    return text;
+}
+
+QJsonObject infoJson(const WvFileSummary &summary)
+{
+    QJsonArray segments;
+    for (const WvSegment &segment : summary.segments) {
+        segments.append(QJsonObject{
+            {"fileName", segment.fileName},
+            {"clock", segment.clock},
+            {"start", segment.start},
+            {"length", segment.length},
+            {"duration", segment.duration},
+            {"peakOffset", segment.peakOffset},
+            {"rmsOffset", segment.rmsOffset},
+        });
+    }
+    return {
+        {"fileName", summary.fileName},
+        {"fileSize", summary.fileSize},
+        {"created", summary.created},
+        {"type", summary.typeText},
+        {"comment", summary.comment},
+        {"copyright", summary.copyright},
+        {"date", summary.date},
+        {"samples", summary.samples},
+        {"clock", summary.clock},
+        {"playTime", summary.playTime},
+        {"levelsValid", summary.levelsValid},
+        {"peakOffset", summary.peakOffset},
+        {"rmsOffset", summary.rmsOffset},
+        {"hasChecksum", summary.hasChecksum},
+        {"hasMarkers", summary.hasMarkers},
+        {"segmentCount", summary.segmentCount},
+        {"segments", segments},
+    };
+}
