@@ -76,7 +76,7 @@ QList<InfoRow> segmentRows(const WvFileSummary &summary)
     };
     for (qsizetype i = 0; i < summary.segments.size(); ++i) {
         const WvSegment &segment = summary.segments.at(i);
-        rows << InfoRow{QString("Segment %1").arg(i), segment.fileName, true}
+        rows << InfoRow{QString("Segment %1").arg(i + 1), segment.fileName, true}
              << InfoRow{"&nbsp;&nbsp; Clock", engineeringText(segment.clock, "Hz")}
              << InfoRow{"&nbsp;&nbsp; Start Sample, Samples",
                         QString("%1, %2").arg(segment.start).arg(segment.length)}
