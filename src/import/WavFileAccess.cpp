@@ -1,0 +1,200 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "WavFileAccess.h"
+
+#include "base/ProgressClock.h"
+#include "log/Tracer.h"
+#include "wvfile/BufferedIO.h"
+
+#include <QDataStream>
+#include <QFileInfo>
+#include <QtEndian>
+
+#include <algorithm>
+#include <vector>
+
+namespace {
+
+constexpr qint64 chunkIdSize = 4;
+constexpr qint64 chunkHeadSize = 8;
+constexpr int blockSamples = 64 * 1024;
+
+} // namespace
+
+double WavHeader::playTime() const
+{
+    return sampleRate > 0 ? static_cast<double>(samples()) / sampleRate : 0.0;
+}
+
+WavFileAccess::WavFileAccess(QObject *parent)
+    : QObject(parent)
+{
+}
+
+bool WavFileAccess::open(const QString &fileName)
+{
+    close();
+    if (!fileName.isEmpty()) {
+        m_file.setFileName(fileName);
+        m_header = WavHeader();
+    }
+    // A pipe or a device may never end; a chunk walk needs a file that can be searched.
+    return QFileInfo(m_file.fileName()).isFile() && m_file.open(QIODevice::ReadOnly);
+}
+
+void WavFileAccess::close()
+{
+    m_file.close();
+}
+
+void WavFileAccess::cancel()
+{
+    m_cancelled = true;
+}
+
+bool WavFileAccess::readHeader()
+{
+    Tracer::Trace(Tracer::Information, "Reading header data from file " + m_file.fileName());
+    m_header = WavHeader();
+    return m_file.isOpen() ? checkHeader() : Tracer::fail("File is not open.");
+}
+
+bool WavFileAccess::checkHeader()
+{
+    Tracer::Trace(Tracer::Debug, "Checking .wav file header.");
+    if (!m_file.seek(0) || m_file.read(chunkIdSize) != "RIFF") {
+        return Tracer::fail("This is not a valid RIFF waveform file.");
+    }
+    QDataStream stream(&m_file);
+    stream.setByteOrder(QDataStream::LittleEndian);
+    quint32 fileSize = 0;
+    stream >> fileSize;
+    if (stream.status() != QDataStream::Ok || fileSize < 8) {
+        return Tracer::fail("The file size seems to be invalid.");
+    }
+    if (m_file.read(chunkIdSize) != "WAVE") {
+        return Tracer::fail("This is not a valid WAVE waveform file.");
+    }
+    Tracer::Trace(Tracer::Debug, "Evaluating chunks...");
+    bool formatFound = false;
+    bool dataFound = false;
+    for (;;) {
+        const QByteArray id = m_file.read(chunkIdSize);
+        if (id.size() < chunkIdSize) {
+            Tracer::Trace(Tracer::Debug, "No more header signatures available in .wav file.");
+            break;
+        }
+        quint32 length = 0;
+        stream >> length;
+        if (stream.status() != QDataStream::Ok || length <= 8) {
+            return Tracer::fail("No chunk length available in .wav file.");
+        }
+        const qint64 position = m_file.pos();
+        if (id == "fmt ") {
+            Tracer::Trace(
+                Tracer::Debug,
+                QString("  Found 'fmt' chunk at position %1.").arg(position - chunkHeadSize));
+            if (!checkFormatChunk(length)) {
+                return false;
+            }
+            formatFound = true;
+        } else if (id == "data") {
+            Tracer::Trace(
+                Tracer::Debug,
+                QString("  Found 'data' chunk at position %1.").arg(position - chunkHeadSize));
+            m_header.dataLength = length;
+            m_header.dataPosition = position;
+            dataFound = true;
+        } else {
+            logUnknownChunk(id, length);
+        }
+        // A length that leads beyond the end leaves nothing to walk on to.
+        if (!m_file.seek(position + length)) {
+            break;
+        }
+    }
+    m_header.valid = formatFound && dataFound;
+    return true;
+}
+
+bool WavFileAccess::checkFormatChunk(quint32 length)
+{
+    constexpr quint32 pcmChunkSize = 16;
+    constexpr qint16 pcm = 1;
+    if (length != pcmChunkSize) {
+        return Tracer::fail("Format chunk has invalid length.");
+    }
+    QDataStream stream(&m_file);
+    stream.setByteOrder(QDataStream::LittleEndian);
+    stream >> m_header.formatTag;
+    if (m_header.formatTag != pcm) {
+        return Tracer::fail("Data Format must be PCM.");
+    }
+    stream >> m_header.channels;
+    if (m_header.channels != 2) {
+        return Tracer::fail("File must contain 2 channels.");
+    }
+    stream >> m_header.sampleRate >> m_header.byteRate >> m_header.blockAlignment >>
+        m_header.bitsPerSample;
+    if (stream.status() != QDataStream::Ok) {
+        return Tracer::fail("Cannot read header information from file.");
+    }
+    if (m_header.blockAlignment != 4) {
+        return Tracer::fail("Block alignment must be 4 bytes.");
+    }
+    if (m_header.bitsPerSample != 16) {
+        return Tracer::fail("Data must be 16 bits/sample.");
+    }
+    return true;
+}
+
+void WavFileAccess::logUnknownChunk(const QByteArray &id, quint32 length) const
+{
+    Tracer::Trace(
+        Tracer::Debug,
+        QString("  Found unknown chunk at position %1.").arg(m_file.pos() - chunkHeadSize));
+    Tracer::Trace(Tracer::Debug, "  - ID is '" + QString::fromLatin1(id) + "'.");
+    Tracer::Trace(Tracer::Debug, QString("  - Chunk Length is %1 bytes.").arg(length));
+}
+
+bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
+{
+    m_cancelled = false;
+    Tracer::Trace(Tracer::Information, "Reading data from WAV file.");
+    if (!m_file.isOpen()) {
+        return Tracer::fail("File is not open.");
+    }
+    if (!stream->writeHeader("IQF")) {
+        return Tracer::fail("Cannot write to temporary file.");
+    }
+    const qint64 total = limit > 0 ? std::min(limit, m_header.samples()) : m_header.samples();
+    Tracer::Trace(Tracer::Information, QString("  Start position : %1").arg(m_header.dataPosition));
+    Tracer::Trace(Tracer::Information, QString("  Samples to read : %1").arg(total));
+    if (!m_file.seek(m_header.dataPosition)) {
+        return Tracer::fail("Cannot set start position data section.");
+    }
+    ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
+    constexpr float scale = 1.0F / 32768.0F;
+    std::vector<qint16> words(2 * static_cast<size_t>(std::min<qint64>(total, blockSamples)));
+    std::vector<float> values(words.size());
+    for (qint64 done = 0; done < total;) {
+        if (progress.shouldStop(done, total)) {
+            return Tracer::fail("*** Action aborted by user.");
+        }
+        const qint64 wanted = std::min<qint64>(total - done, blockSamples);
+        const qint64 got = m_file.read(reinterpret_cast<char *>(words.data()), 4 * wanted);
+        const auto count = static_cast<size_t>(std::max<qint64>(got, 0) / 4);
+        qFromLittleEndian<qint16>(words.data(), static_cast<qsizetype>(2 * count), words.data());
+        for (size_t i = 0; i < 2 * count; ++i) {
+            values[i] = static_cast<float>(words[i]) * scale;
+        }
+        if (count > 0 &&
+            !stream->writeBytes(static_cast<int>(count) * BufferedIO::RecordSize, values.data())) {
+            return Tracer::fail("Cannot write to temporary file.");
+        }
+        if (static_cast<qint64>(count) < wanted) {
+            return Tracer::fail("Cannot read data from .wav file.");
+        }
+        done += wanted;
+    }
+    return true;
+}

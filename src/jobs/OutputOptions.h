@@ -1,0 +1,14 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QString>
+
+#include <optional>
+
+/// What every tool that writes a waveform asks for besides its own settings.
+struct OutputOptions
+{
+    QString fileName;
+    std::optional<QString> comment;   ///< nothing: that of the source, or none
+    std::optional<QString> copyright; ///< nothing: that of the source, or none
+};
