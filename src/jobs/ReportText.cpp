@@ -7,6 +7,17 @@
 
 #include <cmath>
 
+namespace {
+
+/// Two decimals; an offset that rounds to zero is shown without a sign.
+QString decibelText(double value)
+{
+    const QString text = QString::asprintf("%4.2f", value);
+    return (text == "-0.00" ? QString("0.00") : text) + " dB";
+}
+
+} // namespace
+
 QString stepLine(const QString &text)
 {
     return "\n<b>" + text + "</b>";
@@ -31,8 +42,8 @@ QStringList levelLines(const LevelReport &levels)
 {
     return {
         QString(" Samples:    \t%1").arg(levels.samples, 0, 'f', 0),
-        QString::asprintf(" Peak Offset:\t%4.2f dB", levels.peakOffset),
-        QString::asprintf(" Peak/RMS:   \t%4.2f dB", levels.rmsOffset - levels.peakOffset),
+        " Peak Offset:\t" + decibelText(levels.peakOffset),
+        " Peak/RMS:   \t" + decibelText(levels.rmsOffset - levels.peakOffset),
     };
 }
 

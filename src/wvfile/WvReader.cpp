@@ -3,6 +3,7 @@
 
 #include "BufferedIO.h"
 #include "FileKind.h"
+#include "levels.h"
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
@@ -17,12 +18,6 @@ namespace {
 
 constexpr int maxNameLength = 99;
 constexpr int blockSamples = 64 * 1024;
-
-/// Level below full scale in dB; the small amount keeps silence finite.
-double measuredOffset(double level)
-{
-    return 20 * std::log10(1 / (level + 1e-7));
-}
 
 } // namespace
 

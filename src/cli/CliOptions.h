@@ -1,0 +1,63 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "jobs/OutputOptions.h"
+
+#include <CLI/CLI.hpp>
+#include <QString>
+#include <QStringList>
+
+#include <functional>
+#include <limits>
+#include <memory>
+#include <optional>
+#include <string>
+
+class Console;
+
+/// A numeric option: its unit, which may be written behind the number, and its permitted range.
+struct NumberRange
+{
+    QString unit;
+    double min = std::numeric_limits<double>::lowest();
+    double max = std::numeric_limits<double>::max();
+};
+
+/// Adds an option that takes a number in an engineering form: 10k, 1.5M, 1,5M, 10us, -3.
+CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional<double> &value,
+                       const NumberRange &range, const std::string &help);
+
+/// As above, for whole numbers.
+CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<qint64> &value,
+                        const NumberRange &range, const std::string &help);
+
+/// Adds a text option or file argument; texts are taken in the encoding of the terminal.
+CLI::Option *addText(CLI::App &command, const std::string &name, QString &value,
+                     const std::string &help);
+
+/// Adds an option with named values, which fill `index` with their place in the list.
+CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
+                       const QStringList &names, const std::string &help);
+
+/// The options of every command that writes a .wv file.
+struct OutputArguments
+{
+    OutputOptions options;
+    bool force = false;
+};
+void addOutputArguments(CLI::App &command, OutputArguments &arguments);
+
+/// Whether the file may be written: it isn't there, or `force` is set. Logs the reason if not.
+[[nodiscard]] bool mayWrite(Console &console, const QString &fileName, bool force);
+
+/// Adds a command and remembers in `action` what to run after parsing. The state of the command's
+/// options lives as long as its action.
+template <typename State>
+CLI::App &addCommand(CLI::App &parent, const std::string &name, const std::string &help,
+                     std::function<int()> &action, const std::shared_ptr<State> &state,
+                     int (*run)(State &))
+{
+    CLI::App *command = parent.add_subcommand(name, help);
+    command->callback([&action, state, run] { action = [state, run] { return run(*state); }; });
+    return *command;
+}

@@ -1,0 +1,159 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Console.h"
+
+#include "jobs/ReportText.h"
+#include "jobs/ToolJob.h"
+
+#include <QSocketNotifier>
+
+#include <array>
+#include <csignal>
+#include <cstdio>
+#include <fcntl.h>
+#include <unistd.h>
+
+namespace {
+
+/// A signal handler may do little more than write to a pipe; the event loop reads its other end.
+std::array<int, 2> interruptPipe{-1, -1};
+
+extern "C" void onInterrupt(int)
+{
+    const char byte = 1;
+    [[maybe_unused]] const ssize_t written = write(interruptPipe[1], &byte, 1);
+}
+
+QString levelName(int level)
+{
+    if ((level & (Tracer::Error | Tracer::Severe)) != 0) {
+        return "error";
+    }
+    if ((level & Tracer::Warning) != 0) {
+        return "warning";
+    }
+    return (level & Tracer::Debug) != 0 ? "debug" : "info";
+}
+
+} // namespace
+
+Console::Console(QObject *parent)
+    : QObject(parent)
+{
+    connect(&m_tracer, &Tracer::TraceDataAvailable, this, &Console::printLog);
+    if (pipe2(interruptPipe.data(), O_CLOEXEC | O_NONBLOCK) == 0) {
+        std::signal(SIGINT, onInterrupt);
+    }
+    // A closed reader of standard output is to end in a message, not in a silent death.
+    std::signal(SIGPIPE, SIG_IGN);
+}
+
+void Console::setVerbose(bool verbose)
+{
+    m_verbose = verbose;
+    Tracer::setMask(verbose ? Tracer::DebugMask : Tracer::DefaultMask);
+}
+
+void Console::printLog()
+{
+    const QList<Tracer::Entry> entries = Tracer::takeEntries();
+    for (const auto &[stamped, level] : entries) {
+        const QString name = levelName(level);
+        if (!m_verbose && (name == "info" || name == "debug")) {
+            continue;
+        }
+        // The time of day in front, closed by two blanks, is of no use in a script's log.
+        QString text = stamped.mid(stamped.indexOf("  ") + 2);
+        text.replace('\n', ' ');
+        printLine(name + ": " + text);
+        if (name == "error") {
+            m_lastReason = text;
+        }
+    }
+}
+
+void Console::printLine(const QString &line)
+{
+    clearProgress();
+    m_lastLine = line;
+    std::fprintf(stderr, "%s\n", line.toLocal8Bit().constData());
+}
+
+void Console::printReport(const QString &html)
+{
+    const QString line = plainLine(html);
+    if (!m_quiet && !line.isEmpty()) {
+        printLine(line);
+    }
+}
+
+void Console::drawProgress(int percent)
+{
+    if (!m_showProgress || isatty(STDERR_FILENO) == 0) {
+        return;
+    }
+    constexpr int width = 30;
+    const int filled = qBound(0, percent, 100) * width / 100;
+    const QString bar = QString(filled, '#').leftJustified(width, '.');
+    std::fprintf(stderr, "\r\033[K%s [%s] %3d %%", m_stepLabel.toLocal8Bit().constData(),
+                 bar.toLocal8Bit().constData(), percent);
+    std::fflush(stderr);
+    m_progressDrawn = true;
+}
+
+void Console::clearProgress()
+{
+    if (m_progressDrawn) {
+        std::fputs("\r\033[K", stderr);
+        m_progressDrawn = false;
+    }
+}
+
+int Console::run(ToolJob &job)
+{
+    connect(&job, &ToolJob::stepStarted, this,
+            [this](const QString &label) { m_stepLabel = label; });
+    connect(&job, &ToolJob::ProgressUpdate, this, &Console::drawProgress);
+    connect(&job, &ToolJob::report, this, &Console::printReport);
+    QSocketNotifier interrupt(interruptPipe[0], QSocketNotifier::Read);
+    connect(&interrupt, &QSocketNotifier::activated, &job, [&job] {
+        char byte = 0;
+        while (read(interruptPipe[0], &byte, 1) > 0) {
+        }
+        job.cancel();
+    });
+    const bool done = job.run();
+    clearProgress();
+    if (done) {
+        return ExitDone;
+    }
+    if (job.isCancelled()) {
+        return ExitCancelled;
+    }
+    return failed();
+}
+
+int Console::failed()
+{
+    const QString reason = "error: " + m_lastReason;
+    if (m_lastLine != reason) {
+        printLine(reason);
+    }
+    return ExitFailed;
+}
+
+int Console::wrongUsage(const QString &reason)
+{
+    printLine("error: " + reason);
+    return ExitUsage;
+}
+
+bool Console::print(const QByteArray &bytes)
+{
+    if (std::fwrite(bytes.constData(), 1, static_cast<size_t>(bytes.size()), stdout) !=
+            static_cast<size_t>(bytes.size()) ||
+        std::fflush(stdout) != 0) {
+        error("Cannot write to standard output.");
+        return false;
+    }
+    return true;
+}

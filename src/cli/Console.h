@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "log/Tracer.h"
+
+#include <QObject>
+#include <QString>
+
+class ToolJob;
+
+/// Exit status of the program.
+enum ExitCode {
+    ExitDone = 0,
+    ExitFailed = 1,
+    ExitUsage = 2,
+    ExitCancelled = 130,
+};
+
+/// The terminal side of the program: prints the log and the report lines to standard error, draws
+/// the progress of a job there, and turns SIGINT into its cancel().
+class Console : public QObject
+{
+    Q_OBJECT
+
+public:
+    explicit Console(QObject *parent = nullptr);
+
+    void setQuiet(bool quiet) { m_quiet = quiet; }
+    void setVerbose(bool verbose);
+    void setShowProgress(bool show) { m_showProgress = show; }
+
+    /// Runs a job and returns the exit code. When it fails, the reason is the last line.
+    [[nodiscard]] int run(ToolJob &job);
+
+    /// Ends a command that failed with the reason in the log: makes that the last line.
+    [[nodiscard]] int failed();
+
+    /// Ends a command that was used wrongly.
+    [[nodiscard]] int wrongUsage(const QString &reason);
+
+    /// Logs an error of the command line itself.
+    void error(const QString &text) { Tracer::Trace(Tracer::Error, text); }
+
+    /// The text of the last error in the log; empty if there was none.
+    [[nodiscard]] const QString &lastReason() const { return m_lastReason; }
+
+    /// Writes to standard output; false, with the reason logged, if that is closed or full.
+    [[nodiscard]] bool print(const QByteArray &bytes);
+
+private:
+    void printLog();
+    void printReport(const QString &html);
+    void printLine(const QString &line);
+    void drawProgress(int percent);
+    void clearProgress();
+
+    Tracer m_tracer;
+    bool m_quiet = false;
+    bool m_verbose = false;
+    bool m_showProgress = false;
+    bool m_progressDrawn = false;
+    QString m_stepLabel;
+    QString m_lastReason;
+    QString m_lastLine;
+};

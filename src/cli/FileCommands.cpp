@@ -1,0 +1,175 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "CliOptions.h"
+#include "Console.h"
+#include "commands.h"
+
+#include "base/EngineeringNumber.h"
+#include "jobs/DumpJob.h"
+#include "jobs/InfoReport.h"
+#include "jobs/MeasureJob.h"
+#include "wvfile/HvFileIO.h"
+
+#include <QFile>
+#include <QJsonArray>
+#include <QJsonDocument>
+
+namespace {
+
+struct InfoArguments
+{
+    Console &console;
+    std::vector<std::string> files;
+    bool json = false;
+};
+
+int runInfo(InfoArguments &arguments)
+{
+    bool allScanned = true;
+    QJsonArray objects;
+    QByteArray text;
+    for (const std::string &name : arguments.files) {
+        WvFileSummary summary;
+        const QString fileName = QString::fromLocal8Bit(name);
+        if (!HvFileIO().readWaveformInfo(fileName, &summary)) {
+            // The scan's own words don't name the file, of which there may be many.
+            arguments.console.error(fileName + ": " + arguments.console.lastReason());
+            allScanned = false;
+            continue;
+        }
+        objects.append(infoJson(summary));
+        text += (text.isEmpty() ? "" : "\n") + infoText(summary).toLocal8Bit();
+    }
+    const bool printed =
+        arguments.console.print(arguments.json ? QJsonDocument(objects).toJson() : text);
+    return printed && allScanned ? ExitDone : arguments.console.failed();
+}
+
+void addRange(CLI::App &command, SampleRange &range)
+{
+    addText(command, "file", range.fileName, "Waveform file to read")->required();
+    addInteger(command, "--from", range.from, {"", 0, MaxSamples - 1.0},
+               "First sample, counted from 0");
+    addInteger(command, "--count", range.count, {"", 1, double(MaxSamples)},
+               "Number of samples (default: up to the end)");
+}
+
+/// Whether the range lies in the file, by its tags. A file that can't be scanned passes: reading it
+/// tells the reason.
+bool rangeFits(Console &console, const SampleRange &range, int &exitCode)
+{
+    WvFileSummary summary;
+    if ((!range.from && !range.count) || !QFile::exists(range.fileName) ||
+        !HvFileIO().readWaveformInfo(range.fileName, &summary) || summary.samples < 1) {
+        return true;
+    }
+    const QString problem = rangeProblem(range, summary.samples);
+    if (!problem.isEmpty()) {
+        exitCode = console.wrongUsage(problem);
+    }
+    return problem.isEmpty();
+}
+
+struct DumpArguments
+{
+    Console &console;
+    SampleRange range;
+    int format = 0;
+    QString output;
+    bool force = false;
+};
+
+int runDump(DumpArguments &arguments)
+{
+    Console &console = arguments.console;
+    int exitCode = ExitDone;
+    if (!rangeFits(console, arguments.range, exitCode)) {
+        return exitCode;
+    }
+    DumpJob::Sink sink = [&console](const QByteArray &bytes) { return console.print(bytes); };
+    QFile file(arguments.output);
+    if (!arguments.output.isEmpty()) {
+        if (!mayWrite(console, arguments.output, arguments.force)) {
+            return console.failed();
+        }
+        // Opened with the first bytes, so that a source that can't be read leaves nothing behind.
+        sink = [&file](const QByteArray &bytes) {
+            if (!file.isOpen() && !file.open(QIODevice::WriteOnly)) {
+                return Tracer::fail("Cannot open '" + file.fileName() + "': " + file.errorString());
+            }
+            return file.write(bytes) == bytes.size() ||
+                   Tracer::fail("Cannot write '" + file.fileName() + "': " + file.errorString());
+        };
+    }
+    DumpJob job(arguments.range, static_cast<DumpFormat>(arguments.format), sink);
+    exitCode = console.run(job);
+    if (exitCode == ExitDone && file.isOpen() && !file.flush()) {
+        console.error("Cannot write '" + file.fileName() + "': " + file.errorString());
+        exitCode = console.failed();
+    }
+    return exitCode;
+}
+
+struct MeasureArguments
+{
+    Console &console;
+    SampleRange range;
+    bool json = false;
+};
+
+int runMeasure(MeasureArguments &arguments)
+{
+    Console &console = arguments.console;
+    int exitCode = ExitDone;
+    if (!rangeFits(console, arguments.range, exitCode)) {
+        return exitCode;
+    }
+    MeasureJob job(arguments.range);
+    exitCode = console.run(job);
+    if (exitCode != ExitDone) {
+        return exitCode;
+    }
+    const LevelMeasurement &levels = job.result();
+    QByteArray text;
+    if (arguments.json) {
+        text = QJsonDocument(QJsonObject{{"samples", levels.samples},
+                                         {"peakOffset", levels.peakOffset},
+                                         {"rmsOffset", levels.rmsOffset},
+                                         {"crest", levels.crest()}})
+                   .toJson();
+    } else {
+        text =
+            QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
+                              "Peak / RMS:  %.6f dB\n",
+                              levels.samples, levels.peakOffset, levels.rmsOffset, levels.crest())
+                .toLatin1();
+    }
+    return console.print(text) ? ExitDone : console.failed();
+}
+
+} // namespace
+
+void addFileCommands(CommandSet &commands)
+{
+    auto info = std::make_shared<InfoArguments>(InfoArguments{commands.console, {}});
+    CLI::App &infoCommand = addCommand<InfoArguments>(
+        commands.app, "info", "Show the tags of waveform files", commands.action, info, runInfo);
+    infoCommand.add_option("files", info->files, "Waveform files")->required()->type_name("FILE");
+    infoCommand.add_flag("--json", info->json, "Print one JSON array");
+
+    auto dump = std::make_shared<DumpArguments>(DumpArguments{commands.console, {}, 0, {}});
+    CLI::App &dumpCommand = addCommand<DumpArguments>(commands.app, "dump", "Write out samples",
+                                                      commands.action, dump, runDump);
+    addRange(dumpCommand, dump->range);
+    addChoice(dumpCommand, "--format", dump->format, {"csv", "cf32", "ci16"},
+              "Form of the samples (default: csv)");
+    addText(dumpCommand, "-o,--output", dump->output, "File to write (default: standard output)")
+        ->type_name("FILE");
+    dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
+
+    auto measure = std::make_shared<MeasureArguments>(MeasureArguments{commands.console, {}});
+    CLI::App &measureCommand =
+        addCommand<MeasureArguments>(commands.app, "measure", "Measure peak and RMS of the samples",
+                                     commands.action, measure, runMeasure);
+    addRange(measureCommand, measure->range);
+    measureCommand.add_flag("--json", measure->json, "Print JSON");
+}

@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <CLI/CLI.hpp>
+
+#include <functional>
+
+class Console;
+
+/// Each group of commands adds itself to the parser; the chosen command leaves in `action` what is
+/// to be run. The console and the action outlive the parser's callbacks.
+struct CommandSet
+{
+    CLI::App &app;
+    Console &console;
+    std::function<int()> &action;
+};
+
+void addFileCommands(CommandSet &commands);
+void addEditCommands(CommandSet &commands);
+void addImportCommands(CommandSet &commands);

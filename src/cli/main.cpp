@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Console.h"
+#include "commands.h"
+
+#include <CLI/CLI.hpp>
+#include <QCoreApplication>
+
+#include <clocale>
+#include <functional>
+
+int main(int argc, char **argv)
+{
+    const QCoreApplication application(argc, argv);
+    // Numbers are written with a point, whatever the terminal's language.
+    std::setlocale(LC_NUMERIC, "C");
+    Console console;
+    std::function<int()> action;
+
+    CLI::App app("Workbench for the waveforms of arbitrary-waveform signal generators");
+    app.name("corvane-cli");
+    app.set_version_flag("--version", std::string("corvane-cli ") + CORVANE_VERSION);
+    app.require_subcommand(1);
+    app.fallthrough();
+    bool quiet = false;
+    bool verbose = false;
+    bool noProgress = false;
+    app.add_flag("--quiet", quiet, "No report lines");
+    app.add_flag("--verbose", verbose, "The whole log, debug messages included");
+    app.add_flag("--no-progress", noProgress, "No progress bar on a terminal");
+
+    CommandSet commands{app, console, action};
+    addFileCommands(commands);
+    addEditCommands(commands);
+    addImportCommands(commands);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError &problem) {
+        // The library's own codes tell only help and version, which are no errors, from the rest.
+        if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
+            return app.exit(problem);
+        }
+        return console.wrongUsage(QString::fromLocal8Bit(problem.what()));
+    }
+    console.setQuiet(quiet);
+    console.setVerbose(verbose);
+    console.setShowProgress(!noProgress);
+    return action();
+}

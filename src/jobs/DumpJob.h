@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "SampleReadJob.h"
+
+#include <functional>
+#include <span>
+
+enum class DumpFormat {
+    Csv,  ///< header line, then sample number, I, Q and marker byte in a line each
+    Cf32, ///< interleaved 32-bit floats, little-endian
+    Ci16, ///< interleaved 16-bit integers as the writer codes them, little-endian
+};
+
+/// Writes out a range of samples.
+class DumpJob : public SampleReadJob
+{
+    Q_OBJECT
+
+public:
+    /// Takes each block of the output; false ends the job, with the reason logged by the taker.
+    using Sink = std::function<bool(const QByteArray &)>;
+
+    DumpJob(SampleRange range, DumpFormat format, Sink sink, QObject *parent = nullptr);
+
+protected:
+    [[nodiscard]] bool process(SourceWaveform &source, qint64 begin, qint64 count) override;
+
+private:
+    [[nodiscard]] QByteArray encode(qint64 begin, std::span<const float> values,
+                                    std::span<const char> markers) const;
+
+    DumpFormat m_format;
+    Sink m_sink;
+};
