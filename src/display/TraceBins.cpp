@@ -6,7 +6,8 @@
 #include <cstddef>
 #include <cstring>
 
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
+#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) &&                             \
+    !defined(__SANITIZE_ADDRESS__)
 #define CLONES __attribute__((target_clones("default", "arch=x86-64-v3", "arch=x86-64-v4")))
 #else
 #define CLONES
@@ -34,7 +35,7 @@ struct Block
     alignas(64) std::array<double, Size> q;
     alignas(64) std::array<double, Size> magnitude;
     alignas(64) std::array<double, Size> phase;
-    alignas(64) std::array<double, Size> phaseSize; ///< |phase|
+    alignas(64) std::array<double, Size> phaseSize;  ///< |phase|
     alignas(64) std::array<double, Size + 1> folded; ///< from index 1 on; 0 is the sample before
     alignas(64) std::array<double, Size> step;
 };
@@ -52,8 +53,8 @@ inline double arcTangent(double smaller, double larger)
     // Summed in pairs, so that few of the products wait for each other.
     const double z2 = z * z;
     const double z4 = z2 * z2;
-    const double low = (1.0 - 0.3333333333333312 * z) +
-                       z2 * (0.19999999999940837 - 0.14285714279244968 * z);
+    const double low =
+        (1.0 - 0.3333333333333312 * z) + z2 * (0.19999999999940837 - 0.14285714279244968 * z);
     const double middle = (0.11111110744657099 - 0.09090896801472813 * z) +
                           z2 * (0.07692045194561481 - 0.06662950246036792 * z);
     const double high = (0.05846866752275139 - 0.05035049795312439 * z) +

@@ -20,9 +20,9 @@ struct TraceBin
     double phaseHigh = 0;
     double freqMin = 0; ///< phase steps between neighbouring samples, rad
     double freqMax = 0;
-    int count = 0;       ///< samples folded in; all else means nothing while it is 0
-    quint8 mkrHigh = 0;  ///< a bit is set where the marker was high at least once
-    quint8 mkrLow = 0;   ///< a bit is set where the marker was low at least once
+    int count = 0;      ///< samples folded in; all else means nothing while it is 0
+    quint8 mkrHigh = 0; ///< a bit is set where the marker was high at least once
+    quint8 mkrLow = 0;  ///< a bit is set where the marker was low at least once
 };
 
 /// The fixed table of columns into which a stretch of samples is folded, so that drawing costs the
