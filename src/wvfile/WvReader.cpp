@@ -31,7 +31,7 @@ WvReader::WvReader(WvFileInfo &info, QIODevice &device, ProgressClock &progress)
     , m_progress(progress)
     , m_source(device)
     , m_fileLimit(m_source.size() / 4)
-    , m_markers(*info.markerStream, m_fileLimit)
+    , m_markers(*info.markerStream, m_fileLimit, progress)
 {
 }
 
@@ -52,6 +52,10 @@ bool WvReader::read()
 
 WvReader::Round WvReader::readTag(QString &name)
 {
+    if (m_progress.shouldStop(0)) {
+        Tracer::fail("Action aborted by user.");
+        return Round::Failed;
+    }
     if (!m_source.skipPast('{')) {
         Tracer::fail("No tag mark found! Probably incorrect format.");
         return Round::Failed;
