@@ -26,7 +26,7 @@ WvReader::WvReader(WvFileInfo &info, QIODevice &device, ProgressClock &progress)
     , m_progress(progress)
     , m_source(device)
     , m_fileLimit(m_source.size() / 4)
-    , m_markers(*info.markerStream, m_fileLimit)
+    , m_markers(*info.markerStream, m_fileLimit, progress)
 {
 }
 
@@ -47,6 +47,10 @@ bool WvReader::read()
 
 WvReader::Round WvReader::readTag(QString &name)
 {
+    if (m_progress.shouldStop(0)) {
+        Tracer::fail("Action aborted by user.");
+        return Round::Failed;
+    }
     if (!m_source.skipPast('{')) {
         Tracer::fail("No tag mark found! Probably incorrect format.");
         return Round::Failed;
