@@ -17,6 +17,24 @@ namespace {
 // A message may hold any number of queries; answers beyond this are not worth their memory.
 constexpr std::size_t MaxResponseSegments = 1000;
 
+// A count of more than nine digits does not fit the definite form and goes into brackets.
+std::string blockHead(std::uint64_t size)
+{
+    constexpr std::size_t MaxDigits = 9;
+    const std::string count = std::to_string(size);
+    std::string head = "#";
+    if (count.size() > MaxDigits)
+        return head.append("(").append(count).append(")");
+    return head.append(std::to_string(count.size())).append(count);
+}
+
+// What the log shows of a block.
+std::string sizeMark(std::optional<std::uint64_t> size)
+{
+    return size ? std::string("<").append(std::to_string(*size)).append(" bytes>")
+                : std::string("<bytes until END>");
+}
+
 } // namespace
 
 Link::Link(Instrument &instrument, Transport transport, std::string name)
@@ -74,13 +92,9 @@ void Link::respond(std::string text)
 
 void Link::respondBlock(std::unique_ptr<DataSource> source, std::uint64_t size)
 {
-    constexpr std::uint64_t MaxDefiniteSize = 999'999'999;
     const Faults &faults = m_instrument.faults();
     beginAnswer();
-    const std::string count = std::to_string(size);
-    m_response.push_back({.text = size > MaxDefiniteSize
-                                      ? "#(" + count + ")"
-                                      : "#" + std::to_string(count.size()) + count});
+    m_response.push_back({.text = blockHead(size)});
     std::uint64_t sent = size;
     if (faults.has("short-block")) {
         const auto missing = static_cast<std::uint64_t>(
@@ -159,8 +173,8 @@ void Link::onUnit(std::string_view text, bool hasBlock)
 void Link::onBlockBegin(std::string_view text, std::optional<std::uint64_t> size)
 {
     beginMessage();
-    Log::conversation(m_name, ">>",
-                      std::string(text) + "#<" + (size ? std::to_string(*size) : "?") + " bytes>");
+    if (Log::isVerbose())
+        Log::conversation(m_name, ">>", std::string(text) + sizeMark(size));
     ProgramUnit unit;
     m_hasTransfer = false;
     m_transferError = NoError;
@@ -219,8 +233,7 @@ void Link::onMessageEnd()
         if (Log::isVerbose()) {
             std::string answer;
             for (const OutputSegment &segment : m_response)
-                answer +=
-                    segment.isBlock ? "<" + std::to_string(segment.size) + " bytes>" : segment.text;
+                answer += segment.isBlock ? sizeMark(segment.size) : segment.text;
             Log::conversation(m_name, "<<", answer);
         }
         const auto delay =

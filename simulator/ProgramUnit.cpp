@@ -132,7 +132,8 @@ int takeNumber(std::string_view &text, Parameter &parameter)
     text.remove_prefix(static_cast<std::size_t>(result.ptr - text.data()));
     skipWhite(text);
     parameter.kind = Parameter::Kind::Number;
-    parameter.suffix = upperCase(takeWord(text));
+    if (!text.empty() && isLetter(text.front()))
+        parameter.suffix = upperCase(takeWord(text));
     return NoError;
 }
 

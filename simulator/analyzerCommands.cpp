@@ -261,7 +261,7 @@ void queryPowerUnit(CommandContext &context)
 void setContinuous(CommandContext &context)
 {
     if (const std::optional<bool> on = context.boolean(0))
-        context.instrument.words[context.command.pattern] = *on ? "1" : "0";
+        context.instrument.words[context.command.pattern] = numberText(*on ? 1 : 0);
 }
 
 void queryContinuous(CommandContext &context)

@@ -54,7 +54,7 @@ class Reader
 public:
     std::string readLine(std::string_view line)
     {
-        line = trimmed(line);
+        line = trimmed(line.substr(0, std::min(line.find(" ;"), line.find("\t;"))));
         if (line.empty() || line.front() == ';' || line.front() == '#')
             return {};
         if (line.front() == '[') {

@@ -43,6 +43,7 @@ public:
     XdrValue(const XdrValue &) = delete;
     XdrValue &operator=(const XdrValue &) = delete;
 
+    /// On failure the value is that of T{}.
     [[nodiscard]] bool decode(std::span<const std::uint8_t> bytes)
     {
         release();
@@ -53,7 +54,11 @@ public:
         auto *begin = const_cast<std::uint8_t *>(bytes.data());
         xdrmem_create(&stream, reinterpret_cast<char *>(begin), static_cast<unsigned>(bytes.size()),
                       XDR_DECODE);
-        return m_code(&stream, &m_value) != 0;
+        if (m_code(&stream, &m_value))
+            return true;
+        // Half a value is worse than none: it may have a length without the bytes.
+        release();
+        return false;
     }
 
     [[nodiscard]] const T &operator*() const { return m_value; }
