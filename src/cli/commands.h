@@ -19,3 +19,4 @@ struct CommandSet
 void addFileCommands(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
+void addInstrumentCommands(CommandSet &commands);

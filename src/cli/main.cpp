@@ -32,6 +32,7 @@ int main(int argc, char **argv)
     addFileCommands(commands);
     addEditCommands(commands);
     addImportCommands(commands);
+    addInstrumentCommands(commands);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError &problem) {

@@ -111,9 +111,12 @@ public:
 
     // Files and folders of the instrument
 
+    /// Names that begin with a point are left out. A folder that isn't there may look empty.
     [[nodiscard]] bool listDirectory(QList<RemoteFileEntry> &entries, const QString &path);
     /// All files below a folder with their whole size in bytes.
     [[nodiscard]] bool listTree(QStringList &files, qint64 &totalSize, const QString &directory);
+    /// All files and folders below a folder; the names are their paths below it, with "/".
+    [[nodiscard]] bool listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory);
     /// True also when there is no such file, or the user was asked and said no.
     [[nodiscard]] bool deleteRemoteFile(const QString &path, bool ask);
     /// Asks for deleteRemoteFile; without one the answer is no.
@@ -147,8 +150,8 @@ private:
     [[nodiscard]] bool configure();
     [[nodiscard]] bool identify();
     [[nodiscard]] bool queryCatalogue(QList<RemoteFileEntry> &entries, const QString &path);
-    [[nodiscard]] bool collectTree(QStringList &files, qint64 &totalSize, const QString &directory,
-                                   int depth);
+    [[nodiscard]] bool collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
+                                   const QString &prefix, int depth);
     [[nodiscard]] bool removeFolders(const QString &parent, const QString &name, int depth);
 
     quint32 m_session = 0; ///< 0 when closed

@@ -24,11 +24,6 @@ bool tooDeep(const QString &directory)
                             .arg(maxDepth));
 }
 
-bool isWalkable(const RemoteFileEntry &entry)
-{
-    return entry.isDirectory() && entry.name != "." && entry.name != "..";
-}
-
 /// A path must name more than a root, and a folder to be removed must not turn into its parent.
 bool isUsable(const QString &path, const char *reason)
 {
@@ -69,25 +64,42 @@ bool VisaDevice::listTree(QStringList &files, qint64 &totalSize, const QString &
 {
     files.clear();
     totalSize = 0;
-    return collectTree(files, totalSize, directory, 0);
-}
-
-bool VisaDevice::collectTree(QStringList &files, qint64 &totalSize, const QString &directory,
-                             int depth)
-{
-    if (depth > maxDepth) {
-        return tooDeep(directory);
-    }
     QList<RemoteFileEntry> entries;
-    if (!listDirectory(entries, directory)) {
+    if (!listTreeEntries(entries, directory)) {
         return false;
     }
     for (const RemoteFileEntry &entry : std::as_const(entries)) {
-        const QString path = directory + '/' + entry.name;
         if (!entry.isDirectory()) {
-            files.append(path);
+            files.append(directory + '/' + entry.name);
             totalSize += entry.size;
-        } else if (isWalkable(entry) && !collectTree(files, totalSize, path, depth + 1)) {
+        }
+    }
+    return true;
+}
+
+bool VisaDevice::listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory)
+{
+    entries.clear();
+    return collectTree(entries, directory, QString(), 0);
+}
+
+bool VisaDevice::collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
+                             const QString &prefix, int depth)
+{
+    const QString path = prefix.isEmpty() ? directory : directory + '/' + prefix;
+    if (depth > maxDepth) {
+        return tooDeep(path);
+    }
+    QList<RemoteFileEntry> level;
+    if (!listDirectory(level, path)) {
+        return false;
+    }
+    for (RemoteFileEntry &entry : level) {
+        if (!prefix.isEmpty()) {
+            entry.name.prepend(prefix + '/');
+        }
+        entries.append(entry);
+        if (entry.isDirectory() && !collectTree(entries, directory, entry.name, depth + 1)) {
             return false;
         }
     }
@@ -173,7 +185,7 @@ bool VisaDevice::removeFolders(const QString &parent, const QString &name, int d
         return false;
     }
     for (const RemoteFileEntry &entry : std::as_const(entries)) {
-        if (!isWalkable(entry)) {
+        if (!entry.isDirectory()) {
             continue;
         }
         Tracer::Trace(Tracer::Information, "Descending into '" +
