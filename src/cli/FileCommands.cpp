@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "RangeArguments.h"
 #include "commands.h"
 
 #include "base/EngineeringNumber.h"
@@ -42,31 +43,6 @@ int runInfo(InfoArguments &arguments)
     const bool printed =
         arguments.console.print(arguments.json ? QJsonDocument(objects).toJson() : text);
     return printed && allScanned ? ExitDone : arguments.console.failed();
-}
-
-void addRange(CLI::App &command, SampleRange &range)
-{
-    addText(command, "file", range.fileName, "Waveform file to read")->required();
-    addInteger(command, "--from", range.from, {"", 0, MaxSamples - 1.0},
-               "First sample, counted from 0");
-    addInteger(command, "--count", range.count, {"", 1, double(MaxSamples)},
-               "Number of samples (default: up to the end)");
-}
-
-/// Whether the range lies in the file, by its tags. A file that can't be scanned passes: reading it
-/// tells the reason.
-bool rangeFits(Console &console, const SampleRange &range, int &exitCode)
-{
-    WvFileSummary summary;
-    if ((!range.from && !range.count) || !QFile::exists(range.fileName) ||
-        !HvFileIO().readWaveformInfo(range.fileName, &summary) || summary.samples < 1) {
-        return true;
-    }
-    const QString problem = rangeProblem(range, summary.samples);
-    if (!problem.isEmpty()) {
-        exitCode = console.wrongUsage(problem);
-    }
-    return problem.isEmpty();
 }
 
 struct DumpArguments

@@ -17,5 +17,6 @@ struct CommandSet
 };
 
 void addFileCommands(CommandSet &commands);
+void addPlotCommand(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);

@@ -3,14 +3,32 @@
 #include "commands.h"
 
 #include <CLI/CLI.hpp>
-#include <QCoreApplication>
+#include <QGuiApplication>
 
+#include <algorithm>
 #include <clocale>
 #include <functional>
+#include <memory>
+#include <string_view>
+
+namespace {
+
+/// Only pictures need fonts and painters; all else starts without the window system's modules, and
+/// nothing needs a display.
+std::unique_ptr<QCoreApplication> makeApplication(int &argc, char **argv)
+{
+    if (std::find(argv, argv + argc, std::string_view("plot")) == argv + argc) {
+        return std::make_unique<QCoreApplication>(argc, argv);
+    }
+    qputenv("QT_QPA_PLATFORM", "offscreen");
+    return std::make_unique<QGuiApplication>(argc, argv);
+}
+
+} // namespace
 
 int main(int argc, char **argv)
 {
-    const QCoreApplication application(argc, argv);
+    const std::unique_ptr<QCoreApplication> application = makeApplication(argc, argv);
     // Numbers are written with a point, whatever the terminal's language.
     std::setlocale(LC_NUMERIC, "C");
     Console console;
@@ -30,6 +48,7 @@ int main(int argc, char **argv)
 
     CommandSet commands{app, console, action};
     addFileCommands(commands);
+    addPlotCommand(commands);
     addEditCommands(commands);
     addImportCommands(commands);
     try {
