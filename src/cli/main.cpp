@@ -24,10 +24,17 @@ std::unique_ptr<QCoreApplication> makeApplication(int &argc, char **argv)
     return std::make_unique<QGuiApplication>(argc, argv);
 }
 
+/// The toolkit's own remarks are no lines of ours; they show with the debug messages.
+void logToolkitMessage(QtMsgType, const QMessageLogContext &, const QString &text)
+{
+    Tracer::Trace(Tracer::Debug, text);
+}
+
 } // namespace
 
 int main(int argc, char **argv)
 {
+    qInstallMessageHandler(logToolkitMessage);
     const std::unique_ptr<QCoreApplication> application = makeApplication(argc, argv);
     // Numbers are written with a point, whatever the terminal's language.
     std::setlocale(LC_NUMERIC, "C");
