@@ -7,9 +7,28 @@
 
 #include <clocale>
 #include <functional>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace {
+
+/// A mistyped command or option leaves another one missing; what was typed is the better hint.
+QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
+{
+    const std::vector<std::string> unknown = app.remaining(true);
+    if (unknown.empty()) {
+        return QString::fromLocal8Bit(problem.what());
+    }
+    return QString("'%1' is no command, option or argument known here; see --help.")
+        .arg(QString::fromLocal8Bit(unknown.front()));
+}
+
+} // namespace
 
 int main(int argc, char **argv)
 {
+    Console::reserveStandardStreams();
     const QCoreApplication application(argc, argv);
     // Numbers are written with a point, whatever the terminal's language.
     std::setlocale(LC_NUMERIC, "C");
@@ -37,9 +56,12 @@ int main(int argc, char **argv)
     } catch (const CLI::ParseError &problem) {
         // The library's own codes tell only help and version, which are no errors, from the rest.
         if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
-            return app.exit(problem);
+            std::ostringstream text;
+            app.exit(problem, text);
+            return console.print(QByteArray::fromStdString(text.str())) ? ExitDone
+                                                                        : console.failed();
         }
-        return console.wrongUsage(QString::fromLocal8Bit(problem.what()));
+        return console.wrongUsage(usageProblem(app, problem));
     }
     console.setQuiet(quiet);
     console.setVerbose(verbose);
