@@ -5,18 +5,22 @@
 #include <QMutex>
 #include <QMutexLocker>
 #include <QRecursiveMutex>
+#include <QThread>
 #include <QTime>
 
 #include <utility>
 
 namespace {
 
+/// Without a taker the waiting lines stay within this many; the oldest go first.
+constexpr qsizetype maxPending = 100'000;
+
 struct LogState
 {
     unsigned mask = Tracer::DefaultMask;
     QMutex queueMutex;
     QList<Tracer::Entry> pending;
-    // Recursive, since a slot of a listener in the logging thread may log itself.
+    // Recursive, since a slot that runs at once in the logging thread may log itself.
     QRecursiveMutex listenerMutex;
     QList<Tracer *> listeners;
 };
@@ -63,15 +67,29 @@ void Tracer::Trace(int level, const QString &text)
         QLocale::system().toString(QTime::currentTime(), QLocale::ShortFormat) + "  " + text;
     {
         const QMutexLocker locker(&state().queueMutex);
-        state().pending.append({line, level});
-    }
-    const QMutexLocker locker(&state().listenerMutex);
-    const QList<Tracer *> listeners = state().listeners;
-    for (Tracer *listener : listeners) {
-        // A slot may have destroyed a listener that the copy still names.
-        if (state().listeners.contains(listener)) {
-            emit listener->TraceDataAvailable();
+        QList<Entry> &pending = state().pending;
+        if (pending.size() >= maxPending) {
+            pending.remove(0, maxPending / 10);
         }
+        pending.append({line, level});
+    }
+    QList<Tracer *> listeners;
+    {
+        const QMutexLocker locker(&state().listenerMutex);
+        listeners = state().listeners;
+    }
+    for (Tracer *listener : listeners) {
+        QMutexLocker locker(&state().listenerMutex);
+        // A slot or another thread may have destroyed a listener that the copy still names.
+        if (!state().listeners.contains(listener)) {
+            continue;
+        }
+        if (listener->thread() == QThread::currentThread()) {
+            // Its slots run right here, and other threads must be able to log meanwhile. Only this
+            // thread can destroy it.
+            locker.unlock();
+        }
+        emit listener->TraceDataAvailable();
     }
 }
 

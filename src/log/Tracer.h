@@ -48,7 +48,8 @@ public:
     /// Replaces the mask; to be called before any worker thread exists.
     static void setMask(unsigned mask);
 
-    /// Returns all waiting lines in order of arrival and forgets them.
+    /// Returns all waiting lines in order of arrival and forgets them. Without a taker not more
+    /// than 100 000 wait: the oldest are dropped first.
     [[nodiscard]] static QList<Entry> takeEntries();
 
 signals:

@@ -14,6 +14,9 @@
 
 namespace {
 
+/// Reads of this size and above go past the read buffer: the copy would cost more than the call.
+constexpr int directReadSize = 256 * 1024;
+
 QIODevice::OpenMode openModeOf(int mode)
 {
     QIODevice::OpenMode openMode = QIODevice::NotOpen;
@@ -186,9 +189,12 @@ int BufferedIO::readBlock(int len, void *buffer)
         if (m_writePosition != -1 && !m_device->seek(m_readPosition)) {
             return -1;
         }
-        const qint64 got = m_device->read(m_readBuffer.get(), BufferSize);
+        // Only while nothing is being written: then it doesn't matter how far reads look ahead.
+        const bool direct = missing >= directReadSize && m_writePosition == -1 && m_writeFill == 0;
+        const qint64 got = direct ? m_device->read(target, missing)
+                                  : m_device->read(m_readBuffer.get(), BufferSize);
         m_readIndex = 0;
-        m_bytesInReadBuffer = static_cast<int>(std::max<qint64>(got, 0));
+        m_bytesInReadBuffer = direct ? 0 : static_cast<int>(std::max<qint64>(got, 0));
         if (got < 0) {
             return -1;
         }
@@ -199,6 +205,10 @@ int BufferedIO::readBlock(int len, void *buffer)
             break;
         }
         m_readPosition += got;
+        if (direct) {
+            target += got;
+            missing -= static_cast<int>(got);
+        }
         if (m_debug) {
             debug(Tracer::Debug, QString::asprintf("readBytes() : R indata=%d, rpointer=%lld",
                                                    m_bytesInReadBuffer, m_readPosition));
@@ -215,6 +225,34 @@ bool BufferedIO::seekForWrite()
     return m_readPosition == -1 || m_device->seek(m_writePosition);
 }
 
+bool BufferedIO::writeToDevice(const char *bytes, int count)
+{
+    if (!seekForWrite()) {
+        return false;
+    }
+    if (m_device->write(bytes, count) != count) {
+        if (m_debug) {
+            debug(Tracer::Error, "writeBytes() : W Incorrect number of bytes written.");
+        }
+        return false;
+    }
+    m_writePosition += count;
+    m_writeFill = 0;
+    if (m_debug) {
+        debug(Tracer::Debug, QString::asprintf("writeBytes() : W newpos=%lld", m_writePosition));
+    }
+    return true;
+}
+
+bool BufferedIO::writeBlock(int len, const void *buffer)
+{
+    if (!isUsable() || !m_writeBuffer || buffer == nullptr || len < 1) {
+        return false;
+    }
+    return (m_writeFill == 0 || writeToDevice(m_writeBuffer.get(), m_writeFill)) &&
+           writeToDevice(static_cast<const char *>(buffer), len);
+}
+
 bool BufferedIO::writeBytes(int len, const void *buffer)
 {
     if (!isUsable() || !m_writeBuffer || buffer == nullptr || len < 0) {
@@ -228,20 +266,8 @@ bool BufferedIO::writeBytes(int len, const void *buffer)
         source += room;
         missing -= room;
         m_writeFill = BufferSize;
-        if (!seekForWrite()) {
+        if (!writeToDevice(m_writeBuffer.get(), BufferSize)) {
             return false;
-        }
-        if (m_device->write(m_writeBuffer.get(), BufferSize) != BufferSize) {
-            if (m_debug) {
-                debug(Tracer::Error, "writeBytes() : W Incorrect number of bytes written.");
-            }
-            return false;
-        }
-        m_writePosition += BufferSize;
-        m_writeFill = 0;
-        if (m_debug) {
-            debug(Tracer::Debug,
-                  QString::asprintf("writeBytes() : W newpos=%lld", m_writePosition));
         }
     }
     std::memcpy(m_writeBuffer.get() + m_writeFill, source, static_cast<size_t>(missing));

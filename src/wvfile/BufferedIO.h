@@ -65,6 +65,11 @@ public:
     /// Appends `len` bytes.
     [[nodiscard]] bool writeBytes(int len, const void *buffer);
 
+    /// Appends `len` bytes as writeBytes does, but hands them to the device at once: for blocks
+    /// large enough that the copy through the buffer costs more than the transfer. Reads may see
+    /// them before a restart.
+    [[nodiscard]] bool writeBlock(int len, const void *buffer);
+
     /// Flushes what was written and goes to the start for reading and writing.
     [[nodiscard]] bool restartAtBegining();
 
@@ -87,6 +92,7 @@ public:
 private:
     [[nodiscard]] bool firstFill();
     [[nodiscard]] bool flush();
+    [[nodiscard]] bool writeToDevice(const char *bytes, int count);
     [[nodiscard]] bool seekForWrite();
     [[nodiscard]] bool isUsable() const;
     void debug(int level, const QString &text) const;

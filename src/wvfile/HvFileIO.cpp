@@ -110,7 +110,7 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
         return Tracer::fail(
             QString("Waveform data for %1 samples is not available.").arg(job.samples));
     }
-    if (!job.markers.isEmpty() && job.markers.size() < job.samples) {
+    if (markerStream == nullptr && !job.markers.isEmpty() && job.markers.size() < job.samples) {
         return Tracer::fail(
             QString("Marker data for %1 samples is not available.").arg(job.samples));
     }
@@ -129,6 +129,9 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
 
 bool HvFileIO::readWaveformInfo(const QString &fileName, WvFileSummary *summary)
 {
+    if (summary == nullptr) {
+        return Tracer::fail("Invalid input parameter.");
+    }
     *summary = WvFileSummary();
     Tracer::Trace(Tracer::Information, "Reading information from file: " + fileName);
     const QFileInfo fileInfo(fileName);

@@ -4,6 +4,7 @@
 #include "BufferedIO.h"
 #include "ByteSource.h"
 
+#include "base/ProgressClock.h"
 #include "log/Tracer.h"
 
 #include <algorithm>
@@ -18,8 +19,9 @@ constexpr qint64 maxPasses = 64;
 
 } // namespace
 
-MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit)
+MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit, ProgressClock &progress)
     : m_stream(stream)
+    , m_progress(progress)
     , m_fileLimit(fileLimit)
     , m_workLeft(maxPasses * std::max<qint64>(fileLimit, BufferedIO::BufferSize / maxPasses))
 {
@@ -29,6 +31,9 @@ MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit)
 bool MarkerTrace::spendWork(qint64 bytes)
 {
     m_workLeft -= bytes;
+    if (m_progress.shouldStop(0)) {
+        return Tracer::fail("Action aborted by user.");
+    }
     return m_workLeft >= 0 ||
            Tracer::fail(
                "Too many MARKER LIST tags: their positions exceed what a file of this size can "
@@ -138,7 +143,7 @@ bool MarkerTrace::walkTo(List &list, qint64 position)
         return false;
     }
     const qint64 rewriteEnd = std::clamp(m_written, list.pos, position);
-    if (!rewriteRun(list.pos, rewriteEnd, list.current, false)) {
+    if (!rewriteRun(list.pos, rewriteEnd, list.current, Run::Walk, position)) {
         return false;
     }
     if (rewriteEnd < position) {
@@ -157,19 +162,15 @@ bool MarkerTrace::takeOldByte(const List &list, qint64 position, quint8 &byte)
         byte = static_cast<quint8>(m_lastByte & ~list.bit);
         return true;
     }
-    if (!m_stream.readBytes(1, &byte)) {
-        logReadFailure(position);
-        return false;
-    }
-    return true;
+    return m_stream.readBytes(1, &byte) || failToRead(position, position);
 }
 
-void MarkerTrace::logReadFailure(qint64 position) const
+bool MarkerTrace::failToRead(qint64 position, qint64 target) const
 {
     Tracer::Trace(Tracer::Error,
                   QString(" Cannot read from marker file at position %1").arg(position));
     Tracer::Trace(Tracer::Error, QString("       Previously written bytes: %1").arg(m_written));
-    Tracer::Trace(Tracer::Error, QString("       Target position: %1").arg(position));
+    return Tracer::fail(QString("       Target position: %1").arg(target));
 }
 
 /// A list that appends with its marker low clears what an earlier list of the same marker left
@@ -183,16 +184,20 @@ void MarkerTrace::noteCutByExtension(const List &list)
 
 bool MarkerTrace::completeList(List &list)
 {
-    Tracer::Trace(Tracer::Debug, QString("Marker section finished with value 0x%1 at pos. %2")
-                                     .arg(list.byte, 0, 16)
-                                     .arg(list.pos));
+    const bool debug = Tracer::isEnabled(Tracer::Debug);
+    if (debug) {
+        Tracer::Trace(Tracer::Debug, QString("Marker section finished with value 0x%1 at pos. %2")
+                                         .arg(list.byte, 0, 16)
+                                         .arg(list.pos));
+    }
     if (list.pos < m_written) {
-        if (list.current != 0) {
+        if (debug && list.current != 0) {
             Tracer::Trace(Tracer::Debug,
                           QString("Completing marker trace up to pos. %1").arg(m_written));
         }
         if (!spendWork(m_written - list.pos) ||
-            !rewriteRun(list.pos, m_written, list.current, list.current == 0)) {
+            !rewriteRun(list.pos, m_written, list.current,
+                        list.current != 0 ? Run::HighCompletion : Run::LowCompletion, m_written)) {
             return false;
         }
     }
@@ -203,26 +208,33 @@ bool MarkerTrace::completeList(List &list)
     return true;
 }
 
-bool MarkerTrace::rewriteRun(qint64 begin, qint64 end, quint8 mask, bool lowCompletion)
+bool MarkerTrace::rewriteRun(qint64 begin, qint64 end, quint8 mask, Run run, qint64 target)
 {
     m_block.resize(static_cast<size_t>(std::min(std::max<qint64>(end - begin, 1), blockSize)));
     for (qint64 pos = begin; pos < end;) {
+        if (m_progress.shouldStop(0)) {
+            return Tracer::fail("Action aborted by user.");
+        }
         const int wanted = static_cast<int>(std::min(end - pos, blockSize));
         const int got = m_stream.readBlock(wanted, m_block.data());
         if (got < wanted) {
             const qint64 position = pos + std::max(got, 0);
-            if (lowCompletion) {
+            switch (run) {
+            case Run::Walk:
+                return failToRead(position, target);
+            case Run::HighCompletion:
+                return Tracer::fail(
+                    QString(" Cannot read from marker file at position %1").arg(position));
+            case Run::LowCompletion:
                 return Tracer::fail(
                     QString("Reading marker stream failed at position %1").arg(position));
             }
-            logReadFailure(position);
-            return false;
         }
         for (int i = 0; i < got; ++i) {
             m_block[static_cast<size_t>(i)] |= mask;
         }
         if (!m_stream.writeBytes(got, m_block.data())) {
-            return Tracer::fail((lowCompletion
+            return Tracer::fail((run == Run::LowCompletion
                                      ? QString("Writing marker stream failed at position %1")
                                      : QString(" Cannot write to marker file at position %1"))
                                     .arg(pos));

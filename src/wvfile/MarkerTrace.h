@@ -11,6 +11,7 @@
 
 class BufferedIO;
 class ByteSource;
+class ProgressClock;
 
 /// Merges the marker lists of a file into a marker stream, one pass a list.
 ///
@@ -21,11 +22,11 @@ class MarkerTrace
 {
 public:
     /// `fileLimit` is the largest position that a list of this file may name. The stream isn't
-    /// owned and has been restarted.
-    MarkerTrace(BufferedIO &stream, qint64 fileLimit);
+    /// owned and has been restarted; `progress` says when to stop, and outlives the trace.
+    MarkerTrace(BufferedIO &stream, qint64 fileLimit, ProgressClock &progress);
 
     /// Reads the list of the tag `name` up to its end and merges it. Logs and returns false on
-    /// malformed lists and on stream failures.
+    /// malformed lists, on stream failures and on a cancel.
     [[nodiscard]] bool mergeList(ByteSource &source, const QString &name);
 
     /// Appends the carried byte until `length` bytes stand; false on a stream failure.
@@ -54,14 +55,18 @@ private:
     [[nodiscard]] bool positionIsValid(const List &list, qint64 position, quint8 state) const;
     [[nodiscard]] bool walkTo(List &list, qint64 position);
     [[nodiscard]] bool completeList(List &list);
-    [[nodiscard]] bool rewriteRun(qint64 begin, qint64 end, quint8 mask, bool lowCompletion);
+    /// What a run over standing bytes belongs to; it decides the words of a failure.
+    enum class Run { Walk, HighCompletion, LowCompletion };
+
+    [[nodiscard]] bool rewriteRun(qint64 begin, qint64 end, quint8 mask, Run run, qint64 target);
     [[nodiscard]] bool appendRun(qint64 begin, qint64 count, quint8 byte);
     [[nodiscard]] bool takeOldByte(const List &list, qint64 position, quint8 &byte);
     [[nodiscard]] bool spendWork(qint64 bytes);
-    void logReadFailure(qint64 position) const;
+    [[nodiscard]] bool failToRead(qint64 position, qint64 target) const;
     void noteCutByExtension(const List &list);
 
     BufferedIO &m_stream;
+    ProgressClock &m_progress;
     qint64 m_fileLimit = 0;
     qint64 m_workLeft = 0; ///< stream bytes that may still be handled
     qint64 m_written = 0;  ///< bytes that the stream holds

@@ -26,7 +26,7 @@ WvReader::WvReader(WvFileInfo &info, QIODevice &device, ProgressClock &progress)
     , m_progress(progress)
     , m_source(device)
     , m_fileLimit(m_source.size() / 4)
-    , m_markers(*info.markerStream, m_fileLimit)
+    , m_markers(*info.markerStream, m_fileLimit, progress)
 {
 }
 
@@ -47,6 +47,10 @@ bool WvReader::read()
 
 WvReader::Round WvReader::readTag(QString &name)
 {
+    if (m_progress.shouldStop(0)) {
+        Tracer::fail("Action aborted by user.");
+        return Round::Failed;
+    }
     if (!m_source.skipPast('{')) {
         Tracer::fail("No tag mark found! Probably incorrect format.");
         return Round::Failed;
@@ -322,17 +326,27 @@ SampleCoding WvReader::coding() const
 
 bool WvReader::readSamples()
 {
+    const bool complete = readBlocks();
+    m_measuring.wait();
+    return complete;
+}
+
+bool WvReader::readBlocks()
+{
     const auto gain = static_cast<float>(std::pow(10.0, m_info.gainDb / 20));
     const qint64 total = m_info.samples;
-    std::vector<std::byte> words(static_cast<size_t>(std::min<qint64>(total, blockSamples)) * 4);
-    std::vector<float> values(words.size() / 2);
+    const auto blockLength = static_cast<size_t>(std::min<qint64>(total, blockSamples));
+    std::vector<std::byte> words(4 * blockLength);
+    m_values[0].resize(2 * blockLength);
+    m_values[1].resize(total > blockSamples ? 2 * blockLength : 0);
+    size_t current = 0;
     for (qint64 done = 0; done < total;) {
         if (m_progress.shouldStop(done, total)) {
             return Tracer::fail("Action aborted by user.");
         }
         const auto wanted = static_cast<size_t>(std::min<qint64>(total - done, blockSamples));
         const size_t got = m_source.read(std::span(words).first(4 * wanted)) / 4;
-        const auto block = std::span(values).first(2 * got);
+        const auto block = std::span(m_values[current]).first(2 * got);
         decodeWords(coding(), std::span(words).first(4 * got), gain, block);
         if (got > 0 && !storeBlock(done, block)) {
             return false;
@@ -341,21 +355,26 @@ bool WvReader::readSamples()
             return Tracer::fail("Cannot read enough data from xWAVEFORM tag!");
         }
         done += static_cast<qint64>(got);
+        current = 1 - current;
     }
     return true;
 }
 
 bool WvReader::storeBlock(qint64 begin, std::span<const float> values)
 {
-    if (!m_info.dataStream->writeBytes(static_cast<int>(values.size_bytes()), values.data())) {
+    // The sum is bound by the latency of its additions, which have to keep their order; beside it
+    // there is time to write.
+    const auto measure = [this, values] { addLevels(values, m_levels); };
+    if (m_info.samples > blockSamples) {
+        m_measuring.start(measure);
+    } else {
+        measure();
+    }
+    if (!m_info.dataStream->writeBlock(static_cast<int>(values.size_bytes()), values.data())) {
         return Tracer::fail("Cannot write to temporary file!");
     }
     // With marker lists shorter than the samples the carried byte goes on from the sample behind
     // the next one: readers of the stream live with its missing last byte.
     const qint64 end = begin + static_cast<qint64>(values.size() / 2);
-    if (!m_markers.pad(end - std::max(begin, m_markers.written() + 1))) {
-        return false;
-    }
-    addLevels(values, m_levels);
-    return true;
+    return m_markers.pad(end - std::max(begin, m_markers.written() + 1));
 }

@@ -6,7 +6,12 @@
 #include "SampleCoding.h"
 #include "WvTypes.h"
 
+#include "base/SideWorker.h"
+
 #include <QString>
+
+#include <array>
+#include <vector>
 
 class ProgressClock;
 class QIODevice;
@@ -39,6 +44,7 @@ private:
     [[nodiscard]] bool takeSampleCount(qint64 count);
     [[nodiscard]] bool finalizeMarkers();
     [[nodiscard]] bool readSamples();
+    [[nodiscard]] bool readBlocks();
     [[nodiscard]] bool storeBlock(qint64 begin, std::span<const float> values);
     [[nodiscard]] SampleCoding coding() const;
 
@@ -47,6 +53,8 @@ private:
     ByteSource m_source;
     qint64 m_fileLimit = 0; ///< largest position that a marker list may name
     MarkerTrace m_markers;
-    LevelSums m_levels;
     bool m_sixteenBit = true;
+    LevelSums m_levels;
+    std::array<std::vector<float>, 2> m_values; ///< one is measured while the other is filled
+    SideWorker m_measuring;                     // last: its work uses the others
 };

@@ -114,12 +114,15 @@ bool WvScanner::processTag(ByteSource &source, const QString &name)
         {"MWV_SEGMENT_LEVEL_MODE", &WvFileSummary::levelMode, false},
         {"MWV_SEGMENT_CLOCK_MODE", &WvFileSummary::clockMode, false},
     };
+    static const QStringList segmentTags{
+        "MWV_SEGMENT_COUNT", "MWV_SEGMENT_FILES",    "MWV_SEGMENT_START",     "MWV_SEGMENT_LENGTH",
+        "MWV_SEGMENT_CLOCK", "MWV_SEGMENT_DURATION", "MWV_SEGMENT_LEVEL_OFFS"};
     static const QStringList otherTags{"TYPE", "CLOCK", "SAMPLES", "LEVEL OFFS"};
     const auto *textTag =
         std::find_if(std::begin(textTags), std::end(textTags),
                      [&](const TextTag &tag) { return name == QLatin1String(tag.name); });
     const bool isText = textTag != std::end(textTags);
-    const bool isSegments = !isText && name.startsWith("MWV_SEGMENT_");
+    const bool isSegments = segmentTags.contains(name);
     if (!isText && !isSegments && !otherTags.contains(name)) {
         return true;
     }

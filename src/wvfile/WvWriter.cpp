@@ -145,14 +145,22 @@ bool WvWriter::writeTags(QIODevice &device)
 
 bool WvWriter::copyTagsStream(QIODevice &device)
 {
-    if (m_streams.tags == nullptr || !m_streams.tags->restartAtBegining()) {
+    if (m_streams.tags == nullptr) {
         return true;
+    }
+    // Not fatal: the samples are worth more than tags that nobody here knows.
+    const auto warn = [] {
+        Tracer::Trace(Tracer::Warning, "Cannot read the unknown tags. They are not in the file.");
+        return true;
+    };
+    if (!m_streams.tags->restartAtBegining()) {
+        return warn();
     }
     QByteArray block(blockSamples, Qt::Uninitialized);
     for (;;) {
         const int got = m_streams.tags->readBlock(static_cast<int>(block.size()), block.data());
         if (got <= 0) {
-            return true;
+            return got == 0 || warn();
         }
         if (!put(device, block.left(got))) {
             return false;

@@ -1,0 +1,162 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Options.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <map>
+#include <set>
+#include <utility>
+
+namespace simulator {
+namespace {
+
+std::string_view trimmed(std::string_view text)
+{
+    constexpr std::string_view White = " \t\r";
+    const std::size_t begin = text.find_first_not_of(White);
+    if (begin == std::string_view::npos)
+        return {};
+    return text.substr(begin, text.find_last_not_of(White) - begin + 1);
+}
+
+std::string atLine(unsigned line, const std::string &text)
+{
+    return "line " + std::to_string(line) + ": " + text;
+}
+
+// Several faults stand in one value with commas between; quotes keep a comma within one of them.
+void addFaults(const ConfigEntry &entry, std::vector<std::string> &faults)
+{
+    if (entry.isQuoted) {
+        faults.push_back(entry.value);
+        return;
+    }
+    std::string_view rest = entry.value;
+    while (!rest.empty()) {
+        const std::size_t length = std::min(rest.find(','), rest.size());
+        const std::string_view fault = trimmed(rest.substr(0, length));
+        if (!fault.empty())
+            faults.emplace_back(fault);
+        rest.remove_prefix(std::min(length + 1, rest.size()));
+    }
+}
+
+bool setValue(RawInstrument &raw, const ConfigEntry &entry, std::string &error)
+{
+    const std::map<std::string_view, std::optional<std::string> *> keys{
+        {"model", &raw.model},     {"serial", &raw.serial}, {"firmware", &raw.firmware},
+        {"options", &raw.options}, {"root", &raw.root},     {"address", &raw.address},
+        {"gateway", &raw.gateway}, {"gpib", &raw.gpib},     {"seed", &raw.seed},
+    };
+    if (entry.key == "fault") {
+        addFaults(entry, raw.faults);
+        return true;
+    }
+    const auto found = keys.find(entry.key);
+    if (found == keys.end()) {
+        std::string names = "fault";
+        for (const auto &[name, target] : keys)
+            names.append(", ").append(name);
+        error = atLine(entry.line, "unknown key '" + entry.key + "'; there are " + names);
+        return false;
+    }
+    if (found->second->has_value()) {
+        error = atLine(entry.line, "the key '" + entry.key + "' stands twice in its group");
+        return false;
+    }
+    *found->second = entry.value;
+    return true;
+}
+
+// Two instruments at one place could not be told apart.
+bool arePlacesDistinct(std::span<const InstrumentPlace> places, std::string &error)
+{
+    std::set<std::string> taken;
+    for (const InstrumentPlace &place : places) {
+        const std::string name = place.gateway ? "gateway " + std::to_string(*place.gateway) +
+                                                     ", gpib " + std::to_string(place.gpib)
+                                               : "address " + place.address;
+        if (!taken.insert(name).second) {
+            error = "two instruments have the " + name;
+            return false;
+        }
+    }
+    return true;
+}
+
+} // namespace
+
+std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text, std::string &error)
+{
+    std::vector<ConfigEntry> entries;
+    std::string group;
+    unsigned number = 0;
+    while (!text.empty()) {
+        const std::size_t length = std::min(text.find('\n'), text.size());
+        const std::string_view line = trimmed(text.substr(0, length));
+        text.remove_prefix(std::min(length + 1, text.size()));
+        ++number;
+        if (line.empty() || line.front() == ';' || line.front() == '#')
+            continue;
+        if (line.front() == '[') {
+            if (line.back() != ']') {
+                error = atLine(number, "']' is missing behind the name of the group");
+                return std::nullopt;
+            }
+            group = trimmed(line.substr(1, line.size() - 2));
+            entries.push_back({group, {}, {}, number, false});
+            continue;
+        }
+        const std::size_t equals = line.find('=');
+        if (equals == std::string_view::npos || trimmed(line.substr(0, equals)).empty()) {
+            error = atLine(number, "neither '[group]' nor 'key = value'");
+            return std::nullopt;
+        }
+        if (entries.empty()) {
+            error = atLine(number, "a group has to stand before the first key");
+            return std::nullopt;
+        }
+        std::string_view value = trimmed(line.substr(equals + 1));
+        const bool quoted = value.size() >= 2 && value.front() == '"' && value.back() == '"';
+        if (quoted)
+            value = value.substr(1, value.size() - 2);
+        entries.push_back({group, std::string(trimmed(line.substr(0, equals))), std::string(value),
+                           number, quoted});
+    }
+    return entries;
+}
+
+std::optional<std::vector<InstrumentPlace>>
+instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, std::string &error)
+{
+    std::vector<RawInstrument> raws;
+    for (const ConfigEntry &entry : entries) {
+        if (entry.key.empty())
+            raws.push_back({.label = "[" + entry.group + "] "});
+        else if (!setValue(raws.back(), entry, error))
+            return std::nullopt;
+    }
+    if (raws.empty()) {
+        error = "it holds no group, so no instrument";
+        return std::nullopt;
+    }
+    std::vector<InstrumentPlace> places;
+    for (RawInstrument &raw : raws) {
+        if (!raw.address && !raw.gateway) {
+            error = raw.label + "needs either an address, or a gateway and gpib";
+            return std::nullopt;
+        }
+        // A name that stands in a file is meant from that file's place on.
+        if (raw.root && !raw.root->empty())
+            raw.root = (std::filesystem::path(folder) / *raw.root).string();
+        std::optional<InstrumentPlace> place = checkInstrument(raw, error);
+        if (!place)
+            return std::nullopt;
+        places.push_back(std::move(*place));
+    }
+    if (!arePlacesDistinct(places, error))
+        return std::nullopt;
+    return places;
+}
+
+} // namespace simulator

@@ -1,0 +1,261 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Options.h"
+
+#include <arpa/inet.h>
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <utility>
+
+namespace simulator {
+namespace {
+
+constexpr std::string_view DefaultModel = "TGX-870";
+constexpr std::string_view DefaultSerial = "100001";
+constexpr std::string_view DefaultFirmware = "1.0";
+constexpr std::string_view DefaultAddress = "127.0.0.2";
+constexpr std::uint64_t MaxPort = 65535;
+constexpr std::uint64_t FirstFreePort = 1025;
+constexpr std::uint64_t MaxGpib = 30;
+constexpr std::size_t MaxConfigSize = 1024 * 1024;
+
+std::optional<std::uint64_t> wholeNumber(std::string_view text)
+{
+    std::uint64_t value = 0;
+    const auto result = std::from_chars(text.data(), text.data() + text.size(), value);
+    if (text.empty() || result.ec != std::errc() || result.ptr != text.data() + text.size())
+        return std::nullopt;
+    return value;
+}
+
+// The simulator writes files for whoever asks, so it answers on this machine alone.
+bool isLoopback(const std::string &address)
+{
+    constexpr std::uint32_t LoopbackNet = 127;
+    in_addr value{};
+    return ::inet_pton(AF_INET, address.c_str(), &value) == 1 &&
+           ntohl(value.s_addr) >> 24U == LoopbackNet;
+}
+
+// A field of *IDN?, whose separators must not stand in it.
+bool isIdentityField(std::string_view text)
+{
+    return !text.empty() && std::all_of(text.begin(), text.end(), [](char byte) {
+        return byte > ' ' && byte != ',' && byte != '/' && byte != '\x7F';
+    });
+}
+
+bool isPrintable(std::string_view text)
+{
+    return std::none_of(text.begin(), text.end(), [](char byte) {
+        return static_cast<unsigned char>(byte) < ' ' || byte == '\x7F';
+    });
+}
+
+std::optional<std::string> readFile(const std::string &name)
+{
+    std::ifstream file(name, std::ios::binary);
+    std::string text(MaxConfigSize + 1, '\0');
+    file.read(text.data(), static_cast<std::streamsize>(text.size()));
+    text.resize(static_cast<std::size_t>(file.gcount()));
+    if (file.bad() || (text.empty() && !file.eof()) || text.size() > MaxConfigSize)
+        return std::nullopt;
+    return text;
+}
+
+bool loadConfig(const std::string &name, Options &options, std::string &error)
+{
+    const std::optional<std::string> text = readFile(name);
+    if (!text) {
+        error = "cannot read the configuration file '" + name + "'";
+        return false;
+    }
+    const auto fail = [&] {
+        error = name + ": " + error;
+        return false;
+    };
+    const auto entries = parseConfig(*text, error);
+    if (!entries)
+        return fail();
+    const std::string folder = std::filesystem::path(name).parent_path().string();
+    auto instruments = instrumentsOf(*entries, folder, error);
+    if (!instruments)
+        return fail();
+    options.instruments = std::move(*instruments);
+    return true;
+}
+
+} // namespace
+
+std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::string &error)
+{
+    InstrumentPlace place;
+    InstrumentSetup &setup = place.instrument;
+    const auto refuse = [&](std::string_view name, const std::string &value,
+                            std::string_view allowed) {
+        error = raw.label + std::string(name) + " is '" + value + "'; " + std::string(allowed);
+        return std::nullopt;
+    };
+
+    const std::string model = raw.model.value_or(std::string(DefaultModel));
+    setup.model = findModel(model);
+    if (setup.model == nullptr)
+        return refuse("model", model, "there are " + modelNames());
+    setup.serial = raw.serial.value_or(std::string(DefaultSerial));
+    if (!isIdentityField(setup.serial))
+        return refuse("serial", setup.serial, "it needs characters other than blank, ',' and '/'");
+    setup.firmware = raw.firmware.value_or(std::string(DefaultFirmware));
+    if (!isIdentityField(setup.firmware))
+        return refuse("firmware", setup.firmware,
+                      "it needs characters other than blank, ',' and '/'");
+    setup.options = raw.options.value_or(std::string(setup.model->defaultOptions));
+    if (!isPrintable(setup.options))
+        return refuse("options", setup.options, "control characters are not allowed");
+    setup.root = raw.root.value_or(std::string());
+    if (raw.root && raw.root->empty())
+        return refuse("root", *raw.root, "it needs the name of a folder");
+    if (raw.seed) {
+        const auto seed = wholeNumber(*raw.seed);
+        if (!seed)
+            return refuse("seed", *raw.seed, "a whole number from 0 on is needed");
+        setup.seed = *seed;
+    }
+    for (const std::string &fault : raw.faults) {
+        if (!setup.faults.set(fault, error)) {
+            error = raw.label + error;
+            return std::nullopt;
+        }
+    }
+
+    if (!raw.gateway) {
+        place.address = raw.address.value_or(std::string(DefaultAddress));
+        if (!isLoopback(place.address))
+            return refuse("address", place.address, "it has to be one of 127.0.0.0/8");
+        if (raw.gpib)
+            return refuse("gpib", *raw.gpib, "it goes with a gateway only");
+        return place;
+    }
+    if (raw.address)
+        return refuse("address", *raw.address, "it does not go with a gateway");
+    const auto port = wholeNumber(*raw.gateway);
+    if (!port || *port > MaxPort || (*port != 0 && *port < FirstFreePort))
+        return refuse("gateway", *raw.gateway,
+                      "a port from 1025 to 65535, or 0 for any free one, is needed");
+    const auto gpib = wholeNumber(raw.gpib.value_or(std::string()));
+    if (!gpib || *gpib > MaxGpib)
+        return refuse("gpib", raw.gpib.value_or(std::string()),
+                      "a gateway's instrument needs an address from 0 to 30");
+    place.gateway = static_cast<std::uint16_t>(*port);
+    place.gpib = static_cast<unsigned>(*gpib);
+    return place;
+}
+
+std::optional<Options> parseOptions(std::span<const std::string_view> arguments, std::string &error)
+{
+    Options options;
+    RawInstrument raw{.label = "--"};
+    std::optional<std::string> config;
+    bool single = false;
+
+    const std::array<std::pair<std::string_view, std::optional<std::string> *>, 8> switches{{
+        {"--model", &raw.model},
+        {"--serial", &raw.serial},
+        {"--firmware", &raw.firmware},
+        {"--options", &raw.options},
+        {"--address", &raw.address},
+        {"--root", &raw.root},
+        {"--seed", &raw.seed},
+        {"--config", &config},
+    }};
+    for (std::size_t i = 0; i < arguments.size(); ++i) {
+        const std::string_view argument = arguments[i];
+        if (argument == "--help" || argument == "-h" || argument == "--version") {
+            options.action =
+                argument == "--version" ? Options::Action::Version : Options::Action::Help;
+            return options;
+        }
+        if (argument == "--verbose") {
+            options.verbose = true;
+            continue;
+        }
+        const std::size_t equals = std::min(argument.find('='), argument.size());
+        const std::string_view name = argument.substr(0, equals);
+        const auto *known = std::find_if(switches.begin(), switches.end(),
+                                         [name](const auto &entry) { return entry.first == name; });
+        if (known == switches.end() && name != "--fault") {
+            error = "unknown argument '" + std::string(argument) + "'; see --help";
+            return std::nullopt;
+        }
+        std::string value;
+        if (equals < argument.size()) {
+            value = argument.substr(equals + 1);
+        } else if (i + 1 < arguments.size()) {
+            value = arguments[++i];
+        } else {
+            error = std::string(name) + " needs a value";
+            return std::nullopt;
+        }
+        single = single || name != "--config";
+        if (known == switches.end())
+            raw.faults.push_back(std::move(value));
+        else
+            *known->second = std::move(value);
+    }
+
+    if (config) {
+        if (single) {
+            error = "--config takes no switches of a single instrument beside it";
+            return std::nullopt;
+        }
+        if (!loadConfig(*config, options, error))
+            return std::nullopt;
+        return options;
+    }
+    std::optional<InstrumentPlace> place = checkInstrument(raw, error);
+    if (!place)
+        return std::nullopt;
+    options.instruments.push_back(std::move(*place));
+    return options;
+}
+
+std::string helpText()
+{
+    std::string text =
+        "Usage: corvane-simulator [OPTIONS]\n"
+        "Answers like a bench instrument, on this machine alone.\n"
+        "\n"
+        "  --model NAME        instrument model, default TGX-870\n"
+        "  --serial TEXT       serial number, default 100001\n"
+        "  --firmware TEXT     firmware version, default 1.0\n"
+        "  --options TEXT      answer to *OPT?, default that of the model\n"
+        "  --address ADDRESS   own address of 127.0.0.0/8, default 127.0.0.2;\n"
+        "                      the ports 111 and 5025 are opened there\n"
+        "  --root DIR          folder that stands for the top of the file system,\n"
+        "                      default a temporary one\n"
+        "  --seed N            seed of the noise that an analyzer records, default 1\n"
+        "  --fault NAME[=VALUE]  a fault to show; may be repeated\n"
+        "  --config FILE       several instruments, one group of an INI file each, with the keys\n"
+        "                      model, serial, firmware, options, root, seed, fault, and either\n"
+        "                      address, or gateway (a port above 1024) and gpib (0 to 30)\n"
+        "  --verbose           logs each command and answer\n"
+        "  --help, --version\n"
+        "\n"
+        "Models: ";
+    std::size_t column = std::string_view("Models: ").size();
+    constexpr std::size_t Width = 80;
+    for (const ModelInfo &model : modelTable()) {
+        if (column + model.name.size() + 1 > Width) {
+            text += "\n        ";
+            column = std::string_view("Models: ").size();
+        }
+        text.append(model.name).append(" ");
+        column += model.name.size() + 1;
+    }
+    return text + "\n\nFaults:\n" + Faults::help();
+}
+
+} // namespace simulator

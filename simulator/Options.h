@@ -1,0 +1,81 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "Instrument.h"
+
+#include <cstdint>
+#include <optional>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace simulator {
+
+/// One instrument and where it can be reached.
+struct InstrumentPlace
+{
+    InstrumentSetup instrument;
+    std::string address;                  ///< of its own; empty behind a gateway
+    std::optional<std::uint16_t> gateway; ///< port; 0 lets the system choose
+    unsigned gpib = 0;                    ///< address behind the gateway, 0 to 30
+};
+
+/// What the program was asked for.
+struct Options
+{
+    enum class Action { Run, Help, Version };
+
+    Action action = Action::Run;
+    bool verbose = false;
+    std::vector<InstrumentPlace> instruments;
+};
+
+/// Reads the command line without the program's name, and the configuration file it names.
+/// Nothing, with the reason in `error`, when there is anything wrong with it.
+[[nodiscard]] std::optional<Options> parseOptions(std::span<const std::string_view> arguments,
+                                                  std::string &error);
+
+/// One line of an INI file, as group, key and value.
+struct ConfigEntry
+{
+    std::string group;
+    std::string key; ///< empty: the group's heading
+    std::string value;
+    unsigned line = 0;
+    bool isQuoted = false;
+};
+
+/// Reads the lines of an INI file. Nothing, with the reason in `error`, when one is malformed.
+[[nodiscard]] std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text,
+                                                                  std::string &error);
+
+/// The instruments of a configuration; a relative root begins at `folder`.
+[[nodiscard]] std::optional<std::vector<InstrumentPlace>>
+instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, std::string &error);
+
+/// The values of one instrument as they were written, to be checked together.
+struct RawInstrument
+{
+    std::string label; ///< names it in messages
+    std::optional<std::string> model{};
+    std::optional<std::string> serial{};
+    std::optional<std::string> firmware{};
+    std::optional<std::string> options{};
+    std::optional<std::string> root{};
+    std::optional<std::string> address{};
+    std::optional<std::string> gateway{};
+    std::optional<std::string> gpib{};
+    std::optional<std::string> seed{};
+    std::vector<std::string> faults{};
+};
+
+/// Checks the values and fills in what is missing. Nothing, with the reason in `error`, when one of
+/// them is not allowed.
+[[nodiscard]] std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw,
+                                                             std::string &error);
+
+/// The text of --help.
+[[nodiscard]] std::string helpText();
+
+} // namespace simulator

@@ -1,0 +1,66 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "DlgInfo.h"
+
+#include "jobs/InfoReport.h"
+#include "ui_DlgInfo.h"
+#include "wvfile/HvFileIO.h"
+
+#include <QFileInfo>
+#include <QPalette>
+#include <QPushButton>
+
+namespace {
+
+/// The colours of the striped table. All colours of the report pass here.
+InfoColors stripeColors(const QPalette &palette)
+{
+    const auto name = [&](QPalette::ColorRole role) { return palette.color(role).name(); };
+    return {name(QPalette::Text), name(QPalette::Base), name(QPalette::Text),
+            name(QPalette::AlternateBase)};
+}
+
+} // namespace
+
+DlgInfo::DlgInfo(QWidget *parent)
+    : DlgBase(parent)
+    , m_ui(std::make_unique<Ui::DlgInfo>())
+{
+    m_ui->setupUi(this);
+    connect(m_ui->cb_close, &QPushButton::clicked, this, &DlgInfo::reject);
+    connect(this, &DlgInfo::rejected, this, &DlgInfo::slot_dialog_rejected);
+}
+
+DlgInfo::~DlgInfo() = default;
+
+bool DlgInfo::startModule(const QString &path)
+{
+    HvFileIO file;
+    WvFileSummary summary;
+    if (!file.readWaveformInfo(path, &summary)) {
+        return false;
+    }
+    m_ui->te_Info->setHtml(
+        infoHtml(summary, QFileInfo(path).absolutePath(), stripeColors(m_ui->te_Info->palette())));
+    return true;
+}
+
+QString DlgInfo::moduleName() const
+{
+    return "Waveform Info";
+}
+
+QString DlgInfo::menuPath() const
+{
+    return "/Analyze/File Info";
+}
+
+bool DlgInfo::extensionAllowed(const QString &upperCaseExtension) const
+{
+    return upperCaseExtension == "WV";
+}
+
+void DlgInfo::slot_dialog_rejected()
+{
+    // A report of many segments is large, and nobody sees it any more.
+    m_ui->te_Info->clear();
+}

@@ -1,0 +1,148 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "LocalPaneFiles.h"
+
+#include "LocalTreeRemover.h"
+#include "entryname.h"
+#include "log/Tracer.h"
+#include "toolframe/QtProgressDialog.h"
+
+#include <QDir>
+#include <QFile>
+#include <QFileInfo>
+#include <QFileSystemModel>
+
+#include <cerrno>
+#include <cstring>
+
+namespace {
+
+/// The reason of the last failed system call; 0 gives no text.
+QString systemReason(int number)
+{
+    return number == 0 ? QString() : QString::fromLocal8Bit(std::strerror(number));
+}
+
+void logStep(const QString &what, const QString &path)
+{
+    Tracer::Trace(Tracer::Information, QString("%1 '%2'...").arg(what, entryName(path)));
+}
+
+} // namespace
+
+LocalPaneFiles::LocalPaneFiles(QFileSystemModel *model)
+    : m_model(model)
+{
+    connect(model, &QFileSystemModel::directoryLoaded, this, &PaneFiles::folderLoaded);
+}
+
+QString LocalPaneFiles::settingsName() const
+{
+    return "local";
+}
+
+QList<int> LocalPaneFiles::defaultColumnWidths() const
+{
+    return {220, 60, 60, 100};
+}
+
+QString LocalPaneFiles::pathOf(const QModelIndex &index) const
+{
+    if (!index.isValid()) {
+        return {};
+    }
+    const QString path = m_model->filePath(index);
+    return m_model->isDir(index) && !isFolderPath(path) ? path + '/' : path;
+}
+
+QModelIndex LocalPaneFiles::indexOf(const QString &path) const
+{
+    return path.isEmpty() ? QModelIndex() : m_model->index(withoutSlash(path));
+}
+
+void LocalPaneFiles::setNameFilters(const QStringList &wildcards)
+{
+    m_model->setNameFilters(wildcards);
+    m_model->setNameFilterDisables(false);
+}
+
+bool LocalPaneFiles::exists(const QString &path) const
+{
+    const QFileInfo info(withoutSlash(path));
+    return info.exists() || info.isSymLink();
+}
+
+bool LocalPaneFiles::isRoot(const QString &path) const
+{
+    return QDir(path).isRoot();
+}
+
+bool LocalPaneFiles::isRealFolder(const QString &path) const
+{
+    const QFileInfo info(withoutSlash(path));
+    return info.isDir() && !info.isSymLink();
+}
+
+bool LocalPaneFiles::isEmptyFolder(const QString &path) const
+{
+    return QDir(path).isEmpty(LocalTreeRemover::Everything);
+}
+
+QString LocalPaneFiles::removeTreeQuestion(const QString &path) const
+{
+    return QString("The selected folder %1 is not empty.\n"
+                   "Do you really want to delete this folder and all its contents?")
+        .arg(withoutSlash(path));
+}
+
+bool LocalPaneFiles::createFolder(const QString &parent, const QString &name)
+{
+    logStep("Creating folder", name);
+    errno = 0;
+    return QDir(parent).mkdir(name) ||
+           fail("Creation of the new folder failed.", parent + name, systemReason(errno));
+}
+
+bool LocalPaneFiles::rename(const QString &path, const QString &newName)
+{
+    const bool folder = isFolderPath(path);
+    logStep(folder ? "Renaming folder" : "Renaming file", path);
+    const QString words = folder ? "Renaming folder failed." : "Renaming file failed.";
+    const QString target = parentFolder(path) + newName;
+    if (exists(target)) {
+        return fail(words, target, "The name is taken.");
+    }
+    QFile file(withoutSlash(path));
+    return file.rename(target) || fail(words, path, file.errorString());
+}
+
+bool LocalPaneFiles::removeFile(const QString &path)
+{
+    logStep("Deleting file", path);
+    QFile file(withoutSlash(path));
+    return file.remove() || fail("Deleting file failed.", path, file.errorString());
+}
+
+bool LocalPaneFiles::removeEmptyFolder(const QString &path)
+{
+    logStep("Deleting folder", path);
+    errno = 0;
+    return QDir().rmdir(withoutSlash(path)) ||
+           fail("Deleting folder failed.", path, systemReason(errno));
+}
+
+bool LocalPaneFiles::removeTree(const QString &path, QWidget *parent)
+{
+    logStep("Deleting folder structure", path);
+    QtProgressDialog progress("Deleting Files...", parent);
+    LocalTreeRemover remover;
+    connect(&remover, &LocalTreeRemover::ProgressUpdate, &progress, &QtProgressDialog::setValue);
+    connect(&progress, &QtProgressDialog::canceled, &remover, &LocalTreeRemover::cancel);
+    return remover.remove(withoutSlash(path)) ||
+           fail("Deleting folder structure failed.", remover.failedPath(), remover.reason());
+}
+
+bool LocalPaneFiles::fail(const QString &words, const QString &path, const QString &reason)
+{
+    emit failed(QString("%1 %2: %3").arg(words, withoutSlash(path), reason).simplified());
+    return Tracer::fail(words);
+}

@@ -1,0 +1,337 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "MainWindow.h"
+
+#include "AboutBox.h"
+#include "QCustomTreeView.h"
+#include "mnemonics.h"
+#include "processage.h"
+#include "settingsstores.h"
+#include "toolframe/pictures.h"
+#include "toolframe/windowplace.h"
+#include "ui_MainWindow.h"
+
+#include <QCloseEvent>
+#include <QFileSystemModel>
+#include <QMessageBox>
+#include <QShortcut>
+#include <QSignalBlocker>
+#include <QTimer>
+
+#include <algorithm>
+
+namespace {
+
+constexpr int MaxLogLines = 256;
+constexpr int MaxHistory = 11;
+
+QIcon levelIcon(int level)
+{
+    if (level & (Tracer::Error | Tracer::Severe)) {
+        return QIcon(":/icons16/redflag.png");
+    }
+    if (level & Tracer::Warning) {
+        return QIcon(":/icons16/yellowled.png");
+    }
+    return QIcon(level & Tracer::Debug ? ":/icons16/debug.png" : ":/icons16/bulb.png");
+}
+
+/// Sizes of a splitter lie under the prefix followed by 0, 1, 2, ...; fewer than two leave the
+/// layout as it was built.
+void readSplitter(const QSettings &settings, const QString &prefix, QSplitter &splitter)
+{
+    QList<int> sizes;
+    for (;;) {
+        bool isNumber = false;
+        const int size =
+            settings.value(prefix + QString::number(sizes.size()), -1).toInt(&isNumber);
+        if (!isNumber || size < 1) {
+            break;
+        }
+        sizes.append(size);
+    }
+    if (sizes.size() >= 2) {
+        splitter.setSizes(sizes);
+    }
+}
+
+void writeSplitter(QSettings &settings, const QString &prefix, const QSplitter &splitter)
+{
+    const QList<int> sizes = splitter.sizes();
+    for (qsizetype i = 0; i < sizes.size(); ++i) {
+        settings.setValue(prefix + QString::number(i), sizes.at(i));
+    }
+}
+
+} // namespace
+
+MainWindow::MainWindow()
+    : m_ui(std::make_unique<Ui::AppMainWindow>())
+{
+    registerPictures();
+    setAttribute(Qt::WA_DeleteOnClose);
+    m_ui->setupUi(this);
+    m_panes[0] = {m_ui->cb_dev_1, m_ui->cb_flt_1,  m_ui->tb_refresh_1, m_ui->l_win1,
+                  m_ui->cb_entry1, m_ui->tv_dev_1, nullptr};
+    m_panes[1] = {m_ui->cb_dev_2, m_ui->cb_flt_2,  m_ui->tb_refresh_2, m_ui->l_win2,
+                  m_ui->cb_entry2, m_ui->tv_dev_2, nullptr};
+    buildMenus();
+    for (Pane &pane : m_panes) {
+        pane.tree->setModules(&m_modules);
+    }
+
+    Tracer::setMask(QCoreApplication::arguments().contains("--debug") ? Tracer::DebugMask
+                                                                      : Tracer::DefaultMask);
+    connect(&m_tracer, &Tracer::TraceDataAvailable, this, &MainWindow::TraceDataAvailable);
+
+    for (Pane &pane : m_panes) {
+        pane.filter->addItems({"*.*", "*.wv"});
+        connectPane(pane);
+        pane.localModel = std::make_unique<QFileSystemModel>();
+        pane.localModel->setIconProvider(&m_fileIcons);
+        pane.localModel->setRootPath({});
+        pane.localModel->setFilter(QDir::Files | QDir::Drives | QDir::AllDirs | QDir::NoSymLinks |
+                                   QDir::NoDotAndDotDot);
+    }
+    Tracer::Trace(Tracer::Debug,
+                  "System root path is " + m_panes[0].localModel->rootDirectory().path());
+
+    Tracer::Trace(Tracer::Information, "Loading program settings...");
+    loadSettings();
+    for (Pane &pane : m_panes) {
+        selectDevice(pane);
+    }
+    for (Pane &pane : m_panes) {
+        connect(pane.filter, &QComboBox::currentTextChanged, pane.tree,
+                &QCustomTreeView::filterChanged);
+        connect(pane.device, &QComboBox::currentIndexChanged, this,
+                &MainWindow::newDeviceSelection);
+    }
+    m_panes[0].tree->setFocus();
+    markActive(m_panes[0]);
+    Tracer::Trace(Tracer::Information, "Startup complete");
+}
+
+MainWindow::~MainWindow()
+{
+    for (Pane &pane : m_panes) {
+        pane.tree->setModel(nullptr);
+        pane.localModel.reset();
+    }
+}
+
+void MainWindow::buildMenus()
+{
+    QMenu *file = menuBar()->addMenu("File");
+    m_modules.buildMenu(menuBar());
+    if (!file->isEmpty()) {
+        file->addSeparator();
+    }
+    file->addAction(m_ui->actionExit);
+    menuBar()->addMenu("Help")->addAction(m_ui->actionAbout);
+
+    assignMnemonics(menuBar()->actions());
+    const QList<QAction *> menus = menuBar()->actions();
+    for (const QAction *menu : menus) {
+        assignMnemonics(menu->menu()->actions());
+    }
+    connect(m_ui->actionExit, &QAction::triggered, this, &MainWindow::close);
+    connect(m_ui->actionAbout, &QAction::triggered, this, &MainWindow::menu_about);
+    auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
+    connect(refreshKey, &QShortcut::activated, this,
+            [this] { refresh(paneOf(m_activePane->tree)); });
+}
+
+void MainWindow::connectPane(Pane &pane)
+{
+    connect(pane.refresh, &QToolButton::clicked, this, &MainWindow::slot_refresh);
+    connect(pane.tree, &QCustomTreeView::errMsg, this, &MainWindow::errMsg);
+    connect(pane.tree, &QCustomTreeView::infoTextAvailable, this,
+            &MainWindow::slot_infoTextAvailable);
+    connect(pane.tree, &QCustomTreeView::localDefaultFolderSet, this,
+            &MainWindow::slot_localDefaultFolderSet);
+    connect(pane.tree, &QCustomTreeView::itemSelected, this, &MainWindow::slot_itemSelected);
+    connect(pane.tree, &QCustomTreeView::otherPaneRequested, this,
+            [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
+    connect(pane.history, &QComboBox::currentTextChanged, this, &MainWindow::slot_set_item);
+}
+
+void MainWindow::TraceDataAvailable()
+{
+    const QList<Tracer::Entry> entries = Tracer::takeEntries();
+    if (entries.isEmpty()) {
+        return;
+    }
+    for (const auto &[text, level] : entries) {
+        if (text.isEmpty()) {
+            continue;
+        }
+        while (m_ui->lw_log->count() >= MaxLogLines) {
+            delete m_ui->lw_log->takeItem(0);
+        }
+        new QListWidgetItem(levelIcon(level), text, m_ui->lw_log);
+    }
+    m_ui->lw_log->scrollToBottom();
+}
+
+void MainWindow::errMsg(const QString &sTxt)
+{
+    statusBar()->showMessage(sTxt);
+}
+
+void MainWindow::menu_about()
+{
+    AboutBox(this).exec();
+}
+
+void MainWindow::slot_infoTextAvailable(const QString &sInfoText)
+{
+    QMessageBox box(QMessageBox::Information, windowTitle(), sInfoText, QMessageBox::Ok, this);
+    box.setTextFormat(Qt::PlainText);
+    box.exec();
+}
+
+void MainWindow::slot_localDefaultFolderSet(const QString &sDefaultFolder)
+{
+    m_locPath = sDefaultFolder;
+    Tracer::Trace(Tracer::Information,
+                  QString("Set local default folder '%1'").arg(sDefaultFolder));
+}
+
+void MainWindow::slot_refresh()
+{
+    refresh(paneOf(sender()));
+}
+
+void MainWindow::refresh(Pane &pane)
+{
+    pane.tree->updateAndExpandTree(m_locPath);
+}
+
+void MainWindow::newDeviceSelection(int /*iIndex*/)
+{
+    selectDevice(paneOf(sender()));
+}
+
+void MainWindow::selectDevice(Pane &pane)
+{
+    pane.tree->clearSelection();
+    pane.tree->setModel(pane.localModel.get());
+    pane.tree->updateAndExpandTree(m_locPath);
+}
+
+void MainWindow::slot_itemSelected(const QString &sItem)
+{
+    const Pane &pane = paneOf(sender());
+    {
+        const QSignalBlocker blocker(pane.history);
+        if (pane.history->findText(sItem, Qt::MatchExactly | Qt::MatchCaseSensitive) < 0) {
+            while (pane.history->count() >= MaxHistory) {
+                pane.history->removeItem(0);
+            }
+            pane.history->addItem(sItem);
+        }
+        pane.history->setCurrentText(sItem);
+    }
+    m_modules.setSelection(sItem, pane.tree->isLocal());
+    markActive(pane);
+}
+
+void MainWindow::slot_set_item(const QString &sItem)
+{
+    const Pane &pane = paneOf(sender());
+    pane.tree->updateAndExpandTree(sItem);
+    markActive(pane);
+}
+
+void MainWindow::markActive(const Pane &active)
+{
+    m_activePane = &active;
+    active.activeMark->setPixmap(QIcon(":/icons22/attach.png").pixmap(22, 22));
+    otherPane(active).activeMark->clear();
+}
+
+MainWindow::Pane &MainWindow::paneOf(const QObject *widget)
+{
+    const Pane &second = m_panes[1];
+    const bool isSecond = widget == second.device || widget == second.filter ||
+                          widget == second.refresh || widget == second.history ||
+                          widget == second.tree;
+    return m_panes[isSecond ? 1 : 0];
+}
+
+MainWindow::Pane &MainWindow::otherPane(const Pane &pane)
+{
+    return m_panes[&pane == &m_panes[0] ? 1 : 0];
+}
+
+void MainWindow::loadSettings()
+{
+    const auto settings = openMainStore();
+    readWindowPlace(*settings, *this, {50, 50}, {700, 500});
+    readSplitter(*settings, "v", *m_ui->sp_dev);
+    readSplitter(*settings, "h", *m_ui->sp_h);
+    m_locPath = settings->value("locpath", QDir::homePath()).toString();
+    if (!QFileInfo::exists(m_locPath)) {
+        m_locPath = QDir::homePath();
+    }
+    for (int pane = 0; pane < 2; ++pane) {
+        m_panes.at(static_cast<std::size_t>(pane)).tree->readSettings(*settings, pane + 1);
+    }
+    m_modules.readAllSettings(*settings);
+}
+
+void MainWindow::saveSettings()
+{
+    const auto settings = openMainStore();
+    writeWindowPlace(*settings, *this);
+    writeSplitter(*settings, "v", *m_ui->sp_dev);
+    writeSplitter(*settings, "h", *m_ui->sp_h);
+    settings->setValue("locpath", m_locPath);
+    for (int pane = 0; pane < 2; ++pane) {
+        m_panes.at(static_cast<std::size_t>(pane)).tree->writeSettings(*settings, pane + 1);
+    }
+    m_modules.writeAllSettings(*settings);
+    settings->sync();
+    if (settings->status() != QSettings::NoError) {
+        QMessageBox::critical(nullptr, windowTitle(), "The settings file cannot be written.\n");
+    }
+}
+
+bool MainWindow::event(QEvent *event)
+{
+    const bool handled = QMainWindow::event(event);
+    if (event->type() == QEvent::Paint && !m_paintSeen) {
+        m_paintSeen = true;
+        // The children are painted within the same pass, before the next turn of the event loop.
+        QTimer::singleShot(0, this, &MainWindow::noteFirstPaint);
+    }
+    return handled;
+}
+
+void MainWindow::noteFirstPaint()
+{
+    m_firstPaintMs = processAgeMs();
+    Tracer::Trace(Tracer::Debug,
+                  QString("First paint %1 ms after the start of the process").arg(m_firstPaintMs));
+    emit firstPainted();
+}
+
+void MainWindow::closeEvent(QCloseEvent *event)
+{
+    hide();
+    saveSettings();
+    m_modules.closeAll();
+    event->accept();
+}
+
+void MainWindow::hideEvent(QHideEvent *event)
+{
+    m_modules.hideAll();
+    QMainWindow::hideEvent(event);
+}
+
+void MainWindow::showEvent(QShowEvent *event)
+{
+    QMainWindow::showEvent(event);
+    m_modules.showAgain();
+}

@@ -1,0 +1,96 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "FileIcons.h"
+#include "ModulesDb.h"
+#include "log/Tracer.h"
+
+#include <QMainWindow>
+#include <QString>
+
+#include <array>
+#include <memory>
+
+class QComboBox;
+class QCustomTreeView;
+class QFileSystemModel;
+class QLabel;
+class QSplitter;
+class QToolButton;
+
+namespace Ui {
+class AppMainWindow;
+}
+
+/// The program's main window: two panes of files side by side, the log below them, and the menus
+/// of the tools. Owns everything that lives as long as it; closing it saves the settings and closes
+/// the tools. Deletes itself when closed.
+class MainWindow : public QMainWindow
+{
+    Q_OBJECT
+
+public:
+    MainWindow();
+    ~MainWindow() override;
+
+    [[nodiscard]] ModulesDb &modules() { return m_modules; }
+
+    /// Milliseconds from the start of the process to the first complete paint of this window; -1
+    /// before it. The start is known to 10 ms.
+    [[nodiscard]] qint64 firstPaintMs() const { return m_firstPaintMs; }
+
+signals:
+    /// The window has been painted for the first time.
+    void firstPainted();
+
+protected:
+    bool event(QEvent *event) override;
+    void closeEvent(QCloseEvent *event) override;
+    void hideEvent(QHideEvent *event) override;
+    void showEvent(QShowEvent *event) override;
+
+private slots:
+    void TraceDataAvailable();
+    void errMsg(const QString &sTxt);
+    void menu_about();
+    void slot_refresh();
+    void newDeviceSelection(int iIndex);
+    void slot_infoTextAvailable(const QString &sInfoText);
+    void slot_localDefaultFolderSet(const QString &sDefaultFolder);
+    void slot_itemSelected(const QString &sItem);
+    void slot_set_item(const QString &sItem);
+
+private:
+    /// The widgets of one pane and the models that it can show.
+    struct Pane
+    {
+        QComboBox *device = nullptr;
+        QComboBox *filter = nullptr;
+        QToolButton *refresh = nullptr;
+        QLabel *activeMark = nullptr;
+        QComboBox *history = nullptr;
+        QCustomTreeView *tree = nullptr;
+        std::unique_ptr<QFileSystemModel> localModel;
+    };
+
+    void buildMenus();
+    void connectPane(Pane &pane);
+    void selectDevice(Pane &pane);
+    void markActive(const Pane &active);
+    void refresh(Pane &pane);
+    [[nodiscard]] Pane &paneOf(const QObject *widget);
+    [[nodiscard]] Pane &otherPane(const Pane &pane);
+    void loadSettings();
+    void saveSettings();
+    void noteFirstPaint();
+
+    ModulesDb m_modules;
+    Tracer m_tracer;
+    std::unique_ptr<Ui::AppMainWindow> m_ui;
+    FileIcons m_fileIcons;
+    std::array<Pane, 2> m_panes;
+    const Pane *m_activePane = nullptr;
+    QString m_locPath;
+    qint64 m_firstPaintMs = -1;
+    bool m_paintSeen = false;
+};

@@ -1,0 +1,455 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "QCustomTreeView.h"
+
+#include "PaneFiles.h"
+#include "entryname.h"
+#include "mnemonics.h"
+#include "toolframe/questions.h"
+
+#include <QAction>
+#include <QContextMenuEvent>
+#include <QDrag>
+#include <QHeaderView>
+#include <QIcon>
+#include <QMenu>
+#include <QMimeData>
+#include <QRegularExpression>
+#include <QScrollBar>
+#include <QSettings>
+
+namespace {
+
+QString widthKey(int pane, const QString &kind, qsizetype section)
+{
+    return QString("tree%1.%2.section%3").arg(pane).arg(kind).arg(section);
+}
+
+} // namespace
+
+QCustomTreeView::QCustomTreeView(QWidget *parent)
+    : QTreeView(parent)
+    , m_contextMenu(new QMenu(this))
+    , m_copyMenu(new QMenu(this))
+{
+    setEditTriggers(NoEditTriggers);
+    setDragDropMode(DragDrop);
+    setSelectionBehavior(SelectRows);
+    // Without this a folder of thousands of files is measured row by row.
+    setUniformRowHeights(true);
+    setAlternatingRowColors(true);
+    setSortingEnabled(true);
+    sortByColumn(0, Qt::AscendingOrder);
+
+    addOperation("Set As Default Folder", "home", {}, &QCustomTreeView::slot_default);
+    addOperation("Create Folder", "folder_new", Qt::Key_F7, &QCustomTreeView::slot_create);
+    addOperation("Rename", "rename", Qt::Key_F2, &QCustomTreeView::slot_rename);
+    addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
+    m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
+
+    connect(verticalScrollBar(), &QScrollBar::actionTriggered, this,
+            [this] { m_revealedPath.clear(); });
+}
+
+QCustomTreeView::~QCustomTreeView() = default;
+
+void QCustomTreeView::addOperation(const QString &text, const QString &picture,
+                                   const QKeySequence &key, void (QCustomTreeView::*slot)())
+{
+    QAction *action = m_contextMenu->addAction(QIcon(":/icons16/" + picture + ".png"), text);
+    action->setShortcut(key);
+    action->setShortcutContext(Qt::WidgetShortcut);
+    action->setShortcutVisibleInContextMenu(true);
+    addAction(action);
+    connect(action, &QAction::triggered, this, slot);
+}
+
+void QCustomTreeView::setModules(ModulesDb *modules)
+{
+    if (m_modules) {
+        return;
+    }
+    m_modules = modules;
+    m_toolActions = modules->contextActions(this);
+    m_contextMenu->addSeparator();
+    for (int i = 0; i < m_toolActions.size(); ++i) {
+        QAction *action = m_toolActions.at(i).first;
+        m_contextMenu->addAction(action);
+        connect(action, &QAction::triggered, this, [this, i] { slot_module(i); });
+    }
+    assignMnemonics(m_contextMenu->actions());
+}
+
+void QCustomTreeView::setModel(QAbstractItemModel *model)
+{
+    if (model == this->model()) {
+        return;
+    }
+    keepColumnWidths();
+    QTreeView::setModel(model);
+    m_files = PaneFiles::create(model);
+    if (m_files) {
+        connect(m_files.get(), &PaneFiles::failed, this, &QCustomTreeView::errMsg);
+        connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::revealCurrent);
+        connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::folderLoaded);
+        applyColumnWidths();
+    }
+}
+
+bool QCustomTreeView::isLocal() const
+{
+    return !m_files || m_files->isLocal();
+}
+
+QString QCustomTreeView::currentPath() const
+{
+    return m_files ? m_files->pathOf(currentIndex()) : QString();
+}
+
+void QCustomTreeView::keepColumnWidths()
+{
+    if (!m_files) {
+        return;
+    }
+    QList<int> widths;
+    for (int section = 0; section < header()->count(); ++section) {
+        widths.append(header()->sectionSize(section));
+    }
+    m_columnWidths[m_files->settingsName()] = widths;
+}
+
+void QCustomTreeView::applyColumnWidths()
+{
+    QList<int> &widths = m_columnWidths[m_files->settingsName()];
+    if (widths.isEmpty()) {
+        widths = m_files->defaultColumnWidths();
+    }
+    for (int section = 0; section < widths.size() && section < header()->count(); ++section) {
+        header()->resizeSection(section, widths.at(section));
+    }
+}
+
+void QCustomTreeView::writeSettings(QSettings &settings, int pane)
+{
+    keepColumnWidths();
+    for (auto kind = m_columnWidths.cbegin(); kind != m_columnWidths.cend(); ++kind) {
+        for (qsizetype section = 0; section < kind.value().size(); ++section) {
+            settings.setValue(widthKey(pane, kind.key(), section), kind.value().at(section));
+        }
+    }
+}
+
+void QCustomTreeView::readSettings(const QSettings &settings, int pane)
+{
+    const QStringList kinds{"local"};
+    for (const QString &kind : kinds) {
+        QList<int> widths;
+        for (;;) {
+            bool isNumber = false;
+            const int width =
+                settings.value(widthKey(pane, kind, widths.size()), -1).toInt(&isNumber);
+            if (!isNumber || width < 0) {
+                break;
+            }
+            widths.append(width);
+        }
+        if (!widths.isEmpty()) {
+            m_columnWidths[kind] = widths;
+        }
+    }
+    if (m_files) {
+        applyColumnWidths();
+    }
+}
+
+void QCustomTreeView::updateAndExpandTree(const QString &sDir)
+{
+    if (!m_files || sDir.isEmpty()) {
+        return;
+    }
+    const QModelIndex target = m_files->indexOf(sDir);
+    if (!target.isValid()) {
+        emit errMsg(QString("There is no entry '%1' any more.").arg(sDir));
+        return;
+    }
+    for (QModelIndex level = target; level.isValid(); level = level.parent()) {
+        setExpanded(level, true);
+    }
+    setCurrentIndex(target);
+    // The model delivers the folders later, which moves the entry out of sight again.
+    m_revealedPath = m_files->pathOf(target);
+    scrollTo(target);
+}
+
+void QCustomTreeView::updateAndExpandTree()
+{
+    updateAndExpandTree(currentPath());
+}
+
+void QCustomTreeView::revealCurrent(const QString &folder)
+{
+    if (!m_revealedPath.isEmpty() && m_revealedPath.startsWith(folder)) {
+        scrollTo(currentIndex());
+    }
+}
+
+void QCustomTreeView::filterChanged(const QString &sNewFilter)
+{
+    static const QRegularExpression separators("[\\s,;]+");
+    QStringList wildcards = sNewFilter.split(separators, Qt::SkipEmptyParts);
+    if (wildcards.contains("*.*")) {
+        wildcards.clear();
+    }
+    if (m_files) {
+        m_files->setNameFilters(wildcards);
+    }
+}
+
+void QCustomTreeView::currentChanged(const QModelIndex &current, const QModelIndex &previous)
+{
+    QTreeView::currentChanged(current, previous);
+    if (!m_files || !current.isValid()) {
+        return;
+    }
+    const QString path = m_files->pathOf(current);
+    if (path != m_revealedPath) {
+        m_revealedPath.clear();
+    }
+    emit itemSelected(path);
+}
+
+void QCustomTreeView::contextMenuEvent(QContextMenuEvent *event)
+{
+    const bool byMouse = event->reason() == QContextMenuEvent::Mouse;
+    const QModelIndex index = byMouse ? indexAt(event->pos()) : currentIndex();
+    if (!m_files || !index.isValid()) {
+        return;
+    }
+    setCurrentIndex(index);
+    const QString path = currentPath();
+    for (const auto &[action, tool] : std::as_const(m_toolActions)) {
+        action->setVisible(ModulesDb::isAllowed(*tool, path, isLocal()));
+    }
+    const QPoint position = byMouse ? event->pos() : visualRect(index).bottomLeft();
+    m_contextMenu->popup(viewport()->mapToGlobal(position));
+}
+
+void QCustomTreeView::mouseDoubleClickEvent(QMouseEvent *event)
+{
+    QTreeView::mouseDoubleClickEvent(event);
+    if (event->button() == Qt::LeftButton && indexAt(event->position().toPoint()).isValid() &&
+        !isFolderPath(currentPath())) {
+        startFirstTool();
+    }
+}
+
+void QCustomTreeView::keyPressEvent(QKeyEvent *event)
+{
+    switch (event->key()) {
+    case Qt::Key_Return:
+    case Qt::Key_Enter:
+        if (isFolderPath(currentPath())) {
+            setExpanded(currentIndex(), !isExpanded(currentIndex()));
+        } else {
+            startFirstTool();
+        }
+        return;
+    case Qt::Key_Backspace:
+        if (currentIndex().parent().isValid()) {
+            setCurrentIndex(currentIndex().parent());
+            scrollTo(currentIndex());
+        }
+        return;
+    default:
+        QTreeView::keyPressEvent(event);
+    }
+}
+
+void QCustomTreeView::focusInEvent(QFocusEvent *event)
+{
+    QTreeView::focusInEvent(event);
+    if (m_files && currentIndex().isValid()) {
+        emit itemSelected(currentPath());
+    }
+}
+
+bool QCustomTreeView::focusNextPrevChild(bool next)
+{
+    if (next) {
+        emit otherPaneRequested();
+        return true;
+    }
+    return QTreeView::focusNextPrevChild(next);
+}
+
+void QCustomTreeView::startFirstTool()
+{
+    const QString path = currentPath();
+    if (DlgBase *tool = m_modules ? m_modules->firstAllowed(path, isLocal()) : nullptr) {
+        m_modules->start(*tool, path);
+    } else if (!path.isEmpty()) {
+        emit errMsg(QString("No tool works on '%1'.").arg(entryName(path)));
+    }
+}
+
+void QCustomTreeView::slot_module(int iModIndex)
+{
+    if (iModIndex < 0 || iModIndex >= m_toolActions.size()) {
+        return;
+    }
+    DlgBase *tool = m_toolActions.at(iModIndex).second;
+    const QString path = currentPath();
+    if (ModulesDb::isAllowed(*tool, path, isLocal())) {
+        m_modules->start(*tool, path);
+    }
+}
+
+void QCustomTreeView::slot_default()
+{
+    const QString folder = folderOf(currentPath());
+    if (!folder.isEmpty()) {
+        emit localDefaultFolderSet(folder);
+    }
+}
+
+bool QCustomTreeView::acceptsName(const QString &parent, const QString &name,
+                                  const QString &forbiddenText)
+{
+    QString refusal;
+    if (name.trimmed().isEmpty()) {
+        refusal = "The new folder name cannot be empty.";
+    } else if (hasForbiddenCharacter(name)) {
+        refusal = forbiddenText;
+    } else if (m_files->exists(parent + name)) {
+        refusal = "An entry with this name already exists.";
+    } else {
+        return true;
+    }
+    emit infoTextAvailable(refusal);
+    return false;
+}
+
+void QCustomTreeView::slot_create()
+{
+    const QString parent = folderOf(currentPath());
+    if (parent.isEmpty()) {
+        return;
+    }
+    const auto name =
+        askText(this, "Create folder", QString("\nCreate new folder in\n'%1'").arg(parent), {});
+    if (name &&
+        acceptsName(parent, *name, "The new folder name contains invalid characters.") &&
+        m_files->createFolder(parent, *name)) {
+        updateAndExpandTree(parent + *name + '/');
+    }
+}
+
+void QCustomTreeView::slot_rename()
+{
+    const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    if (m_files->isRoot(path)) {
+        emit infoTextAvailable("Cannot rename root node.");
+        return;
+    }
+    const QString parent = parentFolder(path);
+    const auto name = askText(this, "Rename entry",
+                              QString("Enter new name for\n'%1'").arg(entryName(path)),
+                              entryName(path));
+    if (name && acceptsName(parent, *name, "The new entry name contains invalid characters.") &&
+        m_files->rename(path, *name)) {
+        updateAndExpandTree(parent + *name);
+    }
+}
+
+void QCustomTreeView::slot_remove()
+{
+    const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    if (m_files->isRoot(path)) {
+        emit infoTextAvailable("Cannot delete root node.");
+        return;
+    }
+    if (!m_files->isRealFolder(path)) {
+        if (!askYesNo(this, "Delete File",
+                      QString("Do you really want to delete the file\n%1 ?")
+                          .arg(withoutSlash(path)))) {
+            return;
+        }
+        (void)m_files->removeFile(path);
+    } else if (m_files->isEmptyFolder(path)) {
+        (void)m_files->removeEmptyFolder(path);
+    } else {
+        if (!askYesNo(this, "Delete Folder", m_files->removeTreeQuestion(path))) {
+            return;
+        }
+        (void)m_files->removeTree(path, this);
+    }
+    // Also after a failure: what could be removed is gone.
+    updateAndExpandTree(parentFolder(path));
+}
+
+void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
+{
+    const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    auto *mime = new QMimeData;
+    mime->setText(path);
+    auto *drag = new QDrag(this);
+    drag->setMimeData(mime);
+    drag->setPixmap(QIcon(":/icons32/file_waveform.png").pixmap(32, 32));
+    drag->exec(Qt::CopyAction);
+}
+
+void QCustomTreeView::dragEnterEvent(QDragEnterEvent *event)
+{
+    dragMoveEvent(event);
+}
+
+void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
+{
+    if (!comesFromOtherPane(*event)) {
+        event->ignore();
+        return;
+    }
+    const QModelIndex target = indexAt(event->position().toPoint());
+    if (target.isValid()) {
+        selectionModel()->setCurrentIndex(target, QItemSelectionModel::ClearAndSelect |
+                                                      QItemSelectionModel::Rows);
+    }
+    event->acceptProposedAction();
+}
+
+void QCustomTreeView::dropEvent(QDropEvent *event)
+{
+    if (!comesFromOtherPane(*event)) {
+        event->ignore();
+        return;
+    }
+    m_dropSource = event->mimeData()->text();
+    m_dropSourceLocal = static_cast<const QCustomTreeView *>(event->source())->isLocal();
+    const QModelIndex target = indexAt(event->position().toPoint());
+    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
+    event->acceptProposedAction();
+    m_copyMenu->popup(viewport()->mapToGlobal(event->position().toPoint()));
+}
+
+bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const
+{
+    const auto *source = qobject_cast<const QCustomTreeView *>(event.source());
+    return source && source != this && !event.mimeData()->text().isEmpty();
+}
+
+void QCustomTreeView::slot_copy()
+{
+    if (!isFolderPath(m_dropTarget)) {
+        emit infoTextAvailable("The target location for the copy operation must be a folder.");
+    } else if (m_dropSourceLocal && isLocal()) {
+        emit infoTextAvailable("Copy operations between local file systems are not supported.");
+    }
+}

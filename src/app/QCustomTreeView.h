@@ -1,0 +1,113 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "ModulesDb.h"
+
+#include <QMap>
+#include <QTreeView>
+
+#include <memory>
+
+class PaneFiles;
+class QMenu;
+class QSettings;
+
+/// The tree of one pane: shows the entries of its model, and turns menus, keys and drops into the
+/// operations of PaneFiles and into starts of tools.
+///
+/// Paths use "/", and a folder's path ends in it. Questions are asked here, in modal boxes.
+class QCustomTreeView : public QTreeView
+{
+    Q_OBJECT
+
+public:
+    explicit QCustomTreeView(QWidget *parent = nullptr);
+    ~QCustomTreeView() override;
+
+    /// Hands over the tools, which must live longer; adds them to the context menu. Once.
+    void setModules(ModulesDb *modules);
+
+    /// Takes over a model of one of the kinds that PaneFiles knows, or null. Each kind has column
+    /// widths of its own.
+    void setModel(QAbstractItemModel *model) override;
+
+    /// Whether the pane shows the local file system; also without a model.
+    [[nodiscard]] bool isLocal() const;
+
+    /// Path of the current entry, empty if there is none.
+    [[nodiscard]] QString currentPath() const;
+
+    /// Saves and restores the column widths of pane 1 or 2.
+    void writeSettings(QSettings &settings, int pane);
+    void readSettings(const QSettings &settings, int pane);
+
+public slots:
+    /// Opens all folders on the way to a path and makes it current.
+    void updateAndExpandTree(const QString &sDir);
+
+    /// As above with the current path.
+    void updateAndExpandTree();
+
+    /// Shows only files that match a mask, such as "*.wv"; "*.*" shows all, also those without a
+    /// dot. Several patterns are separated by blanks, commas or semicolons.
+    void filterChanged(const QString &sNewFilter);
+
+    void slot_default();
+    void slot_copy();
+    void slot_create();
+    void slot_rename();
+    void slot_remove();
+    void slot_module(int iModIndex);
+
+signals:
+    /// A text for the status bar.
+    void errMsg(const QString &sTxt);
+
+    /// A text that the user must acknowledge.
+    void infoTextAvailable(const QString &sInfoText);
+
+    void localDefaultFolderSet(const QString &sDefaultFolder);
+
+    /// An entry has become current, or the pane has come into use again with this one.
+    void itemSelected(const QString &sItem);
+
+    /// All entries of a folder have arrived in the tree.
+    void folderLoaded(const QString &sFolder);
+
+    /// The user wants to go on in the other pane.
+    void otherPaneRequested();
+
+protected:
+    void currentChanged(const QModelIndex &current, const QModelIndex &previous) override;
+    void contextMenuEvent(QContextMenuEvent *event) override;
+    void mouseDoubleClickEvent(QMouseEvent *event) override;
+    void keyPressEvent(QKeyEvent *event) override;
+    void focusInEvent(QFocusEvent *event) override;
+    bool focusNextPrevChild(bool next) override;
+    void startDrag(Qt::DropActions supportedActions) override;
+    void dragEnterEvent(QDragEnterEvent *event) override;
+    void dragMoveEvent(QDragMoveEvent *event) override;
+    void dropEvent(QDropEvent *event) override;
+
+private:
+    void addOperation(const QString &text, const QString &picture, const QKeySequence &key,
+                      void (QCustomTreeView::*slot)());
+    void keepColumnWidths();
+    void applyColumnWidths();
+    void revealCurrent(const QString &folder);
+    void startFirstTool();
+    [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
+    [[nodiscard]] bool acceptsName(const QString &parent, const QString &name,
+                                   const QString &forbiddenText);
+
+    std::unique_ptr<PaneFiles> m_files; ///< null without a model
+    ModulesDb *m_modules = nullptr;
+    QMenu *m_contextMenu;
+    QMenu *m_copyMenu;
+    QList<ModulesDb::ToolAction> m_toolActions;
+    QMap<QString, QList<int>> m_columnWidths; ///< by PaneFiles::settingsName()
+    QString m_revealedPath; ///< kept in view while its folders load, until the user moves
+    QString m_dropSource;
+    QString m_dropTarget;
+    bool m_dropSourceLocal = true;
+};

@@ -1,0 +1,36 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QObject>
+#include <QString>
+
+class MainWindow;
+
+/// Shows a file in the main window, leaves pictures of the window and of the file's report in a
+/// folder and ends the program, for documentation and for machines without a display.
+class ScreenshotRun : public QObject
+{
+    Q_OBJECT
+
+public:
+    /// Writes "main-window.png" and, if `file` isn't empty, "waveform-info.png" into `folder`,
+    /// which is made when missing. The window must live longer than the run.
+    ScreenshotRun(MainWindow &window, QString folder, const QString &file);
+
+    /// Makes the windows use settings of no user and keep none, so that pictures look the same
+    /// everywhere. To be called before the main window exists.
+    static void detachSettings();
+
+    /// Starts, once the event loop runs; ends it with 0, or with 1 and a line on standard error.
+    void start();
+
+private:
+    void takePictures();
+    [[nodiscard]] bool save(QWidget &window, const QString &name) const;
+    void finish(int status);
+
+    MainWindow &m_window;
+    QString m_folder;
+    QString m_file; ///< absolute, empty for none
+    bool m_finished = false;
+};

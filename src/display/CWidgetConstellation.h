@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "CWidgetBase.h"
+#include "ConstellationPainter.h"
+
+/// Shows I against Q as a density or, for up to 500 samples, as dots, with the values at the mouse.
+class CWidgetConstellation : public CWidgetBase
+{
+    Q_OBJECT
+
+public:
+    explicit CWidgetConstellation(QWidget *parent = nullptr);
+
+    void setData(const QList<CWidgetBase::IQData> &samples);
+    /// The values of I and Q at the edges; values that aren't above 0 count as 1.
+    void setScale(double scaleI, double scaleQ);
+    /// One of the modes of ColorMode; any other number is ignored.
+    void setColorMode(int mode);
+    [[nodiscard]] int colorMode() const { return static_cast<int>(m_scene.colorMode); }
+
+    [[nodiscard]] const ConstellationScene &scene();
+
+public slots:
+    void clear();
+    void col_rainbow();
+    void col_blackwhite();
+    void col_blue();
+    void col_noise();
+
+protected:
+    void drawPlot(QPainter &painter, const QRectF &area) override;
+    void writeData(QTextStream &stream) const override;
+    [[nodiscard]] bool hasData() const override { return !m_samples.isEmpty(); }
+    void extendContextMenu(QMenu &menu) override;
+    void mouseMoveEvent(QMouseEvent *event) override;
+    void leaveEvent(QEvent *event) override;
+
+private:
+    void updateGrid();
+
+    QList<CWidgetBase::IQData> m_samples;
+    ConstellationScene m_scene;
+    bool m_dirty = false;
+};

@@ -1,0 +1,47 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "ConstellationGrid.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+
+namespace {
+
+constexpr int Middle = ConstellationGrid::Size / 2;
+
+} // namespace
+
+int ConstellationGrid::cellOf(double value)
+{
+    return Middle - static_cast<int>(value * -Middle);
+}
+
+void ConstellationGrid::compute(std::span<const IqSample> samples, double scaleI, double scaleQ)
+{
+    clear();
+    for (const IqSample &sample : samples) {
+        const double i = sample.i / scaleI;
+        const double q = sample.q / scaleQ;
+        if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {
+            m_counts[indexOf(cellOf(i), cellOf(q))] += 1;
+        }
+    }
+    m_greatest = *std::max_element(m_counts.begin(), m_counts.end());
+}
+
+void ConstellationGrid::clear()
+{
+    m_counts.fill(0);
+    m_greatest = 0;
+}
+
+double ConstellationGrid::levelDb(int row, int column) const
+{
+    const double cell = count(row, column);
+    if (cell <= 0) {
+        return EmptyDb;
+    }
+    // Half a sample would be as dark as none.
+    const double range = std::log(m_greatest * 2);
+    return std::log(m_greatest / cell) / range * EmptyDb;
+}

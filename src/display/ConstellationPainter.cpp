@@ -1,0 +1,181 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "ConstellationPainter.h"
+
+#include "plotdraw.h"
+#include "plotscale.h"
+
+#include <QFontMetricsF>
+#include <QPainter>
+
+#include <algorithm>
+#include <cmath>
+
+namespace {
+
+constexpr double InnerRadius = 0.707; ///< where I and Q of a full-scale sample are equal
+
+QString axisText(double value)
+{
+    return QString::number(value, 'g', 3) + " V";
+}
+
+} // namespace
+
+ConstellationPainter::ConstellationPainter(const PlotStyle &style, const ConstellationScene &scene)
+    : m_style(style)
+    , m_scene(scene)
+{
+}
+
+QMargins ConstellationPainter::margins(const QFont &font)
+{
+    const QFontMetricsF metrics(font);
+    const int side = static_cast<int>(std::ceil(metrics.horizontalAdvance("-0.005 V"))) + 8;
+    const int bottom = static_cast<int>(std::ceil(metrics.height())) + 6;
+    return {side, 6, side / 2, bottom};
+}
+
+QRectF ConstellationPainter::square(const QRectF &area, const QFont &font)
+{
+    const QRectF room = area.marginsRemoved(margins(font));
+    const double side = std::max(0.0, std::floor(std::min(room.width(), room.height())));
+    // In a wide area the square moves to the middle, its axis texts with it.
+    return {std::floor(room.left() + (room.width() - side) / 2),
+            std::floor(room.top() + (room.height() - side) / 2), side, side};
+}
+
+std::optional<IqSample> ConstellationPainter::valueAt(const QPointF &place,
+                                                      const QRectF &area) const
+{
+    const QRectF plot = square(area, m_style.font);
+    if (plot.isEmpty() || !plot.contains(place)) {
+        return std::nullopt;
+    }
+    return IqSample{((place.x() - plot.left()) / plot.width() * 2 - 1) * m_scene.scaleI,
+                    (1 - (place.y() - plot.top()) / plot.height() * 2) * m_scene.scaleQ};
+}
+
+void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
+{
+    painter.save();
+    painter.fillRect(area, m_style.color(PlotColor::Background));
+    const QRectF plot = square(area, m_style.font);
+    if (!plot.isEmpty()) {
+        const PixelGrid pixels(painter);
+        if (static_cast<qsizetype>(m_scene.samples.size()) > DotLimit) {
+            paintCells(painter, pixels, plot);
+        } else {
+            paintDots(painter, pixels, plot);
+        }
+        paintFrame(painter, pixels, plot);
+        paintAxisTexts(painter, area, plot);
+        paintValueBox(painter, area);
+    }
+    painter.restore();
+}
+
+void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels,
+                                      const QRectF &plot) const
+{
+    constexpr int size = ConstellationGrid::Size;
+    const auto edge = [&](double start, int cell) {
+        return pixels.snap(start + plot.width() * cell / size);
+    };
+    for (int row = 0; row < size; ++row) {
+        const double left = edge(plot.left(), row);
+        const double right = edge(plot.left(), row + 1);
+        for (int column = 0; column < size; ++column) {
+            if (m_scene.grid.count(row, column) <= 0) {
+                continue;
+            }
+            const double top = edge(plot.top(), size - 1 - column);
+            const double bottom = edge(plot.top(), size - column);
+            const double level = m_scene.grid.levelDb(row, column);
+            painter.fillRect(QRectF(left, top, right - left, bottom - top),
+                             QColor(ColorTable::colorOfLevel(m_scene.colorMode, level)));
+        }
+    }
+}
+
+void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
+                                     const QRectF &plot) const
+{
+    constexpr double size = 3;
+    const QColor color = m_style.color(PlotColor::AverageTrace);
+    const QPointF center = plot.center();
+    const double half = plot.width() / 2;
+    painter.setClipRect(plot);
+    for (const IqSample &sample : m_scene.samples) {
+        const double i = sample.i / m_scene.scaleI;
+        const double q = sample.q / m_scene.scaleQ;
+        if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {
+            painter.fillRect(QRectF(pixels.snap(center.x() + i * half - size / 2),
+                                    pixels.snap(center.y() - q * half - size / 2), size, size),
+                             color);
+        }
+    }
+    painter.setClipping(false);
+}
+
+void ConstellationPainter::paintFrame(QPainter &painter, const PixelGrid &pixels,
+                                      const QRectF &plot) const
+{
+    const QColor color = m_style.color(PlotColor::Grid);
+    const QPointF center = plot.center();
+    pixels.frame(plot, color);
+    pixels.horizontal(center.y(), plot.left(), plot.right(), color);
+    pixels.vertical(center.x(), plot.top(), plot.bottom(), color);
+    painter.save();
+    painter.setRenderHint(QPainter::Antialiasing);
+    painter.setBrush(Qt::NoBrush);
+    painter.setPen(QPen(color, pixels.lineWidth()));
+    for (const double radius : {1.0, InnerRadius}) {
+        const double length = radius * plot.width() / 2;
+        painter.drawEllipse(center, length, length);
+    }
+    painter.restore();
+}
+
+void ConstellationPainter::paintAxisTexts(QPainter &painter, const QRectF &area,
+                                          const QRectF &plot) const
+{
+    const QFontMetricsF metrics(m_style.font);
+    painter.setFont(m_style.font);
+    painter.setPen(m_style.color(PlotColor::Text));
+    const double height = metrics.height();
+    for (const double share : {-1.0, 0.0, 1.0}) {
+        const QString textI = axisText(share * m_scene.scaleI);
+        const double width = metrics.horizontalAdvance(textI);
+        const double x = plot.center().x() + share * plot.width() / 2 - width / 2;
+        painter.drawText(
+            QRectF(std::min(x, area.right() - width), plot.bottom() + 3, width + 1, height),
+            Qt::AlignCenter, textI);
+        const double y = plot.center().y() - share * plot.height() / 2 - height / 2;
+        painter.drawText(
+            QRectF(area.left(), std::max(y, area.top()), plot.left() - area.left() - 4, height),
+            Qt::AlignRight | Qt::AlignVCenter, axisText(share * m_scene.scaleQ));
+    }
+    drawCaption(painter, m_style, plot, Qt::AlignTop | Qt::AlignHCenter, "Q");
+    drawCaption(painter, m_style, plot, Qt::AlignVCenter | Qt::AlignRight, "I");
+}
+
+void ConstellationPainter::paintValueBox(QPainter &painter, const QRectF &area) const
+{
+    if (!m_scene.mouse) {
+        return;
+    }
+    const std::optional<IqSample> value = valueAt(*m_scene.mouse, area);
+    if (!value) {
+        return;
+    }
+    constexpr double widthToHeight = 3.5;
+    const double level = magnitudeToDb(std::sqrt(value->i * value->i + value->q * value->q));
+    ValueBox box;
+    box.lines = {QString("I %1 V").arg(value->i, 0, 'f', 3),
+                 QString("Q %1 V").arg(value->q, 0, 'f', 3),
+                 QString("P %1 dB").arg(level, 0, 'f', 2)};
+    box.leastWidth =
+        widthToHeight * QFontMetricsF(m_style.font).boundingRect(" Q -Q.QQQ V").height();
+    box.cornerRadius = 5;
+    drawValueBoxWhereRoom(painter, m_style, *m_scene.mouse, box, area);
+}

@@ -1,0 +1,401 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "TracePainter.h"
+
+#include "base/EngineeringNumber.h"
+#include "plotdraw.h"
+#include "plotscale.h"
+
+#include <QCoreApplication>
+#include <QFontMetricsF>
+#include <QPainter>
+
+#include <algorithm>
+#include <cmath>
+
+namespace {
+
+constexpr int Divisions = 10; ///< of the time axis
+constexpr int MarkerCount = 4;
+constexpr double MarkerPitch = 0.25; ///< of the pane's height from row to row
+constexpr double MarkerHeight = 0.1; ///< of a high level over a low one
+constexpr double LogRange = 100.0;   ///< dB from bottom to top
+constexpr double HalfTurn = 3.1415;  ///< rad at the top of the phase scale
+constexpr int GridAlpha = 70;
+constexpr double PaneInset = 10; ///< pixels left free above and below the values
+
+/// Keeps what lies far off the pane within the range that a rasteriser can handle.
+double drawable(double fraction)
+{
+    constexpr double farOff = 4;
+    return fraction > -farOff ? std::min(fraction, farOff + 1) : -farOff;
+}
+
+double logFraction(double magnitude, double zoom)
+{
+    const double level =
+        magnitude > 0 ? std::clamp(20 * std::log10(magnitude), -LogRange, 0.0) : -LogRange;
+    return level * zoom / LogRange + 1;
+}
+
+QString tr(const char *text, const QString &argument)
+{
+    return QCoreApplication::translate("TracePainter", text).arg(argument);
+}
+
+} // namespace
+
+TracePainter::TracePainter(const PlotStyle &style, const TraceScene &scene)
+    : m_style(style)
+    , m_scene(scene)
+{
+}
+
+QMargins TracePainter::margins(const QFont &font)
+{
+    const QFontMetricsF metrics(font);
+    const int left = static_cast<int>(std::ceil(metrics.horizontalAdvance("-100 dB"))) + 8;
+    const int bottom = static_cast<int>(std::ceil(metrics.height())) + 6;
+    return {left, 6, 8, bottom};
+}
+
+QList<QRectF> TracePainter::panes(const QRectF &plot) const
+{
+    const int valuePanes = m_scene.mode == TraceMode::IqEnvelope ? 2 : 1;
+    const double valueHeight = m_scene.showMarkers ? plot.height() * 2 / 3 : plot.height();
+    const double height = valueHeight / valuePanes;
+    QList<QRectF> result;
+    for (int k = 0; k < valuePanes; ++k) {
+        result += QRectF(plot.left(), plot.top() + k * height, plot.width(), height);
+    }
+    if (m_scene.showMarkers) {
+        result += QRectF(plot.left(), plot.top() + valueHeight, plot.width(),
+                         plot.height() - valueHeight);
+    }
+    return result;
+}
+
+double TracePainter::yOf(const QRectF &pane, double fraction)
+{
+    return pane.top() + PaneInset + (1 - fraction) * (pane.height() - 2 * PaneInset);
+}
+
+double TracePainter::xOf(const QRectF &plot, int bin)
+{
+    return std::floor(plot.width() / TraceBins::BinCount * bin + 0.5) + plot.left();
+}
+
+QList<TracePainter::Label> TracePainter::labels() const
+{
+    const double zoom = m_scene.zoomY;
+    QList<Label> result;
+    switch (m_scene.mode) {
+    case TraceMode::IqEnvelope:
+        for (const double value : {0.7, 0.0, -0.7}) {
+            result += {(value + 1) / 2, QString::number(value / zoom)};
+        }
+        break;
+    case TraceMode::LogMagEnvelope:
+    case TraceMode::LogMagAverage:
+        for (int k = 0; k <= Divisions; ++k) {
+            result += {1.0 - static_cast<double>(k) / Divisions,
+                       QString("%1 dB").arg(k == 0 ? 0.0 : -10 * k / zoom)};
+        }
+        break;
+    case TraceMode::LinMagAverage: {
+        const int digits = 1 + std::max(0, static_cast<int>(std::ceil(std::log10(zoom))));
+        for (int k = Divisions; k >= 0; --k) {
+            const double fraction = static_cast<double>(k) / Divisions;
+            result += {fraction, QString::number(fraction / zoom, 'f', digits)};
+        }
+        break;
+    }
+    case TraceMode::Phase:
+    case TraceMode::Frequency:
+        result += {0.75, QString("Pi/%1").arg(2 * zoom)};
+        result += {0.5, "0"};
+        result += {0.25, QString("-Pi/%1").arg(2 * zoom)};
+        break;
+    }
+    return result;
+}
+
+double TracePainter::fractionOf(double value) const
+{
+    const double zoom = m_scene.zoomY;
+    switch (m_scene.mode) {
+    case TraceMode::IqEnvelope:
+        return (value * zoom + 1) * 0.5;
+    case TraceMode::LogMagEnvelope:
+    case TraceMode::LogMagAverage:
+        return logFraction(value, zoom);
+    case TraceMode::LinMagAverage:
+        return value * zoom;
+    case TraceMode::Phase:
+    case TraceMode::Frequency:
+        break;
+    }
+    return (value * zoom / HalfTurn + 1) * 0.5;
+}
+
+void TracePainter::paint(QPainter &painter, const QRectF &area) const
+{
+    const QRectF plot = area.marginsRemoved(margins(m_style.font));
+    painter.save();
+    painter.fillRect(area, m_style.color(PlotColor::Background));
+    if (plot.width() > 0 && plot.height() > 0) {
+        const PixelGrid grid(painter);
+        const QList<QRectF> rects = panes(plot);
+        const qsizetype valuePanes = rects.size() - (m_scene.showMarkers ? 1 : 0);
+        for (qsizetype k = 0; k < rects.size(); ++k) {
+            QList<Label> texts = labels();
+            if (k == valuePanes) {
+                texts.clear();
+                for (int row = 0; row < MarkerCount; ++row) {
+                    texts += {(MarkerCount - 1 - row) * MarkerPitch + MarkerHeight / 2,
+                              QString("M%1").arg(row + 1)};
+                }
+            }
+            paintAxis(painter, grid, area, rects.at(k), texts);
+        }
+        if (m_scene.sampleCount >= TraceBins::MinSamples) {
+            for (int k = 0; k < valuePanes; ++k) {
+                paintPaneOfMode(painter, plot, rects.at(k), k);
+            }
+            if (m_scene.showMarkers) {
+                paintMarkers(grid, plot, rects.last());
+            }
+        }
+        paintCaptions(painter, plot, rects);
+        paintCursors(painter, grid, plot, rects);
+        painter.setFont(m_style.font);
+        painter.setPen(m_style.color(PlotColor::Text));
+        painter.drawText(
+            QRectF(plot.left(), plot.bottom(), plot.width(), area.bottom() - plot.bottom()),
+            Qt::AlignCenter, divisionText());
+    }
+    painter.restore();
+}
+
+void TracePainter::paintAxis(QPainter &painter, const PixelGrid &grid, const QRectF &area,
+                             const QRectF &pane, const QList<Label> &texts) const
+{
+    const QColor gridColor = m_style.color(PlotColor::Grid, GridAlpha);
+    for (int k = 1; k < Divisions; ++k) {
+        grid.vertical(pane.left() + pane.width() * k / Divisions, pane.top(), pane.bottom(),
+                      gridColor);
+    }
+    painter.setFont(m_style.font);
+    painter.setPen(m_style.color(PlotColor::Text));
+    const double height = QFontMetricsF(m_style.font).height();
+    const double spacing =
+        texts.size() > 1
+            ? std::fabs(yOf(pane, texts.at(1).fraction) - yOf(pane, texts.at(0).fraction))
+            : pane.height();
+    const int stride = labelStride(spacing, height);
+    for (qsizetype k = 0; k < texts.size(); ++k) {
+        const double y = yOf(pane, texts.at(k).fraction);
+        grid.horizontal(y, pane.left(), pane.right(), gridColor);
+        if (k % stride == 0) {
+            painter.drawText(
+                QRectF(area.left(), y - height / 2, pane.left() - area.left() - 4, height),
+                Qt::AlignRight | Qt::AlignVCenter, texts.at(k).text);
+        }
+    }
+    grid.frame(pane, m_style.color(PlotColor::Grid));
+}
+
+void TracePainter::paintPaneOfMode(QPainter &painter, const QRectF &plot, const QRectF &pane,
+                                   int index) const
+{
+    switch (m_scene.mode) {
+    case TraceMode::IqEnvelope:
+        if (index == 0) {
+            paintValues(painter, plot, pane, &TraceBin::iMax, &TraceBin::iMin,
+                        PlotColor::AverageTrace);
+        } else {
+            paintValues(painter, plot, pane, &TraceBin::qMax, &TraceBin::qMin,
+                        PlotColor::PeakTrace);
+        }
+        break;
+    case TraceMode::LogMagEnvelope:
+        paintValues(painter, plot, pane, &TraceBin::magMax, &TraceBin::magMin,
+                    PlotColor::AverageTrace);
+        break;
+    case TraceMode::LogMagAverage:
+    case TraceMode::LinMagAverage:
+        paintValues(painter, plot, pane, &TraceBin::magAvg, nullptr, PlotColor::AverageTrace);
+        break;
+    case TraceMode::Phase:
+        paintValues(painter, plot, pane, &TraceBin::phaseHigh, &TraceBin::phaseLow,
+                    PlotColor::AverageTrace);
+        break;
+    case TraceMode::Frequency:
+        paintValues(painter, plot, pane, &TraceBin::freqMax, &TraceBin::freqMin,
+                    PlotColor::AverageTrace);
+        break;
+    }
+}
+
+void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRectF &pane,
+                               double TraceBin::*upper, double TraceBin::*lower,
+                               PlotColor place) const
+{
+    QPolygonF outline;
+    outline.reserve(2 * TraceBins::BinCount);
+    const auto &bins = m_scene.bins.bins();
+    const auto point = [&](int k, double value) {
+        return QPointF(xOf(plot, k), yOf(pane, drawable(fractionOf(value))));
+    };
+    for (int k = 0; k < TraceBins::BinCount; ++k) {
+        const TraceBin &bin = bins[static_cast<std::size_t>(k)];
+        if (bin.count > 0) {
+            outline += point(k, bin.*upper);
+        }
+    }
+    const qsizetype upperPoints = outline.size();
+    if (lower != nullptr) {
+        for (int k = TraceBins::BinCount - 1; k >= 0; --k) {
+            const TraceBin &bin = bins[static_cast<std::size_t>(k)];
+            if (bin.count > 0) {
+                outline += point(k, bin.*lower);
+            }
+        }
+    }
+    painter.save();
+    painter.setClipRect(pane);
+    painter.setRenderHint(QPainter::Antialiasing);
+    const QColor color = m_style.color(place);
+    painter.setPen(QPen(color, 1));
+    if (lower != nullptr) {
+        painter.setBrush(color);
+        painter.drawPolygon(outline);
+    } else {
+        painter.drawPolyline(outline);
+    }
+    if (m_scene.bins.isSparse()) {
+        constexpr double radius = 1.75;
+        painter.setPen(Qt::NoPen);
+        painter.setBrush(m_style.color(PlotColor::Cursor));
+        for (qsizetype k = 0; k < upperPoints; ++k) {
+            painter.drawEllipse(outline.at(k), radius, radius);
+        }
+    }
+    painter.restore();
+}
+
+void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const QRectF &pane) const
+{
+    const auto &bins = m_scene.bins.bins();
+    for (int row = 0; row < MarkerCount; ++row) {
+        const auto bit = static_cast<quint8>(1U << static_cast<unsigned>(row));
+        const double base = (MarkerCount - 1 - row) * MarkerPitch;
+        const double lowY = grid.snap(yOf(pane, base));
+        const double highY = grid.snap(yOf(pane, base + MarkerHeight));
+        const QColor color =
+            m_style.color(row % 2 == 0 ? PlotColor::PrimaryMarker : PlotColor::SecondaryMarker);
+        const auto edge = [&](double x) {
+            grid.vertical(x, highY, lowY + grid.lineWidth(), color);
+        };
+        int level = -1; // of the line that is being drawn: 0 low, 1 high, -1 none yet
+        double lineStart = 0;
+        for (int k = 0; k < TraceBins::BinCount; ++k) {
+            const TraceBin &bin = bins[static_cast<std::size_t>(k)];
+            if (bin.count == 0) {
+                continue;
+            }
+            const double x = xOf(plot, k);
+            const int binLevel = (bin.mkrHigh & bit) != 0 ? 1 : 0;
+            const bool changes = level >= 0 && binLevel != level;
+            if (level != binLevel) {
+                if (changes) {
+                    grid.horizontal(level == 1 ? highY : lowY, lineStart, x, color);
+                }
+                level = binLevel;
+                lineStart = x;
+            }
+            if (changes || (bin.mkrHigh & bin.mkrLow & bit) != 0) {
+                edge(x);
+            }
+        }
+        if (level >= 0) {
+            grid.horizontal(level == 1 ? highY : lowY, lineStart, plot.right(), color);
+        }
+    }
+}
+
+void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,
+                                const QList<QRectF> &panes) const
+{
+    constexpr double serif = 3;
+    constexpr double flagSize = 7;
+    constexpr int reference = 1;
+    for (int which = 0; which < 2; ++which) {
+        const int bin = m_scene.cursorBins[static_cast<std::size_t>(which)];
+        if (bin < 0 || bin >= TraceBins::BinCount) {
+            continue;
+        }
+        const double x = grid.snap(xOf(plot, bin));
+        const QColor color = m_style.color(which == reference ? PlotColor::SecondaryMarker
+                                                              : PlotColor::PrimaryMarker);
+        for (const QRectF &pane : panes) {
+            const double top = yOf(pane, 0.95);
+            const double bottom = yOf(pane, 0.05);
+            grid.vertical(x, top, bottom, color);
+            if (which == reference) {
+                grid.horizontal(top, x - serif, x + serif + grid.lineWidth(), color);
+                grid.horizontal(bottom, x - serif, x + serif + grid.lineWidth(), color);
+            }
+        }
+    }
+    if (m_scene.mouseBin >= 0 && m_scene.mouseBin < TraceBins::BinCount) {
+        const double x = xOf(plot, m_scene.mouseBin);
+        grid.dashedVertical(x, plot.top(), plot.bottom(), m_style.color(PlotColor::Cursor));
+        drawFlag(painter, x + grid.lineWidth() / 2, plot.bottom() - flagSize, FlagShape::Bottom,
+                 flagSize, m_style.color(PlotColor::Trigger));
+    }
+}
+
+void TracePainter::paintCaptions(QPainter &painter, const QRectF &plot,
+                                 const QList<QRectF> &panes) const
+{
+    QStringList texts;
+    switch (m_scene.mode) {
+    case TraceMode::IqEnvelope:
+        texts = {"I", "Q"};
+        break;
+    case TraceMode::LogMagEnvelope:
+    case TraceMode::LogMagAverage:
+        texts = {"Magnitude"};
+        break;
+    case TraceMode::LinMagAverage:
+        texts = {"Magnitude, full scale 1"};
+        break;
+    case TraceMode::Phase:
+        texts = {"Phase in rad"};
+        break;
+    case TraceMode::Frequency:
+        texts = {"Frequency in rad per sample"};
+        break;
+    }
+    for (qsizetype k = 0; k < texts.size(); ++k) {
+        drawCaption(painter, m_style, panes.at(k), Qt::AlignLeft | Qt::AlignTop, texts.at(k));
+    }
+    if (m_scene.sampleCount > 0 && m_scene.sampleCount < TraceBins::MinSamples) {
+        drawCaption(painter, m_style, plot, Qt::AlignCenter,
+                    tr("A trace needs at least 4 samples, here are %1.",
+                       QString::number(m_scene.sampleCount)));
+    }
+}
+
+QString TracePainter::divisionText() const
+{
+    if (m_scene.sampleCount < 1) {
+        return {};
+    }
+    const double samples = static_cast<double>(m_scene.sampleCount) / Divisions;
+    const QString division =
+        m_scene.clockHz > 0
+            ? formatNumber(samples / m_scene.clockHz, NumberFormat{.unit = "s", .precision = 3})
+            : tr("%1 samples", QString::number(samples));
+    return tr("%1/div", division);
+}

@@ -1,0 +1,14 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "ColorTable.h"
+#include "SpectrumLines.h"
+
+#include <QImage>
+#include <QSize>
+
+/// Paints spectrum lines as a picture of a size in device pixels, time downwards, frequency to the
+/// right. Rows between two lines are mixed of both. Levels below -149 dB and above 0 dB keep the
+/// background colour.
+[[nodiscard]] QImage waterfallImage(const std::vector<SpectrumLines::Line> &lines,
+                                    const ColorTable &colors, const QSize &size);

@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "questions.h"
+
+#include "log/Tracer.h"
+
+#include <QFileInfo>
+#include <QInputDialog>
+#include <QLabel>
+#include <QMessageBox>
+
+bool askYesNo(QWidget *parent, const QString &title, const QString &text)
+{
+    QMessageBox box(QMessageBox::Warning, title, text, QMessageBox::Yes | QMessageBox::No, parent);
+    box.setTextFormat(Qt::PlainText);
+    box.setDefaultButton(QMessageBox::No);
+    return box.exec() == QMessageBox::Yes;
+}
+
+std::optional<QString> askText(QWidget *parent, const QString &title, const QString &label,
+                               const QString &initial)
+{
+    QInputDialog dialog(parent);
+    dialog.setWindowTitle(title);
+    dialog.setLabelText(label);
+    dialog.setTextValue(initial);
+    const QList<QLabel *> labels = dialog.findChildren<QLabel *>();
+    for (QLabel *shown : labels) {
+        shown->setTextFormat(Qt::PlainText);
+    }
+    dialog.resize(360, dialog.sizeHint().height());
+    if (dialog.exec() != QDialog::Accepted) {
+        return std::nullopt;
+    }
+    return dialog.textValue();
+}
+
+bool confirmOverwrite(QWidget *parent, const QString &path)
+{
+    const bool agreed =
+        !QFileInfo::exists(path) ||
+        askYesNo(parent, "Overwrite File",
+                 "The target file already exists.\nDo you want to overwrite this file?");
+    return agreed || Tracer::fail("User break.");
+}

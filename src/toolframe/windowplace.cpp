@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "windowplace.h"
+
+#include <QGuiApplication>
+#include <QScreen>
+#include <QSettings>
+#include <QVariant>
+#include <QWidget>
+
+void writeWindowPlace(QSettings &settings, const QWidget &window)
+{
+    const bool normal = !window.isMaximized() && !window.isFullScreen();
+    settings.setValue("pos", normal ? window.pos() : window.normalGeometry().topLeft());
+    settings.setValue("size", normal ? window.size() : window.normalGeometry().size());
+}
+
+void readWindowPlace(const QSettings &settings, QWidget &window, QPoint position, QSize size)
+{
+    const QVariant storedPosition = settings.value("pos");
+    const QVariant storedSize = settings.value("size");
+    if (storedPosition.canConvert<QPoint>()) {
+        position = storedPosition.toPoint();
+    }
+    if (storedSize.canConvert<QSize>() && !storedSize.toSize().isEmpty()) {
+        size = storedSize.toSize();
+    }
+    const QScreen *screen = QGuiApplication::screenAt(position);
+    if (!screen) {
+        screen = QGuiApplication::primaryScreen();
+        position = screen->availableGeometry().topLeft();
+    }
+    window.resize(size.boundedTo(screen->availableGeometry().size()));
+    window.move(position);
+}

@@ -1,0 +1,661 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Vxi11Peer.h"
+#include "visa/visa.h"
+
+#include <QElapsedTimer>
+#include <QFile>
+#include <QTemporaryDir>
+#include <QTest>
+
+#include <thread>
+
+namespace {
+
+using Result = std::pair<ViStatus, QByteArray>;
+
+// What a call may take beyond its time-out: the grace for the reply, the abort, a busy machine.
+constexpr qint64 SlackMs = 1200;
+
+std::string fragment(std::string_view bytes, bool isLast)
+{
+    const std::uint32_t mark = isLast ? 0x8000'0000U : 0;
+    return bigEndian({static_cast<std::uint32_t>(bytes.size()) | mark}).append(bytes);
+}
+
+} // namespace
+
+/// Instruments on the network and behind GPIB gateways, through the functions of the library.
+class TestVisaVxi11 : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void cleanup();
+    void reads_data();
+    void reads();
+    void readRequests();
+    void writes();
+    void deviceErrors_data();
+    void deviceErrors();
+    void brokenReplies_data();
+    void brokenReplies();
+    void stalledReplies_data();
+    void stalledReplies();
+    void trickledReply();
+    void lateReplyIsDropped();
+    void badOpens_data();
+    void badOpens();
+    void portMapper();
+    void gatewayAndFindList();
+    void clearAndRemote();
+    void printing();
+    void attributes();
+    void closeWakesReader();
+    void sessionsSideBySide();
+    void wrongHandles();
+    void configurationFault();
+
+private:
+    void configure(const QByteArray &text);
+    ViSession open(const Vxi11Peer &peer, ViUInt32 timeoutMs = 5000);
+    static Result read(ViSession session, ViUInt32 size);
+    static ViStatus write(ViSession session, const QByteArray &data, ViUInt32 *count = nullptr);
+
+    QTemporaryDir m_folder;
+    ViSession m_manager = VI_NULL;
+};
+
+void TestVisaVxi11::configure(const QByteArray &text)
+{
+    QFile file(m_folder.filePath("visa.ini"));
+    if (!file.open(QIODevice::WriteOnly) || file.write(text) != text.size())
+        qFatal("cannot write the configuration");
+    file.close();
+    qputenv("CORVANE_VISA_CONFIG", file.fileName().toUtf8());
+    if (viOpenDefaultRM(&m_manager) != VI_SUCCESS)
+        qFatal("cannot open the manager");
+}
+
+ViSession TestVisaVxi11::open(const Vxi11Peer &peer, ViUInt32 timeoutMs)
+{
+    configure("[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " + QByteArray::number(peer.port()));
+    ViSession session = VI_NULL;
+    if (viOpen(m_manager, "TCPIP::127.0.0.1::INSTR", VI_NO_LOCK, 0, &session) != VI_SUCCESS ||
+        viSetAttribute(session, VI_ATTR_TMO_VALUE, timeoutMs) != VI_SUCCESS)
+        qFatal("cannot open the peer");
+    return session;
+}
+
+void TestVisaVxi11::cleanup()
+{
+    if (m_manager != VI_NULL)
+        viClose(m_manager);
+    m_manager = VI_NULL;
+}
+
+Result TestVisaVxi11::read(ViSession session, ViUInt32 size)
+{
+    QByteArray buffer(qsizetype(size), '\0');
+    ViUInt32 count = 0;
+    const ViStatus status =
+        viRead(session, reinterpret_cast<ViByte *>(buffer.data()), size, &count);
+    return {status, buffer.left(count)};
+}
+
+ViStatus TestVisaVxi11::write(ViSession session, const QByteArray &data, ViUInt32 *count)
+{
+    return viWrite(session, reinterpret_cast<const ViByte *>(data.data()), ViUInt32(data.size()),
+                   count);
+}
+
+void TestVisaVxi11::reads_data()
+{
+    // Replies: error, reason, data.
+    using Reply = std::tuple<std::uint32_t, std::uint32_t, QByteArray>;
+    QTest::addColumn<QList<Reply>>("replies");
+    QTest::addColumn<int>("size");
+    QTest::addColumn<bool>("hasTerminator");
+    QTest::addColumn<bool>("suppressesEnd");
+    QTest::addColumn<Result>("result");
+
+    const auto row = [](const char *name, const QList<Reply> &replies, int size,
+                        const Result &result, bool hasTerminator = false,
+                        bool suppressesEnd = false) {
+        QTest::newRow(name) << replies << size << hasTerminator << suppressesEnd << result;
+    };
+    constexpr auto Count = Vxi11Peer::ReasonCount, Character = Vxi11Peer::ReasonTerminator,
+                   End = Vxi11Peer::ReasonEnd;
+    row("end", {{0, End, "abc"}}, 10, {VI_SUCCESS, "abc"});
+    row("empty message", {{0, End, ""}}, 10, {VI_SUCCESS, ""});
+    row("count", {{0, Count, "abc"}}, 3, {VI_SUCCESS_MAX_CNT, "abc"});
+    row("count without reason", {{0, 0, "abc"}}, 3, {VI_SUCCESS_MAX_CNT, "abc"});
+    row("end and count", {{0, End | Count, "abc"}}, 3, {VI_SUCCESS, "abc"});
+    row("terminator", {{0, Character, "ab\n"}}, 10, {VI_SUCCESS_TERM_CHAR, "ab\n"}, true);
+    row("terminator and count", {{0, Character | Count, "ab\n"}}, 3, {VI_SUCCESS_TERM_CHAR, "ab\n"},
+        true);
+    row("terminator and end", {{0, Character | End, "ab\n"}}, 10, {VI_SUCCESS, "ab\n"}, true);
+    row("terminator not asked", {{0, Character, "a\n"}, {0, End, "b"}}, 10, {VI_SUCCESS, "a\nb"});
+    row("partial", {{0, 0, "ab"}, {0, 0, ""}, {0, Count, "c"}, {0, End, "d"}}, 10,
+        {VI_SUCCESS, "abcd"});
+    row("partial up to the count", {{0, 0, "ab"}, {0, Count, "cd"}}, 4,
+        {VI_SUCCESS_MAX_CNT, "abcd"});
+    row("end suppressed", {{0, End, "ab"}, {0, End, "cd"}}, 4, {VI_SUCCESS_MAX_CNT, "abcd"}, false,
+        true);
+    row("error behind data", {{0, 0, "ab"}, {17, 0, "c"}}, 10, {VI_ERROR_IO, "abc"});
+    row("instrument timed out", {{15, 0, ""}}, 10, {VI_ERROR_TMO, ""});
+    row("more than asked", {{0, End, "abcdef"}}, 3, {VI_ERROR_IO, ""});
+    row("nothing for ever", QList<Reply>(40, {0, 0, ""}), 10, {VI_ERROR_IO, ""});
+}
+
+void TestVisaVxi11::reads()
+{
+    using Reply = std::tuple<std::uint32_t, std::uint32_t, QByteArray>;
+    QFETCH(QList<Reply>, replies);
+    QFETCH(int, size);
+    QFETCH(bool, hasTerminator);
+    QFETCH(bool, suppressesEnd);
+    QFETCH(Result, result);
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Read || replies.isEmpty())
+            return false;
+        const auto [error, reason, data] = replies.takeFirst();
+        connection.send(call.reply(Vxi11Peer::readReply(error, reason, data.toStdString())));
+        return true;
+    });
+    const ViSession session = open(peer);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, hasTerminator ? 1 : 0), VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_SUPPRESS_END_EN, suppressesEnd ? 1 : 0), VI_SUCCESS);
+    const Result actual = read(session, ViUInt32(size));
+    QCOMPARE(actual.second, result.second);
+    QCOMPARE(actual.first, result.first);
+}
+
+void TestVisaVxi11::readRequests()
+{
+    const Vxi11Peer peer;
+    const ViSession session = open(peer, 4321);
+    QCOMPARE(read(session, 32767).first, VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR, ';'), VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, VI_TRUE), VI_SUCCESS);
+    QCOMPARE(read(session, 5).first, VI_SUCCESS);
+    QCOMPARE(read(session, 0).first, VI_SUCCESS); // without a call
+    const auto calls = peer.calls(Vxi11Peer::Read);
+    QCOMPARE(calls.size(), std::size_t{2});
+    // Link, size, time-out, lock time-out, flags, terminator.
+    QCOMPARE(calls[0].word(0), Vxi11Peer::Link);
+    QCOMPARE(calls[0].word(1), 32767U);
+    QVERIFY(calls[0].word(2) > 3000 && calls[0].word(2) <= 4321);
+    QCOMPARE(calls[0].word(4), 0U);
+    QCOMPARE(calls[1].word(1), 5U);
+    QCOMPARE(calls[1].word(4), 128U);
+    QCOMPARE(calls[1].word(5), std::uint32_t{';'});
+}
+
+void TestVisaVxi11::writes()
+{
+    // Takes 100 bytes of the second call only, and refuses the tenth and all behind it.
+    int writeCount = 0;
+    Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Write)
+            return false;
+        ++writeCount;
+        const std::uint32_t error = writeCount < 10 ? 0 : 15;
+        const std::uint32_t taken = writeCount == 2 ? 100 : (writeCount == 10 ? 5 : call.word(4));
+        connection.send(call.reply(bigEndian({error, taken})));
+        return true;
+    });
+    peer.maxReceiveSize = 1000;
+    const ViSession session = open(peer);
+    QByteArray data;
+    for (int i = 0; i < 2500; ++i)
+        data += char(i);
+    ViUInt32 count = 0;
+    QCOMPARE(write(session, data, &count), VI_SUCCESS);
+    QCOMPARE(count, 2500U);
+
+    std::string received;
+    QList<std::uint32_t> flags;
+    for (const PeerCall &call : peer.calls(Vxi11Peer::Write)) {
+        received += call.data(4).substr(0, flags.size() == 1 ? 100 : std::string::npos);
+        flags << call.word(3);
+    }
+    QCOMPARE(QByteArray::fromStdString(received), data);
+    // 1000, 100 of 1000, 1000, the last 400 with END.
+    QCOMPARE(flags, (QList<std::uint32_t>{0, 0, 0, 8}));
+
+    QCOMPARE(viSetAttribute(session, VI_ATTR_SEND_END_EN, VI_FALSE), VI_SUCCESS);
+    QCOMPARE(write(session, "no end"), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::Write).back().word(3), 0U);
+    QCOMPARE(write(session, ""), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::Write).size(), std::size_t{5});
+
+    QCOMPARE(write(session, data, &count), VI_SUCCESS);
+    QCOMPARE(write(session, QByteArray(2500, 'x'), &count), VI_ERROR_TMO);
+    QCOMPARE(count, 1005U); // the ninth and five bytes of the tenth
+}
+
+void TestVisaVxi11::deviceErrors_data()
+{
+    QTest::addColumn<std::uint32_t>("error");
+    QTest::addColumn<ViStatus>("status");
+    QTest::newRow("invalid link") << 4U << VI_ERROR_CONN_LOST;
+    QTest::newRow("not supported") << 8U << VI_ERROR_NSUP_OPER;
+    QTest::newRow("locked") << 11U << VI_ERROR_RSRC_LOCKED;
+    QTest::newRow("time-out") << 15U << VI_ERROR_TMO;
+    QTest::newRow("input/output") << 17U << VI_ERROR_IO;
+    QTest::newRow("abort") << 23U << VI_ERROR_ABORT;
+    QTest::newRow("unknown") << 0xFFFF'FFFFU << VI_ERROR_IO;
+}
+
+void TestVisaVxi11::deviceErrors()
+{
+    QFETCH(std::uint32_t, error);
+    QFETCH(ViStatus, status);
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Clear && call.procedure != Vxi11Peer::Write)
+            return false;
+        connection.send(call.reply(bigEndian({error, 0})));
+        return true;
+    });
+    const ViSession session = open(peer);
+    QCOMPARE(viClear(session), status);
+    QCOMPARE(write(session, "*CLS"), status);
+}
+
+void TestVisaVxi11::brokenReplies_data()
+{
+    // What the peer sends for a read before it closes; %T stands for the transaction.
+    QTest::addColumn<QByteArray>("bytes");
+    QTest::addColumn<ViStatus>("status");
+    const auto row = [](const char *name, const char *hex, ViStatus status) {
+        QTest::newRow(name) << QByteArray(hex) << status;
+    };
+    const char *accepted = "%T 00000001 00000000 00000000 00000000 00000000 ";
+    row("closed at once", "", VI_ERROR_CONN_LOST);
+    row("closed in the mark", "8000", VI_ERROR_CONN_LOST);
+    row("closed in the record", "80000040 %T 00000001", VI_ERROR_CONN_LOST);
+    row("closed between fragments", "00000004 %T", VI_ERROR_CONN_LOST);
+    row("2 GiB announced", "ffffffff %T 00000001", VI_ERROR_IO);
+    row("2 GiB in a second fragment", "00000004 %T 7fffffff", VI_ERROR_IO);
+    row("too short for a reply", "80000004 %T", VI_ERROR_IO);
+    row("a call", "80000008 %T 00000000", VI_ERROR_IO);
+    row("denied", "80000010 %T 00000001 00000001 00000000", VI_ERROR_IO);
+    row("garbage arguments", "80000018 %T 00000001 00000000 00000000 00000000 00000004",
+        VI_ERROR_IO);
+    row("no such procedure", "80000018 %T 00000001 00000000 00000000 00000000 00000003",
+        VI_ERROR_NSUP_OPER);
+    row("no results", QByteArray("80000018 ").append(accepted), VI_ERROR_IO);
+    row("data cut",
+        QByteArray("80000028 ").append(accepted).append("00000000 00000004 00000008 61626364"),
+        VI_ERROR_IO);
+    row("data of 4 GiB",
+        QByteArray("80000028 ").append(accepted).append("00000000 00000004 ffffffff 61626364"),
+        VI_ERROR_IO);
+    row("data of 16 MiB",
+        QByteArray("80000028 ").append(accepted).append("00000000 00000004 01000000 61626364"),
+        VI_ERROR_IO);
+}
+
+void TestVisaVxi11::brokenReplies()
+{
+    QFETCH(QByteArray, bytes);
+    QFETCH(ViStatus, status);
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Read)
+            return false;
+        const QByteArray transaction = QByteArray::fromStdString(bigEndian({call.transaction}));
+        const QByteArray hex = QByteArray(bytes).replace("%T", transaction.toHex());
+        connection.send(QByteArray::fromHex(hex).toStdString());
+        connection.shutDown();
+        return true;
+    });
+    const ViSession session = open(peer);
+    QElapsedTimer timer;
+    timer.start();
+    QCOMPARE(read(session, 100), Result(status, QByteArray()));
+    QVERIFY2(timer.elapsed() < 4000, "the call waited for more than the peer could send");
+    QCOMPARE(read(session, 100), Result(VI_ERROR_CONN_LOST, QByteArray()));
+    QCOMPARE(viClear(session), VI_ERROR_CONN_LOST);
+    QCOMPARE(viClose(session), VI_SUCCESS);
+}
+
+void TestVisaVxi11::stalledReplies_data()
+{
+    QTest::addColumn<QByteArray>("bytes");
+    QTest::newRow("silent") << QByteArray();
+    QTest::newRow("stops in the mark") << QByteArray::fromHex("8000");
+    QTest::newRow("stops in the record") << QByteArray::fromHex("8000004000");
+    QTest::newRow("empty fragments") << QByteArray(4000, '\0');
+}
+
+void TestVisaVxi11::stalledReplies()
+{
+    QFETCH(QByteArray, bytes);
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure == Vxi11Peer::CreateLink || call.program != 0x0607AF)
+            return false;
+        connection.send(bytes.toStdString());
+        return true;
+    });
+    const ViSession session = open(peer, 300);
+    QElapsedTimer timer;
+    timer.start();
+    QCOMPARE(read(session, 100), Result(VI_ERROR_TMO, QByteArray()));
+    QVERIFY2(timer.elapsed() >= 290, "the call gave up too soon");
+    QVERIFY2(timer.elapsed() < 300 + SlackMs, "the call took too long");
+    // The instrument is told that nobody waits any more.
+    QVERIFY(peer.waitForCalls(Vxi11Peer::Abort, 1));
+    QCOMPARE(peer.calls(Vxi11Peer::Abort).front().word(0), Vxi11Peer::Link);
+    QCOMPARE(peer.calls(Vxi11Peer::Abort).front().program, 0x0607B0U);
+    timer.restart();
+    QCOMPARE(viClose(session), VI_SUCCESS);
+    QVERIFY2(timer.elapsed() < 1000 + SlackMs, "closing took too long");
+}
+
+void TestVisaVxi11::trickledReply()
+{
+    // Bytes come all the time, but the reply never gets complete: the time-out is for the whole.
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Read)
+            return false;
+        connection.send(bigEndian({0x800F'0000U}));
+        while (connection.send("x"))
+            std::this_thread::yield();
+        return true;
+    });
+    const ViSession session = open(peer, 300);
+    QElapsedTimer timer;
+    timer.start();
+    const Result result = read(session, 100);
+    QVERIFY(result.first == VI_ERROR_TMO || result.first == VI_ERROR_IO);
+    QVERIFY2(timer.elapsed() < 300 + SlackMs, "the call took too long");
+}
+
+void TestVisaVxi11::lateReplyIsDropped()
+{
+    // The first read is answered only when the second comes, in two fragments, with its answer.
+    std::string late;
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure != Vxi11Peer::Read)
+            return false;
+        const std::string reply = call.reply(Vxi11Peer::readReply(0, 4, late.empty() ? "1" : "2"));
+        if (late.empty()) {
+            late = fragment(reply.substr(4, 10), false) + fragment(reply.substr(14), true);
+            connection.send(late.substr(0, 9)); // the reader stops in the middle of a record
+            late.erase(0, 9);
+        } else {
+            connection.send(late + reply);
+        }
+        return true;
+    });
+    const ViSession session = open(peer, 200);
+    QCOMPARE(read(session, 100), Result(VI_ERROR_TMO, QByteArray()));
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TMO_VALUE, 5000), VI_SUCCESS);
+    QCOMPARE(read(session, 100), Result(VI_SUCCESS, "2"));
+}
+
+void TestVisaVxi11::badOpens_data()
+{
+    QTest::addColumn<QByteArray>("results"); // of create_link; empty: no answer
+    QTest::addColumn<ViStatus>("status");
+    const auto row = [](const char *name, const std::string &results, ViStatus status) {
+        QTest::newRow(name) << QByteArray::fromStdString(results) << status;
+    };
+    row("no such device", bigEndian({3, 0, 0, 0}), VI_ERROR_RSRC_NFOUND);
+    row("device name not understood", bigEndian({1, 0, 0, 0}), VI_ERROR_RSRC_NFOUND);
+    row("locked", bigEndian({11, 0, 0, 0}), VI_ERROR_RSRC_LOCKED);
+    row("no more links", bigEndian({9, 0, 0, 0}), VI_ERROR_ALLOC);
+    row("cut", bigEndian({0, 7}), VI_ERROR_IO);
+    row("silent", "", VI_ERROR_TMO);
+}
+
+void TestVisaVxi11::badOpens()
+{
+    QFETCH(QByteArray, results);
+    QFETCH(ViStatus, status);
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (!results.isEmpty())
+            connection.send(call.reply(results.toStdString()));
+        return true;
+    });
+    configure("[general]\nopen_timeout_ms = 400\n[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " +
+              QByteArray::number(peer.port()));
+    ViSession session = 1;
+    QElapsedTimer timer;
+    timer.start();
+    QCOMPARE(viOpen(m_manager, "TCPIP0::127.0.0.1", 0, 0, &session), status);
+    QVERIFY2(timer.elapsed() < 400 + SlackMs, "opening took too long");
+    QCOMPARE(session, ViSession{VI_NULL});
+}
+
+void TestVisaVxi11::portMapper()
+{
+    // The well-known port needs rights that not every tester has.
+    std::string answer;
+    std::mutex mutex;
+    const Vxi11Peer device;
+    const ScriptedPeer mapper(
+        [&](PeerConnection &connection) {
+            const std::string call = connection.receive(4 + 40 + 16);
+            const std::lock_guard lock(mutex);
+            // Program, version, TCP.
+            if (call.substr(44, 12) != bigEndian({0x0607AF, 1, 6}))
+                return;
+            connection.send(bigEndian({0x8000'001CU}) + call.substr(4, 4) +
+                            bigEndian({1, 0, 0, 0, 0}) + answer);
+            connection.waitForClose();
+        },
+        "127.0.0.9", 111);
+    if (mapper.port() == 0)
+        QSKIP("port 111 cannot be opened by this user");
+    configure("");
+    ViSession session = VI_NULL;
+    const auto open = [&](std::uint32_t port) {
+        {
+            const std::lock_guard lock(mutex);
+            answer = bigEndian({port});
+        }
+        return viOpen(m_manager, "TCPIP::127.0.0.9::INSTR", 0, 1000, &session);
+    };
+    QCOMPARE(open(0), VI_ERROR_RSRC_NFOUND);
+    QCOMPARE(open(70000), VI_ERROR_IO);
+    // The device listens on 127.0.0.1 only, so its port is known here but refuses.
+    QCOMPARE(open(device.port()), VI_ERROR_RSRC_NFOUND);
+    QCOMPARE(device.connectionCount(), 0);
+}
+
+void TestVisaVxi11::gatewayAndFindList()
+{
+    const Vxi11Peer peer;
+    configure("[GPIB0]\nhost = 127.0.0.1\nport = " + QByteArray::number(peer.port()) +
+              "\naddresses = 28, 5\n[TCPIP::127.0.0.1::inst0]\n[TCPIP::127.0.0.1::5025::SOCKET]\n");
+    const auto find = [&](const char *expression) {
+        QByteArrayList found;
+        ViFindList list = VI_NULL;
+        ViUInt32 count = 0;
+        char text[VI_FIND_BUFLEN] = "";
+        ViStatus status = viFindRsrc(m_manager, expression, &list, &count, text);
+        for (; status == VI_SUCCESS; status = viFindNext(list, text))
+            found << text;
+        if (status != VI_ERROR_RSRC_NFOUND || found.size() != qsizetype(count))
+            found << "status or count wrong";
+        return found;
+    };
+    QCOMPARE(find("GPIB?*INSTR"), (QByteArrayList{"GPIB0::5::INSTR", "GPIB0::28::INSTR"}));
+    QCOMPARE(find("TCPIP?*INSTR"), (QByteArrayList{"TCPIP0::127.0.0.1::inst0::INSTR"}));
+    QCOMPARE(find("?*SOCKET"), (QByteArrayList{"TCPIP0::127.0.0.1::5025::SOCKET"}));
+    QCOMPARE(find("USB[0-9]::0x7FE3::?*INSTR"), QByteArrayList());
+    char text[VI_FIND_BUFLEN] = "";
+    QCOMPARE(viFindRsrc(m_manager, "GPIB(", nullptr, nullptr, text), VI_ERROR_INV_EXPR);
+    QCOMPARE(viFindRsrc(m_manager, "?*", nullptr, nullptr, text), VI_SUCCESS);
+
+    ViSession session = VI_NULL;
+    QCOMPARE(viOpen(m_manager, "GPIB0::28::INSTR", 0, 0, &session), VI_SUCCESS);
+    ViUInt16 number = 0;
+    QCOMPARE(viGetAttribute(session, VI_ATTR_INTF_TYPE, &number), VI_SUCCESS);
+    QCOMPARE(int{number}, VI_INTF_GPIB);
+    QCOMPARE(viGetAttribute(session, VI_ATTR_GPIB_PRIMARY_ADDR, &number), VI_SUCCESS);
+    QCOMPARE(int{number}, 28);
+    QCOMPARE(viOpen(m_manager, "GPIB0::7::96", 0, 0, &session), VI_SUCCESS);
+    const auto links = peer.calls(Vxi11Peer::CreateLink);
+    QCOMPARE(links[0].data(3), std::string("gpib0,28"));
+    QCOMPARE(links[1].data(3), std::string("gpib0,7,96"));
+    QCOMPARE(viOpen(m_manager, "GPIB1::28::INSTR", 0, 0, &session), VI_ERROR_INTF_NUM_NCONFIG);
+}
+
+void TestVisaVxi11::clearAndRemote()
+{
+    const Vxi11Peer peer;
+    const ViSession session = open(peer);
+    QCOMPARE(viClear(session), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::Clear).size(), std::size_t{1});
+    QCOMPARE(peer.calls(Vxi11Peer::Clear)[0].word(0), Vxi11Peer::Link);
+    QCOMPARE(viGpibControlREN(session, VI_GPIB_REN_DEASSERT_GTL), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::Local).size(), std::size_t{1});
+    QCOMPARE(viGpibControlREN(session, VI_GPIB_REN_ASSERT_ADDRESS_LLO), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::Remote).size(), std::size_t{1});
+    QCOMPARE(viGpibControlREN(session, 7), VI_ERROR_INV_MODE);
+    QCOMPARE(viClose(session), VI_SUCCESS);
+    QCOMPARE(peer.calls(Vxi11Peer::DestroyLink).size(), std::size_t{1});
+    QCOMPARE(viClear(session), VI_ERROR_INV_OBJECT);
+}
+
+void TestVisaVxi11::printing()
+{
+    const Vxi11Peer peer;
+    const ViSession session = open(peer);
+    QCOMPARE(viPrintf(session, ":SYST:ERR?"), VI_SUCCESS);
+    QCOMPARE(viPrintf(session, "LEV 5%%\\nFREQ?"), VI_SUCCESS);
+    QCOMPARE(viPrintf(session, "LEV %d", 5), VI_ERROR_INV_FMT);
+    QByteArrayList messages;
+    for (const PeerCall &call : peer.calls(Vxi11Peer::Write)) {
+        QCOMPARE(call.word(3), 8U);
+        messages << QByteArray::fromStdString(call.data(4));
+    }
+    QCOMPARE(messages, (QByteArrayList{":SYST:ERR?", "LEV 5%\n", "FREQ?"}));
+}
+
+void TestVisaVxi11::attributes()
+{
+    const Vxi11Peer peer;
+    configure("[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " + QByteArray::number(peer.port()));
+    ViSession session = VI_NULL;
+    QCOMPARE(viOpen(m_manager, "tcpip::127.0.0.1", 0, 0, &session), VI_SUCCESS);
+
+    const auto number = [&](ViAttr attribute, auto start) {
+        return viGetAttribute(session, attribute, &start) == VI_SUCCESS ? int(start) : -1;
+    };
+    // The values at start.
+    QCOMPARE(number(VI_ATTR_TMO_VALUE, ViUInt32{9}), 2000);
+    QCOMPARE(number(VI_ATTR_SEND_END_EN, ViUInt16{9}), 1);
+    QCOMPARE(number(VI_ATTR_SUPPRESS_END_EN, ViUInt16{9}), 0);
+    QCOMPARE(number(VI_ATTR_TERMCHAR_EN, ViUInt16{9}), 0);
+    QCOMPARE(number(VI_ATTR_TERMCHAR, ViUInt8{9}), 10);
+    QCOMPARE(number(VI_ATTR_WR_BUF_OPER_MODE, ViUInt16{9}), VI_FLUSH_WHEN_FULL);
+    QCOMPARE(number(VI_ATTR_RD_BUF_OPER_MODE, ViUInt16{9}), VI_FLUSH_DISABLE);
+    QCOMPARE(number(VI_ATTR_INTF_TYPE, ViUInt16{9}), VI_INTF_TCPIP);
+    QCOMPARE(number(VI_ATTR_INTF_NUM, ViUInt16{9}), 0);
+    char text[VI_FIND_BUFLEN] = "";
+    QCOMPARE(viGetAttribute(session, VI_ATTR_RSRC_NAME, text), VI_SUCCESS);
+    QCOMPARE(text, "TCPIP0::127.0.0.1::inst0::INSTR");
+
+    // The set-up of a session by the workbench, in its order.
+    QCOMPARE(viClear(session), VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TMO_VALUE, 5000), VI_SUCCESS);
+    QCOMPARE(viSetBuf(session, VI_WRITE_BUF, 2048), VI_SUCCESS);
+    QCOMPARE(viSetBuf(session, VI_READ_BUF, 4096), VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_WR_BUF_OPER_MODE, 1), VI_SUCCESS);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_RD_BUF_OPER_MODE, 1), VI_SUCCESS);
+    QCOMPARE(number(VI_ATTR_TMO_VALUE, ViUInt32{9}), 5000);
+    QCOMPARE(number(VI_ATTR_WR_BUF_SIZE, ViUInt32{9}), 2048);
+    QCOMPARE(number(VI_ATTR_WR_BUF_OPER_MODE, ViUInt16{9}), 1);
+
+    QCOMPARE(viSetAttribute(session, VI_ATTR_SEND_END_EN, 2), VI_ERROR_NSUP_ATTR_STATE);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR, 256), VI_ERROR_NSUP_ATTR_STATE);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_WR_BUF_OPER_MODE, 3), VI_ERROR_NSUP_ATTR_STATE);
+    QCOMPARE(viSetAttribute(session, VI_ATTR_INTF_TYPE, 1), VI_ERROR_ATTR_READONLY);
+    QCOMPARE(viSetAttribute(session, 0x3FFF0000U, 1), VI_ERROR_NSUP_ATTR);
+    QCOMPARE(viSetBuf(session, 4, 100), VI_ERROR_INV_MASK);
+    QCOMPARE(viSetBuf(session, 0, 100), VI_ERROR_INV_MASK);
+}
+
+void TestVisaVxi11::closeWakesReader()
+{
+    const Vxi11Peer peer([](PeerConnection &, const PeerCall &call) {
+        return call.procedure == Vxi11Peer::Read; // never answers
+    });
+    const ViSession session = open(peer, VI_TMO_INFINITE);
+    Result result;
+    std::thread reader([&] { result = read(session, 100); });
+    QVERIFY(peer.waitForCalls(Vxi11Peer::Read, 1));
+    QElapsedTimer timer;
+    timer.start();
+    QCOMPARE(viClose(session), VI_SUCCESS);
+    QVERIFY2(timer.elapsed() < 1000 + SlackMs, "closing waited for the reader");
+    reader.join();
+    QCOMPARE(result, Result(VI_ERROR_ABORT, QByteArray()));
+}
+
+void TestVisaVxi11::sessionsSideBySide()
+{
+    // One stalls; the other goes on meanwhile, in a thread of its own.
+    const Vxi11Peer peer([](PeerConnection &, const PeerCall &call) {
+        return call.procedure == Vxi11Peer::Read && call.word(1) == 13;
+    });
+    const ViSession stalled = open(peer, VI_TMO_INFINITE);
+    ViSession other = VI_NULL;
+    QCOMPARE(viOpen(m_manager, "TCPIP::127.0.0.1::INSTR", 0, 0, &other), VI_SUCCESS);
+    std::thread reader([&] { (void)read(stalled, 13); });
+    QVERIFY(peer.waitForCalls(Vxi11Peer::Read, 1));
+    for (int i = 0; i < 100; ++i) {
+        QCOMPARE(write(other, "*IDN?"), VI_SUCCESS);
+        QCOMPARE(read(other, 100).first, VI_SUCCESS);
+    }
+    // A second call on the stalled session waits for its turn, but not beyond its time-out.
+    QCOMPARE(viSetAttribute(stalled, VI_ATTR_TMO_VALUE, 100), VI_SUCCESS);
+    QCOMPARE(write(stalled, "*IDN?"), VI_ERROR_TMO);
+    QCOMPARE(viClose(stalled), VI_SUCCESS);
+    reader.join();
+}
+
+void TestVisaVxi11::wrongHandles()
+{
+    const Vxi11Peer peer;
+    const ViSession session = open(peer);
+    char text[VI_FIND_BUFLEN] = "";
+    QCOMPARE(viClear(m_manager), VI_ERROR_NSUP_OPER);
+    QCOMPARE(viClear(VI_NULL), VI_ERROR_INV_OBJECT);
+    QCOMPARE(viFindNext(session, text), VI_ERROR_INV_OBJECT);
+    QCOMPARE(viFindRsrc(session, "?*", nullptr, nullptr, text), VI_ERROR_INV_OBJECT);
+    QCOMPARE(viClose(session + 100), VI_ERROR_INV_OBJECT);
+    QCOMPARE(viRead(session, nullptr, 5, nullptr), VI_ERROR_USER_BUF);
+    QCOMPARE(viGetAttribute(session, VI_ATTR_TMO_VALUE, nullptr), VI_ERROR_USER_BUF);
+    // The manager takes its sessions with it.
+    QCOMPARE(viClose(m_manager), VI_SUCCESS);
+    m_manager = VI_NULL;
+    QCOMPARE(viClear(session), VI_ERROR_INV_OBJECT);
+    QCOMPARE(peer.calls(Vxi11Peer::DestroyLink).size(), std::size_t{1});
+}
+
+void TestVisaVxi11::configurationFault()
+{
+    QFile file(m_folder.filePath("broken.ini"));
+    QVERIFY(file.open(QIODevice::WriteOnly));
+    file.write("[GPIB0]\nhost = a\nport = none\n");
+    file.close();
+    qputenv("CORVANE_VISA_CONFIG", file.fileName().toUtf8());
+    ViSession manager = 1;
+    QCOMPARE(viOpenDefaultRM(&manager), VI_ERROR_INV_SETUP);
+    QCOMPARE(manager, ViSession{VI_NULL});
+    char text[VI_FIND_BUFLEN] = "";
+    QCOMPARE(viStatusDesc(manager, VI_ERROR_INV_SETUP, text), VI_SUCCESS);
+    QCOMPARE(QByteArray(text), "The configuration file '" + file.fileName().toUtf8() +
+                                   "' has a fault in line 3: port 'none' is not 1 to 65535.");
+    QCOMPARE(viStatusDesc(VI_NULL, VI_ERROR_TMO, text), VI_SUCCESS);
+    QCOMPARE(text, "The time-out expired before the operation was completed.");
+    QCOMPARE(viStatusDesc(VI_NULL, 0x12345678, text), VI_WARN_UNKNOWN_STATUS);
+    QCOMPARE(text, "Unknown status code 0x12345678.");
+}
+
+QTEST_APPLESS_MAIN(TestVisaVxi11)
+#include "tst_visa_vxi11.moc"

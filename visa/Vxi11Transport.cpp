@@ -1,0 +1,264 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Vxi11Transport.h"
+
+#include "portMapper.h"
+
+#include <unistd.h>
+#include <vxi11.h>
+
+#include <algorithm>
+#include <cstring>
+
+namespace visa {
+
+namespace {
+
+// Both fit the largest record that RpcConnection takes.
+constexpr std::size_t LargestRead = 1U << 20U;
+constexpr std::size_t LargestWrite = 1U << 20U;
+
+// The instrument watches the same time-out as this side; its word that it ran out needs a moment
+// for the way back.
+constexpr ViUInt32 ReplyGraceMs = 250;
+constexpr ViUInt32 AbortMs = 100;
+constexpr ViUInt32 DestroyLinkMs = 1000;
+
+// Replies without error and without a byte moved, after which the peer counts as broken.
+constexpr int MostIdleReplies = 16;
+
+ViStatus statusOf(Device_ErrorCode error)
+{
+    switch (error) {
+    case DEVICE_ERROR_NONE:
+        return VI_SUCCESS;
+    case DEVICE_ERROR_NOT_ACCESSIBLE:
+    case DEVICE_ERROR_INVALID_ADDRESS:
+        return VI_ERROR_RSRC_NFOUND;
+    case DEVICE_ERROR_INVALID_LINK:
+        return VI_ERROR_CONN_LOST;
+    case DEVICE_ERROR_SYNTAX:
+    case DEVICE_ERROR_PARAMETER:
+        return VI_ERROR_INV_PARAMETER;
+    case DEVICE_ERROR_NOT_SUPPORTED:
+        return VI_ERROR_NSUP_OPER;
+    case DEVICE_ERROR_OUT_OF_RESOURCES:
+        return VI_ERROR_ALLOC;
+    case DEVICE_ERROR_LOCKED_BY_OTHER:
+        return VI_ERROR_RSRC_LOCKED;
+    case DEVICE_ERROR_TIMEOUT:
+        return VI_ERROR_TMO;
+    case DEVICE_ERROR_ABORT:
+        return VI_ERROR_ABORT;
+    default:
+        return VI_ERROR_IO;
+    }
+}
+
+constexpr RpcProcedure coreProcedure(std::uint32_t number)
+{
+    return {DEVICE_CORE, DEVICE_CORE_VERSION, number};
+}
+
+} // namespace
+
+Vxi11Transport::Vxi11Transport(const Vxi11Address &address)
+    : m_address(address)
+    , m_core(m_waker)
+{
+}
+
+Vxi11Transport::~Vxi11Transport()
+{
+    if (!m_hasLink || !m_core.isOpen())
+        return;
+    // Waits for the answer, so that who opens the instrument again at once finds it free. An
+    // interrupted session does not wait; the end of the connection frees the link then.
+    XdrValue<Device_Error> reply(xdr_Device_Error);
+    (void)m_core.call<Device_Link, Device_Error>(coreProcedure(destroy_link), xdr_Device_Link,
+                                                 m_link, 0, reply, Deadline::after(DestroyLinkMs));
+}
+
+ViStatus Vxi11Transport::open(const Vxi11Address &address, const Deadline &deadline,
+                              std::unique_ptr<Transport> &transport)
+{
+    std::unique_ptr<Vxi11Transport> opened(new Vxi11Transport(address));
+    if (const ViStatus status = opened->connect(deadline); status != VI_SUCCESS)
+        return status;
+    if (const ViStatus status = opened->createLink(deadline); status != VI_SUCCESS)
+        return status;
+    transport = std::move(opened);
+    return VI_SUCCESS;
+}
+
+ViStatus Vxi11Transport::connect(const Deadline &deadline)
+{
+    if (const ViStatus status = lookUpHost(m_address.host, deadline, m_hostAddresses);
+        status != VI_SUCCESS)
+        return status;
+    std::uint16_t port = m_address.port;
+    if (port == 0) {
+        const ViStatus status =
+            findRpcPort(m_hostAddresses, DEVICE_CORE, DEVICE_CORE_VERSION, m_waker, deadline, port);
+        if (status != VI_SUCCESS)
+            return status;
+    }
+    return m_core.connect(m_hostAddresses, port, deadline);
+}
+
+ViStatus Vxi11Transport::createLink(const Deadline &deadline)
+{
+    Create_LinkParms arguments{};
+    arguments.clientId = static_cast<int>(getpid());
+    arguments.device = m_address.device.data();
+    XdrValue<Create_LinkResp> reply(xdr_Create_LinkResp);
+    const ViStatus status = m_core.call<Create_LinkParms, Create_LinkResp>(
+        coreProcedure(create_link), xdr_Create_LinkParms, arguments, m_address.device.size() + 4,
+        reply, deadline);
+    if (status != VI_SUCCESS)
+        return status;
+    if (reply->error != DEVICE_ERROR_NONE) {
+        const ViStatus refusal = statusOf(reply->error);
+        return refusal == VI_ERROR_INV_PARAMETER ? VI_ERROR_RSRC_NFOUND : refusal;
+    }
+    m_hasLink = true;
+    m_link = reply->lid;
+    m_abortPort = reply->abortPort;
+    // Devices have to take 1024 bytes at least (VXI-11 rule B.6.3); one that names none gets them.
+    m_largestWrite =
+        reply->maxRecvSize == 0 ? 1024 : std::min<std::size_t>(reply->maxRecvSize, LargestWrite);
+    return VI_SUCCESS;
+}
+
+template <typename Arguments, typename Results>
+ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, XdrCode<Arguments> *encode,
+                                    const Arguments &arguments, std::size_t dataSize,
+                                    XdrValue<Results> &results, const Deadline &deadline)
+{
+    const ViStatus status =
+        m_core.call<Arguments, Results>(coreProcedure(procedure), encode, arguments, dataSize,
+                                        results, deadline.extendedBy(ReplyGraceMs));
+    if (status == VI_ERROR_TMO || status == VI_ERROR_ABORT)
+        abortRunningCall();
+    if (status != VI_SUCCESS)
+        return status;
+    return statusOf(results->error);
+}
+
+ViStatus Vxi11Transport::write(std::span<const std::uint8_t> data, bool end,
+                               const Deadline &deadline, std::size_t &count)
+{
+    count = 0;
+    int idleReplies = 0;
+    while (count < data.size()) {
+        const auto part = data.subspan(count, std::min(data.size() - count, m_largestWrite));
+        const bool isLast = count + part.size() == data.size();
+        Device_WriteParms arguments{};
+        arguments.lid = m_link;
+        arguments.io_timeout = deadline.remainingMs();
+        arguments.flags = end && isLast ? DEVICE_FLAG_END : 0;
+        arguments.data.data_len = static_cast<unsigned>(part.size());
+        // Encoding only reads, the structure is shared with decoding.
+        auto *bytes = const_cast<std::uint8_t *>(part.data());
+        arguments.data.data_val = reinterpret_cast<char *>(bytes);
+        XdrValue<Device_WriteResp> reply(xdr_Device_WriteResp);
+        const ViStatus status = callDevice<Device_WriteParms, Device_WriteResp>(
+            device_write, xdr_Device_WriteParms, arguments, part.size() + 4, reply, deadline);
+        if (reply->size > part.size())
+            return VI_ERROR_IO;
+        count += reply->size;
+        if (status != VI_SUCCESS)
+            return status;
+        idleReplies = reply->size == 0 ? idleReplies + 1 : 0;
+        if (idleReplies > MostIdleReplies)
+            return VI_ERROR_IO;
+        if (count < data.size() && deadline.isOver())
+            return VI_ERROR_TMO;
+    }
+    return VI_SUCCESS;
+}
+
+ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions &options,
+                              const Deadline &deadline, std::size_t &count)
+{
+    count = 0;
+    int idleReplies = 0;
+    for (;;) {
+        const std::size_t wanted = std::min(buffer.size() - count, LargestRead);
+        Device_ReadParms arguments{};
+        arguments.lid = m_link;
+        arguments.requestSize = static_cast<unsigned>(wanted);
+        arguments.io_timeout = deadline.remainingMs();
+        if (options.terminator) {
+            arguments.flags = DEVICE_FLAG_TERMCHRSET;
+            arguments.termChar = static_cast<char>(*options.terminator);
+        }
+        XdrValue<Device_ReadResp> reply(xdr_Device_ReadResp);
+        const ViStatus status = callDevice<Device_ReadParms, Device_ReadResp>(
+            device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
+        const std::size_t size = reply->data.data_len;
+        if (size > wanted)
+            return VI_ERROR_IO;
+        if (size > 0)
+            std::memcpy(buffer.data() + count, reply->data.data_val, size);
+        count += size;
+        if (status != VI_SUCCESS)
+            return status;
+        if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd)
+            return VI_SUCCESS;
+        if ((reply->reason & DEVICE_REASON_CHR) != 0 && options.terminator)
+            return VI_SUCCESS_TERM_CHAR;
+        if (count == buffer.size())
+            return VI_SUCCESS_MAX_CNT;
+        idleReplies = size == 0 ? idleReplies + 1 : 0;
+        if (idleReplies > MostIdleReplies)
+            return VI_ERROR_IO;
+        if (deadline.isOver())
+            return VI_ERROR_TMO;
+    }
+}
+
+ViStatus Vxi11Transport::callGeneric(std::uint32_t procedure, const Deadline &deadline)
+{
+    Device_GenericParms arguments{};
+    arguments.lid = m_link;
+    arguments.io_timeout = deadline.remainingMs();
+    XdrValue<Device_Error> reply(xdr_Device_Error);
+    return callDevice<Device_GenericParms, Device_Error>(procedure, xdr_Device_GenericParms,
+                                                         arguments, 0, reply, deadline);
+}
+
+ViStatus Vxi11Transport::clear(const Deadline &deadline)
+{
+    return callGeneric(device_clear, deadline);
+}
+
+ViStatus Vxi11Transport::controlRemote(ViUInt16 mode, const Deadline &deadline)
+{
+    // The protocol knows remote with local lockout, and local; nothing in between.
+    switch (mode) {
+    case VI_GPIB_REN_DEASSERT:
+    case VI_GPIB_REN_DEASSERT_GTL:
+    case VI_GPIB_REN_ADDRESS_GTL:
+        return callGeneric(device_local, deadline);
+    default:
+        return callGeneric(device_remote, deadline);
+    }
+}
+
+void Vxi11Transport::abortRunningCall()
+{
+    if (m_abortPort == 0 || !m_core.isOpen())
+        return;
+    const Deadline deadline = Deadline::after(AbortMs);
+    const Waker ownWaker; // the session's may be what ended the call
+    RpcConnection connection(ownWaker);
+    if (connection.connect(m_hostAddresses, m_abortPort, deadline) != VI_SUCCESS)
+        return;
+    const RpcProcedure abort{DEVICE_ASYNC, DEVICE_ASYNC_VERSION, device_abort};
+    XdrValue<Device_Error> reply(xdr_Device_Error);
+    // The call that was aborted has failed already; that its end could not be told is no news.
+    (void)connection.call<Device_Link, Device_Error>(abort, xdr_Device_Link, m_link, 0, reply,
+                                                     deadline);
+}
+
+} // namespace visa
