@@ -8,9 +8,11 @@
 #include "jobs/DumpJob.h"
 #include "jobs/InfoReport.h"
 #include "jobs/MeasureJob.h"
+#include "jobs/ReportText.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QFile>
+#include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
 
@@ -82,6 +84,10 @@ int runDump(DumpArguments &arguments)
         console.error("Cannot write '" + file.fileName() + "': " + file.errorString());
         exitCode = console.failed();
     }
+    // Nothing in a dump tells a cut one from a whole one.
+    if (exitCode != ExitDone && file.isOpen() && QFileInfo(file).isFile()) {
+        file.remove();
+    }
     return exitCode;
 }
 
@@ -113,11 +119,11 @@ int runMeasure(MeasureArguments &arguments)
                                          {"crest", levels.crest()}})
                    .toJson();
     } else {
-        text =
-            QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
-                              "Peak / RMS:  %.6f dB\n",
-                              levels.samples, levels.peakOffset, levels.rmsOffset, levels.crest())
-                .toLatin1();
+        text = QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
+                                 "Peak / RMS:  %.6f dB\n",
+                                 levels.samples, writtenDb(levels.peakOffset),
+                                 writtenDb(levels.rmsOffset), writtenDb(levels.crest()))
+                   .toLatin1();
     }
     return console.print(text) ? ExitDone : console.failed();
 }
@@ -138,8 +144,7 @@ void addFileCommands(CommandSet &commands)
     addRange(dumpCommand, dump->range);
     addChoice(dumpCommand, "--format", dump->format, {"csv", "cf32", "ci16"},
               "Form of the samples (default: csv)");
-    addText(dumpCommand, "-o,--output", dump->output, "File to write (default: standard output)")
-        ->type_name("FILE");
+    addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)");
     dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
 
     auto measure = std::make_shared<MeasureArguments>(MeasureArguments{commands.console, {}});

@@ -9,7 +9,10 @@
 #include <clocale>
 #include <functional>
 #include <memory>
+#include <sstream>
+#include <string>
 #include <string_view>
+#include <vector>
 
 namespace {
 
@@ -30,10 +33,22 @@ void logToolkitMessage(QtMsgType, const QMessageLogContext &, const QString &tex
     Tracer::Trace(Tracer::Debug, text);
 }
 
+/// A mistyped command or option leaves another one missing; what was typed is the better hint.
+QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
+{
+    const std::vector<std::string> unknown = app.remaining(true);
+    if (unknown.empty()) {
+        return QString::fromLocal8Bit(problem.what());
+    }
+    return QString("'%1' is no command, option or argument known here; see --help.")
+        .arg(QString::fromLocal8Bit(unknown.front()));
+}
+
 } // namespace
 
 int main(int argc, char **argv)
 {
+    Console::reserveStandardStreams();
     qInstallMessageHandler(logToolkitMessage);
     const std::unique_ptr<QCoreApplication> application = makeApplication(argc, argv);
     // Numbers are written with a point, whatever the terminal's language.
@@ -63,9 +78,12 @@ int main(int argc, char **argv)
     } catch (const CLI::ParseError &problem) {
         // The library's own codes tell only help and version, which are no errors, from the rest.
         if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
-            return app.exit(problem);
+            std::ostringstream text;
+            app.exit(problem, text);
+            return console.print(QByteArray::fromStdString(text.str())) ? ExitDone
+                                                                        : console.failed();
         }
-        return console.wrongUsage(QString::fromLocal8Bit(problem.what()));
+        return console.wrongUsage(usageProblem(app, problem));
     }
     console.setQuiet(quiet);
     console.setVerbose(verbose);
