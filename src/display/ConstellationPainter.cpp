@@ -62,7 +62,7 @@ void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
     const QRectF plot = square(area, m_style.font);
     if (!plot.isEmpty()) {
         const PixelGrid pixels(painter);
-        if (static_cast<qsizetype>(m_scene.samples.size()) > DotLimit) {
+        if (m_scene.sampleCount > DotLimit) {
             paintCells(painter, pixels, plot);
         } else {
             paintDots(painter, pixels, plot);
@@ -105,7 +105,7 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
     painter.setClipRect(plot);
-    for (const IqSample &sample : m_scene.samples) {
+    for (const IqSample &sample : m_scene.dots) {
         const double i = sample.i / m_scene.scaleI;
         const double q = sample.q / m_scene.scaleQ;
         if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {

@@ -48,6 +48,12 @@ QMargins SpectrumPainter::margins(const QFont &font, SpectrumMode mode)
             static_cast<int>(std::ceil(right)), static_cast<int>(std::ceil(bottom))};
 }
 
+QSize SpectrumPainter::waterfallSize(const QRectF &plot, double ratio)
+{
+    return {static_cast<int>(std::lround(plot.width() * ratio)),
+            static_cast<int>(std::lround(plot.height() * ratio))};
+}
+
 double SpectrumPainter::xOf(const QRectF &plot, double bin)
 {
     return plot.left() + (bin + 0.5) / Bins * plot.width();
@@ -126,8 +132,7 @@ void SpectrumPainter::paintSpectrum(QPainter &painter, const PixelGrid &pixels, 
 void SpectrumPainter::paintWaterfall(QPainter &painter, const PixelGrid &pixels, const QRectF &area,
                                      const QRectF &plot) const
 {
-    const QSize size(static_cast<int>(std::lround(plot.width() * pixels.ratio())),
-                     static_cast<int>(std::lround(plot.height() * pixels.ratio())));
+    const QSize size = waterfallSize(plot, pixels.ratio());
     if (m_scene.waterfall.size() != size) {
         m_scene.waterfall = waterfallImage(m_scene.lines.lines(), m_scene.colors, size);
     }
@@ -179,10 +184,9 @@ void SpectrumPainter::paintFrequencyAxis(QPainter &painter, const PixelGrid &pix
     painter.setPen(m_style.color(PlotColor::Text));
     for (int k = -divisions; k <= divisions; ++k) {
         const double frequency = k * step;
-        const double x = xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0);
-        if (x > plot.right()) {
-            continue; // the bins end half a bin before the upper edge
-        }
+        // The centres of the bins end half a bin before the upper edge.
+        const double x =
+            std::min(xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0), plot.right());
         pixels.vertical(x, plot.bottom(), plot.bottom() + tick, m_style.color(PlotColor::Grid));
         if (gridAlpha > 0) {
             pixels.vertical(x, plot.top(), plot.bottom(),
