@@ -277,9 +277,11 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
     painter.save();
     painter.setClipRect(pane);
     const QColor color = m_style.color(place);
+    const PixelGrid pixels(painter);
     if (lower != nullptr) {
-        fillBetween(PixelGrid(painter), upperEdge, lowerEdge, pane, color);
+        fillBetween(pixels, upperEdge, lowerEdge, pane, color);
     }
+    painter.translate(pixels.lineWidth() / 2, pixels.lineWidth() / 2); // onto the grid lines
     painter.setRenderHint(QPainter::Antialiasing);
     painter.setPen(QPen(color, 1));
     painter.setBrush(Qt::NoBrush);

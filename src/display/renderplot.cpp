@@ -5,6 +5,7 @@
 #include "SpectrumPainter.h"
 #include "TracePainter.h"
 #include "base/parallel.h"
+#include "plotdraw.h"
 #include "waterfall.h"
 
 #include <QPainter>
@@ -116,7 +117,7 @@ bool paintSpectrum(QPainter &painter, const QRectF &area, const PlotRequest &req
     const PlotStyle style = PlotStyle::current();
     const QRectF plot = area.marginsRemoved(SpectrumPainter::margins(style.font, scene.mode));
     const int rows = scene.mode == SpectrumMode::Waterfall
-                         ? SpectrumPainter::waterfallSize(plot, request.pixelRatio).height()
+                         ? SpectrumPainter::waterfallSize(plot, PixelGrid(painter).ratio()).height()
                          : 0;
     const bool read = readLines(source, rows, scene);
     SpectrumPainter(style, scene).paint(painter, area);
@@ -160,6 +161,26 @@ std::optional<PlotView> plotViewOf(const QString &name)
     return index < 0 ? std::nullopt : std::optional(static_cast<PlotView>(index));
 }
 
+bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
+               SampleSource &source)
+{
+    switch (request.view) {
+    case PlotView::Iq:
+    case PlotView::LogMag:
+    case PlotView::LogAvg:
+    case PlotView::LinAvg:
+    case PlotView::Phase:
+    case PlotView::Frequency:
+        return paintTrace(painter, area, request, source);
+    case PlotView::Spectrum:
+    case PlotView::Waterfall:
+        return paintSpectrum(painter, area, request, source);
+    case PlotView::Constellation:
+        break;
+    }
+    return paintConstellation(painter, area, source);
+}
+
 QImage renderPlot(const PlotRequest &request, SampleSource &source)
 {
     if (request.size.isEmpty() || !(request.pixelRatio > 0)) {
@@ -171,25 +192,7 @@ QImage renderPlot(const PlotRequest &request, SampleSource &source)
     }
     image.setDevicePixelRatio(request.pixelRatio);
     QPainter painter(&image);
-    const QRectF area(QPointF(), QSizeF(request.size));
-    bool done = false;
-    switch (request.view) {
-    case PlotView::Iq:
-    case PlotView::LogMag:
-    case PlotView::LogAvg:
-    case PlotView::LinAvg:
-    case PlotView::Phase:
-    case PlotView::Frequency:
-        done = paintTrace(painter, area, request, source);
-        break;
-    case PlotView::Spectrum:
-    case PlotView::Waterfall:
-        done = paintSpectrum(painter, area, request, source);
-        break;
-    case PlotView::Constellation:
-        done = paintConstellation(painter, area, source);
-        break;
-    }
+    const bool done = paintPlot(painter, QRectF(QPointF(), QSizeF(request.size)), request, source);
     painter.end();
     return done ? image : QImage();
 }

@@ -4,12 +4,15 @@
 #include "SampleSource.h"
 
 #include <QImage>
+#include <QRectF>
 #include <QSize>
 #include <QString>
 #include <QStringList>
 
 #include <optional>
 #include <span>
+
+class QPainter;
 
 /// The pictures that can be made of a waveform.
 enum class PlotView {
@@ -45,6 +48,11 @@ struct PlotRequest
 /// (the "offscreen" platform will do), but no display. A null image if the size is empty or, after
 /// a line in the log, if the source fails.
 [[nodiscard]] QImage renderPlot(const PlotRequest &request, SampleSource &source);
+
+/// As renderPlot, into a part of any painter; size and pixel ratio of the request don't count.
+/// False if the source fails.
+[[nodiscard]] bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
+                             SampleSource &source);
 
 /// The divisor of a constellation for a peak magnitude: the peak rounded up to a whole multiple of
 /// a power of ten, 1 for a peak of 0.
