@@ -6,6 +6,7 @@
 #include "log/Tracer.h"
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
+#include "tools/DlgResample.h"
 
 #include <QAction>
 #include <QMenu>
@@ -31,6 +32,7 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
 ModulesDb::ModulesDb()
 {
     addTool(std::make_unique<DlgInfo>());
+    addTool(std::make_unique<DlgResample>());
 }
 
 ModulesDb::~ModulesDb() = default;

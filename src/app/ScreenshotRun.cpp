@@ -64,11 +64,12 @@ void ScreenshotRun::start()
     }
     first->setFocus();
     // The second pane is filled later than the first.
-    connect(trees.last(), &QCustomTreeView::folderLoaded, this, [this, folder](const QString &path) {
-        if (QDir(path) == QDir(folder)) {
-            QTimer::singleShot(0, this, &ScreenshotRun::takePictures);
-        }
-    });
+    connect(trees.last(), &QCustomTreeView::folderLoaded, this,
+            [this, folder](const QString &path) {
+                if (QDir(path) == QDir(folder)) {
+                    QTimer::singleShot(0, this, &ScreenshotRun::takePictures);
+                }
+            });
 }
 
 void ScreenshotRun::takePictures()

@@ -4,28 +4,76 @@
 #include "Console.h"
 
 #include "base/EngineeringNumber.h"
+#include "jobs/ReportText.h"
 
 #include <QFileInfo>
+#include <QRegularExpression>
 
 #include <cmath>
 
 namespace {
 
-double parse(const std::string &name, const std::string &text, const NumberRange &range)
+/// The permitted range as text. Whole numbers are told to the last digit.
+QString rangeText(const NumberRange &range, bool whole)
 {
-    const auto number = parseNumber(QString::fromLocal8Bit(text), range.unit, true);
-    const bool valid = number && number->trailing.isEmpty();
-    if (!valid || number->value < range.min || number->value > range.max) {
-        const QString permitted = range.max == std::numeric_limits<double>::max()
-                                      ? "at least " + engineeringText(range.min, range.unit)
-                                      : engineeringText(range.min, range.unit) + " to " +
-                                            engineeringText(range.max, range.unit);
-        const QString problem = QString("%1: %2 is %3; permitted: %4")
-                                    .arg(QString::fromStdString(name), QString::fromLocal8Bit(text),
-                                         valid ? "out of range" : "not a number", permitted);
-        throw CLI::ValidationError(problem.toStdString());
+    const auto text = [&](double value) {
+        return whole ? QString::number(value, 'f', 0) : engineeringText(value, range.unit);
+    };
+    if (range.max == std::numeric_limits<double>::max()) {
+        return "at least " + text(range.min);
     }
-    return number->value;
+    return text(range.min) + " to " + text(range.max);
+}
+
+/// The number in the text; nothing if it isn't one. Fields overlook what stands behind the prefix
+/// letter, and letters that are none in this case; a script is told of both.
+std::optional<double> numberIn(const QString &text, const QString &unit)
+{
+    const auto number = parseNumber(text, unit, true);
+    if (!number || !number->trailing.isEmpty()) {
+        return std::nullopt;
+    }
+    QString prefix = text.simplified();
+    if (!unit.isEmpty() && prefix.endsWith(unit, Qt::CaseInsensitive)) {
+        prefix.chop(unit.size());
+    }
+    static const QRegularExpression unknownPrefix("[UNP] *$");
+    return prefix.contains(unknownPrefix) ? std::nullopt : std::optional(number->value);
+}
+
+double parse(const std::string &name, const std::string &text, const NumberRange &range, bool whole)
+{
+    const std::optional<double> number = numberIn(QString::fromLocal8Bit(text), range.unit);
+    const char *problem = nullptr;
+    if (!number) {
+        problem = "not a number";
+    } else if (*number < range.min || *number > range.max) {
+        problem = "out of range";
+    } else if (whole && *number != std::floor(*number)) {
+        problem = "not a whole number";
+    } else {
+        return *number;
+    }
+    throw CLI::ValidationError(QString("%1: '%2' is %3; permitted: %4")
+                                   .arg(QString::fromStdString(name), QString::fromLocal8Bit(text),
+                                        problem, rangeText(range, whole))
+                                   .toStdString());
+}
+
+/// A file with one longer text can't be read at all.
+QString parseTagText(const std::string &name, const std::string &text)
+{
+    constexpr qsizetype maxLength = 1024;
+    QString tag = QString::fromLocal8Bit(text);
+    const qsizetype length = stripBraces(tag).size();
+    if (length > maxLength) {
+        throw CLI::ValidationError(QString("%1: %2 characters are too many; permitted: up to %3")
+                                       .arg(QString::fromStdString(name))
+                                       .arg(length)
+                                       .arg(maxLength)
+                                       .toStdString());
+    }
+    return tag;
 }
 
 } // namespace
@@ -36,7 +84,9 @@ CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional
     return command
         .add_option_function<std::string>(
             name,
-            [&value, name, range](const std::string &text) { value = parse(name, text, range); },
+            [&value, name, range](const std::string &text) {
+                value = parse(name, text, range, false);
+            },
             help)
         ->type_name("NUMBER");
 }
@@ -45,11 +95,7 @@ CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optiona
                         const NumberRange &range, const std::string &help)
 {
     const auto take = [&value, name, range](const std::string &text) {
-        const double number = parse(name, text, range);
-        if (number != std::floor(number)) {
-            throw CLI::ValidationError(name + ": " + text + " is not a whole number");
-        }
-        value = static_cast<qint64>(number);
+        value = static_cast<qint64>(parse(name, text, range, true));
     };
     return command.add_option_function<std::string>(name, take, help)->type_name("COUNT");
 }
@@ -69,8 +115,8 @@ CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
     const auto take = [&index, name, names](const std::string &text) {
         const auto found = names.indexOf(QString::fromLocal8Bit(text));
         if (found < 0) {
-            throw CLI::ValidationError(name + ": " + text +
-                                       " is unknown; permitted: " + names.join(", ").toStdString());
+            throw CLI::ValidationError(
+                name + ": '" + text + "' is unknown; permitted: " + names.join(", ").toStdString());
         }
         index = static_cast<int>(found);
     };
@@ -78,17 +124,27 @@ CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
         ->type_name(names.join('|').toStdString());
 }
 
+CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help)
+{
+    const auto take = [&value](const std::string &text) {
+        if (text.empty()) {
+            throw CLI::ValidationError("--output: the file name is empty");
+        }
+        value = QString::fromLocal8Bit(text);
+    };
+    return command.add_option_function<std::string>("-o,--output", take, help)->type_name("FILE");
+}
+
 void addOutputArguments(CLI::App &command, OutputArguments &arguments)
 {
     OutputOptions &options = arguments.options;
-    addText(command, "-o,--output", options.fileName, "Waveform file to write")
-        ->type_name("FILE")
-        ->required();
+    addOutputFile(command, options.fileName, "Waveform file to write")->required();
     const auto addTag = [&](const std::string &name, std::optional<QString> &tag,
                             const std::string &help) {
         command
             .add_option_function<std::string>(
-                name, [&tag](const std::string &text) { tag = QString::fromLocal8Bit(text); }, help)
+                name, [&tag, name](const std::string &text) { tag = parseTagText(name, text); },
+                help)
             ->type_name("TEXT");
     };
     addTag("--comment", options.comment, "Comment of the new file");
@@ -98,6 +154,10 @@ void addOutputArguments(CLI::App &command, OutputArguments &arguments)
 
 bool mayWrite(Console &console, const QString &fileName, bool force)
 {
+    if (QFileInfo(fileName).isDir()) {
+        console.error("The output file '" + fileName + "' is a folder.");
+        return false;
+    }
     if (force || !QFileInfo::exists(fileName)) {
         return true;
     }

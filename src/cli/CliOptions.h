@@ -39,6 +39,9 @@ CLI::Option *addText(CLI::App &command, const std::string &name, QString &value,
 CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
                        const QStringList &names, const std::string &help);
 
+/// Adds -o, --output, which takes no empty name.
+CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help);
+
 /// The options of every command that writes a .wv file.
 struct OutputArguments
 {
@@ -47,7 +50,8 @@ struct OutputArguments
 };
 void addOutputArguments(CLI::App &command, OutputArguments &arguments);
 
-/// Whether the file may be written: it isn't there, or `force` is set. Logs the reason if not.
+/// Whether the file may be written: it isn't there, or `force` is set. A folder never may. Logs the
+/// reason if not.
 [[nodiscard]] bool mayWrite(Console &console, const QString &fileName, bool force);
 
 /// Adds a command and remembers in `action` what to run after parsing. The state of the command's

@@ -9,6 +9,7 @@
 #include <array>
 #include <csignal>
 #include <cstdio>
+#include <ctime>
 #include <fcntl.h>
 #include <unistd.h>
 
@@ -17,8 +18,24 @@ namespace {
 /// A signal handler may do little more than write to a pipe; the event loop reads its other end.
 std::array<int, 2> interruptPipe{-1, -1};
 
+/// Set while a job watches the pipe.
+volatile std::sig_atomic_t jobRuns = 0;
+volatile std::sig_atomic_t interruptedAt = 0;
+
 extern "C" void onInterrupt(int)
 {
+    timespec now{};
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    const auto second = static_cast<std::sig_atomic_t>(now.tv_sec);
+    // Nothing to be cancelled, or a job that hangs in a write to a reader that doesn't read: a
+    // user who asks again gets the terminal back. One key press may come as two signals, though.
+    constexpr int patience = 2;
+    if (jobRuns == 0 || (interruptedAt != 0 && second - interruptedAt >= patience)) {
+        _exit(ExitCancelled);
+    }
+    if (interruptedAt == 0) {
+        interruptedAt = second;
+    }
     const char byte = 1;
     [[maybe_unused]] const ssize_t written = write(interruptPipe[1], &byte, 1);
 }
@@ -35,6 +52,16 @@ QString levelName(int level)
 }
 
 } // namespace
+
+void Console::reserveStandardStreams()
+{
+    for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+        if (fcntl(stream, F_GETFD) < 0) {
+            [[maybe_unused]] const int opened =
+                open("/dev/null", stream == STDIN_FILENO ? O_WRONLY : O_RDONLY);
+        }
+    }
+}
 
 Console::Console(QObject *parent)
     : QObject(parent)
@@ -67,6 +94,9 @@ void Console::printLog()
         printLine(name + ": " + text);
         if (name == "error") {
             m_lastReason = text;
+            if (m_jobReason.isEmpty()) {
+                m_jobReason = text;
+            }
         }
     }
 }
@@ -88,7 +118,9 @@ void Console::printReport(const QString &html)
 
 void Console::drawProgress(int percent)
 {
-    if (!m_showProgress || isatty(STDERR_FILENO) == 0) {
+    // A job that is done in a moment shows no bar at all.
+    constexpr qint64 quietMs = 500;
+    if (!m_showProgress || m_jobTime.elapsed() < quietMs || isatty(STDERR_FILENO) == 0) {
         return;
     }
     constexpr int width = 30;
@@ -121,7 +153,12 @@ int Console::run(ToolJob &job)
         }
         job.cancel();
     });
+    m_jobReason.clear();
+    m_jobTime.start();
+    interruptedAt = 0;
+    jobRuns = 1;
     const bool done = job.run();
+    jobRuns = 0;
     clearProgress();
     if (done) {
         return ExitDone;
@@ -129,12 +166,18 @@ int Console::run(ToolJob &job)
     if (job.isCancelled()) {
         return ExitCancelled;
     }
-    return failed();
+    // What was seen first is the cause; errors behind it tell what came of it.
+    return failedWith(m_jobReason);
 }
 
 int Console::failed()
 {
-    const QString reason = "error: " + m_lastReason;
+    return failedWith(m_lastReason);
+}
+
+int Console::failedWith(const QString &text)
+{
+    const QString reason = "error: " + text;
     if (m_lastLine != reason) {
         printLine(reason);
     }

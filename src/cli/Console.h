@@ -3,6 +3,7 @@
 
 #include "log/Tracer.h"
 
+#include <QElapsedTimer>
 #include <QObject>
 #include <QString>
 
@@ -23,13 +24,19 @@ class Console : public QObject
     Q_OBJECT
 
 public:
+    /// To be called before anything opens a file. A standard stream that the caller has closed
+    /// would be given to the next file, and results be written into that; opened the wrong way
+    /// round, it fails as a closed one does.
+    static void reserveStandardStreams();
+
     explicit Console(QObject *parent = nullptr);
 
     void setQuiet(bool quiet) { m_quiet = quiet; }
     void setVerbose(bool verbose);
     void setShowProgress(bool show) { m_showProgress = show; }
 
-    /// Runs a job and returns the exit code. When it fails, the reason is the last line.
+    /// Runs a job and returns the exit code. When it fails, the reason, which is the first error
+    /// that it has logged, is the last line.
     [[nodiscard]] int run(ToolJob &job);
 
     /// Ends a command that failed with the reason in the log: makes that the last line.
@@ -48,6 +55,7 @@ public:
     [[nodiscard]] bool print(const QByteArray &bytes);
 
 private:
+    [[nodiscard]] int failedWith(const QString &text);
     void printLog();
     void printReport(const QString &html);
     void printLine(const QString &line);
@@ -60,6 +68,8 @@ private:
     bool m_showProgress = false;
     bool m_progressDrawn = false;
     QString m_stepLabel;
+    QElapsedTimer m_jobTime;
+    QString m_jobReason;
     QString m_lastReason;
     QString m_lastLine;
 };

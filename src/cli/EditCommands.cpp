@@ -4,6 +4,7 @@
 #include "commands.h"
 
 #include "jobs/LevelJob.h"
+#include "jobs/ResampleJob.h"
 
 namespace {
 
@@ -24,10 +25,55 @@ int runLevel(LevelArguments &arguments)
     return arguments.console.run(job);
 }
 
+struct ResampleArguments
+{
+    Console &console;
+    QString inputFile;
+    std::optional<double> clockHz;
+    std::optional<qint64> samples;
+    OutputArguments output;
+};
+
+int runResample(ResampleArguments &arguments)
+{
+    if (arguments.clockHz.has_value() == arguments.samples.has_value()) {
+        return arguments.console.wrongUsage("one of --clock and --samples is required");
+    }
+    if (!mayWrite(arguments.console, arguments.output.options.fileName, arguments.output.force)) {
+        return arguments.console.failed();
+    }
+    ResampleRequest request;
+    request.inputFile = arguments.inputFile;
+    request.output = arguments.output.options;
+    request.target.clockDecides = arguments.clockHz.has_value();
+    request.target.clockHz = arguments.clockHz.value_or(request.target.clockHz);
+    request.target.samples = arguments.samples.value_or(request.target.samples);
+    ResampleJob job(request);
+    return arguments.console.run(job);
+}
+
+void addResample(CommandSet &commands)
+{
+    auto resample = std::make_shared<ResampleArguments>(ResampleArguments{
+        .console = commands.console, .inputFile = {}, .clockHz = {}, .samples = {}, .output = {}});
+    CLI::App &command = addCommand<ResampleArguments>(
+        commands.app, "resample", "Convert a waveform to another clock or number of samples",
+        commands.action, resample, runResample);
+    addText(command, "file", resample->inputFile, "Waveform file to read")->required();
+    CLI::Option *clock =
+        addNumber(command, "--clock", resample->clockHz,
+                  {"Hz", ResampleTarget::MinClockHz, ResampleTarget::MaxClockHz}, "Target clock");
+    addInteger(command, "--samples", resample->samples,
+               {"", 1, static_cast<double>(ResampleTarget::MaxSamples)}, "Target sample count")
+        ->excludes(clock);
+    addOutputArguments(command, resample->output);
+}
+
 } // namespace
 
 void addEditCommands(CommandSet &commands)
 {
+    addResample(commands);
     auto level = std::make_shared<LevelArguments>(LevelArguments{commands.console, {}, {}});
     CLI::App &command = addCommand<LevelArguments>(
         commands.app, "level", "Copy a waveform with new level tags, its samples untouched",

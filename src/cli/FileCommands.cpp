@@ -1,15 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "RangeArguments.h"
 #include "commands.h"
 
 #include "base/EngineeringNumber.h"
 #include "jobs/DumpJob.h"
 #include "jobs/InfoReport.h"
 #include "jobs/MeasureJob.h"
+#include "jobs/ReportText.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QFile>
+#include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
 
@@ -42,31 +45,6 @@ int runInfo(InfoArguments &arguments)
     const bool printed =
         arguments.console.print(arguments.json ? QJsonDocument(objects).toJson() : text);
     return printed && allScanned ? ExitDone : arguments.console.failed();
-}
-
-void addRange(CLI::App &command, SampleRange &range)
-{
-    addText(command, "file", range.fileName, "Waveform file to read")->required();
-    addInteger(command, "--from", range.from, {"", 0, MaxSamples - 1.0},
-               "First sample, counted from 0");
-    addInteger(command, "--count", range.count, {"", 1, double(MaxSamples)},
-               "Number of samples (default: up to the end)");
-}
-
-/// Whether the range lies in the file, by its tags. A file that can't be scanned passes: reading it
-/// tells the reason.
-bool rangeFits(Console &console, const SampleRange &range, int &exitCode)
-{
-    WvFileSummary summary;
-    if ((!range.from && !range.count) || !QFile::exists(range.fileName) ||
-        !HvFileIO().readWaveformInfo(range.fileName, &summary) || summary.samples < 1) {
-        return true;
-    }
-    const QString problem = rangeProblem(range, summary.samples);
-    if (!problem.isEmpty()) {
-        exitCode = console.wrongUsage(problem);
-    }
-    return problem.isEmpty();
 }
 
 struct DumpArguments
@@ -106,6 +84,10 @@ int runDump(DumpArguments &arguments)
         console.error("Cannot write '" + file.fileName() + "': " + file.errorString());
         exitCode = console.failed();
     }
+    // Nothing in a dump tells a cut one from a whole one.
+    if (exitCode != ExitDone && file.isOpen() && QFileInfo(file).isFile()) {
+        file.remove();
+    }
     return exitCode;
 }
 
@@ -137,11 +119,11 @@ int runMeasure(MeasureArguments &arguments)
                                          {"crest", levels.crest()}})
                    .toJson();
     } else {
-        text =
-            QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
-                              "Peak / RMS:  %.6f dB\n",
-                              levels.samples, levels.peakOffset, levels.rmsOffset, levels.crest())
-                .toLatin1();
+        text = QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
+                                 "Peak / RMS:  %.6f dB\n",
+                                 levels.samples, writtenDb(levels.peakOffset),
+                                 writtenDb(levels.rmsOffset), writtenDb(levels.crest()))
+                   .toLatin1();
     }
     return console.print(text) ? ExitDone : console.failed();
 }
@@ -162,8 +144,7 @@ void addFileCommands(CommandSet &commands)
     addRange(dumpCommand, dump->range);
     addChoice(dumpCommand, "--format", dump->format, {"csv", "cf32", "ci16"},
               "Form of the samples (default: csv)");
-    addText(dumpCommand, "-o,--output", dump->output, "File to write (default: standard output)")
-        ->type_name("FILE");
+    addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)");
     dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
 
     auto measure = std::make_shared<MeasureArguments>(MeasureArguments{commands.console, {}});

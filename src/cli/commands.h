@@ -17,6 +17,7 @@ struct CommandSet
 };
 
 void addFileCommands(CommandSet &commands);
+void addPlotCommand(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);

@@ -3,14 +3,54 @@
 #include "commands.h"
 
 #include <CLI/CLI.hpp>
-#include <QCoreApplication>
+#include <QGuiApplication>
 
+#include <algorithm>
 #include <clocale>
 #include <functional>
+#include <memory>
+#include <sstream>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace {
+
+/// Only pictures need fonts and painters; all else starts without the window system's modules, and
+/// nothing needs a display.
+std::unique_ptr<QCoreApplication> makeApplication(int &argc, char **argv)
+{
+    if (std::find(argv, argv + argc, std::string_view("plot")) == argv + argc) {
+        return std::make_unique<QCoreApplication>(argc, argv);
+    }
+    qputenv("QT_QPA_PLATFORM", "offscreen");
+    return std::make_unique<QGuiApplication>(argc, argv);
+}
+
+/// The toolkit's own remarks are no lines of ours; they show with the debug messages.
+void logToolkitMessage(QtMsgType, const QMessageLogContext &, const QString &text)
+{
+    Tracer::Trace(Tracer::Debug, text);
+}
+
+/// A mistyped command or option leaves another one missing; what was typed is the better hint.
+QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
+{
+    const std::vector<std::string> unknown = app.remaining(true);
+    if (unknown.empty()) {
+        return QString::fromLocal8Bit(problem.what());
+    }
+    return QString("'%1' is no command, option or argument known here; see --help.")
+        .arg(QString::fromLocal8Bit(unknown.front()));
+}
+
+} // namespace
 
 int main(int argc, char **argv)
 {
-    const QCoreApplication application(argc, argv);
+    Console::reserveStandardStreams();
+    qInstallMessageHandler(logToolkitMessage);
+    const std::unique_ptr<QCoreApplication> application = makeApplication(argc, argv);
     // Numbers are written with a point, whatever the terminal's language.
     std::setlocale(LC_NUMERIC, "C");
     Console console;
@@ -30,6 +70,7 @@ int main(int argc, char **argv)
 
     CommandSet commands{app, console, action};
     addFileCommands(commands);
+    addPlotCommand(commands);
     addEditCommands(commands);
     addImportCommands(commands);
     addInstrumentCommands(commands);
@@ -38,9 +79,12 @@ int main(int argc, char **argv)
     } catch (const CLI::ParseError &problem) {
         // The library's own codes tell only help and version, which are no errors, from the rest.
         if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
-            return app.exit(problem);
+            std::ostringstream text;
+            app.exit(problem, text);
+            return console.print(QByteArray::fromStdString(text.str())) ? ExitDone
+                                                                        : console.failed();
         }
-        return console.wrongUsage(QString::fromLocal8Bit(problem.what()));
+        return console.wrongUsage(usageProblem(app, problem));
     }
     console.setQuiet(quiet);
     console.setVerbose(verbose);

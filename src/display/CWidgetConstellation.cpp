@@ -18,7 +18,8 @@ CWidgetConstellation::CWidgetConstellation(QWidget *parent)
 void CWidgetConstellation::setData(const QList<CWidgetBase::IQData> &samples)
 {
     m_samples = samples;
-    m_scene.samples = std::as_const(m_samples);
+    m_scene.sampleCount = m_samples.size();
+    m_scene.dots = std::as_const(m_samples);
     m_dirty = true;
     update();
 }

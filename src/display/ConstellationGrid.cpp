@@ -19,6 +19,11 @@ int ConstellationGrid::cellOf(double value)
 void ConstellationGrid::compute(std::span<const IqSample> samples, double scaleI, double scaleQ)
 {
     clear();
+    append(samples, scaleI, scaleQ);
+}
+
+void ConstellationGrid::append(std::span<const IqSample> samples, double scaleI, double scaleQ)
+{
     for (const IqSample &sample : samples) {
         const double i = sample.i / scaleI;
         const double q = sample.q / scaleQ;

@@ -18,6 +18,9 @@ public:
     /// left out. The scales must not be 0.
     void compute(std::span<const IqSample> samples, double scaleI, double scaleQ);
 
+    /// Adds samples to those counted so far.
+    void append(std::span<const IqSample> samples, double scaleI, double scaleQ);
+
     void clear();
 
     /// Samples in a cell; the row grows with I, the column with Q.

@@ -9,10 +9,34 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 
 namespace {
 
 constexpr double InnerRadius = 0.707; ///< where I and Q of a full-scale sample are equal
+
+struct CellRange
+{
+    double low;
+    double high;
+};
+
+/// The stretch of -1 to 1 whose samples fall into a cell. Cells are drawn where their samples are,
+/// not in equal parts, or else a sample at full scale would stand 4 % too far in.
+CellRange cellRange(int cell)
+{
+    constexpr int middle = ConstellationGrid::Size / 2;
+    constexpr double width = 1.0 / middle;
+    constexpr double outermost = width / 4; // these cells hold full scale alone
+    const int distance = std::abs(cell - middle);
+    if (distance == 0) {
+        return {-width, width};
+    }
+    const CellRange range = distance == middle
+                                ? CellRange{1 - outermost, 1}
+                                : CellRange{distance * width, (distance + 1) * width};
+    return cell > middle ? range : CellRange{-range.high, -range.low};
+}
 
 QString axisText(double value)
 {
@@ -31,8 +55,8 @@ QMargins ConstellationPainter::margins(const QFont &font)
 {
     const QFontMetricsF metrics(font);
     const int side = static_cast<int>(std::ceil(metrics.horizontalAdvance("-0.005 V"))) + 8;
-    const int bottom = static_cast<int>(std::ceil(metrics.height())) + 6;
-    return {side, 6, side / 2, bottom};
+    const int half = static_cast<int>(std::ceil(metrics.height() / 2)) + 2;
+    return {side, half, side / 2, 3 * half};
 }
 
 QRectF ConstellationPainter::square(const QRectF &area, const QFont &font)
@@ -62,7 +86,7 @@ void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
     const QRectF plot = square(area, m_style.font);
     if (!plot.isEmpty()) {
         const PixelGrid pixels(painter);
-        if (static_cast<qsizetype>(m_scene.samples.size()) > DotLimit) {
+        if (m_scene.sampleCount > DotLimit) {
             paintCells(painter, pixels, plot);
         } else {
             paintDots(painter, pixels, plot);
@@ -78,18 +102,19 @@ void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels
                                       const QRectF &plot) const
 {
     constexpr int size = ConstellationGrid::Size;
-    const auto edge = [&](double start, int cell) {
-        return pixels.snap(start + plot.width() * cell / size);
-    };
+    const QPointF center = plot.center();
+    const double half = plot.width() / 2;
     for (int row = 0; row < size; ++row) {
-        const double left = edge(plot.left(), row);
-        const double right = edge(plot.left(), row + 1);
+        const CellRange i = cellRange(row);
+        const double left = pixels.snap(center.x() + i.low * half);
+        const double right = pixels.snap(center.x() + i.high * half);
         for (int column = 0; column < size; ++column) {
             if (m_scene.grid.count(row, column) <= 0) {
                 continue;
             }
-            const double top = edge(plot.top(), size - 1 - column);
-            const double bottom = edge(plot.top(), size - column);
+            const CellRange q = cellRange(column);
+            const double top = pixels.snap(center.y() - q.high * half);
+            const double bottom = pixels.snap(center.y() - q.low * half);
             const double level = m_scene.grid.levelDb(row, column);
             painter.fillRect(QRectF(left, top, right - left, bottom - top),
                              QColor(ColorTable::colorOfLevel(m_scene.colorMode, level)));
@@ -105,7 +130,7 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
     painter.setClipRect(plot);
-    for (const IqSample &sample : m_scene.samples) {
+    for (const IqSample &sample : m_scene.dots) {
         const double i = sample.i / m_scene.scaleI;
         const double q = sample.q / m_scene.scaleQ;
         if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {
@@ -147,9 +172,9 @@ void ConstellationPainter::paintAxisTexts(QPainter &painter, const QRectF &area,
         const QString textI = axisText(share * m_scene.scaleI);
         const double width = metrics.horizontalAdvance(textI);
         const double x = plot.center().x() + share * plot.width() / 2 - width / 2;
-        painter.drawText(
-            QRectF(std::min(x, area.right() - width), plot.bottom() + 3, width + 1, height),
-            Qt::AlignCenter, textI);
+        painter.drawText(QRectF(std::min(x, area.right() - width), plot.bottom() + height / 2 + 1,
+                                width + 1, height),
+                         Qt::AlignCenter, textI);
         const double y = plot.center().y() - share * plot.height() / 2 - height / 2;
         painter.drawText(
             QRectF(area.left(), std::max(y, area.top()), plot.left() - area.left() - 4, height),

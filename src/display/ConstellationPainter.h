@@ -19,9 +19,11 @@ class QPainter;
 struct ConstellationScene
 {
     ConstellationGrid grid;
-    std::span<const IqSample> samples; ///< must outlive the painting
-    double scaleI = 1;                 ///< the value at the right edge
-    double scaleQ = 1;                 ///< the value at the top
+    qint64 sampleCount = 0;
+    /// The samples themselves, needed up to the limit of dots only; must outlive the painting.
+    std::span<const IqSample> dots;
+    double scaleI = 1; ///< the value at the right edge
+    double scaleQ = 1; ///< the value at the top
     ColorMode colorMode = ColorMode::Rainbow;
     std::optional<QPointF> mouse; ///< place of the mouse within the painted area
 };
@@ -30,7 +32,7 @@ struct ConstellationScene
 class ConstellationPainter
 {
 public:
-    static constexpr qsizetype DotLimit = 500; ///< samples that are still drawn one by one
+    static constexpr qint64 DotLimit = 500; ///< samples that are still drawn one by one
 
     ConstellationPainter(const PlotStyle &style, const ConstellationScene &scene);
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "SpectrumLines.h"
 
+#include "base/parallel.h"
 #include "dsp/fft.h"
 #include "dsp/windows.h"
 #include "plotscale.h"
@@ -15,6 +16,8 @@ namespace {
 constexpr int WindowKind = 7; // 1 - cos(2 pi n / 512): its mean is 1, so a tone keeps its level
 constexpr double Scale = 0.001953125; // 1 / 512
 
+constexpr std::size_t FewFrames = 32;
+
 } // namespace
 
 void SpectrumLines::update(std::span<const IqSample> samples, qint64 first)
@@ -24,6 +27,7 @@ void SpectrumLines::update(std::span<const IqSample> samples, qint64 first)
     if (count >= FrameSize) {
         next.reserve(static_cast<std::size_t>((count - FrameSize) / FrameStep + 1));
     }
+    std::vector<std::size_t> missing;
     auto kept = m_lines.begin();
     for (qint64 offset = 0; offset + FrameSize <= count; offset += FrameStep) {
         const qint64 position = first + offset;
@@ -34,11 +38,22 @@ void SpectrumLines::update(std::span<const IqSample> samples, qint64 first)
             next.push_back(std::move(*kept));
             ++kept;
         } else {
-            next.push_back({position, transform(samples.subspan(static_cast<std::size_t>(offset),
-                                                                FrameSize))});
-            ++m_transformCount;
+            missing.push_back(next.size());
+            next.push_back({position, {}});
         }
     }
+    const auto makeLine = [&](std::size_t index) {
+        const auto offset = static_cast<std::size_t>(next[index].position - first);
+        next[index].level = transform(samples.subspan(offset, FrameSize));
+    };
+    // Starting threads costs as much as a few transforms.
+    const std::size_t parts = missing.size() < FewFrames ? 1 : threadCount();
+    parallelFor(parts, [&](std::size_t part) {
+        for (std::size_t k = part; k < missing.size(); k += parts) {
+            makeLine(missing[k]);
+        }
+    });
+    m_transformCount += static_cast<qint64>(missing.size());
     m_lines = std::move(next);
 }
 

@@ -4,6 +4,7 @@
 #include "IqSample.h"
 
 #include <span>
+#include <utility>
 #include <vector>
 
 /// Transforms of 512 samples, 256 samples apart, in time order. Lines that are still wanted when
@@ -25,6 +26,9 @@ public:
     /// covered must be the same; else call clear first.
     void update(std::span<const IqSample> samples, qint64 first);
 
+    /// Takes lines made elsewhere, in time order.
+    void setLines(std::vector<Line> lines) { m_lines = std::move(lines); }
+
     void clear();
 
     [[nodiscard]] const std::vector<Line> &lines() const { return m_lines; }
@@ -35,9 +39,10 @@ public:
     /// Frames transformed since the object was made.
     [[nodiscard]] qint64 transformCount() const { return m_transformCount; }
 
-private:
+    /// The levels of one frame of 512 samples.
     [[nodiscard]] static std::vector<double> transform(std::span<const IqSample> frame);
 
+private:
     std::vector<Line> m_lines;
     qint64 m_transformCount = 0;
 };

@@ -22,6 +22,12 @@ constexpr double ColorBarGap = 6;
 constexpr double ColorBarWidth = 10;
 constexpr char AxisTemplate[] = " -QQQ.QQQ XXX"; ///< the widest text of a frequency axis
 
+/// From the plot down to the frequency texts: clear of the ticks and of a text beside the corner.
+double axisTextGap(const QFontMetricsF &metrics)
+{
+    return std::max(metrics.height() / 2 + 1, 5.0);
+}
+
 QString translated(const char *text)
 {
     return QCoreApplication::translate("SpectrumPainter", text);
@@ -42,10 +48,16 @@ QMargins SpectrumPainter::margins(const QFont &font, SpectrumMode mode)
     const double left = metrics.horizontalAdvance(waterfall ? "888.888 ms" : "-150 dB") + 8;
     const double right =
         waterfall ? ColorBarGap + ColorBarWidth + metrics.horizontalAdvance("-150 dB") + 6 : 10;
-    const double bottom = metrics.height() + 8;
+    const double bottom = axisTextGap(metrics) + metrics.height() + 2;
     const double top = metrics.height() / 2 + 2;
     return {static_cast<int>(std::ceil(left)), static_cast<int>(std::ceil(top)),
             static_cast<int>(std::ceil(right)), static_cast<int>(std::ceil(bottom))};
+}
+
+QSize SpectrumPainter::waterfallSize(const QRectF &plot, double ratio)
+{
+    return {static_cast<int>(std::lround(plot.width() * ratio)),
+            static_cast<int>(std::lround(plot.height() * ratio))};
 }
 
 double SpectrumPainter::xOf(const QRectF &plot, double bin)
@@ -116,6 +128,7 @@ void SpectrumPainter::paintSpectrum(QPainter &painter, const PixelGrid &pixels, 
         painter.setClipRect(plot);
         painter.setRenderHint(QPainter::Antialiasing);
         painter.setPen(QPen(m_style.color(PlotColor::AverageTrace), 1));
+        painter.translate(pixels.lineWidth() / 2, pixels.lineWidth() / 2); // onto the grid lines
         painter.drawPolyline(line);
         painter.restore();
     }
@@ -126,8 +139,7 @@ void SpectrumPainter::paintSpectrum(QPainter &painter, const PixelGrid &pixels, 
 void SpectrumPainter::paintWaterfall(QPainter &painter, const PixelGrid &pixels, const QRectF &area,
                                      const QRectF &plot) const
 {
-    const QSize size(static_cast<int>(std::lround(plot.width() * pixels.ratio())),
-                     static_cast<int>(std::lround(plot.height() * pixels.ratio())));
+    const QSize size = waterfallSize(plot, pixels.ratio());
     if (m_scene.waterfall.size() != size) {
         m_scene.waterfall = waterfallImage(m_scene.lines.lines(), m_scene.colors, size);
     }
@@ -179,10 +191,9 @@ void SpectrumPainter::paintFrequencyAxis(QPainter &painter, const PixelGrid &pix
     painter.setPen(m_style.color(PlotColor::Text));
     for (int k = -divisions; k <= divisions; ++k) {
         const double frequency = k * step;
-        const double x = xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0);
-        if (x > plot.right()) {
-            continue; // the bins end half a bin before the upper edge
-        }
+        // The centres of the bins end half a bin before the upper edge.
+        const double x =
+            std::min(xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0), plot.right());
         pixels.vertical(x, plot.bottom(), plot.bottom() + tick, m_style.color(PlotColor::Grid));
         if (gridAlpha > 0) {
             pixels.vertical(x, plot.top(), plot.bottom(),
@@ -192,8 +203,9 @@ void SpectrumPainter::paintFrequencyAxis(QPainter &painter, const PixelGrid &pix
             const QString text = frequencyText(frequency);
             const double width = metrics.horizontalAdvance(text) + 1;
             const double left = std::clamp(x - width / 2, area.left(), area.right() - width);
-            painter.drawText(QRectF(left, plot.bottom() + tick + 2, width, metrics.height()),
-                             Qt::AlignCenter, text);
+            painter.drawText(
+                QRectF(left, plot.bottom() + axisTextGap(metrics), width, metrics.height()),
+                Qt::AlignCenter, text);
         }
     }
 }

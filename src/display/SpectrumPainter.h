@@ -50,6 +50,9 @@ public:
 
     [[nodiscard]] static QMargins margins(const QFont &font, SpectrumMode mode);
 
+    /// The waterfall's size in device pixels, of which there are `ratio` to a logical one.
+    [[nodiscard]] static QSize waterfallSize(const QRectF &plot, double ratio);
+
     /// Horizontal place of a bin's centre (0 to 511, zero frequency at 256).
     [[nodiscard]] static double xOf(const QRectF &plot, double bin);
     /// Vertical place of a level in the spectrum view.

@@ -217,38 +217,58 @@ inline void fold(TraceBin &bin, const Block &block, int count, double &sum)
 
 } // namespace
 
-CLONES void TraceBins::compute(std::span<const IqSample> samples, std::span<const quint8> markers)
+void TraceBins::compute(std::span<const IqSample> samples, std::span<const quint8> markers)
 {
-    const auto total = static_cast<qint64>(samples.size());
-    if (total < MinSamples) {
+    begin(static_cast<qint64>(samples.size()));
+    append(samples, markers);
+}
+
+void TraceBins::begin(qint64 total)
+{
+    m_total = total;
+    m_done = 0;
+    m_bin = 0;
+    m_sum = 0;
+    if (total >= MinSamples) {
+        m_bins.fill(TraceBin{});
+        m_sparse = total < SparseLimit;
+    }
+}
+
+CLONES void TraceBins::append(std::span<const IqSample> samples, std::span<const quint8> markers)
+{
+    if (m_total < MinSamples) {
         return;
     }
-    m_bins.fill(TraceBin{});
     Block block;
-    block.folded[0] = 0;
-    qint64 done = 0;
-    for (int k = 0; k < BinCount; ++k) {
-        TraceBin &bin = m_bins[static_cast<std::size_t>(k)];
-        // The first sample of the next bin: the least i with i * 512 / n at or above k + 1.
-        const qint64 end = ((k + 1) * total + BinCount - 1) / BinCount;
-        double sum = 0;
-        while (done < end) {
-            const auto count = static_cast<int>(std::min<qint64>(end - done, Block::Size));
-            analyse(samples.data() + done, count, block);
-            if (done == 0) { // nothing lies before the very first sample
-                block.step[0] = 0;
-            }
-            fold(bin, block, count, sum);
-            block.folded[0] = block.folded[static_cast<std::size_t>(count)];
-            if (done < static_cast<qint64>(markers.size())) {
-                const auto from = static_cast<std::size_t>(done);
-                foldMarkers(bin, markers.subspan(from, std::min(markers.size() - from,
-                                                                static_cast<std::size_t>(count))));
-            }
-            done += count;
+    block.folded[0] = m_lastPhase;
+    std::size_t taken = 0;
+    while (taken < samples.size() && m_bin < BinCount) {
+        // The first sample of the next bin: the least i with i * 512 / n at or above its number.
+        const qint64 end = ((m_bin + 1) * m_total + BinCount - 1) / BinCount;
+        if (m_done == end) {
+            ++m_bin;
+            m_sum = 0;
+            continue;
         }
+        const auto inBin = static_cast<std::size_t>(end - m_done);
+        const std::size_t count =
+            std::min({inBin, samples.size() - taken, std::size_t{Block::Size}});
+        const int blockCount = static_cast<int>(count);
+        analyse(samples.data() + taken, blockCount, block);
+        if (m_done == 0) { // nothing lies before the very first sample
+            block.step[0] = 0;
+        }
+        TraceBin &bin = m_bins[static_cast<std::size_t>(m_bin)];
+        fold(bin, block, blockCount, m_sum);
+        if (taken < markers.size()) {
+            foldMarkers(bin, markers.subspan(taken, std::min(markers.size() - taken, count)));
+        }
+        block.folded[0] = block.folded[count];
+        taken += count;
+        m_done += static_cast<qint64>(count);
     }
-    m_sparse = total < SparseLimit;
+    m_lastPhase = block.folded[0];
 }
 
 void TraceBins::clear()

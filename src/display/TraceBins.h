@@ -40,6 +40,11 @@ public:
     /// Folds the samples in. `markers` may be shorter or empty; its four low bits count.
     void compute(std::span<const IqSample> samples, std::span<const quint8> markers);
 
+    /// The same in pieces, for stretches that aren't in memory as a whole: begin with the total
+    /// number of samples, then append them in order. Below 4 samples both leave the table alone.
+    void begin(qint64 total);
+    void append(std::span<const IqSample> samples, std::span<const quint8> markers);
+
     void clear();
 
     [[nodiscard]] const std::array<TraceBin, BinCount> &bins() const { return m_bins; }
@@ -50,4 +55,10 @@ public:
 private:
     std::array<TraceBin, BinCount> m_bins{};
     bool m_sparse = false;
+    // Where append goes on.
+    qint64 m_total = 0;
+    qint64 m_done = 0;
+    int m_bin = 0;
+    double m_sum = 0;       ///< of the magnitudes in the bin
+    double m_lastPhase = 0; ///< folded phase of the sample before
 };

@@ -79,6 +79,7 @@ private:
     void paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,
                       const QList<QRectF> &panes) const;
     void paintCaptions(QPainter &painter, const QRectF &plot, const QList<QRectF> &panes) const;
+    void paintFootLine(QPainter &painter, const QRectF &line) const;
     [[nodiscard]] QString divisionText() const;
 
     const PlotStyle &m_style;

@@ -80,6 +80,12 @@ qreal PixelGrid::snap(qreal coordinate) const
     return std::round(coordinate * m_ratio) / m_ratio;
 }
 
+void PixelGrid::fill(const QRectF &rect, const QColor &color) const
+{
+    const QPointF topLeft(snap(rect.left()), snap(rect.top()));
+    m_painter.fillRect(QRectF(topLeft, QPointF(snap(rect.right()), snap(rect.bottom()))), color);
+}
+
 void PixelGrid::horizontal(qreal y, qreal fromX, qreal toX, const QColor &color) const
 {
     m_painter.fillRect(QRectF(snap(fromX), snap(y), snap(toX) - snap(fromX), m_lineWidth), color);

@@ -20,6 +20,8 @@ public:
     /// Device pixels to a logical one.
     [[nodiscard]] qreal ratio() const { return m_ratio; }
 
+    /// Fills the device pixels that the rectangle covers by at least a half.
+    void fill(const QRectF &rect, const QColor &color) const;
     void horizontal(qreal y, qreal fromX, qreal toX, const QColor &color) const;
     void vertical(qreal x, qreal fromY, qreal toY, const QColor &color) const;
     void frame(const QRectF &rect, const QColor &color) const;

@@ -4,44 +4,147 @@
 #include "ConstellationPainter.h"
 #include "SpectrumPainter.h"
 #include "TracePainter.h"
+#include "base/parallel.h"
+#include "plotdraw.h"
+#include "waterfall.h"
 
 #include <QPainter>
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
+#include <vector>
 
 namespace {
 
-void paintTrace(QPainter &painter, const QRectF &area, const PlotRequest &request, TraceMode mode)
+constexpr qint64 BlockSamples = 64 * 1024;
+
+/// Calls `take` with block after block of the source.
+template <typename Take>
+bool forEachBlock(SampleSource &source, const Take &take)
+{
+    if (!source.restart()) {
+        return false;
+    }
+    std::vector<IqSample> samples;
+    std::vector<quint8> markers;
+    for (qint64 done = 0; done < source.count();) {
+        const auto count = static_cast<std::size_t>(std::min(BlockSamples, source.count() - done));
+        samples.resize(count);
+        markers.resize(count);
+        if (!source.next(samples, markers)) {
+            return false;
+        }
+        take(std::span<const IqSample>(samples), std::span<const quint8>(markers));
+        done += static_cast<qint64>(count);
+    }
+    return true;
+}
+
+bool paintTrace(QPainter &painter, const QRectF &area, const PlotRequest &request,
+                SampleSource &source)
 {
     TraceScene scene;
-    scene.bins.compute(request.samples, request.markers);
-    scene.sampleCount = static_cast<qint64>(request.samples.size());
-    scene.mode = mode;
+    scene.bins.begin(source.count());
+    const bool read = forEachBlock(
+        source, [&scene](auto samples, auto markers) { scene.bins.append(samples, markers); });
+    scene.sampleCount = source.count();
+    scene.mode = static_cast<TraceMode>(request.view);
     scene.showMarkers = request.showMarkers;
     scene.clockHz = request.clockHz;
     TracePainter(PlotStyle::current(), scene).paint(painter, area);
+    return read;
 }
 
-void paintSpectrum(QPainter &painter, const QRectF &area, const PlotRequest &request,
-                   SpectrumMode mode)
+/// Transforms a source frame by frame. Of the lines, only those that a waterfall of `rows` rows
+/// looks at keep their levels; the others count in the mean alone.
+bool readLines(SampleSource &source, int rows, SpectrumScene &scene)
+{
+    const qint64 count = source.count();
+    const qint64 lineCount =
+        count < SpectrumLines::FrameSize
+            ? 0
+            : (count - SpectrumLines::FrameSize) / SpectrumLines::FrameStep + 1;
+    std::vector<SpectrumLines::Line> lines(static_cast<std::size_t>(lineCount));
+    std::vector<bool> looked(lines.size(), false);
+    for (int y = 0; y < rows && !lines.empty(); ++y) {
+        const std::size_t line = waterfallLine(y, rows, lines.size());
+        looked[line] = true;
+        looked[std::min(line + 1, lines.size() - 1)] = true;
+    }
+    if (!lines.empty()) {
+        scene.mean.assign(SpectrumLines::FrameSize, 0.0);
+    }
+    std::vector<IqSample> pending;
+    std::size_t made = 0;
+    return forEachBlock(source, [&](std::span<const IqSample> samples, auto) {
+        pending.insert(pending.end(), samples.begin(), samples.end());
+        const std::size_t from = made;
+        std::size_t offset = 0;
+        for (; offset + SpectrumLines::FrameSize <= pending.size();
+             offset += SpectrumLines::FrameStep) {
+            lines[made].position =
+                source.first() + static_cast<qint64>(made) * SpectrumLines::FrameStep;
+            ++made;
+        }
+        parallelFor(made - from, [&](std::size_t k) {
+            lines[from + k].level = SpectrumLines::transform(
+                std::span(pending).subspan(k * SpectrumLines::FrameStep, SpectrumLines::FrameSize));
+        });
+        for (std::size_t k = from; k < made; ++k) {
+            for (std::size_t bin = 0; bin < scene.mean.size(); ++bin) {
+                scene.mean[bin] += lines[k].level[bin] / static_cast<double>(lineCount);
+            }
+            if (!looked[k]) {
+                lines[k].level = {};
+            }
+        }
+        pending.erase(pending.begin(), pending.begin() + static_cast<std::ptrdiff_t>(offset));
+        if (made == lines.size()) {
+            scene.lines.setLines(std::move(lines));
+        }
+    });
+}
+
+bool paintSpectrum(QPainter &painter, const QRectF &area, const PlotRequest &request,
+                   SampleSource &source)
 {
     SpectrumScene scene;
-    scene.lines.update(request.samples, request.firstSample);
-    scene.mean = scene.lines.mean();
-    scene.sampleCount = static_cast<qint64>(request.samples.size());
-    scene.mode = mode;
+    scene.mode =
+        request.view == PlotView::Spectrum ? SpectrumMode::Spectrum : SpectrumMode::Waterfall;
+    scene.sampleCount = source.count();
     scene.clockHz = request.clockHz;
-    SpectrumPainter(PlotStyle::current(), scene).paint(painter, area);
+    const PlotStyle style = PlotStyle::current();
+    const QRectF plot = area.marginsRemoved(SpectrumPainter::margins(style.font, scene.mode));
+    const int rows = scene.mode == SpectrumMode::Waterfall
+                         ? SpectrumPainter::waterfallSize(plot, PixelGrid(painter).ratio()).height()
+                         : 0;
+    const bool read = readLines(source, rows, scene);
+    SpectrumPainter(style, scene).paint(painter, area);
+    return read;
 }
 
-void paintConstellation(QPainter &painter, const QRectF &area, const PlotRequest &request)
+bool paintConstellation(QPainter &painter, const QRectF &area, SampleSource &source)
 {
+    double peak = 0;
+    if (!forEachBlock(source, [&peak](auto samples, auto) {
+            peak = std::max(peak, peakMagnitude(samples));
+        })) {
+        return false;
+    }
     ConstellationScene scene;
-    scene.samples = request.samples;
-    scene.scaleI = scene.scaleQ = constellationScale(peakMagnitude(request.samples));
-    scene.grid.compute(request.samples, scene.scaleI, scene.scaleQ);
+    scene.scaleI = scene.scaleQ = constellationScale(peak);
+    std::vector<IqSample> dots;
+    const bool read = forEachBlock(source, [&](std::span<const IqSample> samples, auto) {
+        scene.grid.append(samples, scene.scaleI, scene.scaleQ);
+        if (source.count() <= ConstellationPainter::DotLimit) {
+            dots.insert(dots.end(), samples.begin(), samples.end());
+        }
+    });
+    scene.sampleCount = source.count();
+    scene.dots = dots;
     ConstellationPainter(PlotStyle::current(), scene).paint(painter, area);
+    return read;
 }
 
 } // namespace
@@ -58,7 +161,27 @@ std::optional<PlotView> plotViewOf(const QString &name)
     return index < 0 ? std::nullopt : std::optional(static_cast<PlotView>(index));
 }
 
-QImage renderPlot(const PlotRequest &request)
+bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
+               SampleSource &source)
+{
+    switch (request.view) {
+    case PlotView::Iq:
+    case PlotView::LogMag:
+    case PlotView::LogAvg:
+    case PlotView::LinAvg:
+    case PlotView::Phase:
+    case PlotView::Frequency:
+        return paintTrace(painter, area, request, source);
+    case PlotView::Spectrum:
+    case PlotView::Waterfall:
+        return paintSpectrum(painter, area, request, source);
+    case PlotView::Constellation:
+        break;
+    }
+    return paintConstellation(painter, area, source);
+}
+
+QImage renderPlot(const PlotRequest &request, SampleSource &source)
 {
     if (request.size.isEmpty() || !(request.pixelRatio > 0)) {
         return {};
@@ -69,27 +192,9 @@ QImage renderPlot(const PlotRequest &request)
     }
     image.setDevicePixelRatio(request.pixelRatio);
     QPainter painter(&image);
-    const QRectF area(QPointF(), QSizeF(request.size));
-    switch (request.view) {
-    case PlotView::Iq:
-    case PlotView::LogMag:
-    case PlotView::LogAvg:
-    case PlotView::LinAvg:
-    case PlotView::Phase:
-    case PlotView::Frequency:
-        paintTrace(painter, area, request, static_cast<TraceMode>(request.view));
-        break;
-    case PlotView::Spectrum:
-        paintSpectrum(painter, area, request, SpectrumMode::Spectrum);
-        break;
-    case PlotView::Waterfall:
-        paintSpectrum(painter, area, request, SpectrumMode::Waterfall);
-        break;
-    case PlotView::Constellation:
-        paintConstellation(painter, area, request);
-        break;
-    }
-    return image;
+    const bool done = paintPlot(painter, QRectF(QPointF(), QSizeF(request.size)), request, source);
+    painter.end();
+    return done ? image : QImage();
 }
 
 double constellationScale(double peak)

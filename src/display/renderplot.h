@@ -1,15 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "IqSample.h"
+#include "SampleSource.h"
 
 #include <QImage>
+#include <QRectF>
 #include <QSize>
 #include <QString>
 #include <QStringList>
 
 #include <optional>
 #include <span>
+
+class QPainter;
 
 /// The pictures that can be made of a waveform.
 enum class PlotView {
@@ -34,18 +37,22 @@ enum class PlotView {
 struct PlotRequest
 {
     PlotView view = PlotView::Iq;
-    std::span<const IqSample> samples;
-    std::span<const quint8> markers; ///< may be shorter than the samples
-    qint64 firstSample = 0;          ///< position of the first one in the waveform
-    double clockHz = 0;              ///< 0 labels the axes in samples
-    QSize size{800, 600};            ///< logical pixels
-    double pixelRatio = 1;           ///< device pixels to a logical one
-    bool showMarkers = false;        ///< the marker rows, in the views over time
+    double clockHz = 0;       ///< 0 labels the axes in samples
+    QSize size{800, 600};     ///< logical pixels
+    double pixelRatio = 1;    ///< device pixels to a logical one
+    bool showMarkers = false; ///< the marker rows, in the views over time
 };
 
-/// The picture that the display of this view would show. Needs a QGuiApplication (the "offscreen"
-/// platform will do) for its fonts, but no display. A null image if the size is empty.
-[[nodiscard]] QImage renderPlot(const PlotRequest &request);
+/// The picture that the display of this view would show of the samples. Reads them block by block,
+/// so that the memory needed doesn't grow with their number. Needs a QGuiApplication for its fonts
+/// (the "offscreen" platform will do), but no display. A null image if the size is empty or, after
+/// a line in the log, if the source fails.
+[[nodiscard]] QImage renderPlot(const PlotRequest &request, SampleSource &source);
+
+/// As renderPlot, into a part of any painter; size and pixel ratio of the request don't count.
+/// False if the source fails.
+[[nodiscard]] bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
+                             SampleSource &source);
 
 /// The divisor of a constellation for a peak magnitude: the peak rounded up to a whole multiple of
 /// a power of ten, 1 for a peak of 0.

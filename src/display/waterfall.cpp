@@ -27,7 +27,17 @@ RowColors colorsOf(const std::vector<double> &a, const std::vector<double> &b, d
     return row;
 }
 
+double waterfallPlace(int row, int rows, std::size_t lineCount)
+{
+    return static_cast<double>(row) / rows * static_cast<double>(lineCount);
+}
+
 } // namespace
+
+std::size_t waterfallLine(int row, int rows, std::size_t lineCount)
+{
+    return std::min(static_cast<std::size_t>(waterfallPlace(row, rows, lineCount)), lineCount - 1);
+}
 
 QImage waterfallImage(const std::vector<SpectrumLines::Line> &lines, const ColorTable &colors,
                       const QSize &size)
@@ -48,9 +58,8 @@ QImage waterfallImage(const std::vector<SpectrumLines::Line> &lines, const Color
     }
     const std::size_t last = lines.size() - 1;
     for (int y = 0; y < size.height(); ++y) {
-        const double place =
-            static_cast<double>(y) / size.height() * static_cast<double>(lines.size());
-        const std::size_t a = std::min(static_cast<std::size_t>(place), last);
+        const double place = waterfallPlace(y, size.height(), lines.size());
+        const std::size_t a = waterfallLine(y, size.height(), lines.size());
         const std::size_t b = std::min(a + 1, last);
         const RowColors row =
             colorsOf(lines[a].level, lines[b].level, place - std::floor(place), colors);

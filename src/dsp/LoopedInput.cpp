@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <utility>
 
 namespace {
 
@@ -73,7 +74,7 @@ bool LoopedInput::failReading(qint64 sample) const
                     .arg(sample));
 }
 
-void LoopedInput::copyWrapped(qint64 index)
+void LoopedInput::copyWrapped(Window &window, qint64 index) const
 {
     float inPhase = 0;
     float quadrature = 0;
@@ -86,12 +87,12 @@ void LoopedInput::copyWrapped(qint64 index)
         inPhase = m_head[entry];
         quadrature = m_head[entry + 1];
     }
-    const auto place = static_cast<std::size_t>(index - m_start);
-    m_inPhase[place] = inPhase;
-    m_quadrature[place] = quadrature;
+    const auto place = static_cast<std::size_t>(index - window.start);
+    window.inPhase[place] = inPhase;
+    window.quadrature[place] = quadrature;
 }
 
-bool LoopedInput::readInner(qint64 first, qint64 end)
+bool LoopedInput::readInner(Window &window, qint64 first, qint64 end)
 {
     while (first < end) {
         const auto count =
@@ -101,8 +102,8 @@ bool LoopedInput::readInner(qint64 first, qint64 end)
         if (got < static_cast<int>(count)) {
             return failReading(first + got);
         }
-        const auto place = static_cast<std::size_t>(first - m_start);
-        deinterleave(iq, m_inPhase.data() + place, m_quadrature.data() + place);
+        const auto place = static_cast<std::size_t>(first - window.start);
+        deinterleave(iq, window.inPhase.data() + place, window.quadrature.data() + place);
         first += static_cast<qint64>(count);
     }
     return true;
@@ -110,40 +111,40 @@ bool LoopedInput::readInner(qint64 first, qint64 end)
 
 bool LoopedInput::advance(qint64 first, qint64 end, int readAhead)
 {
-    if (!m_filled) {
-        m_start = first;
-        m_end = first;
-        m_filled = true;
+    if (!m_started) {
+        m_window.start = first;
+        m_window.end = first;
+        m_started = true;
     }
-    // Samples before the stream's place were read; they are in the window or not needed.
-    const qint64 kept = std::max<qint64>(m_end - first, 0);
-    const auto drop = static_cast<std::ptrdiff_t>(m_end - kept - m_start);
-    std::copy(m_inPhase.begin() + drop, m_inPhase.begin() + drop + kept, m_inPhase.begin());
-    std::copy(m_quadrature.begin() + drop, m_quadrature.begin() + drop + kept,
-              m_quadrature.begin());
-    m_start = m_end - kept;
-    const qint64 newEnd = std::max(m_end, end);
-    const auto size = static_cast<std::size_t>(newEnd - m_start + readAhead);
-    m_inPhase.resize(std::max(size, m_inPhase.size()));
-    m_quadrature.resize(m_inPhase.size());
+    // The stream gives each sample once, so the new window goes on where the last one ended.
+    Window &window = m_spare;
+    window.start = std::clamp(first, m_window.start, m_window.end);
+    window.end = std::max(m_window.end, end);
+    const auto used = static_cast<std::size_t>(window.end - window.start);
+    const std::size_t size = used + static_cast<std::size_t>(readAhead);
+    window.inPhase.resize(std::max(size, window.inPhase.size()));
+    window.quadrature.resize(window.inPhase.size());
+    const auto keptAt = static_cast<std::ptrdiff_t>(window.start - m_window.start);
+    const auto kept = static_cast<std::ptrdiff_t>(m_window.end - window.start);
+    std::copy_n(m_window.inPhase.begin() + keptAt, kept, window.inPhase.begin());
+    std::copy_n(m_window.quadrature.begin() + keptAt, kept, window.quadrature.begin());
 
-    qint64 index = m_end;
-    for (; index < std::min<qint64>(newEnd, 0); ++index) {
-        copyWrapped(index);
+    qint64 index = m_window.end;
+    for (; index < std::min<qint64>(window.end, 0); ++index) {
+        copyWrapped(window, index);
     }
-    const qint64 innerEnd = std::min(newEnd, m_count);
+    const qint64 innerEnd = std::min(window.end, m_count);
     if (index < innerEnd) {
-        if (!readInner(index, innerEnd)) {
+        if (!readInner(window, index, innerEnd)) {
             return false;
         }
         index = innerEnd;
     }
-    for (; index < newEnd; ++index) {
-        copyWrapped(index);
+    for (; index < window.end; ++index) {
+        copyWrapped(window, index);
     }
-    m_end = newEnd;
-    const auto used = static_cast<std::ptrdiff_t>(newEnd - m_start);
-    std::fill_n(m_inPhase.begin() + used, readAhead, 0.0F);
-    std::fill_n(m_quadrature.begin() + used, readAhead, 0.0F);
+    std::fill_n(window.inPhase.begin() + static_cast<std::ptrdiff_t>(used), readAhead, 0.0F);
+    std::fill_n(window.quadrature.begin() + static_cast<std::ptrdiff_t>(used), readAhead, 0.0F);
+    std::swap(m_window, m_spare);
     return true;
 }

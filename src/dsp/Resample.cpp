@@ -13,6 +13,8 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <thread>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -21,8 +23,9 @@ namespace {
 /// doesn't depend on the number of threads.
 constexpr std::size_t PartSize = 4096;
 
-/// Products between two looks at the clock, some 10 ms of one core.
-constexpr qint64 ProductsPerBlock = 16 * 1024 * 1024;
+/// Products between two looks at the clock, below 10 ms of one core. The block, the one before and
+/// their inputs shall stay in the second cache.
+constexpr qint64 ProductsPerBlock = 4 * 1024 * 1024;
 
 /// Samples of the input window that a block may need.
 constexpr qint64 MaxBlockInput = 512 * 1024;
@@ -96,20 +99,56 @@ private:
     std::vector<char> m_result;
 };
 
+/// Spreads the parts over the processors while the calling thread first does its own work, such as
+/// reading and writing streams, and then joins in.
+template <typename Work, typename OwnWork>
+void shareParts(std::size_t count, const Work &work, const OwnWork &ownWork)
+{
+    std::atomic<std::size_t> next{0};
+    const auto drain = [&] {
+        for (std::size_t part = next++; part < count; part = next++) {
+            work(part);
+        }
+    };
+    const std::size_t helperCount = std::min<std::size_t>(threadCount() - 1, count);
+    std::vector<std::jthread> helpers;
+    for (std::size_t i = 0; i < helperCount; ++i) {
+        helpers.emplace_back(drain);
+    }
+    ownWork();
+    drain();
+}
+
+/// Some outputs that follow each other, on their way from the input to the output stream.
+struct OutputBlock
+{
+    qint64 begin = 0;
+    qint64 end = 0;
+    PlanarInput input;
+    qint64 inputStart = 0; ///< sample at index 0 of the input
+    std::vector<float> result;
+    std::vector<SquareLevel> levels; ///< of the parts
+
+    [[nodiscard]] bool isEmpty() const { return begin >= end; }
+    [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(end - begin); }
+    [[nodiscard]] std::size_t partCount() const { return (count() + PartSize - 1) / PartSize; }
+};
+
 } // namespace
 
-/// One run: the state of the loop over the outputs.
+/// One run: the state of the loop over the outputs. While a block is computed, the one before is
+/// written and the input of the next one is read.
 class Resample::Conversion
 {
 public:
     Conversion(Resample &owner, int inputCount, int outputCount)
         : m_owner(owner)
+        , m_inputCount(inputCount)
         , m_outputCount(outputCount)
         , m_geometry(owner.m_settings.length, inputCount, outputCount)
         , m_interpolator(makeInterpolator(owner.m_table, m_geometry, inputCount, outputCount))
         , m_input(*owner.m_input, inputCount, owner.m_settings.length)
         , m_markers(owner.m_markerInput, owner.m_markerOutput, m_geometry)
-        , m_inputCount(inputCount)
     {
     }
 
@@ -127,17 +166,29 @@ public:
         }
         ProgressClock clock([this](int percent) { emit m_owner.ProgressUpdate(percent); },
                             m_owner.m_cancelled);
-        const qint64 step = blockSize();
-        for (qint64 begin = 0; begin < m_outputCount; begin += step) {
-            if (clock.shouldStop(percentOf(begin, m_outputCount))) {
+        OutputBlock done;
+        OutputBlock current;
+        OutputBlock next;
+        if (!fetch(0, current)) {
+            return false;
+        }
+        while (!current.isEmpty()) {
+            if (clock.shouldStop(percentOf(current.begin, m_outputCount))) {
                 return fail("*** Action aborted by user.");
             }
-            const qint64 end = std::min(begin + step, m_outputCount);
-            if (!convert(begin, end) || !m_markers.copy(begin, end)) {
+            bool ok = true;
+            current.result.resize(2 * current.count());
+            current.levels.resize(current.partCount());
+            shareParts(
+                current.partCount(), [&](std::size_t part) { compute(current, part); },
+                [&] { ok = store(done) && fetch(current.end, next); });
+            if (!ok) {
                 return false;
             }
+            std::swap(done, current);
+            std::swap(current, next);
         }
-        return true;
+        return store(done);
     }
 
     [[nodiscard]] double peak() const { return std::sqrt(m_level.highest); }
@@ -149,7 +200,7 @@ public:
 private:
     [[nodiscard]] qint64 blockSize() const
     {
-        const qint64 byWork = ProductsPerBlock / m_geometry.maxTaps();
+        const qint64 byWork = std::max<qint64>(ProductsPerBlock / m_geometry.maxTaps(), 1);
         const double byInput = static_cast<double>(MaxBlockInput) * m_geometry.ratio();
         return std::clamp<qint64>(static_cast<qint64>(std::min(byInput, 1e9)), 1, byWork);
     }
@@ -172,43 +223,59 @@ private:
         return false;
     }
 
-    [[nodiscard]] bool convert(qint64 begin, qint64 end)
+    /// Reads the input of the outputs from `begin` on; the block is empty behind the last one.
+    [[nodiscard]] bool fetch(qint64 begin, OutputBlock &block)
     {
-        if (missesInput(begin, end)) {
+        block.begin = begin;
+        block.end = std::min(begin + blockSize(), m_outputCount);
+        if (block.isEmpty()) {
+            return true;
+        }
+        if (missesInput(block.begin, block.end)) {
             return fail("*** Missed input sample.");
         }
-        const TapRange last = m_geometry.taps(end - 1);
-        if (!m_input.advance(m_geometry.taps(begin).first, last.first + last.count,
+        const TapRange last = m_geometry.taps(block.end - 1);
+        if (!m_input.advance(m_geometry.taps(block.begin).first, last.first + last.count,
                              Interpolator::ReadAhead)) {
             return false;
         }
-        const auto count = static_cast<std::size_t>(end - begin);
-        m_result.resize(2 * count);
-        m_levels.assign((count + PartSize - 1) / PartSize, {});
-        parallelFor(m_levels.size(), [&](std::size_t part) {
-            const std::size_t from = part * PartSize;
-            const std::span<float> result =
-                std::span(m_result).subspan(2 * from, 2 * std::min(PartSize, count - from));
-            m_interpolator->compute(begin + static_cast<qint64>(from), m_input.samples(),
-                                    m_input.start(), result);
-            m_levels[part] = measureSquares(result);
-        });
-        for (const SquareLevel &level : m_levels) {
+        block.input = m_input.samples();
+        block.inputStart = m_input.start();
+        return true;
+    }
+
+    void compute(OutputBlock &block, std::size_t part) const
+    {
+        const std::size_t from = part * PartSize;
+        const std::span<float> result =
+            std::span(block.result).subspan(2 * from, 2 * std::min(PartSize, block.count() - from));
+        m_interpolator->compute(block.begin + static_cast<qint64>(from), block.input,
+                                block.inputStart, result);
+        block.levels[part] = measureSquares(result);
+    }
+
+    [[nodiscard]] bool store(const OutputBlock &block)
+    {
+        if (block.isEmpty()) {
+            return true;
+        }
+        for (const SquareLevel &level : block.levels) {
             m_level.highest = std::max(m_level.highest, level.highest);
             m_level.sum += level.sum;
         }
-        return writeSamples(*m_owner.m_output, m_result) || fail("*** Cannot write output data.");
+        if (!writeSamples(*m_owner.m_output, block.result)) {
+            return fail("*** Cannot write output data.");
+        }
+        return m_markers.copy(block.begin, block.end);
     }
 
     Resample &m_owner;
+    qint64 m_inputCount;
     qint64 m_outputCount;
     TapGeometry m_geometry;
     std::unique_ptr<Interpolator> m_interpolator;
     LoopedInput m_input;
     MarkerCopy m_markers;
-    qint64 m_inputCount;
-    std::vector<float> m_result; ///< interleaved outputs of the block
-    std::vector<SquareLevel> m_levels;
     SquareLevel m_level; ///< of all outputs so far
 };
 

@@ -34,80 +34,142 @@ CORVANE_INLINE void loadSamples(typename Kernel<Real>::Vector &vector, const flo
     vector = __builtin_convertvector(samples, typename Kernel<Real>::Vector);
 }
 
-template <typename Real>
-CORVANE_INLINE float sumOf(const typename Kernel<Real>::Vector &vector)
+/// The sums of the lanes of four vectors. Halves are added first, which every instruction set can
+/// do at the cost of taking them out of a register.
+CORVANE_INLINE void sumLanes(const Kernel<float>::Vector &i0, const Kernel<float>::Vector &q0,
+                             const Kernel<float>::Vector &i1, const Kernel<float>::Vector &q1,
+                             float *sums)
 {
-    std::array<Real, Kernel<Real>::Lanes> lanes;
-    std::memcpy(lanes.data(), &vector, sizeof(vector));
-    for (std::size_t width = lanes.size() / 2; width > 0; width /= 2) {
-        for (std::size_t i = 0; i < width; ++i) {
-            lanes[i] += lanes[i + width];
+    typedef float Quarter __attribute__((vector_size(KernelVectorBytes / 4)));
+    const auto quarterOf = [](const Kernel<float>::Vector &vector, Quarter &quarter) {
+        const auto half = __builtin_shufflevector(vector, vector, 0, 1, 2, 3, 4, 5, 6, 7) +
+                          __builtin_shufflevector(vector, vector, 8, 9, 10, 11, 12, 13, 14, 15);
+        quarter = __builtin_shufflevector(half, half, 0, 1, 2, 3) +
+                  __builtin_shufflevector(half, half, 4, 5, 6, 7);
+    };
+    Quarter a;
+    Quarter b;
+    Quarter c;
+    Quarter d;
+    quarterOf(i0, a);
+    quarterOf(q0, b);
+    quarterOf(i1, c);
+    quarterOf(q1, d);
+    const Quarter ab =
+        __builtin_shufflevector(a, b, 0, 4, 1, 5) + __builtin_shufflevector(a, b, 2, 6, 3, 7);
+    const Quarter cd =
+        __builtin_shufflevector(c, d, 0, 4, 1, 5) + __builtin_shufflevector(c, d, 2, 6, 3, 7);
+    const Quarter all =
+        __builtin_shufflevector(ab, cd, 0, 1, 4, 5) + __builtin_shufflevector(ab, cd, 2, 3, 6, 7);
+    std::memcpy(sums, &all, sizeof(all));
+}
+
+CORVANE_INLINE void sumLanes(const Kernel<double>::Vector &i0, const Kernel<double>::Vector &q0,
+                             const Kernel<double>::Vector &i1, const Kernel<double>::Vector &q1,
+                             float *sums)
+{
+    const auto sumOf = [](const Kernel<double>::Vector &vector) {
+        const auto half = __builtin_shufflevector(vector, vector, 0, 1, 2, 3) +
+                          __builtin_shufflevector(vector, vector, 4, 5, 6, 7);
+        const auto quarter =
+            __builtin_shufflevector(half, half, 0, 1) + __builtin_shufflevector(half, half, 2, 3);
+        return static_cast<float>(quarter[0] + quarter[1]);
+    };
+    sums[0] = sumOf(i0);
+    sums[1] = sumOf(q0);
+    sums[2] = sumOf(i1);
+    sums[3] = sumOf(q1);
+}
+
+/// Where one output of a block takes its coefficients and samples from.
+template <typename Real>
+struct Output
+{
+    const float *inPhase;
+    const float *quadrature;
+    const Real *row;
+};
+
+template <typename Real>
+CORVANE_INLINE void locate(const RowBlock<Real> &block, std::size_t n, Output<Real> &output)
+{
+    output = {block.input.inPhase + block.offsets[n], block.input.quadrature + block.offsets[n],
+              block.rows + block.rowStarts[n]};
+}
+
+template <typename Real>
+CORVANE_INLINE void
+accumulate(const typename Kernel<Real>::Vector &coefficients, const Output<Real> &output, int place,
+           typename Kernel<Real>::Vector &sumI, typename Kernel<Real>::Vector &sumQ)
+{
+    typename Kernel<Real>::Vector xi;
+    typename Kernel<Real>::Vector xq;
+    loadSamples<Real>(xi, output.inPhase + place);
+    loadSamples<Real>(xq, output.quadrature + place);
+    sumI += coefficients * xi;
+    sumQ += coefficients * xq;
+}
+
+/// Two outputs at a time share the work of adding up lanes. An odd last one is computed twice.
+template <typename Real, typename Coefficients>
+CORVANE_INLINE void dotPairs(const RowBlock<Real> &block, const Coefficients &coefficientsOf)
+{
+    using Vector = typename Kernel<Real>::Vector;
+    constexpr int Lanes = Kernel<Real>::Lanes;
+    const std::size_t count = block.offsets.size();
+    for (std::size_t n = 0; n < count; n += 2) {
+        const std::size_t second = std::min(n + 1, count - 1);
+        Output<Real> output0;
+        Output<Real> output1;
+        locate(block, n, output0);
+        locate(block, second, output1);
+        Vector i0{};
+        Vector q0{};
+        Vector i1{};
+        Vector q1{};
+        for (int place = 0; place < block.vectors * Lanes; place += Lanes) {
+            Vector c0;
+            Vector c1;
+            coefficientsOf(n, output0.row + place, place, c0);
+            coefficientsOf(second, output1.row + place, place, c1);
+            accumulate<Real>(c0, output0, place, i0, q0);
+            accumulate<Real>(c1, output1, place, i1, q1);
         }
+        std::array<float, 4> sums;
+        sumLanes(i0, q0, i1, q1, sums.data());
+        std::copy_n(sums.data(), 2 * (second - n + 1), block.result.data() + 2 * n);
     }
-    return static_cast<float>(lanes[0]);
 }
 
 template <typename Real>
 CORVANE_INLINE void dotRowsBody(const RowBlock<Real> &block)
 {
     using Vector = typename Kernel<Real>::Vector;
-    constexpr int Lanes = Kernel<Real>::Lanes;
-    for (std::size_t n = 0; n < block.offsets.size(); ++n) {
-        const float *inPhase = block.input.inPhase + block.offsets[n];
-        const float *quadrature = block.input.quadrature + block.offsets[n];
-        const Real *row = block.rows[n];
-        Vector sumI{};
-        Vector sumQ{};
-        for (int v = 0; v < block.vectors; ++v) {
-            Vector c;
-            Vector xi;
-            Vector xq;
-            load(c, row + v * Lanes);
-            loadSamples<Real>(xi, inPhase + v * Lanes);
-            loadSamples<Real>(xq, quadrature + v * Lanes);
-            sumI += c * xi;
-            sumQ += c * xq;
-        }
-        block.result[2 * n] = sumOf<Real>(sumI);
-        block.result[2 * n + 1] = sumOf<Real>(sumQ);
-    }
+    dotPairs(
+        block, [](std::size_t, const Real *row, int, Vector &c)
+                   __attribute__((always_inline)) { load(c, row); });
 }
 
 template <typename Real>
 CORVANE_INLINE void dotSlopedRowsBody(const SlopedBlock<Real> &sloped)
 {
     using Vector = typename Kernel<Real>::Vector;
-    constexpr int Lanes = Kernel<Real>::Lanes;
-    const RowBlock<Real> &block = sloped.base;
-    const std::ptrdiff_t width = static_cast<std::ptrdiff_t>(block.vectors) * Lanes;
-    for (std::size_t n = 0; n < block.offsets.size(); ++n) {
-        const float *inPhase = block.input.inPhase + block.offsets[n];
-        const float *quadrature = block.input.quadrature + block.offsets[n];
-        const Real *row = block.rows[n];
-        const Real fraction = sloped.fractions[n];
-        Vector sumI{};
-        Vector sumQ{};
-        for (int v = 0; v < block.vectors; ++v) {
-            Vector value;
-            Vector up;
-            Vector down;
-            Vector shift;
-            Vector xi;
-            Vector xq;
-            load(value, row + v * Lanes);
-            load(up, row + width + v * Lanes);
-            load(down, row - width + v * Lanes);
-            load(shift, sloped.shifts + v * Lanes);
-            const Vector d = fraction - shift;
-            const Vector c = value + d * (d >= 0 ? up : down);
-            loadSamples<Real>(xi, inPhase + v * Lanes);
-            loadSamples<Real>(xq, quadrature + v * Lanes);
-            sumI += c * xi;
-            sumQ += c * xq;
-        }
-        block.result[2 * n] = sumOf<Real>(sumI);
-        block.result[2 * n + 1] = sumOf<Real>(sumQ);
-    }
+    const std::ptrdiff_t width =
+        static_cast<std::ptrdiff_t>(sloped.base.vectors) * Kernel<Real>::Lanes;
+    dotPairs(
+        sloped.base, [&](std::size_t n, const Real *row, int place, Vector &c)
+                         __attribute__((always_inline)) {
+                             Vector value;
+                             Vector up;
+                             Vector down;
+                             Vector shift;
+                             load(value, row);
+                             load(up, row + width);
+                             load(down, row - width);
+                             load(shift, sloped.shifts + place);
+                             const Vector d = sloped.fractions[n] - shift;
+                             c = value + d * (d >= 0 ? up : down);
+                         });
 }
 
 /// Sums of this many kernel vectors of outputs are kept in registers.

@@ -21,13 +21,14 @@ struct PlanarInput
 };
 
 /// Outputs of which each has a row of coefficients and a place in the input: the sum over j of
-/// row[j] x[offset + j]. The result is interleaved, I first.
+/// rows[rowStart + j] x[offset + j]. The result is interleaved, I first.
 template <typename Real>
 struct RowBlock
 {
     PlanarInput input;
+    const Real *rows = nullptr;
     std::span<const std::int32_t> offsets;
-    std::span<const Real *const> rows;
+    std::span<const std::int32_t> rowStarts;
     int vectors = 0; ///< kernel vectors in a row
     std::span<float> result;
 };

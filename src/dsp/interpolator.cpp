@@ -1,20 +1,23 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "interpolator.h"
 
+#include "tapplan.h"
+
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstddef>
+#include <cstdint>
 #include <numeric>
 #include <vector>
 
 namespace {
 
 /// Outputs that are planned and computed at a time.
-constexpr std::size_t PlanSize = 512;
+constexpr int PlanSize = 1024;
 
-/// A bank of phases up to this size stays in the second cache of one core.
-constexpr std::size_t MaxBankBytes = 1024 * 1024;
+/// Larger banks of phases would come from main memory.
+constexpr std::size_t MaxBankBytes = 4 * 1024 * 1024;
 
 /// Up to this sum of the magnitudes of the coefficients, single precision holds the bound.
 constexpr double MaxSinglePrecisionSum = 12.0;
@@ -66,54 +69,34 @@ void fillRow(const FilterTable &table, double position, int count, double scale,
     }
 }
 
-/// The rows of outputs that fall on an input sample. The position of such an output is rounded, so
-/// that it may lie a hair before or behind the sample, which changes the number of taps and the
-/// place of the first one.
-template <typename Real>
-class OnSampleRows
-{
-public:
-    static constexpr std::size_t Count = 4;
-
-    /// Writes the rows into the store, `stride` rows apart.
-    static void fill(RowStore<Real> &store, std::size_t first, std::size_t stride,
-                     const FilterTable &table, const TapGeometry &geometry)
-    {
-        for (std::size_t variant = 0; variant < Count; ++variant) {
-            const int back = geometry.length() - (variant % 2 == 0 ? 1 : 2);
-            const int taps = geometry.maxTaps() - (variant < 2 ? 0 : 1);
-            fillRow(table, back * geometry.scale(), taps, geometry.scale(),
-                    store.row(first + variant * stride));
-        }
-    }
-
-    [[nodiscard]] static std::size_t variantOf(const TapRange &taps, const TapGeometry &geometry)
-    {
-        const bool atSample = taps.position > (geometry.length() - 1.5) * geometry.scale();
-        return (atSample ? 0U : 1U) + (taps.count == geometry.maxTaps() ? 0U : 2U);
-    }
+/// An output that falls on an input sample has a tap more than one between two. Its position is
+/// rounded, so that it may lie a hair before or behind the sample, which changes the number of taps
+/// and the place of the first one.
+enum OnSample : std::size_t {
+    Exact = 0,       ///< or so close that the ends of the taps are rounded to it
+    RoundedUp = 1,   ///< all taps, with the coefficients of a position behind the sample
+    JustBefore = 2,  ///< the last tap is missing
+    JustBehind = 3,  ///< the first tap is missing
+    OnSampleRows = 4 ///< number of such rows
 };
 
-/// What the kernels need to know of the next outputs.
-template <typename Real>
-struct Plan
+OnSample onSampleKind(const TapRange &taps, const TapGeometry &geometry)
 {
-    std::array<std::int32_t, PlanSize> offsets;
-    std::array<const Real *, PlanSize> rows;
-    std::array<Real, PlanSize> fractions;
-};
+    const bool before = taps.position > (geometry.length() - 1.5) * geometry.scale();
+    if (taps.count == geometry.maxTaps()) {
+        return before ? Exact : RoundedUp;
+    }
+    return before ? JustBefore : JustBehind;
+}
 
 template <typename Real>
-RowBlock<Real> rowBlock(const Plan<Real> &plan, PlanarInput input, int vectors,
-                        std::span<float> result)
+void fillOnSampleRow(const FilterTable &table, const TapGeometry &geometry, OnSample kind,
+                     Real *row)
 {
-    RowBlock<Real> block;
-    block.input = input;
-    block.offsets = std::span(plan.offsets).first(result.size() / 2);
-    block.rows = std::span(plan.rows).first(result.size() / 2);
-    block.vectors = vectors;
-    block.result = result;
-    return block;
+    const bool before = kind == Exact || kind == JustBefore;
+    const int back = geometry.length() - (before ? 1 : 2);
+    const int taps = geometry.maxTaps() - (kind < JustBefore ? 0 : 1);
+    fillRow(table, back * geometry.scale(), taps, geometry.scale(), row);
 }
 
 /// Equal counts: every output has the same taps, one input sample on.
@@ -151,63 +134,99 @@ public:
     PhaseBank(const FilterTable &table, const TapGeometry &geometry, int inputPeriod,
               int outputPeriod)
         : m_geometry(geometry)
-        , m_inputPeriod(inputPeriod)
-        , m_outputPeriod(outputPeriod)
-        , m_rows(geometry.maxTaps(),
-                 static_cast<std::size_t>(outputPeriod) + OnSampleRows<Real>::Count)
-        , m_first(static_cast<std::size_t>(outputPeriod))
+        , m_phases(outputPeriod)
+        , m_exactRatio(std::fma(geometry.ratio(), inputPeriod, -outputPeriod) == 0)
+        , m_rows(geometry.maxTaps(), static_cast<std::size_t>(outputPeriod) + OnSampleRows)
     {
+        // Short periods are repeated, so that the kernel has long stretches to work on.
+        const int repeats = (PlanSize + outputPeriod - 1) / outputPeriod;
+        m_inputPeriod = static_cast<qint64>(inputPeriod) * repeats;
+        m_outputPeriod = static_cast<qint64>(outputPeriod) * repeats;
+        const std::int32_t stride = m_rows.vectors() * KernelLanes<Real>;
+        for (int repeat = 0; repeat < repeats; ++repeat) {
+            const auto start = static_cast<std::int32_t>(repeat * inputPeriod);
+            m_offsets.push_back(start - geometry.half());
+            m_rowStarts.push_back((outputPeriod + static_cast<std::int32_t>(Exact)) * stride);
+            for (int phase = 1; phase < outputPeriod; ++phase) {
+                const TapRange taps = geometry.taps(phase);
+                m_offsets.push_back(start + static_cast<std::int32_t>(taps.first));
+                m_rowStarts.push_back(phase * stride);
+            }
+        }
         for (int phase = 1; phase < outputPeriod; ++phase) {
             const TapRange taps = geometry.taps(phase);
-            m_first[static_cast<std::size_t>(phase)] = taps.first;
             fillRow(table, taps.position, taps.count, geometry.scale(),
                     m_rows.row(static_cast<std::size_t>(phase)));
         }
-        OnSampleRows<Real>::fill(m_rows, onSample(), 1, table, geometry);
+        for (std::size_t kind = 0; kind < OnSampleRows; ++kind) {
+            fillOnSampleRow(table, geometry, static_cast<OnSample>(kind),
+                            m_rows.row(static_cast<std::size_t>(outputPeriod) + kind));
+        }
     }
 
     void compute(qint64 firstOutput, PlanarInput input, qint64 inputStart,
                  std::span<float> result) const override
     {
-        Plan<Real> plan;
-        qint64 phase = firstOutput % m_outputPeriod;
-        qint64 periodStart = firstOutput / m_outputPeriod * m_inputPeriod;
-        for (std::size_t done = 0; done < result.size() / 2;) {
-            const std::size_t count = std::min(PlanSize, result.size() / 2 - done);
-            for (std::size_t i = 0; i < count; ++i) {
-                if (phase == 0) {
-                    planOnSample(plan, i, firstOutput + static_cast<qint64>(done + i), inputStart);
-                } else {
-                    const auto row = static_cast<std::size_t>(phase);
-                    plan.rows[i] = m_rows.row(row);
-                    plan.offsets[i] =
-                        static_cast<std::int32_t>(m_first[row] + periodStart - inputStart);
-                }
-                if (++phase == m_outputPeriod) {
-                    phase = 0;
-                    periodStart += m_inputPeriod;
-                }
-            }
-            dotRows(rowBlock(plan, input, m_rows.vectors(), result.subspan(2 * done, 2 * count)));
-            done += count;
+        const qint64 count = static_cast<qint64>(result.size() / 2);
+        for (qint64 done = 0; done < count;) {
+            const qint64 output = firstOutput + done;
+            const qint64 place = output % m_outputPeriod;
+            const qint64 length = std::min(count - done, m_outputPeriod - place);
+            const qint64 shift = output / m_outputPeriod * m_inputPeriod - inputStart;
+            RowBlock<Real> block;
+            block.input = {input.inPhase + shift, input.quadrature + shift};
+            block.rows = m_rows.row(0);
+            block.offsets = std::span(m_offsets).subspan(static_cast<std::size_t>(place),
+                                                         static_cast<std::size_t>(length));
+            block.rowStarts =
+                std::span(m_rowStarts)
+                    .subspan(static_cast<std::size_t>(place), static_cast<std::size_t>(length));
+            block.vectors = m_rows.vectors();
+            block.result = result.subspan(2 * static_cast<std::size_t>(done),
+                                          2 * static_cast<std::size_t>(length));
+            dotRows(block);
+            done += length;
+        }
+        if (!m_exactRatio) {
+            correctOnSample(firstOutput, input, inputStart, result);
         }
     }
 
 private:
-    [[nodiscard]] std::size_t onSample() const { return static_cast<std::size_t>(m_outputPeriod); }
-
-    void planOnSample(Plan<Real> &plan, std::size_t i, qint64 output, qint64 inputStart) const
+    /// Computes again the outputs on a sample whose position was rounded away from it.
+    void correctOnSample(qint64 firstOutput, PlanarInput input, qint64 inputStart,
+                         std::span<float> result) const
     {
-        const TapRange taps = m_geometry.taps(output);
-        plan.rows[i] = m_rows.row(onSample() + OnSampleRows<Real>::variantOf(taps, m_geometry));
-        plan.offsets[i] = static_cast<std::int32_t>(taps.first - inputStart);
+        const qint64 end = firstOutput + static_cast<qint64>(result.size() / 2);
+        const qint64 start = (firstOutput + m_phases - 1) / m_phases * m_phases;
+        for (qint64 output = start; output < end; output += m_phases) {
+            const TapRange taps = m_geometry.taps(output);
+            const OnSample kind = onSampleKind(taps, m_geometry);
+            if (kind == Exact) {
+                continue;
+            }
+            const auto offset = static_cast<std::int32_t>(taps.first - inputStart);
+            const auto rowStart = static_cast<std::int32_t>(
+                m_rows.row(static_cast<std::size_t>(m_phases) + kind) - m_rows.row(0));
+            RowBlock<Real> block;
+            block.input = input;
+            block.rows = m_rows.row(0);
+            block.offsets = {&offset, 1};
+            block.rowStarts = {&rowStart, 1};
+            block.vectors = m_rows.vectors();
+            block.result = result.subspan(2 * static_cast<std::size_t>(output - firstOutput), 2);
+            dotRows(block);
+        }
     }
 
     TapGeometry m_geometry;
+    qint64 m_phases;
+    bool m_exactRatio; ///< positions on a sample aren't rounded
     qint64 m_inputPeriod;
     qint64 m_outputPeriod;
-    RowStore<Real> m_rows;       // row 0 is not used
-    std::vector<qint64> m_first; // first tap of each phase in the first period
+    RowStore<Real> m_rows; ///< row 0 isn't used; the rows on a sample follow those of the phases
+    std::vector<std::int32_t> m_offsets;
+    std::vector<std::int32_t> m_rowStarts;
 };
 
 /// Any counts. Tap j of an output at table point p lies at p - j scale. With the whole parts taken
@@ -222,7 +241,7 @@ public:
         , m_lowest(static_cast<int>((geometry.length() - 2) * geometry.scale()) - 1)
         , m_rowCount(
               static_cast<std::size_t>((geometry.length() - 1) * geometry.scale() - m_lowest) + 2)
-        , m_rows(geometry.maxTaps(), 2 * (m_rowCount + 2 * OnSampleRows<Real>::Count))
+        , m_rows(geometry.maxTaps(), 2 * m_rowCount + 8)
         , m_shifts(geometry.maxTaps(), 1)
     {
         // An output between two input samples has one tap less than one on a sample.
@@ -239,47 +258,52 @@ public:
                 }
             }
         }
-        // A row without slopes before and behind serves any fraction.
-        OnSampleRows<Real>::fill(m_rows, 2 * (m_rowCount + 1), 4, table, geometry);
+        // Rows without slopes before and behind serve any fraction.
+        const std::size_t exact = 2 * m_rowCount + 2;
+        const std::size_t roundedUp = exact + 3;
+        fillOnSampleRow(table, geometry, Exact, m_rows.row(exact));
+        fillOnSampleRow(table, geometry, RoundedUp, m_rows.row(roundedUp));
+        m_layout.lowest = m_lowest;
+        m_layout.rowStride = 2 * m_rows.vectors() * KernelLanes<Real>;
+        m_layout.onSample = static_cast<std::int32_t>(m_rows.row(exact) - m_rows.row(0));
+        m_layout.onSampleNext = static_cast<std::int32_t>(m_rows.row(roundedUp) - m_rows.row(0));
     }
 
     void compute(qint64 firstOutput, PlanarInput input, qint64 inputStart,
                  std::span<float> result) const override
     {
-        Plan<Real> plan;
-        for (std::size_t done = 0; done < result.size() / 2;) {
-            const std::size_t count = std::min(PlanSize, result.size() / 2 - done);
-            for (std::size_t i = 0; i < count; ++i) {
-                const qint64 output = firstOutput + static_cast<qint64>(done + i);
-                planOutput(plan, i, m_geometry.taps(output), inputStart);
-            }
-            const RowBlock<Real> block =
-                rowBlock(plan, input, m_rows.vectors(), result.subspan(2 * done, 2 * count));
-            dotSlopedRows(
-                SlopedBlock<Real>{block, std::span(plan.fractions).first(count), m_shifts.row(0)});
-            done += count;
+        std::array<std::int32_t, PlanSize> offsets;
+        std::array<std::int32_t, PlanSize> rowStarts;
+        std::array<Real, PlanSize> fractions;
+        const std::size_t count = result.size() / 2;
+        for (std::size_t done = 0; done < count;) {
+            const std::size_t length = std::min<std::size_t>(PlanSize, count - done);
+            const TapPlan<Real> plan{std::span(offsets).first(length),
+                                     std::span(rowStarts).first(length),
+                                     std::span(fractions).first(length)};
+            planTaps(m_geometry, m_layout, firstOutput + static_cast<qint64>(done), inputStart,
+                     plan);
+            SlopedBlock<Real> block;
+            block.base.input = input;
+            block.base.rows = m_rows.row(0);
+            block.base.offsets = plan.offsets;
+            block.base.rowStarts = plan.rowStarts;
+            block.base.vectors = m_rows.vectors();
+            block.base.result = result.subspan(2 * done, 2 * length);
+            block.fractions = plan.fractions;
+            block.shifts = m_shifts.row(0);
+            dotSlopedRows(block);
+            done += length;
         }
     }
 
 private:
-    void planOutput(Plan<Real> &plan, std::size_t i, const TapRange &taps, qint64 inputStart) const
-    {
-        const auto whole = static_cast<int>(taps.position);
-        plan.offsets[i] = static_cast<std::int32_t>(taps.first - inputStart);
-        plan.fractions[i] = static_cast<Real>(taps.position - whole);
-        if (taps.count < m_geometry.maxTaps()) {
-            plan.rows[i] = m_rows.row(2 * static_cast<std::size_t>(whole - m_lowest));
-        } else {
-            const std::size_t variant = OnSampleRows<Real>::variantOf(taps, m_geometry);
-            plan.rows[i] = m_rows.row(2 * (m_rowCount + 1) + 4 * variant);
-        }
-    }
-
     TapGeometry m_geometry;
     int m_lowest; ///< table point of the first row
     std::size_t m_rowCount;
     RowStore<Real> m_rows; ///< values and slopes take turns
     RowStore<Real> m_shifts;
+    SlopedLayout m_layout;
 };
 
 template <typename Real>

@@ -9,7 +9,6 @@
 
 #include <algorithm>
 #include <array>
-#include <atomic>
 #include <charconv>
 #include <utility>
 #include <vector>
@@ -82,13 +81,11 @@ bool DumpJob::process(SourceWaveform &source, qint64 begin, qint64 count)
         return false;
     }
     emit stepStarted("Writing Samples...");
-    std::atomic<bool> cancelled{false};
-    connect(this, &ToolJob::cancelRequested, this, [&cancelled] { cancelled = true; });
-    ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, cancelled);
+    ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, cancelFlag());
     std::vector<float> values(2 * static_cast<size_t>(std::min(count, blockSamples)));
     std::vector<char> markers(values.size() / 2);
     for (qint64 done = 0; done < count;) {
-        if (progress.shouldStop(done, count) || isCancelled()) {
+        if (progress.shouldStop(done, count)) {
             return Tracer::fail("Action aborted by user.");
         }
         const auto wanted = static_cast<int>(std::min(count - done, blockSamples));

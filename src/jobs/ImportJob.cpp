@@ -38,8 +38,11 @@ bool ImportJob::scale(TempStream &data, int samples, ImportScaling scaling, doub
     }
     const bool tooHigh = scaling == ImportScaling::Down && peak > 1;
     const bool offScale = scaling == ImportScaling::Auto && peak != 1;
-    if (peak == 0 || (!tooHigh && !offScale) || isCancelled()) {
-        return !isCancelled();
+    if (!mayProceed()) {
+        return false;
+    }
+    if (peak == 0 || (!tooHigh && !offScale)) {
+        return true;
     }
     const JobStep step(*this, "Rescaling...", levels);
     if (!levels.rescale(samples, 1 / peak, data.stream())) {
@@ -54,7 +57,8 @@ bool ImportJob::scaleAndSave(TempStream &data, qint64 samples, const ImportTarge
 {
     double peak = 0;
     double rms = 0;
-    if (!scale(data, static_cast<int>(samples), target.scaling, peak, rms)) {
+    if (!mayProceed() || !scale(data, static_cast<int>(samples), target.scaling, peak, rms) ||
+        !mayProceed()) {
         return false;
     }
     WvWriteJob job;
@@ -64,8 +68,8 @@ bool ImportJob::scaleAndSave(TempStream &data, qint64 samples, const ImportTarge
     job.peakOffset = offsetDb(peak);
     job.rmsOffset = offsetDb(rms);
     job.levelsValid = true;
-    job.comment = stripBraces(target.output.comment.value_or(QString()));
-    job.copyright = stripBraces(target.output.copyright.value_or(QString()));
+    job.comment = tagText("comment", target.output.comment.value_or(QString()));
+    job.copyright = tagText("copyright", target.output.copyright.value_or(QString()));
     for (const QString &line :
          levelLines({static_cast<double>(samples), job.peakOffset, job.rmsOffset})) {
         emit report(line);

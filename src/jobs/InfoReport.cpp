@@ -16,7 +16,8 @@ QString yesNo(bool value)
 
 QString decibels(double value)
 {
-    return QString("%1 dB").arg(value);
+    // Adding nothing turns a negative zero into a plain one.
+    return QString("%1 dB").arg(value + 0.0);
 }
 
 QString quoted(const QString &text)

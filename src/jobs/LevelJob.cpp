@@ -31,7 +31,7 @@ bool LevelJob::run()
     if (m_request.output.fileName.isEmpty()) {
         return Tracer::fail("Output file name is empty.");
     }
-    if (!m_source.read(*this, m_request.inputFile)) {
+    if (!m_source.read(*this, m_request.inputFile) || !mayProceed()) {
         return false;
     }
     const double peakDb = m_request.peakDb.value_or(clampedLevel(-m_source.info().peakOffsetTag));
@@ -39,7 +39,7 @@ bool LevelJob::run()
     if (!m_request.peakToRmsDb && !defaultPeakToRms(peakToRmsDb)) {
         return false;
     }
-    return !isCancelled() && write(peakDb, peakToRmsDb);
+    return mayProceed() && write(peakDb, peakToRmsDb);
 }
 
 /// What the samples measure over the whole file, seen from the RMS offset of the tag.
@@ -64,10 +64,10 @@ bool LevelJob::write(double peakDb, double peakToRmsDb)
 {
     Tracer::Trace(Tracer::Information, "Creating rescaled waveform...");
     WvWriteJob job = m_source.writeJob();
-    job.peakOffset = -peakDb;
-    job.rmsOffset = peakToRmsDb - peakDb;
-    job.comment = stripBraces(m_request.output.comment.value_or(job.comment));
-    job.copyright = stripBraces(m_request.output.copyright.value_or(job.copyright));
+    job.peakOffset = writtenDb(-peakDb);
+    job.rmsOffset = writtenDb(peakToRmsDb - peakDb);
+    job.comment = tagText("comment", m_request.output.comment.value_or(job.comment));
+    job.copyright = tagText("copyright", m_request.output.copyright.value_or(job.copyright));
     HvFileIO file;
     const JobStep step(*this, "Saving waveform...", file);
     if (!file.writeWaveform(job, m_request.output.fileName, m_source.data(), m_source.markers(),

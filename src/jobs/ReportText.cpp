@@ -2,9 +2,11 @@
 #include "ReportText.h"
 
 #include "base/EngineeringNumber.h"
+#include "log/Tracer.h"
 
 #include <QRegularExpression>
 
+#include <algorithm>
 #include <cmath>
 
 namespace {
@@ -65,11 +67,37 @@ QString plainLine(const QString &html)
 
 QString stripBraces(const QString &text)
 {
-    static const QRegularExpression braces("[\\{\\}].");
+    // The character behind may be the line break of a text of several lines.
+    static const QRegularExpression braces("[\\{\\}].",
+                                           QRegularExpression::DotMatchesEverythingOption);
     return QString(text).remove(braces);
+}
+
+QString tagText(const QString &tag, const QString &text)
+{
+    const QString kept = stripBraces(text);
+    const auto canStand = [](QChar character) {
+        return character >= QChar(' ') && character < QChar('}');
+    };
+    const auto *const problem = std::find_if_not(kept.begin(), kept.end(), canStand);
+    if (problem != kept.end()) {
+        Tracer::Trace(Tracer::Warning,
+                      QString("The %1 will not read back as it was given: its character %2 "
+                              "(U+%3) is none that the tags of a waveform file can hold.")
+                          .arg(tag)
+                          .arg(problem - kept.begin() + 1)
+                          .arg(QString::number(problem->unicode(), 16).toUpper(), 4, '0'));
+    }
+    return kept;
 }
 
 double offsetDb(double level)
 {
-    return 20 * std::log10(1 / (level + 1e-12));
+    return writtenDb(20 * std::log10(1 / (level + 1e-12)));
+}
+
+double writtenDb(double offset)
+{
+    constexpr double halfDigit = 5e-7;
+    return std::fabs(offset) < halfDigit ? 0.0 : offset;
 }

@@ -39,5 +39,12 @@ struct LevelReport
 /// Removes each brace with the character behind it, so that a text can't break a file's tags.
 [[nodiscard]] QString stripBraces(const QString &text);
 
+/// The text for a comment or copyright tag, without braces. Warns, naming the tag, of characters
+/// that the file can't give back: tags are read as ASCII from the blank to the closing brace.
+[[nodiscard]] QString tagText(const QString &tag, const QString &text);
+
 /// The offset in dB below full scale of a linear level; silence gives 240 dB.
 [[nodiscard]] double offsetDb(double level);
+
+/// An offset in dB as a tag shows it: what would come out as -0.000000 is 0.
+[[nodiscard]] double writtenDb(double offset);

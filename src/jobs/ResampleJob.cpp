@@ -14,8 +14,7 @@
 void ResampleTarget::follow(double sourceClockHz, qint64 sourceSamples)
 {
     if (clockDecides) {
-        samples =
-            static_cast<qint64>(clockHz / sourceClockHz * static_cast<double>(sourceSamples));
+        samples = static_cast<qint64>(clockHz / sourceClockHz * static_cast<double>(sourceSamples));
     } else {
         clockHz = static_cast<double>(samples) * sourceClockHz / static_cast<double>(sourceSamples);
     }
@@ -124,8 +123,8 @@ bool ResampleJob::rescale()
     Resample scaler;
     const JobStep step(*this, "Rescaling...", scaler);
     if (!scaler.rescale(static_cast<int>(m_request.target.samples), std::pow(10.0, change / 20),
-                        m_data.stream())
-        || isCancelled()) {
+                        m_data.stream()) ||
+        isCancelled()) {
         return stopWith("Rescaling failed", "Rescaling of the waveform failed.");
     }
     m_result.samples = static_cast<int>(m_request.target.samples);

@@ -39,5 +39,5 @@ bool SampleReadJob::run()
         return Tracer::fail(problem);
     }
     const qint64 begin = m_range.from.value_or(0);
-    return !isCancelled() && process(m_source, begin, m_range.count.value_or(samples - begin));
+    return mayProceed() && process(m_source, begin, m_range.count.value_or(samples - begin));
 }

@@ -7,53 +7,93 @@
 #include "wvfile/HvFileIO.h"
 
 #include <algorithm>
+#include <span>
+#include <utility>
 #include <vector>
 
 namespace {
 
 constexpr int blockSize = 64 * 1024;
 
-/// Splits a tags stream at its closing braces; reads on as needed.
-class TagSplitter
+/// Copies a tags stream without the tags that begin with a given text. Works on what comes, since
+/// a tag may be as long as its file.
+class TagFilter
 {
 public:
-    explicit TagSplitter(BufferedIO &stream)
-        : m_stream(stream)
+    TagFilter(BufferedIO &target, QByteArray dropped)
+        : m_target(target)
+        , m_dropped(std::move(dropped))
     {
     }
 
-    /// The next tag with its braces; empty at the end.
-    [[nodiscard]] QByteArray next()
+    /// Whether a tag has gone to the target.
+    [[nodiscard]] bool hasKept() const { return m_hasKept; }
+
+    /// Takes the next bytes of the stream; false if the target can't be written.
+    [[nodiscard]] bool take(std::span<const char> bytes)
     {
-        for (;;) {
-            const qsizetype end = m_text.indexOf('}', m_begin);
-            if (end >= 0) {
-                const QByteArray tag = m_text.mid(m_begin, end + 1 - m_begin);
-                m_begin = end + 1;
-                return tag;
+        while (!bytes.empty()) {
+            if (m_state == State::Head) {
+                if (!takeHead(bytes.front())) {
+                    return false;
+                }
+                bytes = bytes.subspan(1);
+                continue;
             }
-            m_text.remove(0, m_begin);
-            m_begin = 0;
-            const qsizetype held = m_text.size();
-            m_text.resize(held + blockSize);
-            const int got = m_stream.readBlock(blockSize, m_text.data() + held);
-            m_text.resize(held + std::max(got, 0));
-            if (got <= 0) {
-                return {};
+            const auto end = std::find(bytes.begin(), bytes.end(), '}');
+            const bool ends = end != bytes.end();
+            const auto part =
+                bytes.first(static_cast<size_t>(end - bytes.begin()) + (ends ? 1 : 0));
+            if (m_state == State::Keep && !write(part)) {
+                return false;
             }
+            if (ends) {
+                m_state = State::Head;
+            }
+            bytes = bytes.subspan(part.size());
         }
+        return true;
     }
 
 private:
-    BufferedIO &m_stream;
-    QByteArray m_text;
-    qsizetype m_begin = 0;
+    enum class State { Head, Keep, Drop };
+
+    [[nodiscard]] bool takeHead(char byte)
+    {
+        m_head.append(byte);
+        if (m_head == m_dropped) {
+            m_head.clear();
+            m_state = State::Drop;
+            return true;
+        }
+        if (m_dropped.startsWith(m_head)) {
+            return true;
+        }
+        m_hasKept = true;
+        m_state = byte == '}' ? State::Head : State::Keep;
+        const QByteArray head = std::exchange(m_head, {});
+        return write({head.constData(), static_cast<size_t>(head.size())});
+    }
+
+    [[nodiscard]] bool write(std::span<const char> bytes)
+    {
+        return m_target.writeBytes(static_cast<int>(bytes.size()), bytes.data());
+    }
+
+    BufferedIO &m_target;
+    QByteArray m_dropped;
+    QByteArray m_head; // of the tag that began, until it is known whether it is dropped
+    State m_state = State::Head;
+    bool m_hasKept = false;
 };
 
 } // namespace
 
 bool SourceWaveform::read(ToolJob &job, const QString &fileName)
 {
+    if (!job.mayProceed()) {
+        return false;
+    }
     TempStream unknownTags;
     if (!m_data.open() || !unknownTags.open() || !m_tags.open()) {
         return Tracer::fail("Cannot create temporary data buffer.");
@@ -108,18 +148,19 @@ bool SourceWaveform::filterTags(TempStream &unknownTags)
     if (!unknownTags->restartAtBegining()) {
         return Tracer::fail("Cannot save unknown tag.");
     }
-    TagSplitter splitter(*unknownTags.stream());
-    for (QByteArray tag = splitter.next(); !tag.isEmpty(); tag = splitter.next()) {
-        // The writer states the marker clock itself; a second one would follow with every copy.
-        if (tag.startsWith("{CLOCK MARKER:")) {
-            continue;
+    // The writer states the marker clock itself; a second one would follow with every copy.
+    TagFilter filter(*m_tags.stream(), "{CLOCK MARKER:");
+    std::vector<char> block(blockSize);
+    for (;;) {
+        const int got = unknownTags->readBlock(blockSize, block.data());
+        if (got == 0) {
+            m_hasTags = filter.hasKept();
+            return true;
         }
-        if (!m_tags->writeBytes(static_cast<int>(tag.size()), tag.constData())) {
+        if (got < 0 || !filter.take(std::span(block).first(static_cast<size_t>(got)))) {
             return Tracer::fail("Cannot save unknown tag.");
         }
-        m_hasTags = true;
     }
-    return true;
 }
 
 void SourceWaveform::dropTags()

@@ -23,6 +23,9 @@ public:
 
     [[nodiscard]] bool isCancelled() const { return m_cancelled; }
 
+    /// To be asked between steps: false, with the abort logged, once the job was cancelled.
+    [[nodiscard]] bool mayProceed() const;
+
 public slots:
     /// Ends the running step at its next tick, and keeps later steps from starting.
     void cancel();
@@ -39,6 +42,10 @@ signals:
 
     /// To the worker of the running step.
     void cancelRequested();
+
+protected:
+    /// The flag behind isCancelled(), for a loop of the job itself.
+    [[nodiscard]] const std::atomic<bool> &cancelFlag() const { return m_cancelled; }
 
 private:
     std::atomic<bool> m_cancelled{false};

@@ -1,0 +1,15 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "jobs/SampleReadJob.h"
+
+#include <CLI/CLI.hpp>
+
+class Console;
+
+/// Adds the file argument and the options --from and --count of the commands that look at samples.
+void addRange(CLI::App &command, SampleRange &range);
+
+/// Whether the range lies in the file, by its tags; if not, `exitCode` is that of wrong usage. A
+/// file that can't be scanned passes: reading it tells the reason.
+[[nodiscard]] bool rangeFits(Console &console, const SampleRange &range, int &exitCode);

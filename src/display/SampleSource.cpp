@@ -1,0 +1,81 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "SampleSource.h"
+
+#include "dsp/samplestream.h"
+#include "log/Tracer.h"
+
+#include <algorithm>
+#include <vector>
+
+namespace {
+
+bool fail(const char *message)
+{
+    Tracer::Trace(Tracer::Error, message);
+    return false;
+}
+
+} // namespace
+
+MemorySource::MemorySource(std::span<const IqSample> samples, std::span<const quint8> markers,
+                           qint64 first)
+    : m_samples(samples)
+    , m_markers(markers)
+    , m_first(first)
+{
+}
+
+bool MemorySource::restart()
+{
+    m_done = 0;
+    return true;
+}
+
+bool MemorySource::next(std::span<IqSample> samples, std::span<quint8> markers)
+{
+    if (samples.size() > m_samples.size() - m_done) {
+        return fail("Internal error. Invalid buffer length.");
+    }
+    std::copy_n(m_samples.begin() + static_cast<std::ptrdiff_t>(m_done), samples.size(),
+                samples.begin());
+    for (std::size_t k = 0; k < markers.size(); ++k) {
+        markers[k] = m_done + k < m_markers.size() ? m_markers[m_done + k] : quint8{0};
+    }
+    m_done += samples.size();
+    return true;
+}
+
+StreamSource::StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, qint64 count)
+    : m_data(data)
+    , m_markers(markers)
+    , m_first(first)
+    , m_count(count)
+{
+}
+
+bool StreamSource::restart()
+{
+    if (!m_data.restartAtPosition(BufferedIO::HeaderSize + BufferedIO::RecordSize * m_first)) {
+        return fail("Cannot read I/Q data from temporary file.");
+    }
+    if (!m_markers.restartAtPosition(m_first)) {
+        return fail("Cannot read marker data from temporary file.");
+    }
+    return true;
+}
+
+bool StreamSource::next(std::span<IqSample> samples, std::span<quint8> markers)
+{
+    std::vector<float> iq(2 * samples.size());
+    if (readSamples(m_data, iq) != static_cast<int>(samples.size())) {
+        return fail("Cannot read I/Q data from temporary file.");
+    }
+    for (std::size_t k = 0; k < samples.size(); ++k) {
+        samples[k] = {iq[2 * k], iq[2 * k + 1]};
+    }
+    const int markerCount = static_cast<int>(markers.size());
+    if (m_markers.readBlock(markerCount, markers.data()) != markerCount) {
+        return fail("Cannot read marker data from temporary file.");
+    }
+    return true;
+}

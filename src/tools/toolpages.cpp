@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "toolpages.h"
+
+#include <QFileDialog>
+#include <QFileInfo>
+#include <QLineEdit>
+
+namespace {
+
+QString waveformTitle()
+{
+    return QFileDialog::tr("Select waveform file");
+}
+
+QString waveformFilter()
+{
+    return QFileDialog::tr("Waveform File (*.wv)");
+}
+
+} // namespace
+
+bool chooseSourceFile(QWidget *parent, QLineEdit &field)
+{
+    const QString fileName =
+        QFileDialog::getOpenFileName(parent, waveformTitle(), field.text(), waveformFilter());
+    if (!fileName.isEmpty()) {
+        field.setText(fileName);
+    }
+    return !fileName.isEmpty();
+}
+
+void chooseTargetFile(QWidget *parent, QLineEdit &field)
+{
+    const QString fileName =
+        QFileDialog::getSaveFileName(parent, waveformTitle(), field.text(), waveformFilter(),
+                                     nullptr, QFileDialog::DontConfirmOverwrite);
+    if (!fileName.isEmpty()) {
+        field.setText(fileName);
+    }
+}
+
+QString fileNameWithSuffix(const QString &fileName, const QString &suffix)
+{
+    const QFileInfo file(fileName);
+    const QString extension = file.suffix();
+    return file.path() + '/' + file.completeBaseName() + suffix +
+           (extension.isEmpty() ? QString() : '.' + extension);
+}

@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <QString>
+
+class QLineEdit;
+class QWidget;
+
+/// What the tools' pages share.
+
+/// Asks for a waveform file to read and puts its name into the field; false if the user cancels.
+[[nodiscard]] bool chooseSourceFile(QWidget *parent, QLineEdit &field);
+
+/// Asks for a waveform file to write and puts its name into the field. Overwriting is asked about
+/// later, when the file is written.
+void chooseTargetFile(QWidget *parent, QLineEdit &field);
+
+/// "/data/noise.wv" with "_resample" becomes "/data/noise_resample.wv".
+[[nodiscard]] QString fileNameWithSuffix(const QString &fileName, const QString &suffix);

@@ -1,0 +1,236 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "display/TraceBins.h"
+
+#include <QRandomGenerator>
+#include <QTest>
+
+#include <algorithm>
+#include <cmath>
+#include <vector>
+
+namespace {
+
+using Bins = std::array<TraceBin, TraceBins::BinCount>;
+
+double plainPhase(const IqSample &sample, double magnitude)
+{
+    if (!(magnitude > 1e-6)) {
+        return 0;
+    }
+    if (sample.i == 0) {
+        return sample.q > 0 ? 6.283185308 : -6.283185308;
+    }
+    if (sample.q == 0) {
+        return sample.i <= 0 ? 3.141592654 : 0;
+    }
+    return std::atan2(sample.q, sample.i);
+}
+
+/// One sample after the other, as one would write it down: the judge of the block loop.
+Bins plainBins(const std::vector<IqSample> &samples, const std::vector<quint8> &markers)
+{
+    Bins bins{};
+    double previous = 0;
+    for (std::size_t i = 0; i < samples.size(); ++i) {
+        const IqSample &s = samples[i];
+        const double m = std::sqrt(s.i * s.i + s.q * s.q);
+        const double p = plainPhase(s, m);
+        const double q = p < 0 ? p + 6.283 : p;
+        double d = i == 0 ? 0 : q - previous;
+        previous = q;
+        if (d > 3.1415) {
+            d -= 6.283;
+        } else if (d < -3.1415) {
+            d += 6.283;
+        }
+        TraceBin &bin = bins[i * 512 / samples.size()];
+        if (bin.count == 0) {
+            bin = {s.i, s.i, s.q, s.q, m, m, m, p, p, d, d, 0, 0, 0};
+        }
+        bin.iMin = std::min(bin.iMin, s.i);
+        bin.iMax = std::max(bin.iMax, s.i);
+        bin.qMin = std::min(bin.qMin, s.q);
+        bin.qMax = std::max(bin.qMax, s.q);
+        bin.magMin = std::min(bin.magMin, m);
+        bin.magMax = std::max(bin.magMax, m);
+        bin.magAvg = (m + bin.count * bin.magAvg) / (bin.count + 1);
+        if (std::fabs(p) < std::fabs(bin.phaseLow)) {
+            bin.phaseLow = p;
+        }
+        if (std::fabs(p) > std::fabs(bin.phaseHigh)) {
+            bin.phaseHigh = p;
+        }
+        bin.freqMin = std::min(bin.freqMin, d);
+        bin.freqMax = std::max(bin.freqMax, d);
+        ++bin.count;
+        if (i < markers.size()) {
+            bin.mkrHigh = static_cast<quint8>(bin.mkrHigh | markers[i]);
+            bin.mkrLow = static_cast<quint8>(bin.mkrLow | (markers[i] ^ 15));
+        }
+    }
+    return bins;
+}
+
+std::vector<IqSample> mixedSamples(std::size_t count)
+{
+    QRandomGenerator random(4711);
+    std::vector<IqSample> samples(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        const double angle = 0.31 * static_cast<double>(i) + random.generateDouble();
+        const double size = random.generateDouble();
+        samples[i] = {size * std::cos(angle), size * std::sin(angle)};
+        switch (random.bounded(12)) { // the special cases of the phase
+        case 0:
+            samples[i].i = 0;
+            break;
+        case 1:
+            samples[i].q = 0;
+            break;
+        case 2:
+            samples[i] = {};
+            break;
+        case 3:
+            samples[i] = {7e-7, -7e-7};
+            break;
+        case 4:
+            samples[i] = {-0.5, -0.0};
+            break;
+        default:
+            break;
+        }
+    }
+    return samples;
+}
+
+/// The phase comes from another arc tangent and the mean from a plain sum: equal to within a few
+/// units in the last place of the greatest phase. Everything else is equal.
+constexpr double Tolerance = 4e-15;
+
+bool close(double a, double b)
+{
+    return std::fabs(a - b) <= Tolerance;
+}
+
+QString difference(const Bins &actual, const Bins &expected)
+{
+    for (std::size_t k = 0; k < actual.size(); ++k) {
+        const TraceBin &a = actual[k];
+        const TraceBin &e = expected[k];
+        const bool equal = a.iMin == e.iMin && a.iMax == e.iMax && a.qMin == e.qMin &&
+                           a.qMax == e.qMax && a.magMin == e.magMin && a.magMax == e.magMax &&
+                           a.count == e.count && a.mkrHigh == e.mkrHigh && a.mkrLow == e.mkrLow &&
+                           close(a.magAvg, e.magAvg) && close(a.phaseLow, e.phaseLow) &&
+                           close(a.phaseHigh, e.phaseHigh) && close(a.freqMin, e.freqMin) &&
+                           close(a.freqMax, e.freqMax);
+        if (!equal) {
+            return QString("bin %1: count %2/%3, I %4..%5/%6..%7, phase %8/%9")
+                       .arg(k)
+                       .arg(a.count)
+                       .arg(e.count)
+                       .arg(a.iMin)
+                       .arg(a.iMax)
+                       .arg(e.iMin)
+                       .arg(e.iMax)
+                       .arg(a.phaseHigh, 0, 'g', 17)
+                       .arg(e.phaseHigh, 0, 'g', 17) +
+                   QString(", step %1..%2/%3..%4")
+                       .arg(a.freqMin)
+                       .arg(a.freqMax)
+                       .arg(e.freqMin)
+                       .arg(e.freqMax);
+        }
+    }
+    return {};
+}
+
+} // namespace
+
+class TestTraceBins : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void equalsPlainForm_data();
+    void equalsPlainForm();
+    void piecesGiveTheSame();
+    void fewSamplesKeepTheTable();
+    void sparse();
+    void imaginaryAxisHasFullCircle();
+};
+
+void TestTraceBins::equalsPlainForm_data()
+{
+    QTest::addColumn<int>("count");
+    QTest::addColumn<int>("markerCount");
+    for (const int count : {4, 5, 249, 511, 512, 513, 1000, 5000, 100003, 600001}) {
+        QTest::addRow("%d", count) << count << count;
+    }
+    QTest::newRow("markers end early") << 5000 << 1234;
+    QTest::newRow("no markers") << 5000 << 0;
+}
+
+void TestTraceBins::equalsPlainForm()
+{
+    QFETCH(int, count);
+    QFETCH(int, markerCount);
+    const auto samples = mixedSamples(static_cast<std::size_t>(count));
+    std::vector<quint8> markers(static_cast<std::size_t>(markerCount));
+    for (std::size_t i = 0; i < markers.size(); ++i) {
+        markers[i] = static_cast<quint8>(i / 37 % 16);
+    }
+    TraceBins bins;
+    bins.compute(samples, markers);
+    const QString text = difference(bins.bins(), plainBins(samples, markers));
+    QVERIFY2(text.isEmpty(), qPrintable(text));
+}
+
+void TestTraceBins::piecesGiveTheSame()
+{
+    const auto samples = mixedSamples(3001);
+    const std::vector<quint8> markers(samples.size(), 5);
+    const Bins expected = plainBins(samples, markers);
+    for (const std::size_t piece : {1U, 2U, 3U, 7U, 64U, 1000U}) {
+        TraceBins bins;
+        bins.begin(static_cast<qint64>(samples.size()));
+        for (std::size_t from = 0; from < samples.size(); from += piece) {
+            const std::size_t count = std::min(piece, samples.size() - from);
+            bins.append(std::span(samples).subspan(from, count),
+                        std::span(markers).subspan(from, count));
+        }
+        const QString text = difference(bins.bins(), expected);
+        QVERIFY2(text.isEmpty(), qPrintable(QString("pieces of %1: %2").arg(piece).arg(text)));
+    }
+}
+
+void TestTraceBins::fewSamplesKeepTheTable()
+{
+    TraceBins bins;
+    const auto samples = mixedSamples(600);
+    bins.compute(samples, {});
+    const Bins before = bins.bins();
+    bins.compute(std::span(samples).first(3), {});
+    QVERIFY(difference(bins.bins(), before).isEmpty());
+    bins.clear();
+    QCOMPARE(bins.bins()[0].count, 0);
+}
+
+void TestTraceBins::sparse()
+{
+    TraceBins bins;
+    bins.compute(mixedSamples(249), {});
+    QVERIFY(bins.isSparse());
+    bins.compute(mixedSamples(250), {});
+    QVERIFY(!bins.isSparse());
+}
+
+void TestTraceBins::imaginaryAxisHasFullCircle()
+{
+    TraceBins bins;
+    bins.compute(std::vector<IqSample>(8, {0, 1}), {});
+    QCOMPARE(bins.bins()[0].phaseHigh, 6.283185308);
+    bins.compute(std::vector<IqSample>(8, {0, -1}), {});
+    QCOMPARE(bins.bins()[0].phaseHigh, -6.283185308);
+}
+
+QTEST_APPLESS_MAIN(TestTraceBins)
+#include "tst_TraceBins.moc"

@@ -1,0 +1,525 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "TextRecorder.h"
+#include "display/CWidgetTimeline.h"
+#include "display/ConstellationPainter.h"
+#include "display/SpectrumPainter.h"
+#include "display/TracePainter.h"
+#include "display/renderplot.h"
+#include "displaysamples.h"
+#include "log/Tracer.h"
+#include "wvfile/TempStream.h"
+
+#include <QPainter>
+#include <QTest>
+
+#include <cmath>
+#include <functional>
+#include <set>
+#include <utility>
+
+namespace {
+
+constexpr QSize PlotSize(720, 400); // the waterfall has more columns than bins
+const QRectF PlotArea(0, 0, PlotSize.width(), PlotSize.height());
+
+QImage pictureOf(PlotView view, const IqList &samples, const QList<quint8> &markers = {},
+                 double ratio = 1)
+{
+    MemorySource source(samples, markers);
+    PlotRequest request;
+    request.view = view;
+    request.clockHz = 100e6;
+    request.size = PlotSize;
+    request.pixelRatio = ratio;
+    request.showMarkers = !markers.isEmpty();
+    return renderPlot(request, source);
+}
+
+QRectF tracePlot()
+{
+    return PlotArea.marginsRemoved(TracePainter::margins(PlotStyle::current().font));
+}
+
+TraceScene sceneOf(TraceMode mode, bool markers = false)
+{
+    TraceScene scene;
+    scene.mode = mode;
+    scene.showMarkers = markers;
+    return scene;
+}
+
+QList<QRectF> panesOf(TraceMode mode, bool markers = false)
+{
+    const PlotStyle style = PlotStyle::current();
+    const TraceScene scene = sceneOf(mode, markers);
+    return TracePainter(style, scene).panes(tracePlot());
+}
+
+bool isNear(QRgb pixel, const QColor &color, int tolerance = 60)
+{
+    return std::abs(qRed(pixel) - color.red()) < tolerance &&
+           std::abs(qGreen(pixel) - color.green()) < tolerance &&
+           std::abs(qBlue(pixel) - color.blue()) < tolerance;
+}
+
+/// Mean row of the yellow trace in a column of a pane, weighted by its strength, since a line
+/// between two rows of pixels colours both; -1 if there is none.
+double rowOfTrace(const QImage &image, int x, const QRectF &pane)
+{
+    double sum = 0;
+    double weights = 0;
+    for (int y = static_cast<int>(pane.top()) + 1; y < static_cast<int>(pane.bottom()) - 1; ++y) {
+        const int yellow = qRed(image.pixel(x, y)) - qBlue(image.pixel(x, y));
+        if (yellow > 20) {
+            sum += (y + 0.5) * yellow;
+            weights += yellow;
+        }
+    }
+    return weights > 0 ? sum / weights : -1;
+}
+
+QColor plotColor(PlotColor place)
+{
+    return PlotStyle::current().color(place);
+}
+
+} // namespace
+
+class TestPictures : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void namesOfViews();
+    void constantsLieAtTheirLevel_data();
+    void constantsLieAtTheirLevel();
+    void envelopeIsFilled();
+    void phaseOfTheImaginaryAxisIsOffThePane();
+    void markerEdges();
+    void sparseDots();
+    void shortAndEmptyData_data();
+    void shortAndEmptyData();
+    void toneColumnInSpectrum();
+    void toneColumnInWaterfall();
+    void constellationCellsAndDots();
+    void timelineShowsRangeAndCursors();
+    void axisTextsDoNotOverlap_data();
+    void axisTextsDoNotOverlap();
+    void linesAreSharp_data();
+    void linesAreSharp();
+    void streamsAndMemoryGiveTheSame_data();
+    void streamsAndMemoryGiveTheSame();
+    void brokenStreamGivesNoPicture();
+};
+
+void TestPictures::namesOfViews()
+{
+    QCOMPARE(plotViewNames().size(), 9);
+    QVERIFY(plotViewOf("waterfall") == PlotView::Waterfall);
+    QVERIFY(!plotViewOf("Waterfall").has_value());
+    QVERIFY(!plotViewOf("").has_value());
+}
+
+void TestPictures::constantsLieAtTheirLevel_data()
+{
+    QTest::addColumn<int>("view");
+    QTest::addColumn<double>("i");
+    QTest::addColumn<double>("q");
+    QTest::addColumn<double>("fraction"); // of the first pane, from the bottom
+    QTest::newRow("I") << 0 << 0.4 << 0.0 << 0.7;
+    QTest::newRow("I negative") << 0 << -0.6 << 0.1 << 0.2;
+    QTest::newRow("log envelope") << 1 << 0.1 << 0.0 << 0.8;
+    QTest::newRow("log average") << 2 << 0.0 << 0.01 << 0.6;
+    QTest::newRow("log of silence") << 2 << 0.0 << 0.0 << 0.0;
+    QTest::newRow("linear average") << 3 << 0.3 << 0.4 << 0.5;
+    QTest::newRow("phase of 1 + j, upwards") << 4 << 0.5 << 0.5 << (0.785398 / 3.1415 + 1) / 2;
+    QTest::newRow("phase of 1 - j") << 4 << 0.5 << -0.5 << (-0.785398 / 3.1415 + 1) / 2;
+}
+
+void TestPictures::constantsLieAtTheirLevel()
+{
+    QFETCH(int, view);
+    QFETCH(double, i);
+    QFETCH(double, q);
+    QFETCH(double, fraction);
+    const QImage image = pictureOf(static_cast<PlotView>(view), IqList(2000, {i, q}));
+    const QRectF pane = panesOf(static_cast<TraceMode>(view)).first();
+    for (const int bin : {3, 256, 508}) {
+        const int x = static_cast<int>(TracePainter::xOf(tracePlot(), bin));
+        const double row = rowOfTrace(image, x, pane);
+        QVERIFY2(
+            std::fabs(row - TracePainter::yOf(pane, fraction)) <= 1.5,
+            qPrintable(
+                QString("row %1, expected %2").arg(row).arg(TracePainter::yOf(pane, fraction))));
+    }
+}
+
+void TestPictures::envelopeIsFilled()
+{
+    // Every bin holds both +0.5 and -0.5.
+    const QImage image = pictureOf(PlotView::Iq, squareSamples(20000));
+    const QList<QRectF> panes = panesOf(TraceMode::IqEnvelope);
+    const QColor colors[2] = {plotColor(PlotColor::AverageTrace), plotColor(PlotColor::PeakTrace)};
+    for (int k = 0; k < 2; ++k) {
+        const QRectF &pane = panes.at(k);
+        for (int x = static_cast<int>(pane.left()) + 2; x < TracePainter::xOf(tracePlot(), 511) - 1;
+             ++x) {
+            for (const double fraction : {0.27, 0.5, 0.73}) {
+                const int y = static_cast<int>(TracePainter::yOf(pane, fraction));
+                QVERIFY2(isNear(image.pixel(x, y), colors[k], 4), qPrintable(QString::number(x)));
+            }
+            for (const double fraction : {0.2, 0.8}) {
+                const int y = static_cast<int>(TracePainter::yOf(pane, fraction));
+                QVERIFY(!isNear(image.pixel(x, y), colors[k]));
+            }
+        }
+    }
+}
+
+void TestPictures::phaseOfTheImaginaryAxisIsOffThePane()
+{
+    const QImage image = pictureOf(PlotView::Phase, IqList(2000, {0, 1}));
+    const QRectF pane = panesOf(TraceMode::Phase).first();
+    QCOMPARE(rowOfTrace(image, 300, pane), -1.0);
+}
+
+void TestPictures::markerEdges()
+{
+    constexpr int count = 5120; // ten samples a bin
+    QList<quint8> markers(count, 0);
+    std::fill(markers.begin() + 1000, markers.begin() + 3000, quint8{1}); // M1 from bin 100 to 300
+    const QImage image = pictureOf(PlotView::Phase, toneSamples(count, 0.01), markers);
+    const QRectF pane = panesOf(TraceMode::Phase, true).last();
+    QVERIFY(std::fabs(pane.height() - tracePlot().height() / 3) < 1);
+    const QColor color = plotColor(PlotColor::PrimaryMarker);
+    const int high = static_cast<int>(std::round(TracePainter::yOf(pane, 0.85)));
+    const int low = static_cast<int>(std::round(TracePainter::yOf(pane, 0.75)));
+    QVERIFY(high < low);
+    const auto x = [](int bin) { return static_cast<int>(TracePainter::xOf(tracePlot(), bin)); };
+    for (const int bin : {20, 99, 301, 500}) {
+        QVERIFY(isNear(image.pixel(x(bin), low), color, 4));
+        QVERIFY(!isNear(image.pixel(x(bin), high), color));
+    }
+    for (const int bin : {101, 200, 299}) {
+        QVERIFY(isNear(image.pixel(x(bin), high), color, 4));
+        QVERIFY(!isNear(image.pixel(x(bin), low), color));
+    }
+    for (const int edge : {100, 300}) {
+        QVERIFY(isNear(image.pixel(x(edge), (high + low) / 2), color, 4));
+        QVERIFY(!isNear(image.pixel(x(edge) + 2, (high + low) / 2), color));
+    }
+    // M2 stays low all the way.
+    const int secondLow = static_cast<int>(std::round(TracePainter::yOf(pane, 0.5)));
+    QVERIFY(isNear(image.pixel(x(256), secondLow), plotColor(PlotColor::SecondaryMarker), 4));
+}
+
+void TestPictures::sparseDots()
+{
+    const auto dots = [](int samples) {
+        const QImage image = pictureOf(PlotView::LinAvg, IqList(samples, {0.5, 0}));
+        const QRectF pane = panesOf(TraceMode::LinMagAverage).first();
+        const int y = static_cast<int>(TracePainter::yOf(pane, 0.5));
+        int runs = 0;
+        bool inside = false;
+        for (int x = static_cast<int>(pane.left()) - 1; x < pane.right(); ++x) {
+            const bool dot = isNear(image.pixel(x, y), plotColor(PlotColor::Cursor), 40);
+            runs += dot && !inside ? 1 : 0;
+            inside = dot;
+        }
+        return runs;
+    };
+    QCOMPARE(dots(20), 20);
+    QCOMPARE(dots(250), 0);
+}
+
+void TestPictures::shortAndEmptyData_data()
+{
+    QTest::addColumn<int>("view");
+    QTest::addColumn<int>("samples");
+    QTest::addColumn<QString>("hint");
+    for (int view = 0; view < plotViewNames().size(); ++view) {
+        QTest::addRow("%s, empty", qPrintable(plotViewNames().at(view))) << view << 0 << QString();
+    }
+    QTest::newRow("trace of 3") << 1 << 3 << "A trace needs 4 samples, here are 3.";
+    QTest::newRow("spectrum of 511") << 6 << 511 << "A transform needs 512 samples, here are 511.";
+    QTest::newRow("waterfall of 3") << 7 << 3 << "A transform needs 512 samples, here are 3.";
+    QTest::newRow("waterfall of 512") << 7 << 512 << QString();
+}
+
+void TestPictures::shortAndEmptyData()
+{
+    QFETCH(int, view);
+    QFETCH(int, samples);
+    QFETCH(QString, hint);
+    const IqList list = toneSamples(samples, 0.1);
+    QVERIFY(!pictureOf(static_cast<PlotView>(view), list).isNull());
+
+    TextRecorder recorder(PlotSize);
+    QPainter painter(&recorder);
+    MemorySource source(list);
+    QVERIFY(paintPlot(painter, PlotArea, {static_cast<PlotView>(view), 100e6}, source));
+    painter.end();
+    QStringList words;
+    for (const TextRecorder::Text &text : recorder.texts()) {
+        words += text.words;
+    }
+    QCOMPARE(words.join('|').contains("needs"), !hint.isEmpty());
+    QVERIFY2(hint.isEmpty() || words.contains(hint), qPrintable(words.join('|')));
+}
+
+void TestPictures::toneColumnInSpectrum()
+{
+    constexpr int bin = 100; // above zero frequency
+    const QImage image = pictureOf(PlotView::Spectrum, toneSamples(5000, bin / 512.0, 0.1));
+    const QRectF plot = PlotArea.marginsRemoved(
+        SpectrumPainter::margins(PlotStyle::current().font, SpectrumMode::Spectrum));
+    const PlotStyle style = PlotStyle::current();
+    const SpectrumScene scene;
+    const SpectrumPainter painter(style, scene);
+    int topRow = image.height();
+    int topColumn = -1;
+    for (int x = static_cast<int>(plot.left()) + 1; x < plot.right() - 1; ++x) {
+        for (int y = static_cast<int>(plot.top()) + 1; y < topRow; ++y) {
+            if (isNear(image.pixel(x, y), plotColor(PlotColor::AverageTrace))) {
+                topRow = y;
+                topColumn = x;
+            }
+        }
+    }
+    QVERIFY(std::fabs(topColumn + 0.5 - SpectrumPainter::xOf(plot, 256 + bin)) <= 1.5);
+    QVERIFY(std::fabs(topRow - painter.yOf(plot, -20)) <= 2.5);
+}
+
+void TestPictures::toneColumnInWaterfall()
+{
+    constexpr int bin = -60;
+    for (const double ratio : {1.0, 1.5, 2.0}) {
+        const QImage image =
+            pictureOf(PlotView::Waterfall, toneSamples(3000, bin / 512.0, 1), {}, ratio);
+        const QRectF plot = PlotArea.marginsRemoved(
+            SpectrumPainter::margins(PlotStyle::current().font, SpectrumMode::Waterfall));
+        const auto column = [&](double place) {
+            return static_cast<int>(SpectrumPainter::xOf(plot, place) * ratio);
+        };
+        const ColorTable table;
+        for (const double share : {0.1, 0.5, 0.9}) {
+            const int y = static_cast<int>((plot.top() + share * plot.height()) * ratio);
+            // A column of pixels shows the bin at its left edge, so it may stand one further right.
+            const int x = column(256 + bin);
+            QVERIFY(image.pixel(x, y) == table.entry(0) || image.pixel(x + 1, y) == table.entry(0));
+            QCOMPARE(image.pixel(column(256 + bin + 8), y), table.background());
+            QCOMPARE(image.pixel(column(256 - bin), y), table.background());
+        }
+    }
+}
+
+void TestPictures::constellationCellsAndDots()
+{
+    const PlotStyle style = PlotStyle::current();
+    const QRectF plot = ConstellationPainter::square(PlotArea, style.font);
+    const auto colored = [&plot](const QImage &image, double i, double q) {
+        const QPoint place(static_cast<int>(plot.center().x() + i * plot.width() / 2),
+                           static_cast<int>(plot.center().y() - q * plot.height() / 2));
+        return image.pixel(place);
+    };
+    // The peak is 0.45 sqrt 2 = 0.64, so the edge is 1 V; all four cells hold as much.
+    const QImage cells = pictureOf(PlotView::Constellation, squareSamples(4000, 0.45));
+    const QImage dots = pictureOf(PlotView::Constellation, squareSamples(400, 0.45));
+    for (const auto &[i, q] :
+         {std::pair(0.45, 0.45), {-0.45, 0.45}, {0.45, -0.45}, {-0.45, -0.45}}) {
+        QCOMPARE(colored(cells, i, q), ColorTable().entry(0));
+        QCOMPARE(QColor(colored(dots, i, q)), plotColor(PlotColor::AverageTrace));
+    }
+    int cellCount = 0;
+    for (int row = 0; row < 51; ++row) {
+        for (int column = 0; column < 51; ++column) {
+            const double i = (row - 25) * 0.04 + (row < 25 ? -0.02 : 0.02);
+            const double q = (column - 25) * 0.04 + (column < 25 ? -0.02 : 0.02);
+            cellCount += colored(cells, i, q) == ColorTable().entry(0) ? 1 : 0;
+        }
+    }
+    QCOMPARE(cellCount, 4);
+}
+
+void TestPictures::timelineShowsRangeAndCursors()
+{
+    TimelineScene scene;
+    scene.total = 1000;
+    scene.first = 250;
+    scene.count = 500;
+    scene.cursors = {100, 900};
+    const PlotStyle style = PlotStyle::current();
+    const TimelinePainter timeline(style, scene);
+    QImage image(600, 50, QImage::Format_RGB32);
+    QPainter painter(&image);
+    timeline.paint(painter, QRectF(image.rect()));
+    painter.end();
+    const QRectF bar = TimelinePainter::bar(QRectF(image.rect()), style.font);
+    const int y = static_cast<int>(bar.center().y());
+    const auto pixel = [&](double sample) {
+        return image.pixel(static_cast<int>(std::round(timeline.xOf(bar, sample))), y);
+    };
+    QCOMPARE(QColor(pixel(50)), style.color(PlotColor::Marked));
+    QCOMPARE(QColor(pixel(800)), style.color(PlotColor::Marked));
+    QVERIFY(QColor(pixel(500)) != style.color(PlotColor::Marked));
+    QCOMPARE(QColor(pixel(100)), style.color(PlotColor::PrimaryMarker));
+    QCOMPARE(QColor(pixel(900)), style.color(PlotColor::SecondaryMarker));
+}
+
+void TestPictures::axisTextsDoNotOverlap_data()
+{
+    QTest::addColumn<int>("view");
+    QTest::addColumn<QSize>("size");
+    QTest::addColumn<bool>("markers");
+    QTest::addColumn<double>("clock");
+    for (int view = 0; view < plotViewNames().size(); ++view) {
+        for (const QSize size : {QSize(400, 300), QSize(401, 333), QSize(640, 300), QSize(400, 800),
+                                 QSize(1200, 700)}) {
+            for (const double clock : {0.0, 12.345678e6, 20e6, 600e6}) {
+                const bool markers = static_cast<int>(clock) % 20 == 0;
+                QTest::addRow("%s %dx%d at %g", qPrintable(plotViewNames().at(view)), size.width(),
+                              size.height(), clock)
+                    << view << size << markers << clock;
+            }
+        }
+    }
+}
+
+void TestPictures::axisTextsDoNotOverlap()
+{
+    QFETCH(int, view);
+    QFETCH(QSize, size);
+    QFETCH(bool, markers);
+    QFETCH(double, clock);
+    TextRecorder recorder(size);
+    QPainter painter(&recorder);
+    const IqList samples = toneSamples(7777, 0.01);
+    MemorySource source(samples, {}, 123456);
+    PlotRequest request;
+    request.view = static_cast<PlotView>(view);
+    request.clockHz = clock;
+    request.showMarkers = markers;
+    const QRectF area(0, 0, size.width(), size.height());
+    QVERIFY(paintPlot(painter, area, request, source));
+    painter.end();
+    const QList<TextRecorder::Text> &texts = recorder.texts();
+    QVERIFY(texts.size() >= 3);
+    for (qsizetype a = 0; a < texts.size(); ++a) {
+        QVERIFY2(area.adjusted(-0.5, -2, 0.5, 2).contains(texts.at(a).place),
+                 qPrintable(texts.at(a).words));
+        for (qsizetype b = a + 1; b < texts.size(); ++b) {
+            // Half a pixel of side bearing isn't seen.
+            const QRectF common = texts.at(a).place.intersected(texts.at(b).place);
+            QVERIFY2(common.width() < 1 || common.height() < 1,
+                     qPrintable(texts.at(a).words + " / " + texts.at(b).words));
+        }
+    }
+}
+
+void TestPictures::linesAreSharp_data()
+{
+    QTest::addColumn<double>("ratio");
+    for (const double ratio : {1.0, 1.5, 2.0}) {
+        QTest::addRow("%g", ratio) << ratio;
+    }
+}
+
+void TestPictures::linesAreSharp()
+{
+    // Across the frame of a pane only pure colours may stand: a blurred line mixes them.
+    QFETCH(double, ratio);
+    const QImage image = pictureOf(PlotView::LinAvg, {}, {}, ratio);
+    QCOMPARE(image.size(), (QSizeF(PlotSize) * ratio).toSize());
+    const QRectF plot = tracePlot();
+    const int y = static_cast<int>((plot.top() + plot.height() * 0.55) * ratio);
+    const QRgb frame = plotColor(PlotColor::Grid).rgb();
+    const QRgb background = plotColor(PlotColor::Background).rgb();
+    std::set<QRgb> colors;
+    int framePixels = 0;
+    for (int x = static_cast<int>((plot.left() - 3) * ratio); x < image.width(); ++x) {
+        colors.insert(image.pixel(x, y));
+        framePixels += image.pixel(x, y) == frame ? 1 : 0;
+    }
+    colors.erase(frame);
+    colors.erase(background);
+    QVERIFY2(colors.size() <= 1, "only the weaker grid may be left");
+    QCOMPARE(framePixels, ratio < 2 ? 2 : 4);
+}
+
+void TestPictures::streamsAndMemoryGiveTheSame_data()
+{
+    QTest::addColumn<int>("view");
+    for (int view = 0; view < plotViewNames().size(); ++view) {
+        QTest::addRow("%s", qPrintable(plotViewNames().at(view))) << view;
+    }
+}
+
+void TestPictures::streamsAndMemoryGiveTheSame()
+{
+    QFETCH(int, view);
+    // Several blocks of the reader, and far more lines than a waterfall has rows.
+    constexpr qsizetype count = 300'000;
+    constexpr qsizetype first = 1000;
+    IqList samples = toneSamples(count, 0.0123, 0.6);
+    QList<quint8> markers(count);
+    TempStream data;
+    TempStream markerStream;
+    QVERIFY(data.open() && markerStream.open() && data->writeHeader("IQF"));
+    for (qsizetype k = 0; k < count; ++k) {
+        const float iq[2] = {static_cast<float>(samples.at(k).i * (k % 1000 < 300 ? 0.3 : 1)),
+                             static_cast<float>(samples.at(k).q)};
+        samples[k] = {iq[0], iq[1]};
+        markers[k] = static_cast<quint8>(k / 5000 % 16);
+        QVERIFY(data->writeBytes(8, iq));
+    }
+    QVERIFY(markerStream->writeBytes(static_cast<int>(count), markers.constData()));
+
+    PlotRequest request;
+    request.view = static_cast<PlotView>(view);
+    request.clockHz = 1e6;
+    request.size = QSize(500, 320);
+    request.showMarkers = true;
+    StreamSource stream(*data.stream(), *markerStream.stream(), first, count - first);
+    const QImage streamed = renderPlot(request, stream);
+    QVERIFY(!streamed.isNull());
+
+    const IqList part = samples.mid(first);
+    const QList<quint8> markerPart = markers.mid(first);
+    MemorySource memory(part, markerPart, first);
+    QCOMPARE(renderPlot(request, memory), streamed);
+
+    if (request.view == PlotView::Waterfall || request.view == PlotView::Spectrum) {
+        // The whole cache of lines, as the widget has it.
+        SpectrumScene scene;
+        scene.lines.update(part, first);
+        scene.mean = scene.lines.mean();
+        scene.sampleCount = part.size();
+        scene.mode =
+            request.view == PlotView::Spectrum ? SpectrumMode::Spectrum : SpectrumMode::Waterfall;
+        scene.clockHz = request.clockHz;
+        QImage whole(request.size, QImage::Format_RGB32);
+        QPainter painter(&whole);
+        const PlotStyle style = PlotStyle::current();
+        SpectrumPainter(style, scene).paint(painter, QRectF(whole.rect()));
+        painter.end();
+        QCOMPARE(whole, streamed);
+    }
+}
+
+void TestPictures::brokenStreamGivesNoPicture()
+{
+    TempStream data;
+    TempStream markers;
+    QVERIFY(data.open() && markers.open() && data->writeHeader("IQF"));
+    const std::vector<char> bytes(8 * 100, 0);
+    QVERIFY(data->writeBytes(800, bytes.data()) && markers->writeBytes(100, bytes.data()));
+    StreamSource source(*data.stream(), *markers.stream(), 0, 101);
+    (void)Tracer::takeEntries();
+    QVERIFY(renderPlot({}, source).isNull());
+    const auto entries = Tracer::takeEntries();
+    QCOMPARE(entries.size(), 1);
+    QVERIFY(entries.first().first.endsWith("Cannot read I/Q data from temporary file."));
+}
+
+QTEST_MAIN(TestPictures)
+#include "tst_pictures.moc"
