@@ -1,4 +1,370 @@
-int main()
+// SPDX-License-Identifier: Apache-2.0
+// The instr commands of corvane-cli against simulated instruments.
+#include "simulator/SimulatorProcess.h"
+
+#include <QDir>
+#include <QElapsedTimer>
+#include <QFile>
+#include <QJsonArray>
+#include <QJsonDocument>
+#include <QJsonObject>
+#include <QProcess>
+#include <QTemporaryDir>
+#include <QTest>
+
+#include <csignal>
+
+namespace {
+
+struct Outcome
 {
-    return 0;
+    int exitCode = -1;
+    QString output;
+    QStringList log;
+
+    [[nodiscard]] QJsonDocument json() const { return QJsonDocument::fromJson(output.toUtf8()); }
+    [[nodiscard]] QString lastLine() const { return log.isEmpty() ? QString() : log.last(); }
+};
+
+QString program()
+{
+    return qEnvironmentVariable("CORVANE_BIN") + "/corvane-cli";
 }
+
+Outcome outcomeOf(QProcess &process)
+{
+    process.waitForFinished(60'000);
+    return {process.exitStatus() == QProcess::NormalExit ? process.exitCode() : -1,
+            QString::fromUtf8(process.readAllStandardOutput()),
+            QString::fromUtf8(process.readAllStandardError()).split('\n', Qt::SkipEmptyParts)};
+}
+
+Outcome run(const QStringList &arguments)
+{
+    QProcess process;
+    process.start(program(), QStringList{"instr"} + arguments);
+    return outcomeOf(process);
+}
+
+bool store(const QString &fileName, const QByteArray &bytes)
+{
+    QFile file(fileName);
+    return file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size();
+}
+
+QByteArray content(const QString &fileName)
+{
+    QFile file(fileName);
+    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
+}
+
+const QString device = "GPIB0::28";
+
+} // namespace
+
+class TestInstrCommands : public QObject
+{
+    Q_OBJECT
+private slots:
+    void init();
+    void cleanup() { m_simulator.reset(); }
+    void wrongUsage_data();
+    void wrongUsage();
+    void info();
+    void scan();
+    void queryAndSend();
+    void foldersAndFiles();
+    void drives();
+    void transfers();
+    void getKeepsFiles();
+    void failures_data();
+    void failures();
+    void play();
+    void interrupted_data();
+    void interrupted();
+    void withoutLibrary();
+
+private:
+    [[nodiscard]] QString local(const QString &name) const { return m_folder->filePath(name); }
+    [[nodiscard]] QString remote(const QString &name) const
+    {
+        return m_simulator->root() + "/a/var/user/" + name;
+    }
+
+    std::unique_ptr<QTemporaryDir> m_folder;
+    std::unique_ptr<SimulatorProcess> m_simulator;
+};
+
+void TestInstrCommands::init()
+{
+    m_folder = std::make_unique<QTemporaryDir>();
+    m_simulator = std::make_unique<SimulatorProcess>();
+    QVERIFY(m_simulator->startConfig("[a]\nmodel=TGX-870\nserial=100001\nroot=%ROOT%/a\n"
+                                     "gateway=0\ngpib=28\n"
+                                     "[b]\nmodel=PAX-710\nserial=200002\nroot=%ROOT%/b\n"
+                                     "gateway=0\ngpib=5\n",
+                                     2));
+    QVERIFY(store(local("visa.ini"), QString("[GPIB0]\nhost=127.0.0.1\nport=%1\naddresses=5,28\n")
+                                         .arg(m_simulator->gatewayPort())
+                                         .toLatin1()));
+    qputenv("CORVANE_VISA_CONFIG", local("visa.ini").toLocal8Bit());
+}
+
+void TestInstrCommands::wrongUsage_data()
+{
+    QTest::addColumn<QStringList>("arguments");
+    QTest::addColumn<QString>("words");
+    QTest::newRow("no command") << QStringList{} << "subcommand";
+    QTest::newRow("unknown command") << QStringList{"dance", "x"} << "subcommand";
+    QTest::newRow("no resource") << QStringList{"info"} << "resource";
+    QTest::newRow("empty resource") << QStringList{"info", " "} << "RES";
+    QTest::newRow("no local file") << QStringList{"get", "x", "/a.wv"} << "local";
+    QTest::newRow("other interface") << QStringList{"scan", "tcpip"} << "gpib, usb";
+    QTest::newRow("no waveform") << QStringList{"run", "x", "/var/user/a.wv.txt"} << "a.wv.txt";
+    QTest::newRow("time-out") << QStringList{"run", "x", "/a.wv", "--timeout", "0"} << "1 s";
+    QTest::newRow("relative folder") << QStringList{"mkdir", "x", "a"} << "'a'";
+    QTest::newRow("drive alone") << QStringList{"rmdir", "x", "D:", "--recursive"} << "'D:'";
+    QTest::newRow("top alone") << QStringList{"rmdir", "x", "/"} << "'/'";
+    QTest::newRow("old name relative") << QStringList{"mv", "x", "a.wv", "b.wv"} << "OLD";
+    QTest::newRow("other folder") << QStringList{"mv", "x", "/d/a.wv", "/e/a.wv"} << "NEW";
+    QTest::newRow("apostrophe") << QStringList{"rm", "x", "/it's.wv"} << "apostrophe";
+    QTest::newRow("empty query") << QStringList{"query", "x", ""} << "COMMAND";
+}
+
+void TestInstrCommands::wrongUsage()
+{
+    QFETCH(const QStringList, arguments);
+    QFETCH(const QString, words);
+    const Outcome outcome = run(arguments);
+    QCOMPARE(outcome.exitCode, 2);
+    QVERIFY(outcome.output.isEmpty());
+    QVERIFY2(outcome.lastLine().startsWith("error: ") && outcome.lastLine().contains(words),
+             qPrintable(outcome.log.join('\n')));
+}
+
+void TestInstrCommands::info()
+{
+    const Outcome outcome = run({"info", device, "--json"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log, QStringList{});
+    const QJsonObject object = outcome.json().object();
+    QCOMPARE(object.keys(),
+             (QStringList{"analyzer", "baseband", "firmware", "interface", "model", "options",
+                          "resource", "rf", "roots", "serial", "vendor"}));
+    QCOMPARE(object["interface"].toString(), "GPIB0");
+    QCOMPARE(object["roots"].toArray(), (QJsonArray{"/var/user/", "/hdd/"}));
+    QCOMPARE(object["rf"].toArray(), (QJsonArray{QJsonObject{{"lower", 9e3}, {"upper", 6e9}}}));
+    QCOMPARE(object["baseband"].toArray(),
+             (QJsonArray{
+                 QJsonObject{{"size", 268435456}, {"clock", 60000000}, {"bandwidth", 90000000}}}));
+    QVERIFY(!object["analyzer"].toBool(true));
+    const Outcome analyzer = run({"info", "--json", "GPIB::5::INSTR"});
+    QCOMPARE(analyzer.json().object()["serial"].toString(), "200002");
+    QVERIFY(analyzer.json().object()["analyzer"].toBool());
+    QVERIFY(run({"info", device}).output.contains("\nBB1 size:       256 MS\n"));
+}
+
+void TestInstrCommands::scan()
+{
+    const Outcome outcome = run({"scan", "gpib", "--json"});
+    QCOMPARE(outcome.exitCode, 0);
+    const QJsonArray found = outcome.json().array();
+    QCOMPARE(found.size(), 2);
+    QCOMPARE(found.at(1).toObject(), (QJsonObject{{"resource", "GPIB0::28::INSTR"},
+                                                  {"model", "TGX-870"},
+                                                  {"serial", "100001"},
+                                                  {"interface", "GPIB0"}}));
+    QVERIFY(run({"scan", "gpib"}).output.contains("GPIB0::5::INSTR\tPAX-710\t200002\tGPIB0\n"));
+}
+
+void TestInstrCommands::queryAndSend()
+{
+    Outcome outcome = run({"query", device, "*IDN?"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.output, "Halvorn,TGX-870,TGX870/100001/01,1.0\n");
+    QCOMPARE(outcome.log, QStringList{});
+    // An answer is worth having even when the instrument complains besides.
+    outcome = run({"query", device, "FOO; *IDN?"});
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY(outcome.output.startsWith("Halvorn,"));
+    QCOMPARE(outcome.lastLine(), "error: The instrument reports: -113,\"Undefined header\"");
+    QCOMPARE(run({"send", device, "*RST;*OPC?"}).exitCode, 0);
+    outcome = run({"send", device, "FOO"});
+    QCOMPARE(outcome.exitCode, 1);
+    QCOMPARE(outcome.lastLine(), "error: The instrument reports: -113,\"Undefined header\"");
+    QCOMPARE(run({"send", device, "*IDN?"}).exitCode, 0);
+}
+
+void TestInstrCommands::foldersAndFiles()
+{
+    QCOMPARE(run({"mkdir", device, "/var/user/w/"}).exitCode, 0);
+    QVERIFY(QDir(remote("w")).exists());
+    QCOMPARE(run({"mkdir", device, "/var/user/w"}).exitCode, 1);
+    QVERIFY(store(remote("w/a.wv"), "12345"));
+    QVERIFY(store(remote("b.txt"), "123"));
+    Outcome outcome = run({"ls", device, "/var/user", "--json"});
+    QCOMPARE(outcome.json().array(),
+             (QJsonArray{QJsonObject{{"name", "b.txt"}, {"type", "ASC"}, {"size", 3}},
+                         QJsonObject{{"name", "w"}, {"type", "DIR"}, {"size", 0}}}));
+    outcome = run({"ls", device, "/var/user/", "--recursive"});
+    QCOMPARE(outcome.output, "ASC            3  b.txt\nDIR            0  w\n"
+                             "BIN            5  w/a.wv\n");
+    QCOMPARE(run({"mv", device, "/var/user/w/a.wv", "c.wv"}).exitCode, 0);
+    QCOMPARE(run({"mv", device, "/var/user/w/c.wv", "/var/user/w/d.wv"}).exitCode, 0);
+    QCOMPARE(content(remote("w/d.wv")), "12345");
+    QCOMPARE(run({"mv", device, "/var/user/w/", "v"}).exitCode, 0);
+    QCOMPARE(run({"rmdir", device, "/var/user/v"}).exitCode, 1);
+    QCOMPARE(run({"rm", device, "/var/user/b.txt"}).exitCode, 0);
+    QVERIFY(!QFile::exists(remote("b.txt")));
+    outcome = run({"rm", device, "/var/user/b.txt"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log, QStringList{"warning: *** File does not exist on instrument."});
+    QCOMPARE(run({"rmdir", device, "/var/user/v", "--recursive"}).exitCode, 0);
+    QVERIFY(!QDir(remote("v")).exists());
+}
+
+void TestInstrCommands::drives()
+{
+    QCOMPARE(run({"mkdir", "GPIB0::5", "E:\\w"}).exitCode, 0);
+    QVERIFY(store(local("x.wv"), "12345"));
+    QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "E:\\w\\"}).exitCode, 0);
+    QCOMPARE(content(m_simulator->root() + "/b/E:/w/x.wv"), "12345");
+    QCOMPARE(run({"mv", "GPIB0::5", "E:\\w\\x.wv", "E:/w/y.wv"}).exitCode, 0);
+    QCOMPARE(run({"get", "GPIB0::5", "E:\\w\\y.wv", m_folder->path()}).exitCode, 0);
+    QCOMPARE(content(local("y.wv")), "12345");
+    QCOMPARE(run({"rmdir", "GPIB0::5", "E:\\w", "--recursive"}).exitCode, 0);
+    QVERIFY(!QDir(m_simulator->root() + "/b/E:/w").exists());
+}
+
+void TestInstrCommands::transfers()
+{
+    const QByteArray data = QByteArray("#1\n\0x", 5).repeated(100'001);
+    QVERIFY(store(local("x.wv"), data));
+    Outcome outcome = run({"put", device, local("x.wv"), "/var/user/x.wv"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log, QStringList{});
+    QVERIFY(content(remote("x.wv")) == data);
+    QCOMPARE(run({"get", device, "/var/user/x.wv", local("back.wv")}).exitCode, 0);
+    QVERIFY(content(local("back.wv")) == data);
+    // Sent again, a file is replaced.
+    QVERIFY(store(local("x.wv"), "short"));
+    QCOMPARE(run({"put", device, local("x.wv"), "/var/user/x.wv"}).exitCode, 0);
+    QCOMPARE(content(remote("x.wv")), "short");
+}
+
+void TestInstrCommands::getKeepsFiles()
+{
+    QVERIFY(store(remote("x.wv"), "new"));
+    QVERIFY(store(local("x.wv"), "old"));
+    Outcome outcome = run({"get", device, "/var/user/x.wv", local("x.wv")});
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY(outcome.lastLine().contains("--force"));
+    QCOMPARE(content(local("x.wv")), "old");
+    outcome = run({"get", device, "/var/user/gone.wv", local("x.wv"), "--force"});
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY2(outcome.lastLine().contains("-256,\"File name not found\""),
+             qPrintable(outcome.lastLine()));
+    QCOMPARE(content(local("x.wv")), "old");
+    QCOMPARE(run({"get", device, "/var/user/x.wv", local("x.wv"), "--force"}).exitCode, 0);
+    QCOMPARE(content(local("x.wv")), "new");
+    QCOMPARE(QDir(m_folder->path()).entryList(QDir::Files), (QStringList{"visa.ini", "x.wv"}));
+}
+
+void TestInstrCommands::failures_data()
+{
+    QTest::addColumn<QStringList>("arguments");
+    QTest::addColumn<QString>("words");
+    QTest::newRow("no such device") << QStringList{"info", "GPIB0::9"} << "viOpen";
+    QTest::newRow("no such host") << QStringList{"info", "nowhere.invalid"}
+                                  << "No host address found. ";
+    QTest::newRow("no folder") << QStringList{"ls", device, "/var/user/gone"}
+                               << "The instrument reports: -256,";
+    QTest::newRow("no local file") << QStringList{"put", device, "/nonexistent.wv", "/var/user/"}
+                                   << "'/nonexistent.wv' does not exist";
+    QTest::newRow("nothing on USB") << QStringList{"scan", "usb"} << "No devices found.";
+}
+
+void TestInstrCommands::failures()
+{
+    QFETCH(const QStringList, arguments);
+    QFETCH(const QString, words);
+    const Outcome outcome = run(arguments);
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY(outcome.output.isEmpty());
+    QVERIFY2(outcome.log.join('\n').contains(words), qPrintable(outcome.log.join('\n')));
+    QVERIFY(outcome.lastLine().startsWith("error: "));
+}
+
+void TestInstrCommands::play()
+{
+    QVERIFY(store(remote("x.WV"), "12345"));
+    QCOMPARE(run({"run", device, "/var/user/x.WV"}).exitCode, 0);
+    QCOMPARE(run({"query", device, "SOUR:BB:ARB:STAT?"}).output, "1\n");
+    QCOMPARE(run({"send", device, ":SYST:FAUL 'busy',60"}).exitCode, 0);
+    Outcome outcome = run({"run", device, "/var/user/x.WV", "--timeout", "2"});
+    QCOMPARE(outcome.exitCode, 1);
+    QCOMPARE(outcome.lastLine(), "error: ARB did not get ready in time.");
+}
+
+void TestInstrCommands::interrupted_data()
+{
+    QTest::addColumn<QString>("command");
+    QTest::addColumn<QString>("sign"); // in the log, that the work has begun
+    QTest::newRow("put") << "put"
+                         << "VISA >> Sending data";
+    QTest::newRow("get") << "get"
+                         << "Read block size";
+    QTest::newRow("run") << "run"
+                         << "Waiting for ARB";
+}
+
+void TestInstrCommands::interrupted()
+{
+    QFETCH(const QString, command);
+    QFETCH(const QString, sign);
+    // Sparse, and far more than moves before the signal arrives.
+    QFile huge(command == "put" ? local("huge.wv") : remote("huge.wv"));
+    QVERIFY(huge.open(QIODevice::WriteOnly) && huge.resize(999'999'999));
+    QStringList arguments{"--verbose", "instr", command, device};
+    if (command == "put") {
+        arguments += {huge.fileName(), "/var/user/huge.wv"};
+    } else {
+        QCOMPARE(run({"send", device, ":SYST:FAUL 'busy',60"}).exitCode, 0);
+        arguments += "/var/user/huge.wv";
+        arguments += command == "get" ? QStringList{local("huge.wv")} : QStringList{};
+    }
+    QProcess process;
+    process.setReadChannel(QProcess::StandardError);
+    process.start(program(), arguments);
+    QByteArray log;
+    while (!log.contains(sign.toLatin1()) && process.waitForReadyRead(30'000)) {
+        log += process.readAllStandardError();
+    }
+    QElapsedTimer timer;
+    timer.start();
+    ::kill(static_cast<pid_t>(process.processId()), SIGINT);
+    const Outcome outcome = outcomeOf(process);
+    QCOMPARE(outcome.exitCode, 130);
+    QVERIFY(timer.elapsed() < 10'000);
+    // No part of a file, and an instrument that listens.
+    QVERIFY(command == "put" ? !QFile::exists(remote("huge.wv"))
+                             : !QFile::exists(local("huge.wv")));
+    QCOMPARE(QDir(m_folder->path()).entryList({"*.part*"}), QStringList{});
+    QCOMPARE(run({"query", device, "*OPT?"}).exitCode, 0);
+}
+
+void TestInstrCommands::withoutLibrary()
+{
+    QProcess process;
+    QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
+    environment.insert("CORVANE_VISA_LIBRARY", "/nonexistent.so");
+    process.setProcessEnvironment(environment);
+    process.start(program(), {"instr", "info", device});
+    const Outcome outcome = outcomeOf(process);
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY(outcome.log.first().contains("/nonexistent.so"));
+    QVERIFY(outcome.log.contains("error: The VISA library cannot be loaded."));
+}
+
+QTEST_GUILESS_MAIN(TestInstrCommands)
+#include "tst_instrcommands.moc"
