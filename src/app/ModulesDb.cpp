@@ -7,6 +7,7 @@
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
 #include "tools/DlgResample.h"
+#include "tools/DlgView.h"
 
 #include <QAction>
 #include <QMenu>
@@ -32,6 +33,7 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
 ModulesDb::ModulesDb()
 {
     addTool(std::make_unique<DlgInfo>());
+    addTool(std::make_unique<DlgView>());
     addTool(std::make_unique<DlgResample>());
 }
 
