@@ -46,6 +46,10 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
     m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
 
+    // The model delivers and sorts folders later, which moves the revealed entry out of sight.
+    m_revealTimer.setSingleShot(true);
+    m_revealTimer.setInterval(0);
+    connect(&m_revealTimer, &QTimer::timeout, this, &QCustomTreeView::revealCurrent);
     connect(verticalScrollBar(), &QScrollBar::actionTriggered, this,
             [this] { m_revealedPath.clear(); });
 }
@@ -85,11 +89,16 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
         return;
     }
     keepColumnWidths();
+    if (this->model()) {
+        this->model()->disconnect(&m_revealTimer);
+    }
     QTreeView::setModel(model);
     m_files = PaneFiles::create(model);
     if (m_files) {
         connect(m_files.get(), &PaneFiles::failed, this, &QCustomTreeView::errMsg);
-        connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::revealCurrent);
+        const auto reveal = qOverload<>(&QTimer::start);
+        connect(model, &QAbstractItemModel::rowsInserted, &m_revealTimer, reveal);
+        connect(model, &QAbstractItemModel::layoutChanged, &m_revealTimer, reveal);
         connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::folderLoaded);
         applyColumnWidths();
     }
@@ -175,9 +184,8 @@ void QCustomTreeView::updateAndExpandTree(const QString &sDir)
         setExpanded(level, true);
     }
     setCurrentIndex(target);
-    // The model delivers the folders later, which moves the entry out of sight again.
     m_revealedPath = m_files->pathOf(target);
-    scrollTo(target);
+    revealCurrent();
 }
 
 void QCustomTreeView::updateAndExpandTree()
@@ -185,10 +193,15 @@ void QCustomTreeView::updateAndExpandTree()
     updateAndExpandTree(currentPath());
 }
 
-void QCustomTreeView::revealCurrent(const QString &folder)
+void QCustomTreeView::revealCurrent()
 {
-    if (!m_revealedPath.isEmpty() && m_revealedPath.startsWith(folder)) {
-        scrollTo(currentIndex());
+    if (m_revealedPath.isEmpty()) {
+        return;
+    }
+    // At the lower edge a folder would hide what it holds, and a file its neighbours.
+    const QRect row = visualRect(currentIndex());
+    if (row.top() < 0 || row.bottom() > viewport()->height() * 2 / 3) {
+        scrollTo(currentIndex(), PositionAtCenter);
     }
 }
 
@@ -430,12 +443,19 @@ void QCustomTreeView::dropEvent(QDropEvent *event)
         event->ignore();
         return;
     }
-    m_dropSource = event->mimeData()->text();
-    m_dropSourceLocal = static_cast<const QCustomTreeView *>(event->source())->isLocal();
-    const QModelIndex target = indexAt(event->position().toPoint());
-    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
     event->acceptProposedAction();
-    m_copyMenu->popup(viewport()->mapToGlobal(event->position().toPoint()));
+    offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
+              event->position().toPoint());
+}
+
+void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QString &path,
+                                const QPoint &position)
+{
+    const QModelIndex target = indexAt(position);
+    m_dropSource = path;
+    m_dropSourceLocal = source.isLocal();
+    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
+    m_copyMenu->popup(viewport()->mapToGlobal(position));
 }
 
 bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const

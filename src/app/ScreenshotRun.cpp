@@ -32,6 +32,11 @@ ScreenshotRun::ScreenshotRun(MainWindow &window, QString folder, const QString &
     , m_folder(std::move(folder))
     , m_file(file.isEmpty() ? QString() : QFileInfo(file).absoluteFilePath())
 {
+    const auto trees = m_window.findChildren<QCustomTreeView *>();
+    for (QCustomTreeView *tree : trees) {
+        connect(tree, &QCustomTreeView::folderLoaded, this,
+                [this, tree](const QString &path) { folderArrived(tree, path); });
+    }
 }
 
 void ScreenshotRun::detachSettings()
@@ -47,29 +52,46 @@ void ScreenshotRun::start()
         finish(1);
         return;
     }
+    if (!m_file.isEmpty() && !QFileInfo::exists(m_file)) {
+        complain(QString("there is no file '%1'").arg(m_file));
+        finish(1);
+        return;
+    }
     m_window.resize(PictureSize);
     QTimer::singleShot(TimeOutMs, this, [this] {
         complain("the panes were not loaded in time");
         finish(1);
     });
-    if (m_file.isEmpty()) {
-        connect(&m_window, &MainWindow::firstPainted, this, &ScreenshotRun::takePictures);
-        return;
-    }
-    const QString folder = QFileInfo(m_file).absolutePath();
-    const auto trees = m_window.findChildren<QCustomTreeView *>();
+    const QString shown = m_file.isEmpty() ? QDir::homePath() : m_file;
+    const QString folder = QFileInfo(shown).path();
     auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
-    for (QCustomTreeView *tree : trees) {
-        tree->updateAndExpandTree(tree == first ? m_file : folder);
-    }
+    auto *second = m_window.findChild<QCustomTreeView *>("tv_dev_2");
+    second->updateAndExpandTree(folder);
+    awaitFolders(*second, folder);
+    first->updateAndExpandTree(shown);
+    awaitFolders(*first, folder);
     first->setFocus();
-    // The second pane is filled later than the first.
-    connect(trees.last(), &QCustomTreeView::folderLoaded, this,
-            [this, folder](const QString &path) {
-                if (QDir(path) == QDir(folder)) {
-                    QTimer::singleShot(0, this, &ScreenshotRun::takePictures);
-                }
-            });
+    m_started = true;
+    folderArrived(nullptr, {});
+}
+
+void ScreenshotRun::awaitFolders(const QCustomTreeView &tree, const QString &path)
+{
+    QDir folder(path);
+    do {
+        m_awaited.insert({&tree, folder.path()});
+    } while (folder.cdUp());
+}
+
+void ScreenshotRun::folderArrived(const QCustomTreeView *tree, const QString &folder)
+{
+    m_arrived.insert({tree, QDir(folder).path()});
+    if (m_started && m_arrived.contains(m_awaited)) {
+        // The views sort, scroll and paint in later turns of the event loop.
+        constexpr int SettleMs = 200;
+        m_started = false;
+        QTimer::singleShot(SettleMs, this, &ScreenshotRun::takePictures);
+    }
 }
 
 void ScreenshotRun::takePictures()

@@ -2,9 +2,12 @@
 #pragma once
 
 #include <QObject>
+#include <QPair>
+#include <QSet>
 #include <QString>
 
 class MainWindow;
+class QCustomTreeView;
 
 /// Shows a file in the main window, leaves pictures of the window and of the file's report in a
 /// folder and ends the program, for documentation and for machines without a display.
@@ -25,6 +28,8 @@ public:
     void start();
 
 private:
+    void awaitFolders(const QCustomTreeView &tree, const QString &path);
+    void folderArrived(const QCustomTreeView *tree, const QString &folder);
     void takePictures();
     [[nodiscard]] bool save(QWidget &window, const QString &name) const;
     void finish(int status);
@@ -32,5 +37,8 @@ private:
     MainWindow &m_window;
     QString m_folder;
     QString m_file; ///< absolute, empty for none
+    QSet<QPair<const QCustomTreeView *, QString>> m_arrived; ///< folders that the panes know
+    QSet<QPair<const QCustomTreeView *, QString>> m_awaited; ///< folders that the picture needs
+    bool m_started = false;
     bool m_finished = false;
 };
