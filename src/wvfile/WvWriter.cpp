@@ -12,6 +12,7 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cmath>
 #include <cstring>
 #include <utility>
@@ -55,6 +56,18 @@ size_t findChange(std::span<const quint8> bytes, size_t from, quint8 mask, quint
         ++i;
     }
     return i;
+}
+
+/// Appends "0:1", or ";12:0" for any position but the first.
+void appendTransition(QByteArray &text, int position, bool high)
+{
+    if (position > 0) {
+        text.append(';');
+    }
+    std::array<char, 16> digits;
+    const auto [end, error] = std::to_chars(digits.begin(), digits.end(), position);
+    text.append(digits.data(), end - digits.data());
+    text.append(high ? ":1" : ":0", 2);
 }
 
 } // namespace
@@ -207,19 +220,16 @@ bool WvWriter::writeMarkerList(QIODevice &device, int marker)
         size_t i = begin == 0 ? 0 : findChange(bytes, 0, mask, state);
         while (i < bytes.size()) {
             state = bytes[i] & mask;
-            if (text.back() != ' ') {
-                text += ';';
-            }
-            text += QByteArray::number(begin + static_cast<qint64>(i)) + (state != 0 ? ":1" : ":0");
+            const int position = begin + static_cast<int>(i);
+            appendTransition(text, position, state != 0);
             i = findChange(bytes, i, mask, state);
         }
         begin += count;
         if (text.size() > blockSamples) {
-            // The last character stays behind, so that the separator above knows what it follows.
-            if (!put(device, text.chopped(1))) {
+            if (!put(device, text)) {
                 return false;
             }
-            text = text.right(1);
+            text.resize(0); // keeps the memory
         }
         if (m_progress.shouldStop(10 + 10 * (marker - 1))) {
             return Tracer::fail("Action aborted by user.");
