@@ -151,7 +151,7 @@ Vxi11Client::ReadResult Vxi11Client::read(quint32 count, quint32 timeoutMs,
 {
     XdrArguments arguments;
     arguments.number(m_link).number(count).number(timeoutMs).number(0);
-    arguments.number(termChar ? TermCharSet : 0);
+    arguments.number(termChar ? quint32{TermCharSet} : 0);
     arguments.number(static_cast<unsigned char>(termChar.value_or(0)));
     return readResult(call(CoreProgram, DeviceRead, arguments.bytes()));
 }
