@@ -1,15 +1,34 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Resample.h"
 
+#include "LoopedInput.h"
+#include "TapGeometry.h"
 #include "base/ProgressClock.h"
+#include "base/parallel.h"
+#include "interpolator.h"
 #include "log/Tracer.h"
 #include "samplestream.h"
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <thread>
+#include <utility>
 #include <vector>
 
 namespace {
+
+/// Outputs that one thread computes at a time. The level is summed over such parts, so that it
+/// doesn't depend on the number of threads.
+constexpr std::size_t PartSize = 4096;
+
+/// Products between two looks at the clock, below 10 ms of one core. The block, the one before and
+/// their inputs shall stay in the second cache.
+constexpr qint64 ProductsPerBlock = 4 * 1024 * 1024;
+
+/// Samples of the input window that a block may need.
+constexpr qint64 MaxBlockInput = 512 * 1024;
 
 [[nodiscard]] bool fail(const QString &text)
 {
@@ -17,25 +36,300 @@ namespace {
     return false;
 }
 
-[[nodiscard]] bool failAtSample(const char *what, qint64 sample)
+double offsetOf(double level)
 {
-    return fail(QString("*** %1 failed for sample %2.").arg(QLatin1String(what)).arg(sample));
+    return 20 * std::log10(1 / (level + 1e-12));
 }
 
-/// The first sample of a block behind `first` that a failed write has lost: blocks reach the device
-/// only when the write buffer, which holds the header too, is full.
-qint64 failedWriteSample(qint64 first)
+/// Carries markers to the outputs. The positions of outputs never fall.
+class MarkerCopy
 {
-    const qint64 start = BufferedIO::HeaderSize + first * BufferedIO::RecordSize;
-    const qint64 boundary = (start / BufferedIO::BufferSize + 1) * BufferedIO::BufferSize;
-    return (boundary - BufferedIO::HeaderSize) / BufferedIO::RecordSize;
+public:
+    MarkerCopy(BufferedIO *input, BufferedIO *output, const TapGeometry &geometry)
+        : m_input(input)
+        , m_output(output)
+        , m_geometry(geometry)
+    {
+    }
+
+    [[nodiscard]] bool open()
+    {
+        if (!isWanted()) {
+            return true;
+        }
+        if (!m_input->restartAtBegining()) {
+            return fail("*** Cannot read marker data.");
+        }
+        return m_output->restartAtBegining() || fail("*** Cannot write marker output.");
+    }
+
+    [[nodiscard]] bool copy(qint64 begin, qint64 end)
+    {
+        if (!isWanted()) {
+            return true;
+        }
+        const auto last = static_cast<qint64>(m_geometry.inputPosition(end - 1));
+        const int missing = static_cast<int>(last - m_position);
+        m_bytes.resize(static_cast<std::size_t>(missing) + 1);
+        m_bytes[0] = m_kept;
+        if (missing > 0 && m_input->readBlock(missing, m_bytes.data() + 1) != missing) {
+            return fail("*** Cannot read marker data.");
+        }
+        m_result.resize(static_cast<std::size_t>(end - begin));
+        for (qint64 n = begin; n < end; ++n) {
+            const auto position = static_cast<qint64>(m_geometry.inputPosition(n));
+            m_result[static_cast<std::size_t>(n - begin)] =
+                m_bytes[static_cast<std::size_t>(position - m_position)];
+        }
+        m_kept = m_bytes.back();
+        m_position = last;
+        return m_output->writeBytes(static_cast<int>(m_result.size()), m_result.data()) ||
+               fail("*** Cannot write marker output.");
+    }
+
+private:
+    [[nodiscard]] bool isWanted() const { return m_input != nullptr && m_output != nullptr; }
+
+    BufferedIO *m_input;
+    BufferedIO *m_output;
+    const TapGeometry &m_geometry;
+    qint64 m_position = -1; ///< input sample of the kept byte
+    char m_kept = 0;
+    std::vector<char> m_bytes;
+    std::vector<char> m_result;
+};
+
+/// Spreads the parts over the processors while the calling thread first does its own work, such as
+/// reading and writing streams, and then joins in.
+template <typename Work, typename OwnWork>
+void shareParts(std::size_t count, const Work &work, const OwnWork &ownWork)
+{
+    std::atomic<std::size_t> next{0};
+    const auto drain = [&] {
+        for (std::size_t part = next++; part < count; part = next++) {
+            work(part);
+        }
+    };
+    const std::size_t helperCount = std::min<std::size_t>(threadCount() - 1, count);
+    std::vector<std::jthread> helpers;
+    for (std::size_t i = 0; i < helperCount; ++i) {
+        helpers.emplace_back(drain);
+    }
+    ownWork();
+    drain();
 }
+
+/// Some outputs that follow each other, on their way from the input to the output stream.
+struct OutputBlock
+{
+    qint64 begin = 0;
+    qint64 end = 0;
+    PlanarInput input;
+    qint64 inputStart = 0; ///< sample at index 0 of the input
+    std::vector<float> result;
+    std::vector<SquareLevel> levels; ///< of the parts
+
+    [[nodiscard]] bool isEmpty() const { return begin >= end; }
+    [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(end - begin); }
+    [[nodiscard]] std::size_t partCount() const { return (count() + PartSize - 1) / PartSize; }
+};
 
 } // namespace
+
+/// One run: the state of the loop over the outputs. While a block is computed, the one before is
+/// written and the input of the next one is read.
+class Resample::Conversion
+{
+public:
+    Conversion(Resample &owner, int inputCount, int outputCount)
+        : m_owner(owner)
+        , m_inputCount(inputCount)
+        , m_outputCount(outputCount)
+        , m_geometry(owner.m_settings.length, inputCount, outputCount)
+        , m_interpolator(makeInterpolator(owner.m_table, m_geometry, inputCount, outputCount))
+        , m_input(*owner.m_input, inputCount, owner.m_settings.length)
+        , m_markers(owner.m_markerInput, owner.m_markerOutput, m_geometry)
+    {
+    }
+
+    [[nodiscard]] bool run()
+    {
+        if (!m_input.open()) {
+            return false;
+        }
+        if (!m_owner.m_output->writeHeader("IQF")) {
+            return fail("*** Cannot write header.");
+        }
+        Tracer::Trace(Tracer::Information, "Resampling...");
+        if (!m_markers.open()) {
+            return false;
+        }
+        ProgressClock clock([this](int percent) { emit m_owner.ProgressUpdate(percent); },
+                            m_owner.m_cancelled);
+        OutputBlock done;
+        OutputBlock current;
+        OutputBlock next;
+        if (!fetch(0, current)) {
+            return false;
+        }
+        while (!current.isEmpty()) {
+            if (clock.shouldStop(percentOf(current.begin, m_outputCount))) {
+                return fail("*** Action aborted by user.");
+            }
+            bool ok = true;
+            current.result.resize(2 * current.count());
+            current.levels.resize(current.partCount());
+            shareParts(
+                current.partCount(), [&](std::size_t part) { compute(current, part); },
+                [&] { ok = store(done) && fetch(current.end, next); });
+            if (!ok) {
+                return false;
+            }
+            std::swap(done, current);
+            std::swap(current, next);
+        }
+        return store(done);
+    }
+
+    [[nodiscard]] double peak() const { return std::sqrt(m_level.highest); }
+    [[nodiscard]] double rms() const
+    {
+        return std::sqrt(m_level.sum / static_cast<double>(m_outputCount));
+    }
+
+private:
+    [[nodiscard]] qint64 blockSize() const
+    {
+        const qint64 byWork = std::max<qint64>(ProductsPerBlock / m_geometry.maxTaps(), 1);
+        const double byInput = static_cast<double>(MaxBlockInput) * m_geometry.ratio();
+        return std::clamp<qint64>(static_cast<qint64>(std::min(byInput, 1e9)), 1, byWork);
+    }
+
+    /// Whether an output's first tap lies behind the sample up to which the input was read: then
+    /// one step is longer than the filter reaches.
+    [[nodiscard]] bool missesInput(qint64 begin, qint64 end) const
+    {
+        if (1 / m_geometry.ratio() <= m_geometry.maxTaps() - 2) {
+            return false;
+        }
+        for (qint64 n = std::max<qint64>(begin, 1); n < end; ++n) {
+            const TapRange before = m_geometry.taps(n - 1);
+            const TapRange taps = m_geometry.taps(n);
+            if (taps.first < m_inputCount && taps.count > 0 &&
+                taps.first > std::min(before.first + before.count, m_inputCount)) {
+                return true;
+            }
+        }
+        return false;
+    }
+
+    /// Reads the input of the outputs from `begin` on; the block is empty behind the last one.
+    [[nodiscard]] bool fetch(qint64 begin, OutputBlock &block)
+    {
+        block.begin = begin;
+        block.end = std::min(begin + blockSize(), m_outputCount);
+        if (block.isEmpty()) {
+            return true;
+        }
+        if (missesInput(block.begin, block.end)) {
+            return fail("*** Missed input sample.");
+        }
+        const TapRange last = m_geometry.taps(block.end - 1);
+        if (!m_input.advance(m_geometry.taps(block.begin).first, last.first + last.count,
+                             Interpolator::ReadAhead)) {
+            return false;
+        }
+        block.input = m_input.samples();
+        block.inputStart = m_input.start();
+        return true;
+    }
+
+    void compute(OutputBlock &block, std::size_t part) const
+    {
+        const std::size_t from = part * PartSize;
+        const std::span<float> result =
+            std::span(block.result).subspan(2 * from, 2 * std::min(PartSize, block.count() - from));
+        m_interpolator->compute(block.begin + static_cast<qint64>(from), block.input,
+                                block.inputStart, result);
+        block.levels[part] = measureSquares(result);
+    }
+
+    [[nodiscard]] bool store(const OutputBlock &block)
+    {
+        if (block.isEmpty()) {
+            return true;
+        }
+        for (const SquareLevel &level : block.levels) {
+            m_level.highest = std::max(m_level.highest, level.highest);
+            m_level.sum += level.sum;
+        }
+        if (!writeSamples(*m_owner.m_output, block.result)) {
+            return fail("*** Cannot write output data.");
+        }
+        return m_markers.copy(block.begin, block.end);
+    }
+
+    Resample &m_owner;
+    qint64 m_inputCount;
+    qint64 m_outputCount;
+    TapGeometry m_geometry;
+    std::unique_ptr<Interpolator> m_interpolator;
+    LoopedInput m_input;
+    MarkerCopy m_markers;
+    SquareLevel m_level; ///< of all outputs so far
+};
 
 Resample::Resample(QObject *parent)
     : QObject(parent)
 {
+}
+
+void Resample::setFilterFrequency(double rate, double cutoff)
+{
+    m_settings.rate = rate;
+    m_settings.cutoff = cutoff;
+}
+
+void Resample::setFilterLength(int length)
+{
+    m_settings.length = length;
+}
+
+bool Resample::setFilterType(int kind, double parameter)
+{
+    if (kind < 0 || kind > static_cast<int>(FilterKind::Custom)) {
+        return false;
+    }
+    m_settings.filter = static_cast<FilterKind>(kind);
+    m_settings.parameter = parameter;
+    return true;
+}
+
+bool Resample::setWindowType(int kind)
+{
+    if (kind < 0 || kind > 6) {
+        return false;
+    }
+    m_settings.window = kind;
+    return true;
+}
+
+void Resample::setInput(BufferedIO *stream, qint64 samples)
+{
+    m_input = stream;
+    m_inputSamples = samples;
+}
+
+void Resample::setOutput(BufferedIO *stream, qint64 samples)
+{
+    m_output = stream;
+    m_outputSamples = samples;
+}
+
+void Resample::setMarkers(BufferedIO *input, BufferedIO *output)
+{
+    m_markerInput = input;
+    m_markerOutput = output;
 }
 
 void Resample::cancel()
@@ -43,88 +337,29 @@ void Resample::cancel()
     m_cancelled = true;
 }
 
-bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork &work)
+bool Resample::run()
 {
     m_cancelled = false;
-    if (samples < 1) {
-        return fail("*** Invalid input data length.");
+    const auto inputCount = static_cast<std::int32_t>(m_inputSamples);
+    const auto outputCount = static_cast<std::int32_t>(m_outputSamples);
+    if (inputCount < 1 || outputCount < 1) {
+        return fail("*** Invalid input or output data length.");
     }
-    if (stream == nullptr) {
+    if (m_input == nullptr || m_output == nullptr) {
         return fail("*** Invalid data buffer.");
     }
-    if (!stream->checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
-    }
-    if (!stream->writeBytes(BufferedIO::HeaderSize, "IQF")) {
-        return fail("*** Cannot write to data buffer.");
-    }
-    std::vector<float> block(2 * static_cast<size_t>(std::min(samples, StreamBlockSamples)));
-    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    for (int done = 0; done < samples;) {
-        if (clock.shouldStop(percentOf(done, samples))) {
-            return fail("*** Action aborted by user.");
+    if (m_tableSettings != m_settings) {
+        m_tableSettings.reset();
+        if (!buildFilterTable(m_settings, m_table)) {
+            return fail("*** Cannot create filter function.");
         }
-        const int count = std::min(samples - done, StreamBlockSamples);
-        const std::span<float> iq(block.data(), 2 * static_cast<size_t>(count));
-        const int got = readSamples(*stream, iq);
-        const std::span<float> read = iq.first(2 * static_cast<size_t>(got));
-        work(read);
-        if (got > 0 && !writeSamples(*stream, read)) {
-            return failAtSample("Writing", failedWriteSample(done));
-        }
-        if (got < count) {
-            return failAtSample("Reading", done + got);
-        }
-        done += count;
+        m_tableSettings = m_settings;
     }
-    return true;
-}
-
-bool Resample::rescale(int samples, double factor, BufferedIO *stream)
-{
-    const auto gain = static_cast<float>(factor);
-    return transformInPlace(samples, stream, [gain](std::span<float> iq) {
-        for (float &value : iq) {
-            value *= gain;
-        }
-    });
-}
-
-bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double *rms)
-{
-    m_cancelled = false;
-    if (stream == nullptr || peak == nullptr || rms == nullptr) {
-        return fail("*** Invalid input arguments.");
+    Conversion conversion(*this, inputCount, outputCount);
+    if (!conversion.run()) {
+        return false;
     }
-    if (samples < 1) {
-        return fail("*** Invalid input data length.");
-    }
-    if (!stream->checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
-    }
-    std::vector<float> block(2 * static_cast<size_t>(std::min(samples, StreamBlockSamples)));
-    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    double highest = 0;
-    double sum = 0;
-    for (int done = 0; done < samples;) {
-        if (clock.shouldStop(percentOf(done, samples))) {
-            return fail("*** Action aborted by user.");
-        }
-        const int count = std::min(samples - done, StreamBlockSamples);
-        const int got = readSamples(*stream, {block.data(), 2 * static_cast<size_t>(count)});
-        if (got < count) {
-            return failAtSample("Reading", done + got);
-        }
-        for (size_t i = 0; i < 2 * static_cast<size_t>(count); i += 2) {
-            const double inPhase = block[i];
-            const double quadrature = block[i + 1];
-            const double square = inPhase * inPhase + quadrature * quadrature;
-            highest = std::max(highest, square);
-            sum += square;
-        }
-        done += count;
-    }
-    *rms = std::sqrt(sum / samples);
-    *peak = std::sqrt(highest);
+    m_peakOffset = offsetOf(conversion.peak());
+    m_rmsOffset = offsetOf(conversion.rms());
     return true;
 }

@@ -1,0 +1,248 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "Resample.h"
+
+#include "base/ProgressClock.h"
+#include "base/parallel.h"
+#include "log/Tracer.h"
+#include "samplestream.h"
+#include "vectorclones.h"
+#include "vectormath.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <numbers>
+#include <vector>
+
+namespace {
+
+constexpr double Circle = 2 * std::numbers::pi;
+
+[[nodiscard]] bool fail(const QString &text)
+{
+    Tracer::Trace(Tracer::Error, text);
+    return false;
+}
+
+[[nodiscard]] bool failAtSample(const char *what, qint64 sample)
+{
+    return fail(QString("*** %1 failed for sample %2.").arg(QLatin1String(what)).arg(sample));
+}
+
+/// The first sample of a block from `first` on that a failed write has lost: blocks reach the
+/// device only when the write buffer, which holds the header too, is full.
+qint64 failedWriteSample(qint64 first)
+{
+    const qint64 start = BufferedIO::HeaderSize + first * BufferedIO::RecordSize;
+    const qint64 boundary = (start / BufferedIO::BufferSize + 1) * BufferedIO::BufferSize;
+    return (boundary - BufferedIO::HeaderSize) / BufferedIO::RecordSize;
+}
+
+size_t floatsOf(int samples)
+{
+    return 2 * static_cast<size_t>(samples);
+}
+
+CORVANE_VECTOR_CLONES void scale(std::span<float> iq, float gain)
+{
+    for (float &value : iq) {
+        value *= gain;
+    }
+}
+
+/// Turns each sample by the angle whose sine and cosine are given.
+CORVANE_VECTOR_CLONES void rotate(std::span<float> iq, const double *sine, const double *cosine)
+{
+    for (size_t i = 0; i < iq.size() / 2; ++i) {
+        const double re = iq[2 * i];
+        const double im = iq[2 * i + 1];
+        const bool onAxis = re == 0;
+        const double x = onAxis ? std::abs(im) : re;
+        const double y = onAxis ? 0.0 : im;
+        iq[2 * i] = static_cast<float>(x * cosine[i] - y * sine[i]);
+        iq[2 * i + 1] = static_cast<float>(x * sine[i] + y * cosine[i]);
+    }
+}
+
+/// Sine and cosine of the phase of cartesianToPolar are those of the vector itself but for the
+/// imaginary axis, where it is a full circle.
+CORVANE_VECTOR_CLONES void splitPolar(std::span<const float> iq, std::span<float> phase,
+                                      std::span<float> amplitude, double offset, double gain)
+{
+    // The double closest to a full circle misses it by this much.
+    constexpr double FullCircleSine = 2.4492935982947064e-16;
+    constexpr double HalfCircleSine = 1.2246467991473532e-16;
+    for (size_t i = 0; i < iq.size() / 2; ++i) {
+        const double re = iq[2 * i];
+        const double im = iq[2 * i + 1];
+        const double magnitude = std::sqrt(re * re + im * im);
+        const bool onAxis = re == 0;
+        const double axisSine = im > 0 ? -FullCircleSine : FullCircleSine;
+        const double realAxisSine = re < 0 ? HalfCircleSine : 0.0;
+        const double divisor = onAxis ? 1.0 : magnitude;
+        const double sine = im == 0 ? realAxisSine : im / divisor;
+        phase[2 * i] = static_cast<float>(onAxis ? 1.0 : re / divisor);
+        phase[2 * i + 1] = static_cast<float>(-(onAxis ? axisSine : sine));
+        amplitude[2 * i] = static_cast<float>(((2 * magnitude) - 1.0) * gain + offset);
+        amplitude[2 * i + 1] = 0.0F;
+    }
+}
+
+/// The passes' common loop over a stream whose first sample is next to be read. `work` takes a
+/// block of samples and its first index, and gives false if it has failed and said why.
+template <typename Work>
+[[nodiscard]] bool forEachBlock(BufferedIO &stream, int samples, ProgressClock &clock, Work work)
+{
+    std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
+    for (int done = 0; done < samples;) {
+        if (clock.shouldStop(percentOf(done, samples))) {
+            return fail("*** Action aborted by user.");
+        }
+        const int count = std::min(samples - done, StreamBlockSamples);
+        const int got = readSamples(stream, std::span(block).first(floatsOf(count)));
+        if (got > 0 && !work(std::span(block).first(floatsOf(got)), done)) {
+            return false;
+        }
+        if (got < count) {
+            return failAtSample("Reading", done + got);
+        }
+        done += count;
+    }
+    return true;
+}
+
+} // namespace
+
+bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork &work)
+{
+    m_cancelled = false;
+    if (samples < 1) {
+        return fail("*** Invalid input data length.");
+    }
+    if (stream == nullptr) {
+        return fail("*** Invalid data buffer.");
+    }
+    if (!stream->checkHeader("IQF")) {
+        return fail("*** Cannot validate data stream header.");
+    }
+    if (!stream->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+        return fail("*** Cannot write to data buffer.");
+    }
+    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
+    return forEachBlock(*stream, samples, clock, [&](std::span<float> iq, qint64 first) {
+        work(iq);
+        return writeSamples(*stream, iq) || failAtSample("Writing", failedWriteSample(first));
+    });
+}
+
+bool Resample::rescale(int samples, double factor, BufferedIO *stream)
+{
+    const auto gain = static_cast<float>(factor);
+    return transformInPlace(samples, stream, [gain](std::span<float> iq) { scale(iq, gain); });
+}
+
+bool Resample::frequencyShift(int samples, double frequency, double clock, BufferedIO *stream)
+{
+    const double step = frequency * Circle / clock;
+    if (!std::isfinite(step)) {
+        return fail(QString("*** Invalid frequency shift of %1 Hz at a clock of %2 Hz.")
+                        .arg(frequency)
+                        .arg(clock));
+    }
+    double angle = 0.0;
+    std::vector<double> angles(StreamBlockSamples);
+    std::vector<double> sine(StreamBlockSamples);
+    std::vector<double> cosine(StreamBlockSamples);
+    constexpr size_t Part = StreamBlockSamples / 8;
+    const auto turn = [&](std::span<float> iq) {
+        // The sum is taken sample by sample: its roundings are a part of the result.
+        const size_t count = iq.size() / 2;
+        for (size_t i = 0; i < count; ++i) {
+            angles[i] = angle;
+            angle += step;
+        }
+        parallelFor((count + Part - 1) / Part, [&](size_t part) {
+            const size_t first = part * Part;
+            const size_t length = std::min(Part, count - first);
+            sinCos(std::span(angles).subspan(first, length), std::span(sine).subspan(first, length),
+                   std::span(cosine).subspan(first, length));
+            rotate(iq.subspan(2 * first, 2 * length), sine.data() + first, cosine.data() + first);
+        });
+    };
+    if (!transformInPlace(samples, stream, turn)) {
+        return false;
+    }
+    return stream->restartAtBegining() || fail("*** Cannot write to data buffer.");
+}
+
+bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, BufferedIO *amplitude,
+                          double offset, double gain)
+{
+    m_cancelled = false;
+    if (samples < 1) {
+        return fail("*** Invalid input data length.");
+    }
+    if (source == nullptr || phase == nullptr || amplitude == nullptr) {
+        return fail("*** Invalid data buffer.");
+    }
+    if (!source->checkHeader("IQF")) {
+        return fail("*** Cannot validate data stream header.");
+    }
+    if (!phase->restartAtBegining()) {
+        return fail("*** Cannot setup phase output buffer.");
+    }
+    if (!amplitude->restartAtBegining()) {
+        return fail("*** Cannot setup amplitude output buffer.");
+    }
+    if (!phase->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+        return fail("*** Cannot write to phase data buffer.");
+    }
+    if (!amplitude->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+        return fail("*** Cannot write to amplitude data buffer.");
+    }
+    std::vector<float> phaseBlock(floatsOf(StreamBlockSamples));
+    std::vector<float> amplitudeBlock(floatsOf(StreamBlockSamples));
+    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
+    return forEachBlock(*source, samples, clock, [&](std::span<float> iq, qint64 first) {
+        const std::span<float> phasePart = std::span(phaseBlock).first(iq.size());
+        const std::span<float> amplitudePart = std::span(amplitudeBlock).first(iq.size());
+        splitPolar(iq, phasePart, amplitudePart, offset, gain);
+        if (!writeSamples(*phase, phasePart)) {
+            return failAtSample("Writing phase data", failedWriteSample(first));
+        }
+        return writeSamples(*amplitude, amplitudePart) ||
+               failAtSample("Writing amplitude data", failedWriteSample(first));
+    });
+}
+
+bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double *rms)
+{
+    m_cancelled = false;
+    if (stream == nullptr || peak == nullptr || rms == nullptr) {
+        return fail("*** Invalid input arguments.");
+    }
+    if (samples < 1) {
+        return fail("*** Invalid input data length.");
+    }
+    if (!stream->checkHeader("IQF")) {
+        return fail("*** Cannot validate data stream header.");
+    }
+    double highest = 0;
+    double sum = 0;
+    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
+    const bool done = forEachBlock(*stream, samples, clock, [&](std::span<const float> iq, qint64) {
+        for (size_t i = 0; i < iq.size(); i += 2) {
+            const double inPhase = iq[i];
+            const double quadrature = iq[i + 1];
+            const double square = inPhase * inPhase + quadrature * quadrature;
+            highest = std::max(highest, square);
+            sum += square;
+        }
+        return true;
+    });
+    if (done) {
+        *rms = std::sqrt(sum / samples);
+        *peak = std::sqrt(highest);
+    }
+    return done;
+}
