@@ -20,3 +20,4 @@ void addFileCommands(CommandSet &commands);
 void addPlotCommand(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
+void addInstrumentCommands(CommandSet &commands);

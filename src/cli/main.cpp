@@ -73,6 +73,7 @@ int main(int argc, char **argv)
     addPlotCommand(commands);
     addEditCommands(commands);
     addImportCommands(commands);
+    addInstrumentCommands(commands);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError &problem) {

@@ -1,0 +1,327 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "BlockReader.h"
+
+#include "VisaDevice.h"
+
+#include "base/ProgressClock.h"
+#include "log/Tracer.h"
+#include "wvfile/BufferedIO.h"
+
+#include <QElapsedTimer>
+#include <QFile>
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+
+namespace {
+
+constexpr qint64 fileBlockBytes = 32768;
+constexpr qint64 streamBlockBytes = 2048;
+/// Short reads in a row that are taken for a slow instrument.
+constexpr int maxRetries = 3;
+/// Digits of the byte count; one digit tells their number.
+constexpr quint32 maxDigits = 9;
+
+void note(const QString &text)
+{
+    Tracer::Trace(Tracer::Information, text);
+}
+
+bool isDigit(char character)
+{
+    return character >= '0' && character <= '9';
+}
+
+quint32 digitValue(char character)
+{
+    return static_cast<quint32>(character - '0');
+}
+
+} // namespace
+
+BlockReader::BlockReader(VisaDevice &device, const VisaSession &session,
+                         const std::atomic<bool> &cancelled)
+    : m_device(device)
+    , m_session(session)
+    , m_cancelled(cancelled)
+{
+}
+
+bool BlockReader::fail(const char *text) const
+{
+    m_session.clear();
+    Tracer::Trace(Tracer::Error, text);
+    return false;
+}
+
+bool BlockReader::fail(const char *text, ViStatus status) const
+{
+    (void)fail(text);
+    m_device.reportStatus(status);
+    return false;
+}
+
+bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
+{
+    note("Copying file from instrument to local file system.");
+    note("Source   \t: " + remotePath);
+    note("Destination \t: " + localPath);
+    note(QString("R/W Timeout \t: %1 ms").arg(m_device.timeoutMs()));
+    QFile file(localPath);
+    if (!file.open(QIODevice::WriteOnly)) {
+        return Tracer::fail("Cannot open local file for writing.");
+    }
+    emit m_device.ProgressUpdate(0);
+    if (!m_device.sendCommand(":MMEM:DATA? '" + remotePath + "'")) {
+        return fail("Cannot query file from instrument.");
+    }
+    // The data may hold any byte.
+    m_session.setAttribute(VI_ATTR_TERMCHAR_EN, VI_FALSE);
+    const std::optional<qint64> length = readFileLength();
+    if (!length) {
+        return false;
+    }
+    note(QString("Reading %1 bytes.").arg(*length));
+    QElapsedTimer rateTimer;
+    rateTimer.start();
+    if (!receiveFile(file, *length)) {
+        return false;
+    }
+    char terminator = 0;
+    quint32 count = 0;
+    const ViStatus status = m_session.read(&terminator, 1, count);
+    if (!VisaSession::isGoodRead(status)) {
+        // All data are there, so this is worth no more than a message.
+        (void)fail("No terminating character received.", status);
+    }
+    const qint64 elapsedMs = rateTimer.elapsed();
+    if (!file.flush()) {
+        return fail("Writing data to local file failed.");
+    }
+    emit m_device.ProgressUpdate(100);
+    if (!m_device.checkErrorQueue()) {
+        return false;
+    }
+    if (elapsedMs > 0) {
+        const double rate =
+            static_cast<double>(*length) / 1024 / (static_cast<double>(elapsedMs) / 1000);
+        // Shows a tenth of the rate, as this line has always done.
+        note(QString::asprintf("Transfer rate was %3.1f kB/s.", std::trunc(rate * 10) * 0.01));
+    }
+    return true;
+}
+
+std::optional<qint64> BlockReader::readFileLength() const
+{
+    std::array<char, maxDigits> text{};
+    quint32 count = 0;
+    ViStatus status = m_session.read(text.data(), 2, count);
+    if (!VisaSession::isGoodRead(status)) {
+        (void)fail("Reading start character failed.", status);
+        return std::nullopt;
+    }
+    if (count != 2 || text[0] != '#' || !isDigit(text[1])) {
+        (void)fail("Invalid or no character received from instrument. Expected character was '#'.",
+                   status);
+        return std::nullopt;
+    }
+    const quint32 digits = digitValue(text[1]);
+    status = m_session.read(text.data(), digits, count);
+    if (!VisaSession::isGoodRead(status)) {
+        (void)fail("Reading length information failed.", status);
+        return std::nullopt;
+    }
+    if (count != digits) {
+        (void)fail("Invalid length data received from instrument.");
+        return std::nullopt;
+    }
+    const bool allDigits = std::all_of(text.begin(), text.begin() + digits, isDigit);
+    const qint64 length = QByteArray(text.data(), digits).toLongLong();
+    if (!allDigits || length == 0) {
+        (void)fail("Invalid length information received from instrument.");
+        return std::nullopt;
+    }
+    return length;
+}
+
+bool BlockReader::receiveFile(QFile &file, qint64 length)
+{
+    note(QString("Read block size is %1 bytes.").arg(fileBlockBytes));
+    m_buffer.resize(fileBlockBytes);
+    ProgressClock progress([this](int percent) { emit m_device.ProgressUpdate(percent); },
+                           m_cancelled);
+    int retries = 0;
+    for (qint64 remaining = length; remaining > 0;) {
+        const auto wanted = static_cast<quint32>(std::min(remaining, fileBlockBytes));
+        quint32 count = 0;
+        const ViStatus status = m_session.read(m_buffer.data(), wanted, count);
+        if (!VisaSession::isGoodRead(status)) {
+            (void)fail("Reading binary data block failed.");
+            Tracer::Trace(Tracer::Error,
+                          QString("%1 bytes already received.").arg(length - remaining));
+            Tracer::Trace(Tracer::Error, QString("%1 bytes remaining.").arg(remaining));
+            m_device.reportStatus(status);
+            return false;
+        }
+        if (count != wanted) {
+            if (retries == maxRetries) {
+                return failIncomplete(length - remaining, length, count, status);
+            }
+            Tracer::Trace(Tracer::Debug,
+                          "viRead() has returned less bytes than expected. Retrying...");
+            ++retries;
+        } else {
+            retries = 0;
+        }
+        if (file.write(m_buffer.constData(), count) != static_cast<qint64>(count)) {
+            return fail("Writing data to local file failed.");
+        }
+        remaining -= count;
+        if (progress.shouldStop(length - remaining, length)) {
+            return abandon();
+        }
+    }
+    return true;
+}
+
+bool BlockReader::failIncomplete(qint64 total, qint64 length, quint32 count, ViStatus status) const
+{
+    constexpr quint32 shownBytes = 6;
+    (void)fail("viRead(): Binary data transfer incomplete.");
+    Tracer::Trace(
+        Tracer::Error,
+        QString("viRead(): Received %1 bytes but expected %2 bytes.").arg(total).arg(length));
+    Tracer::Trace(Tracer::Error, QString("%1 bytes received.").arg(count));
+    if (count >= shownBytes) {
+        QString text = "Last received data: ";
+        for (quint32 i = count - shownBytes; i < count; ++i) {
+            text += QString::asprintf("%02X ", static_cast<unsigned char>(m_buffer.at(i)));
+        }
+        Tracer::Trace(Tracer::Error, text);
+    }
+    m_device.reportStatus(status);
+    return false;
+}
+
+bool BlockReader::abandon() const
+{
+    m_session.clear();
+    m_device.checkErrorQueue();
+    (void)m_device.sendCommand("*CLS");
+    note("*** Transfer aborted by user.");
+    return false;
+}
+
+bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
+{
+    const std::optional<qint64> length = readStreamLength();
+    if (!length) {
+        return false;
+    }
+    if (*length > maximum) {
+        return Tracer::fail("Data buffer too small.");
+    }
+    if (!stream.restartAtBegining() || !stream.writeBytes(BufferedIO::HeaderSize, "IQF")) {
+        return Tracer::fail("Cannot initialize temporary data buffer.");
+    }
+    if (Tracer::isEnabled(Tracer::Debug)) {
+        Tracer::Trace(Tracer::Debug,
+                      QString("Reading with binary block size of %1 bytes.").arg(streamBlockBytes));
+    }
+    ViBoolean usesTerminator = VI_FALSE;
+    ViStatus status = m_session.getAttribute(VI_ATTR_TERMCHAR_EN, usesTerminator);
+    if (status == VI_SUCCESS) {
+        status = m_session.setAttribute(VI_ATTR_TERMCHAR_EN, VI_FALSE);
+    }
+    if (status != VI_SUCCESS) {
+        m_device.reportStatus(status);
+        return false;
+    }
+    const std::optional<qint64> received = receiveStream(stream, *length, maximum);
+    if (!received) {
+        return false;
+    }
+    status = m_session.setAttribute(VI_ATTR_TERMCHAR_EN, usesTerminator);
+    if (status != VI_SUCCESS) {
+        m_device.reportStatus(status);
+        return false;
+    }
+    char terminator = 0;
+    quint32 count = 0;
+    if (!VisaSession::isGoodRead(m_session.read(&terminator, 1, count))) {
+        return Tracer::fail("Cannot read terminating character.");
+    }
+    emit m_device.ProgressUpdate(100);
+    note(QString("Reading of %1 bytes completed.").arg(*received));
+    return true;
+}
+
+std::optional<qint64> BlockReader::readStreamLength() const
+{
+    const auto failed = [this](const char *text, ViStatus status) {
+        Tracer::Trace(Tracer::Error, text);
+        m_device.reportStatus(status);
+        return std::nullopt;
+    };
+    char character = 0;
+    quint32 count = 0;
+    ViStatus status = m_session.read(&character, 1, count);
+    if (!VisaSession::isGoodRead(status)) {
+        return failed("Cannot read header length.", status);
+    }
+    if (count != 1 || character != '#') {
+        Tracer::Trace(Tracer::Error, "Invalid character in binary data header. Expected '#'.");
+        return std::nullopt;
+    }
+    status = m_session.read(&character, 1, count);
+    if (!VisaSession::isGoodRead(status) || count != 1 || !isDigit(character)) {
+        return failed("Cannot read header length.", status);
+    }
+    const quint32 digits = digitValue(character);
+    if (Tracer::isEnabled(Tracer::Debug)) {
+        Tracer::Trace(Tracer::Debug, QString("The header length is %1 bytes.").arg(digits));
+    }
+    std::array<char, maxDigits> text{};
+    status = m_session.read(text.data(), digits, count);
+    if (!VisaSession::isGoodRead(status)) {
+        return failed("Cannot read binary data length information.", status);
+    }
+    // Reads as far as there are digits.
+    qint64 length = 0;
+    for (quint32 i = 0; i < count && isDigit(text[i]); ++i) {
+        length = 10 * length + digitValue(text[i]);
+    }
+    note(QString("Instrument sends %1 bytes.").arg(length));
+    return length;
+}
+
+std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 length, qint64 maximum)
+{
+    m_buffer.resize(streamBlockBytes);
+    emit m_device.ProgressUpdate(0);
+    QElapsedTimer progress;
+    progress.start();
+    qint64 received = 0;
+    while (received < length) {
+        const auto wanted = static_cast<quint32>(std::min(length - received, streamBlockBytes));
+        quint32 count = 0;
+        if (!VisaSession::isGoodRead(m_session.read(m_buffer.data(), wanted, count))) {
+            (void)fail("Reading failed.");
+            return std::nullopt;
+        }
+        if (!stream.writeBytes(static_cast<int>(count), m_buffer.constData())) {
+            (void)fail("Cannot write data to temporary buffer.");
+            return std::nullopt;
+        }
+        received += count;
+        if (progress.elapsed() > ProgressClock::IntervalMs) {
+            emit m_device.ProgressUpdate(static_cast<int>(100 * received / maximum));
+            progress.restart();
+        }
+        if (count < wanted) {
+            break;
+        }
+    }
+    return received;
+}

@@ -1,0 +1,200 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "BlockWriter.h"
+
+#include "VisaDevice.h"
+#include "instrumenttext.h"
+#include "remotepaths.h"
+
+#include "base/ProgressClock.h"
+#include "log/Tracer.h"
+
+#include <QElapsedTimer>
+#include <QFile>
+#include <QFileInfo>
+
+#include <algorithm>
+#include <limits>
+#include <optional>
+
+namespace {
+
+constexpr qint64 blockBytes = 1024;
+/// Largest byte count that fits in the nine digits of the definite form.
+constexpr qint64 maxDefiniteBytes = 999'999'999;
+/// The instrument's byte count is a signed 32-bit number.
+constexpr qint64 maxFileBytes = std::numeric_limits<qint32>::max();
+
+void note(const QString &text)
+{
+    Tracer::Trace(Tracer::Information, text);
+}
+
+} // namespace
+
+BlockWriter::BlockWriter(VisaDevice &device, const VisaSession &session,
+                         const std::atomic<bool> &cancelled)
+    : m_device(device)
+    , m_session(session)
+    , m_cancelled(cancelled)
+    , m_buffer(blockBytes, '\0')
+{
+}
+
+QString BlockWriter::header(const QString &remotePath, qint64 size)
+{
+    const QString count = QString::number(size);
+    const QString head = size <= maxDefiniteBytes ? QString("#%1%2").arg(count.size()).arg(count)
+                                                  : "#(" + count + ')';
+    return ":MMEM:DATA '" + remotePath + "'," + head;
+}
+
+bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
+{
+    const qint64 size = QFileInfo(localPath).size();
+    if (size == 0) {
+        return Tracer::fail("Local file has zero size.");
+    }
+    if (size > maxFileBytes) {
+        return Tracer::fail(QString("The local file '%1' has %2 bytes; an instrument takes at most "
+                                    "%3.")
+                                .arg(localPath)
+                                .arg(size)
+                                .arg(maxFileBytes));
+    }
+    const QString head = header(remotePath, size);
+    const std::optional<QByteArray> headBytes = toInstrument(head);
+    if (!headBytes || !removeOldFile(remotePath)) {
+        return false;
+    }
+    emit m_device.ProgressUpdate(0);
+    QFile file(localPath);
+    if (!file.open(QIODevice::ReadOnly)) {
+        return Tracer::fail("Error opening local input file.");
+    }
+    if (!prepareSession()) {
+        return false;
+    }
+    note(QString("Sending %1 bytes of binary data...").arg(size));
+    note("VISA >> '" + head + "...'");
+    quint32 count = 0;
+    if (const ViStatus status = m_session.write(*headBytes, count); status != VI_SUCCESS) {
+        m_device.reportStatus(status);
+        m_device.recoverAfterTransferError(m_previousEnd, m_interface);
+        return false;
+    }
+    Tracer::Trace(Tracer::Debug, "VISA >> Sending data");
+    QElapsedTimer rateTimer;
+    rateTimer.start();
+    if (!sendFile(file, size)) {
+        abandon(remotePath);
+        return false;
+    }
+    const qint64 elapsedMs = std::max<qint64>(rateTimer.elapsed(), 1);
+    Tracer::Trace(Tracer::Debug, "VISA >> Setting back VI_ATTR_SEND_END_EN attribute.");
+    if (!setSendEnd(m_previousEnd)) {
+        return false;
+    }
+    emit m_device.ProgressUpdate(100);
+    if (m_interface == VI_INTF_GPIB && !m_device.sendCommand(":SYST:COMM:GPIB:LTER STAN; *OPC?")) {
+        return false;
+    }
+    if (!m_device.checkErrorQueue()) {
+        return false;
+    }
+    note(QString("Transfer rate was %1 bytes/s.").arg(size * 1000 / elapsedMs));
+    return true;
+}
+
+bool BlockWriter::removeOldFile(const QString &remotePath)
+{
+    const RemotePath parts = splitPath(remotePath);
+    QList<RemoteFileEntry> entries;
+    if (!m_device.listDirectory(entries, parts.directory)) {
+        return false;
+    }
+    return std::all_of(entries.cbegin(), entries.cend(), [&](const RemoteFileEntry &entry) {
+        return entry.isDirectory() || entry.name != parts.fileName ||
+               m_device.sendCommand(":MMEM:DEL '" + remotePath + "'; *OPC?");
+    });
+}
+
+bool BlockWriter::prepareSession()
+{
+    if (!m_device.interfaceType(m_interface)) {
+        return false;
+    }
+    // The instrument then takes only EOI for the end of a message, so that a line feed among the
+    // data can't end it.
+    if (m_interface == VI_INTF_GPIB && !m_device.sendCommand(":SYST:COMM:GPIB:LTER EOI; *OPC?")) {
+        return Tracer::fail("Cannot set instrument EOI mode.");
+    }
+    const ViStatus status = m_session.getAttribute(VI_ATTR_SEND_END_EN, m_previousEnd);
+    if (status != VI_SUCCESS) {
+        m_device.reportStatus(status);
+        return false;
+    }
+    return setSendEnd(VI_FALSE);
+}
+
+bool BlockWriter::setSendEnd(ViAttrState value) const
+{
+    const ViStatus status = m_session.setAttribute(VI_ATTR_SEND_END_EN, value);
+    if (status != VI_SUCCESS) {
+        m_device.reportStatus(status);
+    }
+    return status == VI_SUCCESS;
+}
+
+bool BlockWriter::sendFile(QFile &file, qint64 size)
+{
+    ProgressClock progress([this](int percent) { emit m_device.ProgressUpdate(percent); },
+                           m_cancelled);
+    for (qint64 remaining = size; remaining > 0;) {
+        const qint64 wanted = std::min(remaining, blockBytes);
+        if (remaining <= blockBytes) {
+            Tracer::Trace(Tracer::Debug, "VISA >> Sending last data block.");
+            if (!setSendEnd(VI_TRUE)) {
+                return false;
+            }
+        }
+        const qint64 available = file.read(m_buffer.data(), wanted);
+        if (available != wanted) {
+            return failOnSource(wanted, available, remaining);
+        }
+        quint32 count = 0;
+        const ViStatus status =
+            m_session.write(m_buffer.constData(), static_cast<quint32>(wanted), count);
+        if (status != VI_SUCCESS) {
+            m_device.reportStatus(status);
+            return false;
+        }
+        if (count != wanted) {
+            return Tracer::fail(
+                "The number of bytes to send disagrees with the number of bytes sent.");
+        }
+        remaining -= wanted;
+        if (progress.shouldStop(size - remaining, size)) {
+            m_wasCancelled = true;
+            return false;
+        }
+    }
+    return true;
+}
+
+bool BlockWriter::failOnSource(qint64 wanted, qint64 count, qint64 remaining) const
+{
+    Tracer::Trace(Tracer::Error, QString("Error: %1 bytes required from input file.").arg(wanted));
+    Tracer::Trace(Tracer::Error, QString("Error: %1 bytes read from file.").arg(count));
+    Tracer::Trace(Tracer::Error, QString("Error: %1 bytes remaining for transfer.").arg(remaining));
+    return false;
+}
+
+/// Leaves no partial file on the instrument.
+void BlockWriter::abandon(const QString &remotePath)
+{
+    m_device.recoverAfterTransferError(m_previousEnd, m_interface);
+    (void)m_device.deleteRemoteFile(remotePath, false);
+    if (m_wasCancelled) {
+        note("*** Transfer aborted by user.");
+    }
+}

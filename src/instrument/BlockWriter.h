@@ -1,0 +1,43 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "VisaSession.h"
+
+#include <QByteArray>
+#include <QString>
+
+#include <atomic>
+
+class QFile;
+class VisaDevice;
+
+/// Sends a local file as one block. Its end is marked by END with the last piece and by nothing
+/// else, so that the data may hold any byte. Lives for one transfer of an open device, whose
+/// progress signal it emits and in whose name it logs.
+class BlockWriter
+{
+public:
+    BlockWriter(VisaDevice &device, const VisaSession &session, const std::atomic<bool> &cancelled);
+
+    /// See VisaDevice::writeRemoteFile.
+    [[nodiscard]] bool writeFile(const QString &localPath, const QString &remotePath);
+
+    /// The command with the head of the block for that many bytes.
+    [[nodiscard]] static QString header(const QString &remotePath, qint64 size);
+
+private:
+    [[nodiscard]] bool removeOldFile(const QString &remotePath);
+    [[nodiscard]] bool prepareSession();
+    [[nodiscard]] bool sendFile(QFile &file, qint64 size);
+    [[nodiscard]] bool failOnSource(qint64 wanted, qint64 count, qint64 remaining) const;
+    [[nodiscard]] bool setSendEnd(ViAttrState value) const;
+    void abandon(const QString &remotePath);
+
+    VisaDevice &m_device;
+    VisaSession m_session;
+    const std::atomic<bool> &m_cancelled;
+    quint16 m_interface = 0;
+    ViBoolean m_previousEnd = VI_TRUE;
+    QByteArray m_buffer;
+    bool m_wasCancelled = false;
+};

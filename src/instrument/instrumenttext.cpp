@@ -1,0 +1,27 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "instrumenttext.h"
+
+#include "log/Tracer.h"
+
+#include <algorithm>
+
+std::optional<QByteArray> toInstrument(const QString &command)
+{
+    constexpr char16_t lastCharacter = 0xFF;
+    const auto found = std::find_if(command.cbegin(), command.cend(), [](QChar character) {
+        return character.unicode() > lastCharacter;
+    });
+    if (found != command.cend()) {
+        Tracer::Trace(Tracer::Error,
+                      QString("The command '%1' holds the character '%2', which can't be sent to "
+                              "an instrument; those of Latin-1 can.")
+                          .arg(command, *found));
+        return std::nullopt;
+    }
+    return command.toLatin1();
+}
+
+QString fromInstrument(const char *bytes, quint32 count)
+{
+    return QString::fromLatin1(bytes, static_cast<qsizetype>(qstrnlen(bytes, count))).simplified();
+}

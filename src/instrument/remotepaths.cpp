@@ -1,0 +1,83 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "remotepaths.h"
+
+#include <QStringList>
+
+namespace {
+
+constexpr QChar Backslash('\\');
+
+} // namespace
+
+RemotePath splitPath(const QString &path)
+{
+    RemotePath parts;
+    if (path.size() > 1 && path.at(1) == ':') {
+        parts.drive = path.left(2);
+    }
+    qsizetype separator = path.lastIndexOf('/');
+    if (separator < 0) {
+        separator = path.lastIndexOf(Backslash);
+    }
+    // A drive without a folder, as in "D:file.wv", is the folder that is current there.
+    const qsizetype nameBegin = separator < 0 ? parts.drive.size() : separator + 1;
+    parts.directory = path.left(nameBegin);
+    parts.fileName = path.mid(nameBegin);
+    const qsizetype point = parts.fileName.lastIndexOf('.');
+    parts.baseName = point < 0 ? parts.fileName : parts.fileName.left(point);
+    parts.suffix = point < 0 ? QString() : parts.fileName.mid(point + 1);
+    return parts;
+}
+
+QString joinRemotePath(const QString &parent, const QString &name, QChar separator)
+{
+    const auto unified = [separator](QString text) {
+        return text.replace('/', separator).replace(Backslash, separator);
+    };
+    QString head = unified(parent);
+    while (head.endsWith(separator)) {
+        head.chop(1);
+    }
+    QString tail = unified(name);
+    while (tail.startsWith(separator)) {
+        tail.remove(0, 1);
+    }
+    return QString(head + separator + tail).remove('\'');
+}
+
+QList<RemoteFileEntry> parseCatalogue(const QString &answer)
+{
+    QList<RemoteFileEntry> entries;
+    const qsizetype firstQuote = answer.indexOf('"');
+    if (firstQuote < 0) {
+        return entries;
+    }
+    const QStringList parts = answer.mid(firstQuote).split("\",\"");
+    for (QString part : parts) {
+        part.remove('"');
+        if (part.count(',') < 2 || part.startsWith('.')) {
+            continue;
+        }
+        const qsizetype lastComma = part.lastIndexOf(',');
+        const qsizetype typeComma = part.lastIndexOf(',', lastComma - 1);
+        bool isNumber = false;
+        RemoteFileEntry entry;
+        // What stands before the two last commas is the name, which may hold commas itself.
+        entry.name = part.left(typeComma);
+        entry.type = part.mid(typeComma + 1, lastComma - typeComma - 1);
+        entry.size = part.mid(lastComma + 1).toLongLong(&isNumber);
+        if (isNumber && !entry.name.isEmpty() && !entry.type.isEmpty()) {
+            entries.append(entry);
+        }
+    }
+    return entries;
+}
+
+QString resourceOf(const QString &text)
+{
+    const QString trimmed = text.trimmed();
+    if (trimmed.isEmpty() || trimmed.contains("::")) {
+        return trimmed;
+    }
+    return "TCPIP::" + trimmed + "::INSTR";
+}
