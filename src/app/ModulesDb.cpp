@@ -8,6 +8,7 @@
 #include "toolframe/DlgBase.h"
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
+#include "tools/DlgWvCreate.h"
 
 #include <QAction>
 #include <QMenu>
@@ -34,6 +35,7 @@ ModulesDb::ModulesDb()
 {
     addTool(std::make_unique<DlgInfo>());
     addTool(std::make_unique<DlgView>());
+    addTool(std::make_unique<DlgWvCreate>());
     addTool(std::make_unique<DlgResample>());
 }
 
