@@ -13,8 +13,7 @@ LocalFileModel::LocalFileModel(QAbstractFileIconProvider *icons)
 {
     setIconProvider(icons);
     setRootPath({});
-    setFilter(QDir::Files | QDir::Drives | QDir::AllDirs | QDir::NoSymLinks |
-              QDir::NoDotAndDotDot);
+    setFilter(QDir::Files | QDir::Drives | QDir::AllDirs | QDir::NoSymLinks | QDir::NoDotAndDotDot);
 }
 
 QVariant LocalFileModel::data(const QModelIndex &index, int role) const

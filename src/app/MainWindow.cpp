@@ -71,10 +71,10 @@ MainWindow::MainWindow()
     registerPictures();
     setAttribute(Qt::WA_DeleteOnClose);
     m_ui->setupUi(this);
-    m_panes[0] = {m_ui->cb_dev_1, m_ui->cb_flt_1,  m_ui->tb_refresh_1, m_ui->l_win1,
-                  m_ui->cb_entry1, m_ui->tv_dev_1, nullptr};
-    m_panes[1] = {m_ui->cb_dev_2, m_ui->cb_flt_2,  m_ui->tb_refresh_2, m_ui->l_win2,
-                  m_ui->cb_entry2, m_ui->tv_dev_2, nullptr};
+    m_panes[0] = {m_ui->cb_dev_1, m_ui->cb_flt_1, m_ui->tb_refresh_1, m_ui->l_win1, m_ui->cb_entry1,
+                  m_ui->tv_dev_1, nullptr};
+    m_panes[1] = {m_ui->cb_dev_2, m_ui->cb_flt_2, m_ui->tb_refresh_2, m_ui->l_win2, m_ui->cb_entry2,
+                  m_ui->tv_dev_2, nullptr};
     buildMenus();
     for (Pane &pane : m_panes) {
         pane.tree->setModules(&m_modules);

@@ -349,8 +349,7 @@ void QCustomTreeView::slot_create()
     }
     const auto name =
         askText(this, "Create folder", QString("\nCreate new folder in\n'%1'").arg(parent), {});
-    if (name &&
-        acceptsName(parent, *name, "The new folder name contains invalid characters.") &&
+    if (name && acceptsName(parent, *name, "The new folder name contains invalid characters.") &&
         m_files->createFolder(parent, *name)) {
         updateAndExpandTree(parent + *name + '/');
     }
@@ -367,9 +366,9 @@ void QCustomTreeView::slot_rename()
         return;
     }
     const QString parent = parentFolder(path);
-    const auto name = askText(this, "Rename entry",
-                              QString("Enter new name for\n'%1'").arg(entryName(path)),
-                              entryName(path));
+    const auto name =
+        askText(this, "Rename entry", QString("Enter new name for\n'%1'").arg(entryName(path)),
+                entryName(path));
     if (name && acceptsName(parent, *name, "The new entry name contains invalid characters.") &&
         m_files->rename(path, *name)) {
         updateAndExpandTree(parent + *name);
@@ -387,9 +386,9 @@ void QCustomTreeView::slot_remove()
         return;
     }
     if (!m_files->isRealFolder(path)) {
-        if (!askYesNo(this, "Delete File",
-                      QString("Do you really want to delete the file\n%1 ?")
-                          .arg(withoutSlash(path)))) {
+        if (!askYesNo(
+                this, "Delete File",
+                QString("Do you really want to delete the file\n%1 ?").arg(withoutSlash(path)))) {
             return;
         }
         (void)m_files->removeFile(path);

@@ -36,7 +36,7 @@ private:
 
     MainWindow &m_window;
     QString m_folder;
-    QString m_file; ///< absolute, empty for none
+    QString m_file;                                          ///< absolute, empty for none
     QSet<QPair<const QCustomTreeView *, QString>> m_arrived; ///< folders that the panes know
     QSet<QPair<const QCustomTreeView *, QString>> m_awaited; ///< folders that the picture needs
     bool m_started = false;

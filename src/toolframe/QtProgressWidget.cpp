@@ -83,6 +83,7 @@ void QtProgressWidget::paintEvent(QPaintEvent * /*event*/)
     }
     // The text changes its colour where the filled part ends, so that it can be read on both.
     const QString text = QString("%1 %").arg(m_value);
+    painter.setClipRect(bar.adjusted(filled.width(), 0, 0, 0));
     painter.setPen(palette().color(QPalette::Text));
     painter.drawText(bar, Qt::AlignCenter, text);
     painter.setClipRect(filled);

@@ -112,9 +112,8 @@ bool withModals(const std::function<void()> &action, const QList<Answer> &answer
     });
     poll.start(10);
     action();
-    const bool done =
-        QTest::qWaitFor([&] { return count >= answers.size(); }, 2000) &&
-        QTest::qWaitFor([] { return !QApplication::activeModalWidget(); }, 2000);
+    const bool done = QTest::qWaitFor([&] { return count >= answers.size(); }, 2000) &&
+                      QTest::qWaitFor([] { return !QApplication::activeModalWidget(); }, 2000);
     return done && count == answers.size();
 }
 

@@ -104,8 +104,7 @@ void TestMainWindow::showsWhatItMust()
     // All controls lie within the panes even at the smallest size.
     const auto *button = desk.find<QToolButton>("tb_refresh_2");
     const QWidget *central = desk.window()->centralWidget();
-    QVERIFY(central->rect().contains(
-        QRect(button->mapTo(central, QPoint(0, 0)), button->size())));
+    QVERIFY(central->rect().contains(QRect(button->mapTo(central, QPoint(0, 0)), button->size())));
     QTRY_VERIFY(desk.window()->firstPaintMs() > 0);
 }
 

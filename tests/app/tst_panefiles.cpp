@@ -82,11 +82,26 @@ void TestPaneFiles::splitsPaths_data()
     QTest::addColumn<QString>("name");
     QTest::addColumn<QString>("parent");
     QTest::addColumn<QString>("folder");
-    QTest::newRow("file") << "/a/b.wv" << "b.wv" << "/a/" << "/a/";
-    QTest::newRow("folder") << "/a/b/" << "b" << "/a/" << "/a/b/";
-    QTest::newRow("at the top") << "/b" << "b" << "/" << "/";
-    QTest::newRow("folder at the top") << "/b/" << "b" << "/" << "/b/";
-    QTest::newRow("root") << "/" << "" << "/" << "/";
+    QTest::newRow("file") << "/a/b.wv"
+                          << "b.wv"
+                          << "/a/"
+                          << "/a/";
+    QTest::newRow("folder") << "/a/b/"
+                            << "b"
+                            << "/a/"
+                            << "/a/b/";
+    QTest::newRow("at the top") << "/b"
+                                << "b"
+                                << "/"
+                                << "/";
+    QTest::newRow("folder at the top") << "/b/"
+                                       << "b"
+                                       << "/"
+                                       << "/b/";
+    QTest::newRow("root") << "/"
+                          << ""
+                          << "/"
+                          << "/";
 }
 
 void TestPaneFiles::splitsPaths()
@@ -228,10 +243,10 @@ void TestPaneFiles::shortSizes_data()
     QTest::newRow("none") << qint64(0) << "0 B";
     QTest::newRow("three digits") << qint64(999) << "999 B";
     QTest::newRow("four digits") << qint64(1000) << "0.98 K";
-    QTest::newRow("two decimals") << qint64(1234) << "1.21 K";    // 1.205
-    QTest::newRow("one decimal") << qint64(10239) << "10.0 K";    // 9.999
-    QTest::newRow("no decimal") << qint64(102390) << "100 K";     // 99.99
-    QTest::newRow("mega") << qint64(400000000) << "381 M";        // 381.47
+    QTest::newRow("two decimals") << qint64(1234) << "1.21 K"; // 1.205
+    QTest::newRow("one decimal") << qint64(10239) << "10.0 K"; // 9.999
+    QTest::newRow("no decimal") << qint64(102390) << "100 K";  // 99.99
+    QTest::newRow("mega") << qint64(400000000) << "381 M";     // 381.47
     QTest::newRow("largest") << std::numeric_limits<qint64>::max() << "8.00 E";
 }
 

@@ -75,8 +75,10 @@ void TestProgram::answersWithoutADisplay_data()
 {
     QTest::addColumn<QString>("argument");
     QTest::addColumn<QString>("answer");
-    QTest::newRow("version") << "--version" << "corvane ";
-    QTest::newRow("help") << "--help" << "Usage: corvane ";
+    QTest::newRow("version") << "--version"
+                             << "corvane ";
+    QTest::newRow("help") << "--help"
+                          << "Usage: corvane ";
 }
 
 void TestProgram::answersWithoutADisplay()
