@@ -15,16 +15,6 @@
 #include <QMimeData>
 #include <QRegularExpression>
 #include <QScrollBar>
-#include <QSettings>
-
-namespace {
-
-QString widthKey(int pane, const QString &kind, qsizetype section)
-{
-    return QString("tree%1.%2.section%3").arg(pane).arg(kind).arg(section);
-}
-
-} // namespace
 
 QCustomTreeView::QCustomTreeView(QWidget *parent)
     : QTreeView(parent)
@@ -100,7 +90,7 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
         connect(model, &QAbstractItemModel::rowsInserted, &m_revealTimer, reveal);
         connect(model, &QAbstractItemModel::layoutChanged, &m_revealTimer, reveal);
         connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::folderLoaded);
-        applyColumnWidths();
+        m_columnWidths.apply(m_files->settingsName(), *header());
     }
 }
 
@@ -114,59 +104,24 @@ QString QCustomTreeView::currentPath() const
     return m_files ? m_files->pathOf(currentIndex()) : QString();
 }
 
-void QCustomTreeView::keepColumnWidths()
-{
-    if (!m_files) {
-        return;
-    }
-    QList<int> widths;
-    for (int section = 0; section < header()->count(); ++section) {
-        widths.append(header()->sectionSize(section));
-    }
-    m_columnWidths[m_files->settingsName()] = widths;
-}
-
-void QCustomTreeView::applyColumnWidths()
-{
-    QList<int> &widths = m_columnWidths[m_files->settingsName()];
-    if (widths.isEmpty()) {
-        widths = m_files->defaultColumnWidths();
-    }
-    for (int section = 0; section < widths.size() && section < header()->count(); ++section) {
-        header()->resizeSection(section, widths.at(section));
-    }
-}
-
 void QCustomTreeView::writeSettings(QSettings &settings, int pane)
 {
     keepColumnWidths();
-    for (auto kind = m_columnWidths.cbegin(); kind != m_columnWidths.cend(); ++kind) {
-        for (qsizetype section = 0; section < kind.value().size(); ++section) {
-            settings.setValue(widthKey(pane, kind.key(), section), kind.value().at(section));
-        }
-    }
+    m_columnWidths.write(settings, pane);
 }
 
 void QCustomTreeView::readSettings(const QSettings &settings, int pane)
 {
-    const QStringList kinds{"local"};
-    for (const QString &kind : kinds) {
-        QList<int> widths;
-        for (;;) {
-            bool isNumber = false;
-            const int width =
-                settings.value(widthKey(pane, kind, widths.size()), -1).toInt(&isNumber);
-            if (!isNumber || width < 0) {
-                break;
-            }
-            widths.append(width);
-        }
-        if (!widths.isEmpty()) {
-            m_columnWidths[kind] = widths;
-        }
-    }
+    m_columnWidths.read(settings, pane);
     if (m_files) {
-        applyColumnWidths();
+        m_columnWidths.apply(m_files->settingsName(), *header());
+    }
+}
+
+void QCustomTreeView::keepColumnWidths()
+{
+    if (m_files) {
+        m_columnWidths.keep(m_files->settingsName(), *header());
     }
 }
 

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "ColumnWidths.h"
 #include "ModulesDb.h"
 
-#include <QMap>
 #include <QTimer>
 #include <QTreeView>
 
@@ -98,7 +98,6 @@ private:
     void addOperation(const QString &text, const QString &picture, const QKeySequence &key,
                       void (QCustomTreeView::*slot)());
     void keepColumnWidths();
-    void applyColumnWidths();
     void revealCurrent();
     void startFirstTool();
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
@@ -110,7 +109,7 @@ private:
     QMenu *m_contextMenu;
     QMenu *m_copyMenu;
     QList<ModulesDb::ToolAction> m_toolActions;
-    QMap<QString, QList<int>> m_columnWidths; ///< by PaneFiles::settingsName()
+    ColumnWidths m_columnWidths;
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
     QString m_dropSource;
