@@ -3,6 +3,7 @@
 
 #include "Resample.h"
 #include "base/ProgressClock.h"
+#include "dotkernels.h"
 #include "log/Tracer.h"
 #include "samplestream.h"
 #include "signalgenerators.h"
@@ -10,6 +11,7 @@
 #include "wvfile/TempStream.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstddef>
 #include <cstdlib>
@@ -26,29 +28,43 @@ constexpr int MinStreamSamples = 512;
     return false;
 }
 
-CORVANE_VECTOR_CLONES void packSamples(std::span<const double> inPhase,
-                                       std::span<const double> quadrature, float *iq,
-                                       double *squares)
+/// Converts to the records of a stream and takes the level, sample by sample: the order of a sum is
+/// a part of its result.
+CORVANE_VECTOR_CLONES void packSamples(const double *inPhase, const double *quadrature,
+                                       std::size_t count, float *iq, SquareLevel &level)
 {
-    for (std::size_t i = 0; i < inPhase.size(); ++i) {
-        squares[i] = inPhase[i] * inPhase[i] + quadrature[i] * quadrature[i];
-        iq[2 * i] = static_cast<float>(inPhase[i]);
-        iq[2 * i + 1] = static_cast<float>(quadrature[i]);
+    constexpr std::size_t Lanes = 8;
+    double highest = level.highest;
+    double sum = level.sum;
+    for (std::size_t first = 0; first < count; first += Lanes) {
+        const std::size_t used = std::min(Lanes, count - first);
+        std::array<double, Lanes> squares;
+        for (std::size_t i = 0; i < Lanes; ++i) {
+            const double re = inPhase[first + i];
+            const double im = quadrature[first + i];
+            squares[i] = re * re + im * im;
+            iq[2 * (first + i)] = static_cast<float>(re);
+            iq[2 * (first + i) + 1] = static_cast<float>(im);
+        }
+        for (std::size_t i = 0; i < used; ++i) {
+            highest = std::max(highest, squares[i]);
+            sum += squares[i];
+        }
     }
+    level = {highest, sum};
 }
 
 } // namespace
 
-/// The arrays of one run, and the statistics of what was written.
+/// The arrays of one run; whole vectors of samples fit, so the last ones may be too many.
 class CreateSignal::Writer
 {
 public:
     Writer(CreateSignal &owner, SignalGenerator &generator)
         : m_owner(owner)
         , m_generator(generator)
-        , m_inPhase(static_cast<std::size_t>(std::min(owner.m_fit.samples, StreamBlockSamples)))
+        , m_inPhase(static_cast<std::size_t>(generator.blockSize()))
         , m_quadrature(m_inPhase.size())
-        , m_squares(m_inPhase.size())
         , m_packed(2 * m_inPhase.size())
     {
     }
@@ -59,12 +75,10 @@ public:
         const std::span<double> inPhase = std::span(m_inPhase).first(used);
         const std::span<double> quadrature = std::span(m_quadrature).first(used);
         m_generator.fill(first, inPhase, quadrature);
-        packSamples(inPhase, quadrature, m_packed.data(), m_squares.data());
-        // Sample by sample, since the order of a sum is a part of its result.
-        for (const double square : std::span(m_squares).first(used)) {
-            m_owner.m_peak = std::max(m_owner.m_peak, square);
-            m_owner.m_rms += square;
-        }
+        SquareLevel level{m_owner.m_peak, m_owner.m_rms};
+        packSamples(m_inPhase.data(), m_quadrature.data(), used, m_packed.data(), level);
+        m_owner.m_peak = level.highest;
+        m_owner.m_rms = level.sum;
         m_owner.m_samplesWritten += count;
         return writeSamples(*m_owner.m_output, std::span(m_packed).first(2 * used)) ||
                fail("*** Cannot write to output file.");
@@ -75,7 +89,6 @@ private:
     SignalGenerator &m_generator;
     std::vector<double> m_inPhase;
     std::vector<double> m_quadrature;
-    std::vector<double> m_squares;
     std::vector<float> m_packed;
 };
 
@@ -254,7 +267,7 @@ bool CreateSignal::writeSignal(SignalGenerator &generator)
     Writer writer(*this, generator);
     for (int pass = 0; pass < passes; ++pass) {
         for (int first = 0; first < samples;) {
-            const int count = std::min(samples - first, StreamBlockSamples);
+            const int count = std::min(samples - first, generator.blockSize());
             const double done = static_cast<double>(pass) * MinStreamSamples + first;
             if (clock.shouldStop(static_cast<int>(done * 100.0 / total)) || m_cancelled) {
                 return fail("*** User break.");

@@ -36,12 +36,22 @@ struct CarrierSum
     [[nodiscard]] double angleOf(int index) const { return turn * index / clock; }
 
     /// One sample as defined, carrier by carrier.
-    [[nodiscard]] double directSample(int index) const
+    [[nodiscard]] double directSample(double x) const
     {
-        const double x = angleOf(index);
+        PartArray angles;
+        PartArray values;
         double sum = 0;
-        for (int k = 1; k <= carriers; ++k) {
-            sum += std::sin(k * x + phases[static_cast<std::size_t>(k % PhaseCount)]) + offset;
+        for (int first = 1; first <= carriers; first += static_cast<int>(PartSize)) {
+            const auto count = static_cast<std::size_t>(
+                std::min(carriers - first + 1, static_cast<int>(PartSize)));
+            for (std::size_t i = 0; i < count; ++i) {
+                const int k = first + static_cast<int>(i);
+                angles[i] = k * x + phases[static_cast<std::size_t>(k % PhaseCount)];
+            }
+            sines(std::span(angles).first(count), values);
+            for (std::size_t i = 0; i < count; ++i) {
+                sum += values[i] + offset;
+            }
         }
         return sum / carriers;
     }
@@ -126,6 +136,9 @@ public:
         sinCos(m_sum.phases, m_sum.phaseSines, m_sum.phaseCosines);
     }
 
+    /// Enough work for all processors.
+    [[nodiscard]] int blockSize() const override { return 32768; }
+
     void fill(int first, std::span<double> inPhase, std::span<double> quadrature) override
     {
         std::fill(quadrature.begin(), quadrature.end(), 0.0);
@@ -165,14 +178,14 @@ private:
             combineRows(rows, one, all, row, rest, result);
         }
         for (std::size_t i = 0; i < values.size(); ++i) {
-            values[i] = settled(result[i], angles[i], first + static_cast<int>(i));
+            values[i] = settled(result[i], angles[i]);
         }
     }
 
     /// The carrier-by-carrier sum has roundings of its own, most of all those of its angles. Where
     /// they could change the stored float, the sample is computed that way; with very many carriers
     /// that would take hours.
-    [[nodiscard]] double settled(double sum, double angle, int index) const
+    [[nodiscard]] double settled(double sum, double angle) const
     {
         constexpr int MaxDirectCarriers = 16384;
         const double value = (sum + m_sum.carriers * m_sum.offset) / m_sum.carriers;
@@ -180,14 +193,14 @@ private:
             return value;
         }
         // The roundings of n angles up to n x are independent of each other: their mean has a
-        // spread of about a third of sqrt(n) x units of rounding.
+        // standard deviation of a third of sqrt(n) x units of rounding. Six of them are taken.
         constexpr double Unit = 0x1p-53;
-        const double spread = 4 * std::sqrt(m_sum.carriers) * angle * Unit;
-        const double margin = spread + 128 * Unit * (1 + std::abs(m_sum.offset));
+        const double spread = 2 * std::sqrt(m_sum.carriers) * angle * Unit;
+        const double margin = spread + 32 * Unit * (1 + std::abs(m_sum.offset));
         if (static_cast<float>(value - margin) == static_cast<float>(value + margin)) {
             return value;
         }
-        return m_sum.directSample(index);
+        return m_sum.directSample(angle);
     }
 
     CarrierSum m_sum;

@@ -6,7 +6,6 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
-#include <string>
 #include <vector>
 
 namespace {
@@ -181,11 +180,11 @@ public:
         , m_pattern(record.pattern)
         , m_transition(samplesOf(record.transitionTime, fit.clock))
         , m_symbol(static_cast<double>(m_shape.on + m_transition) /
-                   static_cast<double>(std::max<std::size_t>(m_pattern.size(), 1)))
+                   static_cast<double>(std::max<qsizetype>(m_pattern.size(), 1)))
     {
     }
 
-    [[nodiscard]] bool isValid() const { return !m_pattern.empty() && m_symbol > 0; }
+    [[nodiscard]] bool isValid() const { return !m_pattern.isEmpty() && m_symbol > 0; }
 
     void fill(int first, std::span<double> inPhase, std::span<double> quadrature) override
     {
@@ -205,7 +204,7 @@ public:
 private:
     [[nodiscard]] double levelOf(int symbol) const
     {
-        return m_pattern[static_cast<std::size_t>(symbol)] == '1' ? 1.0 : -1.0;
+        return m_pattern.at(symbol) == '1' ? 1.0 : -1.0;
     }
 
     [[nodiscard]] double valueAt(int index) const
@@ -231,7 +230,7 @@ private:
     }
 
     PulseShape m_shape;
-    std::string m_pattern;
+    QByteArray m_pattern;
     int m_transition; ///< samples
     double m_symbol;  ///< samples
     double m_last = 0.0;

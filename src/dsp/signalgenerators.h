@@ -19,6 +19,10 @@ public:
     SignalGenerator(const SignalGenerator &) = delete;
     SignalGenerator &operator=(const SignalGenerator &) = delete;
 
+    /// Samples that are best computed in one call, a multiple of 8. The default leaves all arrays
+    /// in the first cache.
+    [[nodiscard]] virtual int blockSize() const { return 1024; }
+
     /// Computes the samples from index `first` on, as many as the spans hold. Calls follow each
     /// other without gaps; index 0 starts over.
     virtual void fill(int first, std::span<double> inPhase, std::span<double> quadrature) = 0;

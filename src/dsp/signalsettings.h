@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <string>
+#include <QByteArray>
 
 // What a user chooses for a signal. Frequencies and bandwidths are in Hz, times in seconds, phases
 // in degrees, levels linear with full scale 1. The kinds keep their numbers: dialogs store them.
@@ -65,7 +65,7 @@ struct PulseRecord
 {
     PulseKind kind = PulseKind::Single;
     PulseSettings pulse;
-    std::string pattern;         ///< symbols of a coded pulse, "1" for the positive level
+    QByteArray pattern;          ///< symbols of a coded pulse, "1" for the positive level
     double transitionTime = 0.0; ///< between symbols
     double chirpRange = 1e7;
     double pause = 5e-5; ///< between the two pulses
