@@ -10,6 +10,8 @@
 namespace simulator {
 namespace {
 
+constexpr std::size_t FirstSerial = 100001;
+
 std::string_view trimmed(std::string_view text)
 {
     constexpr std::string_view White = " \t\r";
@@ -146,6 +148,9 @@ instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, s
             error = raw.label + "needs either an address, or a gateway and gpib";
             return std::nullopt;
         }
+        // Two of one model are told apart by their serial numbers.
+        if (!raw.serial)
+            raw.serial = std::to_string(FirstSerial + places.size());
         // A name that stands in a file is meant from that file's place on.
         if (raw.root && !raw.root->empty())
             raw.root = (std::filesystem::path(folder) / *raw.root).string();

@@ -12,7 +12,7 @@ namespace simulator {
 namespace {
 
 // Controllers send files in pieces of a kilobyte or so; the disk gets bigger ones.
-constexpr std::size_t BufferSize = 256 * 1024;
+constexpr std::size_t BufferSize = 262'144;
 
 } // namespace
 

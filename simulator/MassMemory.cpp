@@ -120,7 +120,7 @@ int openRegular(int folder, const std::string &name, int flags, UniqueFd &fd)
 
 } // namespace
 
-MassMemory::MassMemory(bool unixPaths, std::vector<std::string> roots)
+MassMemory::MassMemory(bool unixPaths, const std::vector<std::string> &roots)
     : m_unixPaths(unixPaths)
 {
     for (const std::string &root : roots) {
@@ -415,7 +415,7 @@ int MassMemory::move(std::string_view from, std::string_view to)
 
 int MassMemory::copy(std::string_view from, std::string_view to)
 {
-    constexpr std::size_t PieceSize = 256 * 1024;
+    constexpr std::size_t PieceSize = 262'144;
     UniqueFd source;
     std::uint64_t size = 0;
     if (const int error = openForReading(from, source, size); error != NoError)

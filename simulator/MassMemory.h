@@ -36,7 +36,7 @@ public:
 
     /// `unixPaths`: paths begin at "/"; otherwise at one of the drives in `roots`. An instrument
     /// without roots has no mass memory: each operation fails.
-    MassMemory(bool unixPaths, std::vector<std::string> roots);
+    MassMemory(bool unixPaths, const std::vector<std::string> &roots);
 
     /// Opens the folder that stands for the top of the file system and makes it and the roots in it
     /// where they are missing. False with the reason in `error`.

@@ -21,7 +21,7 @@ constexpr std::string_view DefaultAddress = "127.0.0.2";
 constexpr std::uint64_t MaxPort = 65535;
 constexpr std::uint64_t FirstFreePort = 1025;
 constexpr std::uint64_t MaxGpib = 30;
-constexpr std::size_t MaxConfigSize = 1024 * 1024;
+constexpr std::size_t MaxConfigSize = 1'048'576;
 
 std::optional<std::uint64_t> wholeNumber(std::string_view text)
 {
@@ -126,7 +126,7 @@ std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::st
     }
     for (const std::string &fault : raw.faults) {
         if (!setup.faults.set(fault, error)) {
-            error = raw.label + error;
+            error.insert(0, raw.label);
             return std::nullopt;
         }
     }

@@ -13,7 +13,7 @@
 namespace simulator {
 namespace {
 
-constexpr std::size_t BufferSize = 256 * 1024;
+constexpr std::size_t BufferSize = 262'144;
 
 // Sends all answers, each as soon as it may leave; false when the connection ended.
 bool sendAnswers(Instrument &instrument, Link &link, int fd, std::vector<char> &buffer)

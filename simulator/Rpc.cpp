@@ -26,7 +26,7 @@ constexpr std::uint32_t NullProcedure = 0;
 constexpr std::size_t MaxCredentialSize = 400;
 
 constexpr int RecordTimeoutMilliseconds = 30'000;
-constexpr std::size_t ReceiveSize = 64 * 1024;
+constexpr std::size_t ReceiveSize = 65'536;
 
 void beginReply(XdrWriter &reply, std::uint32_t transaction)
 {

@@ -43,7 +43,7 @@ class Vxi11Server
 {
 public:
     /// The most data that a device_write may carry.
-    static constexpr std::uint32_t MaxReceiveSize = 1024 * 1024;
+    static constexpr std::uint32_t MaxReceiveSize = 1'048'576;
 
     /// Opens both channels; `corePort` may be 0, and the abort channel's port is always the
     /// system's choice. False with the reason in `error`.

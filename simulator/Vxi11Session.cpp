@@ -40,7 +40,7 @@ constexpr std::uint32_t TermCharSeen = 2;
 constexpr std::uint32_t EndSeen = 4;
 
 // What one device_read returns at most; the controller asks again for the rest.
-constexpr std::uint32_t MaxReadSize = 1024 * 1024;
+constexpr std::uint32_t MaxReadSize = 1'048'576;
 
 void putError(XdrWriter &results, Vxi11Error error)
 {

@@ -156,8 +156,10 @@ QModelIndex RemoteDirModel::index(int row, int column, const QModelIndex &parent
         return {};
     }
     if (canFetchMore(parent)) {
-        const QScopedValueRollback guard(m_isInIndex, true);
-        m_reader.read(entry);
+        // A view looks into a folder by asking for what is in it.
+        auto *self = const_cast<RemoteDirModel *>(this);
+        const QScopedValueRollback guard(self->m_isInIndex, true);
+        self->look(entry);
     }
     return row < entry->children().size() ? createIndex(row, column, entry->children().at(row))
                                           : QModelIndex();
@@ -192,7 +194,16 @@ bool RemoteDirModel::canFetchMore(const QModelIndex &parent) const
 void RemoteDirModel::fetchMore(const QModelIndex &parent)
 {
     if (canFetchMore(parent)) {
-        m_reader.read(entryOf(parent));
+        look(entryOf(parent));
+    }
+}
+
+void RemoteDirModel::look(RemoteEntry *entry)
+{
+    if (m_isChanging) {
+        postpone(entry);
+    } else {
+        m_reader.read(entry);
     }
 }
 
@@ -301,6 +312,7 @@ void RemoteDirModel::sort(int column, Qt::SortOrder order)
 {
     m_sortColumn = column;
     m_sortOrder = order;
+    const QScopedValueRollback guard(m_isChanging, true);
     emit layoutAboutToBeChanged({}, QAbstractItemModel::VerticalSortHint);
     const QModelIndexList before = persistentIndexList();
     if (column >= 0) {
@@ -321,12 +333,11 @@ void RemoteDirModel::sort(int column, Qt::SortOrder order)
 void RemoteDirModel::refresh(const QModelIndex &index)
 {
     if (!index.isValid()) {
-        const QScopedValueRollback guard(m_isResetting, true);
+        const QScopedValueRollback guard(m_isChanging, true);
         beginResetModel();
         m_roots.clear();
-        m_emptyFolders.clear();
+        m_postponed.clear();
         m_reader.refresh();
-        m_roots = m_reader.roots();
         endResetModel();
         return;
     }
@@ -358,13 +369,8 @@ void RemoteDirModel::slotCollapsed(const QModelIndex &index)
 void RemoteDirModel::slotReadingDone(RemoteEntry *entry)
 {
     if (entry == nullptr) {
-        // refresh() itself tells the views.
-        if (!m_isResetting) {
-            beginResetModel();
-            m_roots = m_reader.roots();
-            m_emptyFolders.clear();
-            endResetModel();
-        }
+        // The views are told by refresh(), which alone makes the reader do this.
+        m_roots = m_reader.roots();
         return;
     }
     const QModelIndex folder = indexOf(entry);
@@ -372,14 +378,14 @@ void RemoteDirModel::slotReadingDone(RemoteEntry *entry)
     const QList<RemoteEntry *> found = sorted(entry->staged());
     // The new ones come before the old ones go, so that an expanded folder is never empty between.
     if (!found.isEmpty()) {
+        const QScopedValueRollback guard(m_isChanging, true);
         beginInsertRows(folder, static_cast<int>(oldCount),
                         static_cast<int>(oldCount + found.size()) - 1);
         entry->publishStaged(found);
         endInsertRows();
     } else if (m_isInIndex) {
         // Whoever looks into the folder has counted the placeholder and asks for its index.
-        m_emptyFolders.append(entry);
-        QMetaObject::invokeMethod(this, &RemoteDirModel::removePlaceholders, Qt::QueuedConnection);
+        postpone(entry);
         return;
     }
     removeFirstChildren(entry, oldCount);
@@ -391,6 +397,7 @@ void RemoteDirModel::removeFirstChildren(RemoteEntry *entry, qsizetype count)
     if (count == 0) {
         return;
     }
+    const QScopedValueRollback guard(m_isChanging, true);
     beginRemoveRows(indexOf(entry), 0, static_cast<int>(count) - 1);
     const QList<RemoteEntry *> gone = entry->takeFirstChildren(count);
     endRemoveRows();
@@ -400,7 +407,7 @@ void RemoteDirModel::removeFirstChildren(RemoteEntry *entry, qsizetype count)
 
 void RemoteDirModel::forget(const QList<RemoteEntry *> &entries)
 {
-    m_emptyFolders.removeIf([&entries](RemoteEntry *folder) {
+    m_postponed.removeIf([&entries](RemoteEntry *folder) {
         RemoteEntry *entry = folder;
         while (entry != nullptr && !entries.contains(entry)) {
             entry = entry->parent();
@@ -409,13 +416,29 @@ void RemoteDirModel::forget(const QList<RemoteEntry *> &entries)
     });
 }
 
-void RemoteDirModel::removePlaceholders()
+void RemoteDirModel::postpone(RemoteEntry *entry)
 {
-    const QList<RemoteEntry *> folders = std::exchange(m_emptyFolders, {});
-    for (RemoteEntry *folder : folders) {
-        if (!folder->children().isEmpty() && folder->children().first()->isPlaceholder()) {
+    if (m_postponed.isEmpty()) {
+        QMetaObject::invokeMethod(this, &RemoteDirModel::servePostponed, Qt::QueuedConnection);
+    }
+    if (!m_postponed.contains(entry)) {
+        m_postponed.append(entry);
+    }
+}
+
+void RemoteDirModel::servePostponed()
+{
+    // Serving one may bring more, and make others vanish.
+    for (qsizetype count = m_postponed.size(); count > 0 && !m_postponed.isEmpty(); --count) {
+        RemoteEntry *folder = m_postponed.takeFirst();
+        if (!folder->isRead()) {
+            m_reader.read(folder);
+        } else if (!folder->children().isEmpty() && folder->children().first()->isPlaceholder()) {
             removeFirstChildren(folder, 1);
         }
+    }
+    if (!m_postponed.isEmpty()) {
+        QMetaObject::invokeMethod(this, &RemoteDirModel::servePostponed, Qt::QueuedConnection);
     }
 }
 

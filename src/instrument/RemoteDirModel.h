@@ -13,8 +13,10 @@
 /// read when it is first looked into. Without a device, or one without a file system, the model
 /// has one row that says so.
 ///
-/// A read blocks for the length of one query. A folder that could not be read says so until it is
-/// refreshed.
+/// A read blocks for the length of one query and has changed the model when the call that asked for
+/// it returns; only a look from within a slot of one of the model's own signals is answered with
+/// "Reading..." and served when the event loop comes round. A folder that could not be read says so
+/// until it is refreshed.
 class RemoteDirModel : public QAbstractItemModel
 {
     Q_OBJECT
@@ -90,17 +92,20 @@ private:
     [[nodiscard]] QList<RemoteEntry *> sorted(const QList<RemoteEntry *> &entries) const;
     void sortChildren(RemoteEntry *entry);
     void removeFirstChildren(RemoteEntry *entry, qsizetype count);
-    void removePlaceholders();
+    void look(RemoteEntry *entry);
+    void postpone(RemoteEntry *entry);
+    void servePostponed();
     void forget(const QList<RemoteEntry *> &entries);
-    RemoteEntry *walk(const QString &path, const std::function<void(RemoteEntry *)> &visit) const;
+    [[nodiscard]] RemoteEntry *walk(const QString &path,
+                                    const std::function<void(RemoteEntry *)> &visit) const;
 
-    mutable instrIO m_reader; // read from index(), as views look into folders through it
+    instrIO m_reader;
     QList<RemoteEntry *> m_roots;
     QStringList m_nameFilters{"*.*"};
     IconProvider m_iconProvider;
     int m_sortColumn = -1; ///< -1: in the order of the catalogue
     Qt::SortOrder m_sortOrder = Qt::AscendingOrder;
-    bool m_isResetting = false;
-    mutable bool m_isInIndex = false;
-    QList<RemoteEntry *> m_emptyFolders; ///< read by index(), still with their placeholder
+    bool m_isChanging = false;        ///< between the signals before and after a change
+    bool m_isInIndex = false;         ///< a read was asked for by index()
+    QList<RemoteEntry *> m_postponed; ///< folders to be read, or to lose their placeholder
 };

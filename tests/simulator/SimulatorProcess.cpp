@@ -34,7 +34,10 @@ bool SimulatorProcess::start(const QStringList &arguments, int instrumentCount)
     }
     if (m_ready.size() == instrumentCount)
         return true;
-    m_process.waitForFinished(StartMilliseconds);
+    if (m_process.error() == QProcess::FailedToStart)
+        m_errorOutput = m_process.program() + ": " + m_process.errorString();
+    else
+        m_process.waitForFinished(StartMilliseconds);
     m_errorOutput += QString::fromUtf8(m_process.readAllStandardError());
     return false;
 }

@@ -113,6 +113,7 @@ void tst_SimulatorOptions::config()
     const InstrumentPlace &analyzer = options->instruments[1];
     QCOMPARE(analyzer.gateway.value_or(1), 0);
     QCOMPARE(analyzer.gpib, 20U);
+    QCOMPARE(analyzer.instrument.serial, "100002"); // by its place
 }
 
 void tst_SimulatorOptions::wrongConfig_data()

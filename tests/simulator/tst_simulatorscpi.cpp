@@ -423,10 +423,10 @@ void tst_SimulatorScpi::capture()
     QCOMPARE(errors(*m_client), "");
 
     double squares = 0;
-    for (int i = 0; i < Samples; ++i) {
+    for (qsizetype i = 0; i < Samples; ++i) {
         float values[2];
         std::memcpy(values, answer.constData() + 7 + 8 * i, sizeof(values));
-        const double step = 2 * std::numbers::pi * i;
+        const double step = 2 * std::numbers::pi * static_cast<double>(i);
         const double errorI =
             values[0] - 0.5 * std::cos(step / 16) - 0.05 * std::cos(step * 3 / 32);
         const double errorQ =

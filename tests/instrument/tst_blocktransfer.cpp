@@ -1,0 +1,557 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "FakeInstrument.h"
+#include "LogRecorder.h"
+
+#include "instrument/BlockWriter.h"
+#include "instrument/VisaDevice.h"
+#include "instrument/fetchfile.h"
+#include "wvfile/TempStream.h"
+
+#include <QElapsedTimer>
+#include <QFile>
+#include <QSignalSpy>
+#include <QTemporaryDir>
+#include <QTest>
+
+namespace {
+
+const QString remoteName = "/var/user/a.wv";
+const QString timeoutReport = "4 ERROR: status BFFF0015";
+
+struct Fault
+{
+    QString call;
+    qint32 status = 0;
+    int skipped = 0;
+};
+
+QByteArray content(const QString &fileName)
+{
+    QFile file(fileName);
+    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
+}
+
+bool store(const QString &fileName, const QByteArray &bytes)
+{
+    QFile file(fileName);
+    return file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size();
+}
+
+} // namespace
+
+Q_DECLARE_METATYPE(Fault)
+
+class TestBlockTransfer : public QObject
+{
+    Q_OBJECT
+private slots:
+    void init();
+    void cleanup();
+    void readFile_data();
+    void readFile();
+    void readFileOfManyBlocks();
+    void readFileRefuses();
+    void fetchKeepsOldFile();
+    void writeHeader();
+    void writeFile_data();
+    void writeFile();
+    void writeFileFails_data();
+    void writeFileFails();
+    void writeFileReplaces();
+    void writeFileOverGpib();
+    void writeFileRefuses();
+    void cancel_data();
+    void cancel();
+    void readStream_data();
+    void readStream();
+
+private:
+    QString local(const QString &name = "local") const { return m_folder.filePath(name); }
+
+    QTemporaryDir m_folder;
+    std::unique_ptr<FakeInstrument> m_fake;
+    std::unique_ptr<VisaDevice> m_device;
+};
+
+void TestBlockTransfer::cleanup()
+{
+    m_fake.reset();
+    m_device.reset();
+}
+
+void TestBlockTransfer::init()
+{
+    m_fake = std::make_unique<FakeInstrument>();
+    m_device = std::make_unique<VisaDevice>();
+    QVERIFY(m_device->openResource("GPIB0::28::INSTR"));
+    QFile::remove(local());
+    (void)m_fake->takeCalls();
+    (void)m_fake->takeMessages();
+    (void)takeLog();
+}
+
+void TestBlockTransfer::readFile_data()
+{
+    QTest::addColumn<QByteArray>("answer");
+    QTest::addColumn<Fault>("fault");
+    QTest::addColumn<QList<int>>("limits");
+    QTest::addColumn<bool>("done");
+    QTest::addColumn<QByteArray>("file");
+    QTest::addColumn<QStringList>("words");
+    const QByteArray good = "#15he\nlo\n";
+    const Fault none;
+    const qint32 timeout = VI_ERROR_TMO;
+    const QString received = "4 viRead(): Received %1 bytes but expected 5 bytes.";
+    QTest::newRow("good") << good << none << QList<int>{} << true << QByteArray("he\nlo")
+                          << QStringList{};
+    QTest::newRow("termination character")
+        << good << Fault{"viRead 5", VI_SUCCESS_TERM_CHAR, 0} << QList<int>{} << true
+        << QByteArray("he\nlo") << QStringList{};
+    QTest::newRow("no terminator")
+        << QByteArray("#15hello") << none << QList<int>{} << true << QByteArray("hello")
+        << QStringList{"4 No terminating character received.", timeoutReport};
+    QTest::newRow("no answer") << QByteArray() << none << QList<int>{} << false << QByteArray()
+                               << QStringList{"4 Reading start character failed.", timeoutReport};
+    QTest::newRow("odd status at start")
+        << good << Fault{"viRead 2", 1, 0} << QList<int>{} << false << QByteArray()
+        << QStringList{"4 Reading start character failed.", "4 ERROR: status 1"};
+    const QString noBlock =
+        "4 Invalid or no character received from instrument. Expected character was '#'.";
+    QTest::newRow("text") << QByteArray("hello\n") << none << QList<int>{} << false << QByteArray()
+                          << QStringList{noBlock, "4 ERROR: status 3FFF0006"};
+    QTest::newRow("no digit") << QByteArray("#(5)hello\n") << none << QList<int>{} << false
+                              << QByteArray() << QStringList{noBlock, "4 ERROR: status 3FFF0006"};
+    QTest::newRow("one character") << QByteArray("#") << none << QList<int>{} << false
+                                   << QByteArray() << QStringList{noBlock, "4 ERROR: status 0"};
+    QTest::newRow("length not read")
+        << good << Fault{"viRead 1", timeout, 0} << QList<int>{} << false << QByteArray()
+        << QStringList{"4 Reading length information failed.", timeoutReport};
+    QTest::newRow("length cut") << QByteArray("#512") << none << QList<int>{} << false
+                                << QByteArray()
+                                << QStringList{"4 Invalid length data received from instrument."};
+    const QString badLength = "4 Invalid length information received from instrument.";
+    QTest::newRow("#0") << QByteArray("#0\n") << none << QList<int>{} << false << QByteArray()
+                        << QStringList{badLength};
+    QTest::newRow("length 0") << QByteArray("#10\n") << none << QList<int>{} << false
+                              << QByteArray() << QStringList{badLength};
+    QTest::newRow("length no number") << QByteArray("#2x5hello\n") << none << QList<int>{} << false
+                                      << QByteArray() << QStringList{badLength};
+    QTest::newRow("negative length") << QByteArray("#2-5hello\n") << none << QList<int>{} << false
+                                     << QByteArray() << QStringList{badLength};
+    QTest::newRow("data not read")
+        << good << Fault{"viRead 5", timeout, 0} << QList<int>{} << false << QByteArray()
+        << QStringList{"4 Reading binary data block failed.", "4 0 bytes already received.",
+                       "4 5 bytes remaining.", timeoutReport};
+    QTest::newRow("three short reads") << good << none << QList<int>{-1, -1, 1, 1, 1} << true
+                                       << QByteArray("he\nlo") << QStringList{};
+    QTest::newRow("four short reads")
+        << good << none << QList<int>{-1, -1, 1, 1, 1, 1} << false << QByteArray("he\n")
+        << QStringList{"4 viRead(): Binary data transfer incomplete.", received.arg(3),
+                       "4 1 bytes received.", "4 ERROR: status 0"};
+    QTest::newRow("nothing comes, no error")
+        << good << none << QList<int>{-1, -1, 0, 0, 0, 0} << false << QByteArray()
+        << QStringList{"4 viRead(): Binary data transfer incomplete.", received.arg(0),
+                       "4 0 bytes received.", "4 ERROR: status 0"};
+    QTest::newRow("short block") << QByteArray("#15he") << none << QList<int>{} << false
+                                 << QByteArray("he")
+                                 << QStringList{"4 Reading binary data block failed.",
+                                                "4 2 bytes already received.",
+                                                "4 3 bytes remaining.", timeoutReport};
+}
+
+void TestBlockTransfer::readFile()
+{
+    QFETCH(const QByteArray, answer);
+    QFETCH(const Fault, fault);
+    QFETCH(const QList<int>, limits);
+    QFETCH(const bool, done);
+    FakeInstrument &fake = *m_fake;
+    fake->answer = [&](const std::string &message) {
+        const bool isRequest = message == ":MMEM:DATA? '/var/user/a.wv'";
+        return isRequest ? answer.toStdString() : std::string();
+    };
+    if (!fault.call.isEmpty()) {
+        fake.failCall(fault.call, fault.status, fault.skipped);
+    }
+    fake->readLimits.assign(limits.begin(), limits.end());
+    QCOMPARE(m_device->readRemoteFile(remoteName, local()), done);
+    QTEST(takeLog(), "words");
+    QTEST(content(local()), "file");
+    const QStringList calls = fake.takeCalls();
+    QVERIFY(calls.contains("viSetAttribute 3FFF0038 0"));
+    // Whatever fails, the instrument's output is cleared.
+    QVERIFY(done || calls.contains("viClear"));
+}
+
+void TestBlockTransfer::readFileOfManyBlocks()
+{
+    QByteArray data(100'000, '\0');
+    for (qsizetype i = 0; i < data.size(); ++i) {
+        data[i] = static_cast<char>(i % 251);
+    }
+    FakeInstrument &fake = *m_fake;
+    fake->answer = [&](const std::string &message) {
+        return message.rfind(":MMEM:DATA?", 0) == 0 ? "#6100000" + data.toStdString() + '\n'
+                                                    : std::string();
+    };
+    QVERIFY(m_device->readRemoteFile(remoteName, local()));
+    QCOMPARE(content(local()), data);
+    const QStringList calls = fake.takeCalls().filter("viRead");
+    QCOMPARE(calls, (QStringList{"viRead 2", "viRead 6", "viRead 32768", "viRead 32768",
+                                 "viRead 32768", "viRead 1696", "viRead 1", "viRead 1023"}));
+    // An error that waits in the queue spoils it, though all bytes are there.
+    fake->errors = {"-310,\"System error\""};
+    QVERIFY(!m_device->readRemoteFile(remoteName, local()));
+    QCOMPARE(content(local()), data);
+    QCOMPARE(m_device->takeLastError(), "-310,\"System error\"\n");
+    // The last six bytes of what came tell where it broke.
+    fake->readLimits = {-1, -1, 10, 10, 10, 10};
+    (void)takeLog();
+    QVERIFY(!m_device->readRemoteFile(remoteName, local()));
+    QVERIFY(takeLog().contains("4 Last received data: 22 23 24 25 26 27 "));
+}
+
+void TestBlockTransfer::readFileRefuses()
+{
+    QVERIFY(!m_device->readRemoteFile(remoteName, ""));
+    QVERIFY(!m_device->readRemoteFile("", local()));
+    QVERIFY(!m_device->readRemoteFile(remoteName, local("no/such/folder")));
+    m_fake->failCall("viWrite", VI_ERROR_CONN_LOST);
+    QVERIFY(!m_device->readRemoteFile(remoteName, local()));
+    QCOMPARE(
+        takeLog(),
+        (QStringList{"4 Local file name cannot be empty.", "4 Remote file name cannot be empty.",
+                     "4 Cannot open local file for writing.", "4 ERROR: status BFFF00A6",
+                     "4 Cannot query file from instrument."}));
+    QVERIFY(store(local(), "old"));
+    m_device->closeResource();
+    QVERIFY(!m_device->readRemoteFile(remoteName, local()));
+    QCOMPARE(takeLog(), QStringList{"4 Device is not open."});
+    QCOMPARE(content(local()), "old");
+}
+
+void TestBlockTransfer::fetchKeepsOldFile()
+{
+    FakeInstrument &fake = *m_fake;
+    std::string answer = "#15he";
+    fake->answer = [&](const std::string &message) {
+        return message.rfind(":MMEM:DATA?", 0) == 0 ? answer : std::string();
+    };
+    QVERIFY(store(local(), "old"));
+    QVERIFY(!fetchRemoteFile(*m_device, remoteName, local()));
+    QCOMPARE(content(local()), "old");
+    QCOMPARE(QDir(m_folder.path()).entryList(QDir::Files), QStringList{"local"});
+    answer = "#15hello\n";
+    QFile::setPermissions(local(), QFile::ReadOwner | QFile::WriteOwner);
+    const QFile::Permissions permissions = QFile::permissions(local());
+    QVERIFY(QFile::link(local(), local("link")));
+    QVERIFY(fetchRemoteFile(*m_device, remoteName, local("link")));
+    QCOMPARE(content(local()), "hello");
+    QCOMPARE(QFile::permissions(local()), permissions);
+    QCOMPARE(QDir(m_folder.path()).entryList(QDir::Files), (QStringList{"link", "local"}));
+    QFile::remove(local("link"));
+}
+
+void TestBlockTransfer::writeHeader()
+{
+    QCOMPARE(BlockWriter::header("a", 7), ":MMEM:DATA 'a',#17");
+    QCOMPARE(BlockWriter::header("a", 10), ":MMEM:DATA 'a',#210");
+    QCOMPARE(BlockWriter::header("a", 999'999'999), ":MMEM:DATA 'a',#9999999999");
+    QCOMPARE(BlockWriter::header("a", 1'000'000'000), ":MMEM:DATA 'a',#(1000000000)");
+}
+
+void TestBlockTransfer::writeFile_data()
+{
+    QTest::addColumn<int>("size");
+    QTest::addColumn<QStringList>("dataCalls");
+    const QString endOn = "viSetAttribute 3FFF0016 1";
+    QTest::newRow("1") << 1 << QStringList{endOn, "viWrite 1 END"};
+    QTest::newRow("1024") << 1024 << QStringList{endOn, "viWrite 1024 END"};
+    QTest::newRow("1025") << 1025 << QStringList{"viWrite 1024", endOn, "viWrite 1 END"};
+    QTest::newRow("2048") << 2048 << QStringList{"viWrite 1024", endOn, "viWrite 1024 END"};
+}
+
+void TestBlockTransfer::writeFile()
+{
+    QFETCH(const int, size);
+    QFETCH(const QStringList, dataCalls);
+    FakeInstrument &fake = *m_fake;
+    // Line feeds are data like any other.
+    const QByteArray data = QByteArray("\n#*OPC?").repeated(size).left(size);
+    QVERIFY(store(local(), data));
+    fake->sendsEnd = true;
+    QSignalSpy progress(m_device.get(), &VisaDevice::ProgressUpdate);
+    QVERIFY(m_device->writeRemoteFile(local(), remoteName));
+    QCOMPARE(takeLog(), QStringList{});
+    const QString head = BlockWriter::header(remoteName, size);
+    QStringList expected{"viPrintf :MMEM:CAT? '/var/user/'",
+                         "viRead 32767",
+                         "viPrintf :SYST:ERR?",
+                         "viRead 1023",
+                         "viGetAttribute 3FFF0171",
+                         "viGetAttribute 3FFF0016",
+                         "viSetAttribute 3FFF0016 0",
+                         QString("viWrite %1").arg(head.size())};
+    expected += dataCalls;
+    expected += QStringList{"viSetAttribute 3FFF0016 1", "viPrintf :SYST:ERR?", "viRead 1023"};
+    QCOMPARE(fake.takeCalls(), expected);
+    QVERIFY(fake.takeMessages().contains(head + QString::fromLatin1(data)));
+    QCOMPARE(progress.first().first().toInt(), 0);
+    QCOMPARE(progress.last().first().toInt(), 100);
+}
+
+void TestBlockTransfer::writeFileFails_data()
+{
+    QTest::addColumn<Fault>("fault");
+    QTest::addColumn<bool>("breaksBlock"); // the instrument sits in the middle of a block
+    QTest::addColumn<bool>("deletes");
+    QTest::addColumn<QStringList>("words");
+    const QString lost = "4 ERROR: status BFFF00A6";
+    const qint32 status = VI_ERROR_CONN_LOST;
+    QTest::newRow("catalogue") << Fault{"viPrintf :MMEM:CAT?", status, 0} << false << false
+                               << QStringList{lost, "4 Cannot read files list from instrument."};
+    QTest::newRow("interface type")
+        << Fault{"viGetAttribute 3FFF0171", status, 0} << false << false << QStringList{lost};
+    QTest::newRow("old END") << Fault{"viGetAttribute 3FFF0016", status, 0} << false << false
+                             << QStringList{lost};
+    QTest::newRow("END off") << Fault{"viSetAttribute 3FFF0016 0", 1, 0} << false << false
+                             << QStringList{"4 ERROR: status 1"};
+    QTest::newRow("header") << Fault{"viWrite 34", status, 0} << true << false << QStringList{lost};
+    QTest::newRow("first block") << Fault{"viWrite 1024", status, 0} << true << true
+                                 << QStringList{lost};
+    QTest::newRow("second block with a remark")
+        << Fault{"viWrite 1024", VI_SUCCESS_MAX_CNT, 1} << true << true
+        << QStringList{"4 ERROR: status 3FFF0006"};
+    QTest::newRow("END on") << Fault{"viSetAttribute 3FFF0016 1", status, 0} << true << true
+                            << QStringList{lost};
+}
+
+void TestBlockTransfer::writeFileFails()
+{
+    QFETCH(const Fault, fault);
+    QFETCH(const bool, breaksBlock);
+    QFETCH(const bool, deletes);
+    FakeInstrument &fake = *m_fake;
+    QVERIFY(store(local(), QByteArray(3000, 'x')));
+    // The half-written file shows only in the list that is asked for to delete it.
+    fake->answer = [](const std::string &message) {
+        return message == ":MMEM:CAT? '/var/user/*.wv'" ? "1,2,\"a.wv,BIN,1024\"\n" : "";
+    };
+    // Fails once, so that the recovery can work.
+    int skipped = fault.skipped;
+    fake->status = [&](const std::string &call) {
+        const bool hit = skipped >= 0 && QString::fromStdString(call).startsWith(fault.call);
+        return hit && skipped-- == 0 ? fault.status : 0;
+    };
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QTEST(takeLog(), "words");
+    const QStringList calls = fake.takeCalls();
+    const QStringList messages = fake.takeMessages();
+    const auto blank = calls.indexOf("viWrite 1 END");
+    QCOMPARE(blank >= 0, breaksBlock);
+    QCOMPARE(messages.contains("*CLS"), breaksBlock);
+    QCOMPARE(messages.contains("MMEM:DEL '/var/user/a.wv'; *OPC?"), deletes);
+    if (breaksBlock) {
+        QCOMPARE(calls.value(blank - 1), "viSetAttribute 3FFF0016 1");
+        QCOMPARE(calls.value(blank + 1), "viClear");
+        QVERIFY(calls.lastIndexOf("viSetAttribute 3FFF0016 1") > blank);
+    }
+    // The session is of use again.
+    fake->status = nullptr;
+    QVERIFY(m_device->writeRemoteFile(local(), remoteName));
+}
+
+void TestBlockTransfer::writeFileReplaces()
+{
+    FakeInstrument &fake = *m_fake;
+    QVERIFY(store(local(), "x"));
+    fake->answer = [](const std::string &message) {
+        return message == ":MMEM:CAT? '/var/user/'"
+                   ? "1,2,\"a.wv,DIR,0\",\"A.wv,BIN,1\",\"a.wv,BIN,5\"\n"
+                   : "";
+    };
+    QVERIFY(m_device->writeRemoteFile(local(), remoteName));
+    QCOMPARE(fake.takeMessages().filter("DEL"), QStringList{":MMEM:DEL '/var/user/a.wv'; *OPC?"});
+    // Fewer bytes sent than told: nobody knows what the instrument has.
+    fake->lostCount = 1;
+    (void)takeLog();
+    fake->answer = nullptr;
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QVERIFY(takeLog().contains(
+        "4 The number of bytes to send disagrees with the number of bytes sent."));
+    fake->lostCount = 0;
+    // All moved, yet the instrument complains.
+    fake->answer = [&](const std::string &message) {
+        if (message.rfind(":MMEM:DATA '", 0) == 0) {
+            fake->errors = {"-310,\"System error\""};
+        }
+        return std::string();
+    };
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QCOMPARE(m_device->takeLastError(), "-310,\"System error\"\n");
+}
+
+void TestBlockTransfer::writeFileOverGpib()
+{
+    FakeInstrument &fake = *m_fake;
+    fake->interfaceType = VI_INTF_GPIB;
+    QVERIFY(store(local(), "x"));
+    QVERIFY(m_device->writeRemoteFile(local(), remoteName));
+    const QString eoi = ":SYST:COMM:GPIB:LTER EOI; *OPC?";
+    const QString standard = ":SYST:COMM:GPIB:LTER STAN; *OPC?";
+    QCOMPARE(fake.takeMessages(), (QStringList{":MMEM:CAT? '/var/user/'", eoi,
+                                               ":MMEM:DATA '/var/user/a.wv',#11x", standard}));
+    fake->answer = [](const std::string &message) {
+        return message.find("LTER EOI") != std::string::npos ? "0\n" : "";
+    };
+    (void)takeLog();
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QCOMPARE(takeLog().last(), "4 Cannot set instrument EOI mode.");
+    // A broken block ends with the standard mode as well.
+    fake->answer = nullptr;
+    fake.failCall("viWrite 1 END", VI_ERROR_CONN_LOST);
+    (void)fake.takeMessages();
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QVERIFY(fake.takeMessages().contains(standard));
+}
+
+void TestBlockTransfer::writeFileRefuses()
+{
+    QVERIFY(!m_device->writeRemoteFile("", remoteName));
+    QVERIFY(!m_device->writeRemoteFile(local(), ""));
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QFile big(local());
+    QVERIFY(big.open(QIODevice::WriteOnly) && big.resize(qint64{1} << 31));
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QVERIFY(store(local(), "x"));
+    QVERIFY(!m_device->writeRemoteFile(local(), QString::fromUtf8("/var/user/Ω.wv")));
+    const QStringList log = takeLog();
+    QCOMPARE(log.mid(0, 3),
+             (QStringList{"4 Local file name cannot be empty.",
+                          "4 Remote file name cannot be empty.", "4 Local file has zero size."}));
+    QVERIFY2(log.value(3).contains("2147483648") && log.value(3).contains("2147483647"),
+             qPrintable(log.value(3)));
+    QVERIFY(m_fake->takeMessages().isEmpty());
+}
+
+void TestBlockTransfer::cancel_data()
+{
+    QTest::addColumn<bool>("writes");
+    QTest::newRow("read") << false;
+    QTest::newRow("write") << true;
+}
+
+void TestBlockTransfer::cancel()
+{
+    QFETCH(const bool, writes);
+    FakeInstrument &fake = *m_fake;
+    QVERIFY(store(local(), QByteArray(200'000, 'x')));
+    // Slow enough for a tick of the progress before the last block.
+    QElapsedTimer timer;
+    bool isSlow = true;
+    fake->status = [&](const std::string &call) {
+        const bool isData = call == "viWrite 1024" || call == "viRead 32768";
+        timer.start();
+        while (isData && isSlow && !timer.hasExpired(110)) {
+        }
+        return 0;
+    };
+    fake->answer = [](const std::string &message) -> std::string {
+        if (message == ":MMEM:CAT? '/var/user/*.wv'") {
+            return "1,2,\"a.wv,BIN,1024\"\n";
+        }
+        return message.rfind(":MMEM:DATA?", 0) == 0 ? "#6100000" + std::string(100'000, 'x') + '\n'
+                                                    : std::string();
+    };
+    int updates = 0;
+    connect(m_device.get(), &VisaDevice::ProgressUpdate, this, [&](int) {
+        if (++updates == 2) {
+            m_device->cancel();
+        }
+    });
+    // A cancel from before the transfer is none of this one.
+    m_device->cancel();
+    const auto transfer = [&] {
+        return writes ? m_device->writeRemoteFile(local(), remoteName)
+                      : m_device->readRemoteFile(remoteName, local());
+    };
+    QVERIFY(!transfer());
+    QCOMPARE(updates, 2);
+    QVERIFY(takeLog(Tracer::Information).last() == "1 *** Transfer aborted by user.");
+    QVERIFY(fake.takeCalls().contains("viClear"));
+    const QStringList messages = fake.takeMessages();
+    QVERIFY(messages.contains("*CLS"));
+    QCOMPARE(messages.contains("MMEM:DEL '/var/user/a.wv'; *OPC?"), writes);
+    isSlow = false;
+    QVERIFY(transfer());
+}
+
+void TestBlockTransfer::readStream_data()
+{
+    QTest::addColumn<QByteArray>("answer");
+    QTest::addColumn<Fault>("fault");
+    QTest::addColumn<bool>("done");
+    QTest::addColumn<QByteArray>("data");
+    QTest::addColumn<QStringList>("words");
+    const QByteArray long16(4096, 'q');
+    const Fault none;
+    const QByteArray good = "#216ABCDEFGHIJKLMNOP\n";
+    const QByteArray all = "ABCDEFGHIJKLMNOP";
+    const qint32 timeout = VI_ERROR_TMO;
+    QTest::newRow("good") << good << none << true << all << QStringList{};
+    QTest::newRow("two blocks") << "#44096" + long16 + "\n"
+                                << none << true << long16 << QStringList{};
+    QTest::newRow("empty") << QByteArray("#0\n") << none << true << QByteArray() << QStringList{};
+    QTest::newRow("too long") << QByteArray("#44097") << none << false << QByteArray()
+                              << QStringList{"4 Data buffer too small."};
+    QTest::newRow("no answer") << QByteArray() << none << false << QByteArray()
+                               << QStringList{"4 Cannot read header length.", timeoutReport};
+    QTest::newRow("text") << QByteArray("x") << none << false << QByteArray()
+                          << QStringList{
+                                 "4 Invalid character in binary data header. Expected '#'."};
+    QTest::newRow("no digit") << QByteArray("#x") << none << false << QByteArray()
+                              << QStringList{"4 Cannot read header length.", "4 ERROR: status 0"};
+    QTest::newRow("no length") << QByteArray("#2") << none << false << QByteArray()
+                               << QStringList{"4 Cannot read binary data length information.",
+                                              timeoutReport};
+    QTest::newRow("attribute not read") << good << Fault{"viGetAttribute 3FFF0038", 1, 0} << false
+                                        << QByteArray() << QStringList{"4 ERROR: status 1"};
+    QTest::newRow("attribute not set") << good << Fault{"viSetAttribute 3FFF0038 0", 1, 0} << false
+                                       << QByteArray() << QStringList{"4 ERROR: status 1"};
+    QTest::newRow("attribute not restored") << good << Fault{"viSetAttribute 3FFF0038 1", 1, 0}
+                                            << false << all << QStringList{"4 ERROR: status 1"};
+    QTest::newRow("data not read") << good << Fault{"viRead 16", timeout, 0} << false
+                                   << QByteArray() << QStringList{"4 Reading failed."};
+    QTest::newRow("no terminator") << QByteArray("#13ABC") << none << false << QByteArray("ABC")
+                                   << QStringList{"4 Cannot read terminating character."};
+}
+
+void TestBlockTransfer::readStream()
+{
+    QFETCH(const QByteArray, answer);
+    QFETCH(const Fault, fault);
+    QFETCH(const bool, done);
+    QFETCH(const QByteArray, data);
+    FakeInstrument &fake = *m_fake;
+    fake->usesTerminator = true;
+    fake->output = answer.toStdString();
+    if (!fault.call.isEmpty()) {
+        fake.failCall(fault.call, fault.status, fault.skipped);
+    }
+    TempStream stream;
+    QVERIFY(stream.open());
+    QCOMPARE(m_device->readBinaryBlock(stream.stream(), 4096), done);
+    QTEST(takeLog(), "words");
+    if (done) {
+        QVERIFY(fake->usesTerminator);
+        QVERIFY(stream->checkHeader("IQF"));
+        QByteArray read(4096, '\0');
+        const int count = stream->readBlock(4096, read.data());
+        QCOMPARE(read.left(count), data);
+    }
+    QVERIFY(!m_device->readBinaryBlock(nullptr, 4096));
+    QCOMPARE(takeLog(), QStringList{"4 Invalid temporary data buffer."});
+}
+
+QTEST_GUILESS_MAIN(TestBlockTransfer)
+#include "tst_blocktransfer.moc"

@@ -1,0 +1,279 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "FakeInstrument.h"
+#include "LogRecorder.h"
+
+#include "instrument/VisaDevice.h"
+#include "visa/visa.h"
+
+#include <QSignalSpy>
+#include <QTest>
+
+#include <map>
+
+class TestRemoteFiles : public QObject
+{
+    Q_OBJECT
+private slots:
+    void init();
+    void cleanup();
+    void listDirectory();
+    void listDirectoryFails();
+    void listTree();
+    void endlessTree();
+    void commands_data();
+    void commands();
+    void deleteFile();
+    void deleteFileFails();
+    void removeTree();
+    void removeTreeFails_data();
+    void removeTreeFails();
+
+private:
+    void answerCatalogues(const std::map<std::string, std::string> &catalogues);
+
+    std::unique_ptr<FakeInstrument> m_fake;
+    std::unique_ptr<VisaDevice> m_device;
+};
+
+void TestRemoteFiles::cleanup()
+{
+    m_fake.reset();
+    m_device.reset();
+}
+
+void TestRemoteFiles::init()
+{
+    m_fake = std::make_unique<FakeInstrument>();
+    (*m_fake)->identity = "Halvorn,TGX-810,x/1/2,1.0"; // paths with the backslash
+    m_device = std::make_unique<VisaDevice>();
+    QVERIFY(m_device->openResource("GPIB0::28::INSTR"));
+    (void)m_fake->takeMessages();
+    (void)takeLog();
+}
+
+/// Answers by path; a path that isn't there gives an error as real instruments do.
+void TestRemoteFiles::answerCatalogues(const std::map<std::string, std::string> &catalogues)
+{
+    FakeVisa *fake = m_fake->operator->();
+    fake->answer = [fake, catalogues](const std::string &message) -> std::string {
+        const std::string command = ":MMEM:CAT? '";
+        if (message.rfind(command, 0) != 0) {
+            return {};
+        }
+        const std::string path =
+            message.substr(command.size(), message.size() - command.size() - 1);
+        const auto found = catalogues.find(path);
+        if (found == catalogues.end()) {
+            fake->errors = {"-256,\"File name not found\""};
+            return "\n";
+        }
+        return "10,20" + found->second + "\n";
+    };
+}
+
+void TestRemoteFiles::listDirectory()
+{
+    answerCatalogues({{"D:\\w", ",\"a.wv,BIN,5\",\"s,DIR,0\""}, {"D:\\empty", ""}});
+    QList<RemoteFileEntry> entries;
+    QVERIFY(m_device->listDirectory(entries, "D:\\w"));
+    QCOMPARE(entries.size(), 2);
+    QCOMPARE(entries.first().name, "a.wv");
+    QCOMPARE(entries.first().size, 5);
+    QVERIFY(entries.last().isDirectory());
+    QVERIFY(m_device->listDirectory(entries, "D:\\empty"));
+    QVERIFY(entries.isEmpty());
+}
+
+void TestRemoteFiles::listDirectoryFails()
+{
+    FakeInstrument &fake = *m_fake;
+    QList<RemoteFileEntry> entries{{}};
+    // A number that ends so stands for an empty folder.
+    fake->answer = [&, first = true](const std::string &message) mutable -> std::string {
+        if (message.rfind(":MMEM", 0) == 0 && std::exchange(first, false)) {
+            fake->errors = {"-150469,\"Directory empty\""};
+        }
+        return message.rfind(":MMEM", 0) == 0 ? "1,2,\"a,BIN,1\"\n" : "";
+    };
+    QVERIFY(m_device->listDirectory(entries, "D:\\w"));
+    QVERIFY(entries.isEmpty());
+    QCOMPARE(m_device->takeLastError(), QString());
+    QVERIFY(takeLog().isEmpty());
+    // One from long ago doesn't make a failure of today an empty folder.
+    fake->errors = {"-150469,\"Directory empty\""};
+    QVERIFY(!m_device->checkErrorQueue());
+    fake.failCall("viPrintf :MMEM:CAT?", VI_ERROR_CONN_LOST);
+    QVERIFY(!m_device->listDirectory(entries, "D:\\w"));
+    QCOMPARE(takeLog().last(), "4 Cannot read files list from instrument.");
+    fake->status = nullptr;
+    answerCatalogues({});
+    (void)m_device->takeLastError();
+    QVERIFY(!m_device->listDirectory(entries, "D:\\w"));
+    // The caller can show what the instrument said.
+    QCOMPARE(m_device->takeLastError(), "-256,\"File name not found\"\n");
+}
+
+void TestRemoteFiles::listTree()
+{
+    answerCatalogues({{"D:\\w", ",\".,DIR,0\",\"..,DIR,0\",\"a,BIN,5\",\"s,DIR,0\",\"b,BIN,7\""},
+                      {"D:\\w/s", ",\"c,BIN,3000000000\",\"t,DIR,0\""},
+                      {"D:\\w/s/t", ",\"d,ASC,1\""}});
+    QStringList files{"old"};
+    qint64 size = 1;
+    QVERIFY(m_device->listTree(files, size, "D:\\w"));
+    QCOMPARE(files, (QStringList{"D:\\w/a", "D:\\w/s/c", "D:\\w/s/t/d", "D:\\w/b"}));
+    QCOMPARE(size, 3000000013);
+    QList<RemoteFileEntry> entries;
+    QVERIFY(m_device->listTreeEntries(entries, "D:\\w/s"));
+    QCOMPARE(entries.size(), 3);
+    QCOMPARE(entries.last().name, "t/d");
+    answerCatalogues({{"D:\\w", ",\"a,BIN,5\",\"s,DIR,0\""}});
+    QVERIFY(!m_device->listTree(files, size, "D:\\w"));
+}
+
+void TestRemoteFiles::endlessTree()
+{
+    FakeInstrument &fake = *m_fake;
+    fake->answer = [](const std::string &message) {
+        return message.rfind(":MMEM:CAT?", 0) == 0 ? "1,2,\"s,DIR,0\"\n" : "";
+    };
+    QStringList files;
+    qint64 size = 0;
+    QVERIFY(!m_device->listTree(files, size, "D:"));
+    QVERIFY(!m_device->removeEmptyTree("D:", "s"));
+    for (const QString &line : takeLog()) {
+        QVERIFY2(line.contains("nested deeper"), qPrintable(line));
+    }
+    QVERIFY(fake.takeMessages().filter("RDIR").isEmpty());
+}
+
+void TestRemoteFiles::commands_data()
+{
+    QTest::addColumn<QString>("operation");
+    QTest::addColumn<QStringList>("arguments");
+    QTest::addColumn<QString>("message"); // or the words of the failure
+    const QString noPath = "4 Directory path cannot be empty.";
+    QTest::newRow("make") << "make" << QStringList{"D:/w/", "/a"} << ":MMEM:MDIR 'D:\\w\\a'; *OPC?";
+    QTest::newRow("make nothing") << "make" << QStringList{"", ""} << noPath;
+    QTest::newRow("remove") << "remove" << QStringList{"D:", "it's"}
+                            << ":MMEM:RDIR 'D:\\its'; *OPC?";
+    QTest::newRow("remove nothing") << "remove" << QStringList{"/", "/"} << noPath;
+    // Without a name this would be the folder above.
+    QTest::newRow("remove no name") << "remove" << QStringList{"D:\\w", ""} << noPath;
+    QTest::newRow("remove tree, no name") << "tree" << QStringList{"D:\\w", "\\"} << noPath;
+    QTest::newRow("rename") << "rename" << QStringList{"D:\\w", "a.wv", "b.wv"}
+                            << ":MMEM:MOVE 'D:\\w\\a.wv','D:\\w\\b.wv'; *OPC?";
+    QTest::newRow("rename to nothing")
+        << "rename" << QStringList{"", "a.wv", ""} << "4 Entry name cannot be empty.";
+}
+
+void TestRemoteFiles::commands()
+{
+    QFETCH(const QString, operation);
+    QFETCH(const QStringList, arguments);
+    QFETCH(const QString, message);
+    const QString &parent = arguments.at(0);
+    const QString &name = arguments.at(1);
+    const bool done = operation == "make"     ? m_device->makeDirectory(parent, name)
+                      : operation == "remove" ? m_device->removeDirectory(parent, name)
+                      : operation == "tree"   ? m_device->removeTree(parent, name)
+                                            : m_device->renameEntry(parent, name, arguments.at(2));
+    const bool fails = message.startsWith("4 ");
+    QCOMPARE(done, !fails);
+    QCOMPARE(m_fake->takeMessages(), fails ? QStringList() : QStringList{message});
+    QCOMPARE(takeLog(), fails ? QStringList{message} : QStringList());
+}
+
+void TestRemoteFiles::deleteFile()
+{
+    FakeInstrument &fake = *m_fake;
+    const QString command = "MMEM:DEL 'D:\\w\\a,b.wv'; *OPC?";
+    answerCatalogues(
+        {{"D:\\w\\*.wv", ",\"x.wv,BIN,1\",\"a,b.wv,BIN,5\""}, {"D:\\w\\*.*", ",\"plain,BIN,1\""}});
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\a,b.wv", false));
+    QCOMPARE(fake.takeMessages(), (QStringList{":MMEM:CAT? 'D:\\w\\*.wv'", command}));
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\plain", false));
+    QCOMPARE(fake.takeMessages().last(), "MMEM:DEL 'D:\\w\\plain'; *OPC?");
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\gone.wv", false));
+    QCOMPARE(fake.takeMessages().size(), 1);
+    QCOMPARE(takeLog(), QStringList{"2 *** File does not exist on instrument."});
+    // Without anybody to ask the file stays.
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\x.wv", true));
+    QCOMPARE(fake.takeMessages().size(), 1);
+    QStringList question;
+    bool yes = false;
+    m_device->setQuestion([&](const QString &title, const QString &text) {
+        question = {title, text};
+        return yes;
+    });
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\x.wv", true));
+    QCOMPARE(question, (QStringList{"WARNING", "File exists on instrument. Delete ?"}));
+    QCOMPARE(fake.takeMessages().size(), 1);
+    yes = true;
+    QVERIFY(m_device->deleteRemoteFile("D:\\w\\x.wv", true));
+    QCOMPARE(fake.takeMessages().size(), 2);
+}
+
+void TestRemoteFiles::deleteFileFails()
+{
+    FakeInstrument &fake = *m_fake;
+    answerCatalogues({{"D:\\*.wv", ",\"x.wv,BIN,1\""}});
+    fake.failCall("viWrite", VI_ERROR_TMO);
+    QVERIFY(!m_device->deleteRemoteFile("D:\\x.wv", false));
+    QCOMPARE(takeLog(),
+             (QStringList{"4 ERROR: status BFFF0015", "4 *** Error deleting file on instrument."}));
+    fake->status = nullptr;
+    QVERIFY(!m_device->deleteRemoteFile("E:\\x.wv", false));
+    QCOMPARE(takeLog(), QStringList{"4 Cannot read files list from instrument."});
+}
+
+void TestRemoteFiles::removeTree()
+{
+    FakeInstrument &fake = *m_fake;
+    answerCatalogues(
+        {{"D:\\w", ",\"a,BIN,5\",\"s,DIR,0\""}, {"D:\\w/s", ",\"b,BIN,5\""}, {"D:\\w\\s", ""}});
+    fake->errors = {"-1,\"Old\""};
+    QSignalSpy progress(m_device.get(), &VisaDevice::ProgressUpdate);
+    QVERIFY(m_device->removeTree("D:", "w"));
+    QCOMPARE(
+        fake.takeMessages(),
+        (QStringList{":MMEM:CAT? 'D:\\w'", ":MMEM:CAT? 'D:\\w/s'", ":MMEM:DEL 'D:\\w/a'; *OPC?",
+                     ":MMEM:DEL 'D:\\w/s/b'; *OPC?", ":MMEM:CAT? 'D:\\w'", ":MMEM:CAT? 'D:\\w\\s'",
+                     ":MMEM:RDIR 'D:\\w\\s'; *OPC?", ":MMEM:RDIR 'D:\\w'; *OPC?"}));
+    QCOMPARE(progress.size(), 3);
+    QCOMPARE(progress.at(1).first().toInt(), 50);
+}
+
+void TestRemoteFiles::removeTreeFails_data()
+{
+    QTest::addColumn<QString>("failure");
+    QTest::newRow("command") << "command";
+    QTest::newRow("error queue") << "queue";
+    QTest::newRow("cancel") << "cancel";
+}
+
+void TestRemoteFiles::removeTreeFails()
+{
+    QFETCH(const QString, failure);
+    FakeInstrument &fake = *m_fake;
+    fake->answer = [&](const std::string &message) -> std::string {
+        const bool isDelete = message.rfind(":MMEM:DEL", 0) == 0;
+        if (isDelete && failure == "queue") {
+            fake->errors = {"-257,\"File name error\""};
+        }
+        if (isDelete && failure == "command") {
+            return "0\n";
+        }
+        return message.rfind(":MMEM:CAT?", 0) == 0 ? "1,2,\"a,BIN,5\",\"b,BIN,5\"\n" : "";
+    };
+    if (failure == "cancel") {
+        connect(m_device.get(), &VisaDevice::ProgressUpdate, m_device.get(), &VisaDevice::cancel);
+    }
+    QVERIFY(!m_device->removeTree("D:", "w"));
+    const QStringList messages = fake.takeMessages();
+    QCOMPARE(messages.filter("DEL").size(), 1);
+    QVERIFY(messages.filter("RDIR").isEmpty());
+}
+
+QTEST_GUILESS_MAIN(TestRemoteFiles)
+#include "tst_remotefiles.moc"

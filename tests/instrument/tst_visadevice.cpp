@@ -1,0 +1,590 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "FakeInstrument.h"
+#include "LogRecorder.h"
+
+#include "instrument/VisaDevice.h"
+#include "visa/visa.h"
+
+#include <QElapsedTimer>
+#include <QSignalSpy>
+#include <QTcpServer>
+#include <QTest>
+#include <QTimer>
+
+namespace {
+
+const QString resource = "GPIB0::28::INSTR";
+constexpr int information = Tracer::Information;
+
+} // namespace
+
+class TestVisaDevice : public QObject
+{
+    Q_OBJECT
+private slots:
+    void init() { (void)takeLog(); }
+    void libraryLacksFunction_data();
+    void libraryLacksFunction();
+    void libraryIsMissing();
+    void managerFails();
+    void opensInOrder();
+    void openFails_data();
+    void openFails();
+    void openTwice();
+    void hostIsUnreachable();
+    void sendCommand_data();
+    void sendCommand();
+    void queryText();
+    void errorQueue();
+    void errorQueueFails_data();
+    void errorQueueFails();
+    void sessionSettings();
+    void charactersOutsideLatin1();
+    void openElsewhere();
+    void scan();
+    void scanFails();
+    void arbWait_data();
+    void arbWait();
+    void arbStart_data();
+    void arbStart();
+    void arbCancel();
+};
+
+void TestVisaDevice::libraryLacksFunction_data()
+{
+    QTest::addColumn<QString>("operation");
+    QTest::newRow("viOpenDefaultRM") << "construct";
+    QTest::newRow("viStatusDesc") << "construct";
+    for (const char *name :
+         {"viOpen", "viClear", "viSetAttribute", "viSetBuf", "viPrintf", "viRead", "viWrite"}) {
+        QTest::newRow(name) << "open";
+    }
+    QTest::newRow("viClose") << "close";
+    QTest::newRow("viGpibControlREN") << "close";
+    QTest::newRow("viGetAttribute") << "attribute";
+    QTest::newRow("viFindRsrc") << "scan";
+    QTest::newRow("viFindNext") << "scan";
+}
+
+void TestVisaDevice::libraryLacksFunction()
+{
+    QFETCH(const QString, operation);
+    const QString words = "Cannot resolve functions in VISA Library.";
+    FakeInstrument fake(QTest::currentDataTag());
+    VisaDevice device;
+    if (operation == "construct") {
+        QCOMPARE(device.takeLastError(), words);
+        QVERIFY(!device.openResource(resource));
+        return;
+    }
+    QCOMPARE(device.takeLastError(), QString());
+    if (operation == "open") {
+        QVERIFY(!device.openResource(resource));
+        QVERIFY(takeLog().contains("4 " + words));
+        return;
+    }
+    if (operation == "scan") {
+        QList<VisaDevice *> found;
+        QVERIFY(!device.scanResources(found, VisaDevice::ScanGpib));
+        QCOMPARE(takeLog(), QStringList{"4 " + words});
+        return;
+    }
+    QVERIFY(device.openResource(resource));
+    if (operation == "close") {
+        QVERIFY(!device.closeResource());
+        QVERIFY(device.isOpen());
+    } else {
+        quint16 type = 0;
+        QVERIFY(!device.interfaceType(type));
+        QCOMPARE(device.timeoutMs(), 0U);
+    }
+    QCOMPARE(takeLog().first(), "4 " + words);
+}
+
+void TestVisaDevice::libraryIsMissing()
+{
+    const QString notLoaded = "4 VISA Library is not loaded.";
+    qputenv("CORVANE_VISA_LIBRARY", "/nonexistent/libvisa.so");
+    {
+        VisaDevice first;
+        QCOMPARE(first.takeLastError(), "The VISA library cannot be loaded.");
+        const QStringList log = takeLog();
+        QCOMPARE(log.size(), 1);
+        QVERIFY2(log.first().contains("/nonexistent/libvisa.so"), qPrintable(log.first()));
+        VisaDevice second;
+        QCOMPARE(second.takeLastError(), QString());
+        QVERIFY(!second.openResource(resource));
+        QCOMPARE(takeLog(), QStringList{notLoaded});
+    }
+    FakeInstrument fake;
+    VisaDevice local(true);
+    QCOMPARE(local.takeLastError(), QString());
+    // The first object decides for all: this one doesn't load the library either.
+    VisaDevice other;
+    QVERIFY(!other.openResource(resource));
+    QCOMPARE(takeLog(), QStringList{notLoaded});
+    QVERIFY(fake.takeCalls().isEmpty());
+}
+
+void TestVisaDevice::managerFails()
+{
+    FakeInstrument fake;
+    fake.failCall("viOpenDefaultRM", VI_ERROR_SYSTEM_ERROR);
+    VisaDevice device;
+    QCOMPARE(device.takeLastError(), "The viOpenDefaultRM() failed: status BFFF0000");
+    QVERIFY(!device.openResource(resource));
+    QCOMPARE(takeLog(), (QStringList{"4 viOpen(): Cannot open instrument connection.",
+                                     "4 ERROR: status BFFF000E",
+                                     "4 Check resource string or VISA installation."}));
+    QCOMPARE(fake.takeCalls(), QStringList{"viOpenDefaultRM"});
+}
+
+void TestVisaDevice::opensInOrder()
+{
+    FakeInstrument fake;
+    {
+        VisaDevice device;
+        QVERIFY(device.openResource(resource));
+        QCOMPARE(
+            fake.takeCalls(),
+            (QStringList{"viOpenDefaultRM", "viOpen GPIB0::28::INSTR 0 0", "viClear",
+                         "viSetAttribute 3FFF001A 5000", "viSetBuf 2 2048", "viSetBuf 1 4096",
+                         "viSetAttribute 3FFF002D 1", "viSetAttribute 3FFF002A 1", "viWrite 4 END",
+                         "viPrintf *IDN?", "viRead 32767", "viPrintf :SYST:ERR?", "viRead 1023",
+                         "viPrintf *OPT?", "viRead 32767", "viPrintf :SYST:ERR?", "viRead 1023"}));
+        QCOMPARE(fake.takeMessages(), (QStringList{"*CLS", "*IDN?", "*OPT?"}));
+        QCOMPARE(device.vendor(), "Halvorn");
+        QCOMPARE(device.model(), "TGX-870");
+        QCOMPARE(device.serial(), "100001");
+        QCOMPARE(device.firmware(), "1.0");
+        QCOMPARE(device.interfaceName(), "GPIB0");
+        (void)takeLog();
+        QVERIFY(device.closeResource());
+        QCOMPARE(fake.takeCalls(), (QStringList{"viGpibControlREN 2", "viClear", "viClose"}));
+        QCOMPARE(takeLog(information), QStringList{"1 Device TGX-870, 100001 closed."});
+        // Closed already: nothing happens, the identity stays.
+        QVERIFY(device.closeResource());
+        QVERIFY(takeLog(information).isEmpty());
+        QCOMPARE(device.model(), "TGX-870");
+    }
+    QCOMPARE(fake.takeCalls(), QStringList{"viClose manager"});
+}
+
+void TestVisaDevice::openFails_data()
+{
+    QTest::addColumn<QString>("call");
+    QTest::addColumn<qint32>("status");
+    QTest::addColumn<QString>("identity");
+    QTest::addColumn<QString>("words");
+    const QString good = "Halvorn,TGX-870,TGX870/100001/01,1.0";
+    const qint32 timeout = VI_ERROR_TMO;
+    const QString report = "4 ERROR: status BFFF0015";
+    QTest::newRow("viOpen with a remark")
+        << "viOpen G" << qint32{VI_SUCCESS_MAX_CNT} << good << "4 ERROR: status 3FFF0006";
+    QTest::newRow("clear") << "viClear" << timeout << good << report;
+    QTest::newRow("time-out value") << "viSetAttribute 3FFF001A" << timeout << good << report;
+    QTest::newRow("write buffer") << "viSetBuf 2" << timeout << good << report;
+    QTest::newRow("read buffer with a remark")
+        << "viSetBuf 1" << qint32{VI_SUCCESS_MAX_CNT} << good << "4 ERROR: status 3FFF0006";
+    QTest::newRow("buffer mode") << "viSetAttribute 3FFF002A" << timeout << good << report;
+    QTest::newRow("*CLS") << "viWrite" << timeout << good << report;
+    QTest::newRow("*IDN?") << "viPrintf *IDN?" << timeout << good << report;
+    QTest::newRow("*OPT?") << "viPrintf *OPT?" << timeout << good << report;
+    QTest::newRow("other maker") << "-" << 0 << "Acme,TGX-870,TGX870/100001/01,1.0"
+                                 << "4 This device is not a Halvorn instrument.";
+    QTest::newRow("unknown model") << "-" << 0 << "Halvorn,QQQ-1,x/1/2,1.0"
+                                   << "4 The device 'QQQ-1' is not supported.";
+    QTest::newRow("empty answer") << "-" << 0 << ""
+                                  << "4 This device is not a Halvorn instrument.";
+}
+
+void TestVisaDevice::openFails()
+{
+    QFETCH(const QString, call);
+    QFETCH(const qint32, status);
+    QFETCH(const QString, identity);
+    QFETCH(const QString, words);
+    FakeInstrument fake;
+    VisaDevice device;
+    fake->identity = identity.toStdString();
+    fake.failCall(call, status);
+    QVERIFY(!device.openResource(resource));
+    const QStringList log = takeLog();
+    QVERIFY2(log.contains(words), qPrintable(log.join('\n')));
+    QVERIFY(!device.isOpen());
+    QCOMPARE(fake->openSessions, 0U);
+    // Nothing of the failure stays behind.
+    fake->status = nullptr;
+    fake->identity = "halvorn,TGX-870,TGX870/100001/01,1.0";
+    QVERIFY(device.openResource(resource));
+}
+
+void TestVisaDevice::openTwice()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    QVERIFY(!device.openResource("GPIB0::5::INSTR"));
+    QCOMPARE(takeLog(), QStringList{"4 Device is already open."});
+    QVERIFY(device.isOpen());
+    QCOMPARE(device.resource(), resource);
+}
+
+void TestVisaDevice::hostIsUnreachable()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QTcpServer plainScpi;
+    QVERIFY2(plainScpi.listen(QHostAddress("127.0.0.87"), 5025),
+             qPrintable(plainScpi.errorString()));
+    (void)fake.takeCalls();
+    // Written small, it is tested all the same; one port of two is not enough.
+    QVERIFY(!device.openResource("tcpip0::127.0.0.87::instr"));
+    QCOMPARE(takeLog(information | Tracer::Warning | Tracer::Error),
+             (QStringList{"1 Using VISA library '" + FakeInstrument::libraryName({}) + "'",
+                          "1 Opening VISA device 'tcpip0::127.0.0.87::instr'",
+                          "1 Trying to access device '127.0.0.87'",
+                          "2 Port 111 is not accessible. Check your firewall settings.",
+                          "1 Port 5025 is accessible."}));
+    QVERIFY(!device.openResource("TCPIP::no-such-host.invalid::INSTR"));
+    QVERIFY(takeLog().first().startsWith("4 No host address found. "));
+    QVERIFY(fake.takeCalls().isEmpty());
+}
+
+void TestVisaDevice::sendCommand_data()
+{
+    QTest::addColumn<QString>("answer");
+    QTest::addColumn<bool>("done");
+    QTest::newRow("1") << "1\n" << true;
+    QTest::newRow("blanks") << " \t+1 \r\n" << true;
+    QTest::newRow("0") << "0\n" << false;
+    QTest::newRow("text") << "ready  now\n" << false;
+    QTest::newRow("two numbers") << "1 1\n" << false;
+}
+
+void TestVisaDevice::sendCommand()
+{
+    QFETCH(const QString, answer);
+    QFETCH(const bool, done);
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(!device.sendCommand("*CLS"));
+    QCOMPARE(takeLog(), QStringList{"4 Device is not open."});
+    QVERIFY(device.openResource(resource));
+    fake->answer = [&](const std::string &message) {
+        return message == "DO; *OPC?" ? answer.toStdString() : std::string();
+    };
+    (void)fake.takeCalls();
+    (void)takeLog();
+    QCOMPARE(device.sendCommand("DO; *OPC?"), done);
+    QCOMPARE(fake.takeCalls(), (QStringList{"viWrite 9 END", "viRead 1023"}));
+    const QString shown = "VISA << '" + answer.simplified() + "'";
+    QCOMPARE(takeLog(),
+             done ? QStringList()
+                  : (QStringList{"4 ERROR : R Unexpected Result from *OPC?", "4 " + shown}));
+    // Without the question nothing is read, and it is one in this spelling only.
+    QVERIFY(device.sendCommand("*opc?"));
+    QCOMPARE(fake.takeCalls(), QStringList{"viWrite 5 END"});
+    fake.failCall("viWrite", VI_SUCCESS_MAX_CNT);
+    QVERIFY(!device.sendCommand("DO"));
+    QCOMPARE(takeLog(), QStringList{"4 ERROR: status 3FFF0006"});
+}
+
+void TestVisaDevice::queryText()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    const std::string longText(201, 'x');
+    fake->answer = [&](const std::string &message) {
+        return message == "LONG?" ? " a\t\r\n " + longText + "\n" : std::string();
+    };
+    (void)takeLog();
+    QString answer;
+    QVERIFY(device.queryText("LONG?", answer));
+    QCOMPARE(answer, "a " + QString(201, 'x'));
+    QCOMPARE(takeLog(information),
+             (QStringList{"1 VISA >> 'LONG?'", "1 VISA << 'a " + QString(198, 'x') + "..."}));
+    // An answer counts as failed while the queue holds an error, but is delivered.
+    fake->errors = {"-221,\"Settings conflict\""};
+    QVERIFY(!device.queryText("LONG?", answer));
+    QCOMPARE(answer.size(), 203);
+    QCOMPARE(device.takeLastError(), "-221,\"Settings conflict\"\n");
+    QCOMPARE(device.takeLastError(), QString());
+    // A positive status is as good as 0 here.
+    fake.failCall("viRead 32767", VI_SUCCESS_TERM_CHAR);
+    QVERIFY(device.queryText("LONG?", answer));
+    (void)takeLog();
+    // Nothing is sent for an empty query, and no answer is no empty answer.
+    (void)fake.takeMessages();
+    fake->status = nullptr;
+    QVERIFY(!device.queryText("", answer));
+    QVERIFY(fake.takeMessages().isEmpty());
+    QCOMPARE(takeLog(), QStringList{"4 ERROR: status BFFF0015"});
+}
+
+void TestVisaDevice::errorQueue()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    for (int i = 1; i <= 21; ++i) {
+        fake->errors.push_back(std::to_string(-i) + ",\"Error\"");
+    }
+    (void)takeLog();
+    QVERIFY(!device.checkErrorQueue());
+    QCOMPARE(fake->errors.size(), size_t{1});
+    const QStringList log = takeLog(information);
+    QCOMPARE(log.size(), 20);
+    QCOMPARE(log.first(), "1 Instrument reports '-1,\"Error\"'");
+    QCOMPARE(device.takeLastError().count('\n'), 20);
+    QVERIFY(!device.checkErrorQueue());
+    QVERIFY(device.checkErrorQueue());
+    // What is no number ends the reading like the number 0.
+    fake->errors = {"no number", "-5,\"Error\""};
+    QVERIFY(device.checkErrorQueue());
+    QCOMPARE(fake->errors.size(), size_t{1});
+}
+
+void TestVisaDevice::errorQueueFails_data()
+{
+    QTest::addColumn<QString>("call");
+    QTest::addColumn<qint32>("status");
+    QTest::addColumn<QString>("words");
+    const QString command = "4 :SYST:ERR? Command failed.";
+    const QString answer = "4 No response from :SYST:ERR?";
+    QTest::newRow("command") << "viPrintf" << qint32{VI_ERROR_CONN_LOST} << command;
+    QTest::newRow("command with a remark") << "viPrintf" << qint32{VI_SUCCESS_TERM_CHAR} << command;
+    QTest::newRow("answer") << "viRead" << qint32{VI_ERROR_TMO} << answer;
+    QTest::newRow("answer with a remark") << "viRead" << qint32{VI_SUCCESS_MAX_CNT} << answer;
+}
+
+void TestVisaDevice::errorQueueFails()
+{
+    QFETCH(const QString, call);
+    QFETCH(const qint32, status);
+    QFETCH(const QString, words);
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    (void)takeLog();
+    fake.failCall(call, status);
+    QVERIFY(!device.checkErrorQueue());
+    const QStringList log = takeLog();
+    QCOMPARE(log.size(), 2);
+    QCOMPARE(log.first(), words);
+    QVERIFY(log.last().startsWith("4 ERROR: status "));
+}
+
+void TestVisaDevice::sessionSettings()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    QCOMPARE(device.timeoutMs(), 5000U);
+    QVERIFY(device.setTimeoutMs(123));
+    QCOMPARE(device.timeoutMs(), 123U);
+    fake->interfaceType = VI_INTF_GPIB;
+    quint16 type = 0;
+    QVERIFY(device.interfaceType(type));
+    QCOMPARE(type, quint16{1});
+    fake.failCall("viGetAttribute", VI_ERROR_NSUP_ATTR);
+    QCOMPARE(device.timeoutMs(), 0U);
+    QVERIFY(!device.interfaceType(type));
+    fake.failCall("viSetAttribute", VI_ERROR_NSUP_ATTR_STATE);
+    QVERIFY(!device.setTimeoutMs(1));
+    device.closeResource();
+    (void)takeLog();
+    QVERIFY(!device.interfaceType(type));
+    QCOMPARE(takeLog(), QStringList{"4 Device is not open."});
+}
+
+void TestVisaDevice::charactersOutsideLatin1()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    (void)fake.takeMessages();
+    QVERIFY(device.sendCommand(QString::fromUtf8("MMEM:CDIR 'ä'")));
+    QCOMPARE(fake.takeMessages(), QStringList{QString::fromUtf8("MMEM:CDIR 'ä'")});
+    (void)takeLog();
+    // A "?" in the place of the letter would delete other files.
+    QVERIFY(!device.sendCommand(QString::fromUtf8("MMEM:DEL 'Ω.wv'")));
+    QVERIFY(fake.takeMessages().isEmpty());
+    QCOMPARE(takeLog().size(), 1);
+}
+
+void TestVisaDevice::openElsewhere()
+{
+    FakeInstrument fake;
+    VisaDevice first;
+    VisaDevice second;
+    QVERIFY(first.openResource(resource));
+    QVERIFY(second.isOpenElsewhere("TGX-870", "100001"));
+    QVERIFY(!first.isOpenElsewhere("TGX-870", "100001"));
+    QVERIFY(!second.isOpenElsewhere("TGX-870", "100002"));
+    QVERIFY(!second.isOpenElsewhere("", ""));
+    first.closeResource();
+    QVERIFY(!second.isOpenElsewhere("TGX-870", "100001"));
+}
+
+void TestVisaDevice::scan()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    fake->resources = {"GPIB0::1::INSTR", "GPIB0::2::INSTR", "GPIB0::3::INSTR"};
+    // The second of the three answers, but is of another make.
+    int identities = 0;
+    fake->answer = [&](const std::string &message) {
+        const bool isForeign = message == "*IDN?" && ++identities == 2;
+        return isForeign ? std::string("Acme,1,2,3\n") : std::string();
+    };
+    QSignalSpy progress(&device, &VisaDevice::ProgressUpdate);
+    QList<VisaDevice *> found;
+    QVERIFY(device.scanResources(found, VisaDevice::ScanGpib));
+    QCOMPARE(found.size(), 2);
+    QCOMPARE(found.at(0)->resource(), "GPIB0::1::INSTR");
+    QCOMPARE(found.at(1)->resource(), "GPIB0::3::INSTR");
+    QVERIFY(!found.at(1)->isOpen());
+    QCOMPARE(found.at(1)->serial(), "100001");
+    qDeleteAll(found);
+    QList<int> percents;
+    for (const QList<QVariant> &arguments : progress) {
+        percents.append(arguments.first().toInt());
+    }
+    QCOMPARE(percents, (QList<int>{0, 10, 43, 76, 100, 100}));
+    QVERIFY(fake.takeCalls().contains("viFindRsrc GPIB?*INSTR"));
+    QCOMPARE(fake->openSessions, 0U);
+}
+
+void TestVisaDevice::scanFails()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QList<VisaDevice *> found;
+    QVERIFY(!device.scanResources(found, 2));
+    QVERIFY(!device.scanResources(found, VisaDevice::ScanUsb));
+    QCOMPARE(takeLog(), (QStringList{"4 Invalid remte control interface type.",
+                                     "4 No devices found. viFindRsrc() returned an error.",
+                                     "4 ERROR: status BFFF0011"}));
+    QVERIFY(fake.takeCalls().contains("viFindRsrc USB[0-9]::0x7FE3::?*INSTR"));
+    fake->resources = {"USB0::0x7FE3::1::2::INSTR", "USB0::0x7FE3::1::3::INSTR"};
+    connect(&device, &VisaDevice::ProgressUpdate, &device, [&device](int percent) {
+        if (percent > 10) {
+            device.cancel();
+        }
+    });
+    QVERIFY(!device.scanResources(found, VisaDevice::ScanUsb));
+    QCOMPARE(found.size(), 1);
+    qDeleteAll(found);
+}
+
+void TestVisaDevice::arbWait_data()
+{
+    QTest::addColumn<QString>("model");
+    QTest::addColumn<QStringList>("conditions");
+    QTest::addColumn<int>("seconds");
+    QTest::addColumn<bool>("ready");
+    QTest::addColumn<QStringList>("words");
+    QTest::newRow("no time") << "TGX-870" << QStringList{} << 0 << false << QStringList{};
+    QTest::newRow("ready") << "TGX-870" << QStringList{"0"} << 3 << true << QStringList{};
+    QTest::newRow("other bits") << "TGX-870" << QStringList{"5"} << 3 << true << QStringList{};
+    QTest::newRow("busy, then ready")
+        << "TGX-840" << QStringList{"2", "4"} << 4 << true << QStringList{};
+    QTest::newRow("busy too long") << "TGX-840" << QStringList{"2", "2", "2"} << 2 << false
+                                   << QStringList{"4 ARB did not get ready in time."};
+    QTest::newRow("nonsense") << "TGX-870" << QStringList{"abc"} << 3 << false
+                              << QStringList{"4 Invalid instrument response."};
+    QTest::newRow("no progress") << "TGX-870" << QStringList{"MCOD"} << 3 << false
+                                 << QStringList{"4 Cannot read MCOD progress."};
+    QTest::newRow("no condition") << "TGX-870" << QStringList{"COND"} << 3 << false
+                                  << QStringList{"4 Cannot read instrument status."};
+}
+
+void TestVisaDevice::arbWait()
+{
+    QFETCH(const QString, model);
+    QFETCH(QStringList, conditions);
+    QFETCH(const int, seconds);
+    QFETCH(const bool, ready);
+    QFETCH(const QStringList, words);
+    FakeInstrument fake;
+    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    const bool fails = conditions.value(0).toInt() == 0 && conditions.value(0).size() == 4;
+    fake->answer = [&](const std::string &message) -> std::string {
+        if (fails && QString::fromStdString(message).contains(conditions.first())) {
+            fake->errors = {"-300,\"Device-specific error\""};
+        }
+        if (message == "SOUR:BB:PROG:MCOD?") {
+            return "37\n";
+        }
+        return message == "STAT:OPER:COND?" ? conditions.takeFirst().toStdString() + "\n"
+                                            : std::string();
+    };
+    (void)fake.takeMessages();
+    (void)takeLog();
+    QSignalSpy progress(&device, &VisaDevice::ProgressUpdate);
+    QCOMPARE(device.waitForArbReady(seconds), ready);
+    QCOMPARE(takeLog(), words);
+    const bool asksProgress = model == "TGX-870" && seconds > 0;
+    QCOMPARE(fake.takeMessages().contains("SOUR:BB:PROG:MCOD?"), asksProgress);
+    if (ready) {
+        QCOMPARE(progress.last().first().toInt(), 100);
+    }
+    if (words.value(0).contains("in time")) {
+        // Without a coder the progress is the time in seconds.
+        QCOMPARE(progress.last().first().toInt(), 1);
+    }
+}
+
+void TestVisaDevice::arbStart_data()
+{
+    QTest::addColumn<QString>("model");
+    QTest::addColumn<QStringList>("messages");
+    QTest::newRow("with a coder") << "TGX-870"
+                                  << QStringList{"SOUR:BB:ARB:WAV:SEL '/var/user/a.wv'",
+                                                 "SOUR:BB:PROG:MCOD?", "STAT:OPER:COND?",
+                                                 "SOUR:BB:ARB:STAT ON; *OPC?"};
+    QTest::newRow("without") << "TGX-840"
+                             << QStringList{"SOUR:WAV:SEL '/var/user/a.wv'", "STAT:OPER:COND?",
+                                            "SOUR:STAT ON; *OPC?"};
+}
+
+void TestVisaDevice::arbStart()
+{
+    QFETCH(const QString, model);
+    QFETCH(const QStringList, messages);
+    FakeInstrument fake;
+    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    fake->answer = [&](const std::string &message) {
+        return message == "STAT:OPER:COND?" || message == "SOUR:BB:PROG:MCOD?" ? std::string("0\n")
+                                                                               : std::string();
+    };
+    // An old error is no error of this start.
+    fake->errors = {"-1,\"Old\""};
+    (void)fake.takeMessages();
+    QVERIFY(device.startArb("/var/user/a.wv"));
+    QCOMPARE(fake.takeMessages(), messages);
+}
+
+void TestVisaDevice::arbCancel()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    (void)takeLog();
+    QElapsedTimer timer;
+    timer.start();
+    // One left over from before ends the wait as well.
+    device.cancel();
+    QVERIFY(!device.waitForArbReady(100));
+    QVERIFY(timer.elapsed() < 5000);
+    QCOMPARE(takeLog(), QStringList{"4 *** User break."});
+}
+
+QTEST_GUILESS_MAIN(TestVisaDevice)
+#include "tst_visadevice.moc"
