@@ -116,10 +116,18 @@ void WvWriter::prepareLevels()
     info("=======================================");
 }
 
-bool WvWriter::put(QIODevice &device, const QByteArray &bytes)
+bool WvWriter::put(QIODevice &device, std::span<const char> bytes)
 {
-    return device.write(bytes) == bytes.size() ||
-           Tracer::fail("Error writing output file: " + device.errorString());
+    // On a full disk the part that still fits is written without an error; the next write tells the
+    // reason.
+    while (!bytes.empty()) {
+        const qint64 written = device.write(bytes.data(), static_cast<qint64>(bytes.size()));
+        if (written <= 0) {
+            return Tracer::fail("Error writing output file: " + device.errorString());
+        }
+        bytes = bytes.subspan(static_cast<size_t>(written));
+    }
+    return true;
 }
 
 bool WvWriter::write(QIODevice &device)
@@ -130,8 +138,8 @@ bool WvWriter::write(QIODevice &device)
     }
     m_report(50);
     const auto blockBytes = 4 * static_cast<qint64>(m_job.samples) + 1;
-    if (!put(device, QString("{WAVEFORM-%1: #").arg(blockBytes).toLatin1()) ||
-        !writeSamples(device) || !put(device, "}")) {
+    if (!put(device, "{WAVEFORM-" + QByteArray::number(blockBytes) + ": #") ||
+        !writeSamples(device) || !put(device, QByteArray("}"))) {
         return false;
     }
     m_report(100);
@@ -175,7 +183,7 @@ bool WvWriter::copyTagsStream(QIODevice &device)
         if (got <= 0) {
             return got == 0 || warn();
         }
-        if (!put(device, block.left(got))) {
+        if (!put(device, std::span(block).first(static_cast<size_t>(got)))) {
             return false;
         }
     }
@@ -278,9 +286,8 @@ bool WvWriter::writeSamples(QIODevice &device)
             fetchSamples(done, std::span(values).first(2 * static_cast<size_t>(wanted)));
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));
         encodeWords(std::span(values).first(2 * static_cast<size_t>(got)), bytes);
-        if (device.write(reinterpret_cast<const char *>(bytes.data()),
-                         static_cast<qint64>(bytes.size())) != static_cast<qint64>(bytes.size())) {
-            return Tracer::fail("Error writing output file: " + device.errorString());
+        if (!put(device, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
+            return false;
         }
         if (got < wanted) {
             return Tracer::fail("Error reading waveform data from temporary file.");
