@@ -8,8 +8,11 @@
 #include <QApplication>
 #include <QDir>
 #include <QFileInfo>
+#include <QLineEdit>
 #include <QPixmap>
+#include <QPushButton>
 #include <QSettings>
+#include <QStackedWidget>
 #include <QTemporaryDir>
 #include <QTimer>
 
@@ -101,16 +104,44 @@ void ScreenshotRun::takePictures()
     }
     bool done = save(m_window, "main-window.png");
     if (!m_file.isEmpty()) {
-        DlgBase *tool = m_window.modules().firstAllowed(m_file, true);
-        done = done && tool && m_window.modules().start(*tool, m_file) &&
-               save(*tool, "waveform-info.png");
+        const QList<DlgBase *> tools = m_window.modules().allAllowed(m_file, true);
+        for (DlgBase *tool : tools) {
+            done = done && m_window.modules().start(*tool, m_file) && saveTool(*tool);
+            tool->close();
+        }
         if (!done) {
-            complain(QString("no report on '%1'").arg(m_file));
+            complain(QString("not all tools could show '%1'").arg(m_file));
         }
     }
     std::printf("first paint %lld ms after the start\n",
                 static_cast<long long>(m_window.firstPaintMs()));
     finish(done ? 0 : 1);
+}
+
+/// A picture of the tool, or of each of its pages. A wizard is taken as far as it goes without
+/// overwriting a file, so that its pages show what a user would see.
+bool ScreenshotRun::saveTool(DlgBase &tool) const
+{
+    const QString name = tool.moduleName().toLower().replace(' ', '-');
+    auto *pages = tool.findChild<QStackedWidget *>("sw_assist");
+    auto *next = tool.findChild<QPushButton *>("pb_next");
+    if (!pages || !next) {
+        return save(tool, name + ".png");
+    }
+    const auto *output = tool.findChild<QLineEdit *>("le_outfile");
+    for (int step = 0; step < pages->count() && next->isVisible() && next->isEnabled(); ++step) {
+        const bool isRun = next->text().contains("Run");
+        if (isRun && (!output || QFileInfo::exists(output->text()))) {
+            break;
+        }
+        next->click();
+    }
+    bool done = true;
+    for (int page = 0; page < pages->count() && done; ++page) {
+        pages->setCurrentIndex(page);
+        done = save(tool, QString("%1-%2.png").arg(name).arg(page + 1, 2, 10, QChar('0')));
+    }
+    return done;
 }
 
 bool ScreenshotRun::save(QWidget &window, const QString &name) const
