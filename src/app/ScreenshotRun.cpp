@@ -8,7 +8,6 @@
 #include <QApplication>
 #include <QDir>
 #include <QFileInfo>
-#include <QLineEdit>
 #include <QPixmap>
 #include <QPushButton>
 #include <QSettings>
@@ -118,8 +117,8 @@ void ScreenshotRun::takePictures()
     finish(done ? 0 : 1);
 }
 
-/// A picture of the tool, or of each of its pages. A wizard is taken as far as it goes without
-/// overwriting a file, so that its pages show what a user would see.
+/// A picture of the tool, or of each of its pages: first those on the way that "Next" leads, as a
+/// user would see them, then the others. Nothing is run, so no file is written.
 bool ScreenshotRun::saveTool(DlgBase &tool) const
 {
     const QString name = tool.moduleName().toLower().replace(' ', '-');
@@ -128,18 +127,25 @@ bool ScreenshotRun::saveTool(DlgBase &tool) const
     if (!pages || !next) {
         return save(tool, name + ".png");
     }
-    const auto *output = tool.findChild<QLineEdit *>("le_outfile");
-    for (int step = 0; step < pages->count() && next->isVisible() && next->isEnabled(); ++step) {
-        const bool isRun = next->text().contains("Run");
-        if (isRun && (!output || QFileInfo::exists(output->text()))) {
+    QSet<int> taken;
+    const auto take = [&] {
+        const int page = pages->currentIndex();
+        taken.insert(page);
+        return save(tool, QString("%1-%2.png").arg(name).arg(page + 1, 2, 10, QChar('0')));
+    };
+    bool done = take();
+    while (done && next->isEnabled() && next->text().contains("Next")) {
+        next->click();
+        if (taken.contains(pages->currentIndex())) {
             break;
         }
-        next->click();
+        done = take();
     }
-    bool done = true;
     for (int page = 0; page < pages->count() && done; ++page) {
-        pages->setCurrentIndex(page);
-        done = save(tool, QString("%1-%2.png").arg(name).arg(page + 1, 2, 10, QChar('0')));
+        if (!taken.contains(page)) {
+            pages->setCurrentIndex(page);
+            done = take();
+        }
     }
     return done;
 }
