@@ -43,8 +43,8 @@ void TcpServer::start(Session session)
 void TcpServer::stop()
 {
     if (m_thread.joinable()) {
-        const std::uint64_t one = 1;
-        (void)!::write(m_wake.get(), &one, sizeof(one));
+        m_stopping = true;
+        wake();
         m_thread.join();
     }
     m_listener.reset();
@@ -56,6 +56,12 @@ void TcpServer::stop()
     join(true);
 }
 
+void TcpServer::wake()
+{
+    const std::uint64_t one = 1;
+    (void)!::write(m_wake.get(), &one, sizeof(one));
+}
+
 void TcpServer::accept()
 {
     constexpr int RetryMilliseconds = 50;
@@ -63,9 +69,15 @@ void TcpServer::accept()
         std::array<pollfd, 2> events{{{m_wake.get(), POLLIN, 0}, {m_listener.get(), POLLIN, 0}}};
         if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR)
             return;
-        if (events[0].revents != 0)
+        if (m_stopping)
             return;
-        join(false);
+        if (events[0].revents != 0) {
+            std::uint64_t count = 0;
+            (void)!::read(m_wake.get(), &count, sizeof(count));
+            join(false);
+        }
+        if (events[1].revents == 0)
+            continue;
         UniqueFd fd(::accept4(m_listener.get(), nullptr, nullptr, SOCK_CLOEXEC));
         if (!fd.isValid()) {
             // Out of descriptors: the waiting connection would keep poll awake all the time.
@@ -97,6 +109,7 @@ void TcpServer::serve(Connection &connection)
     ::shutdown(connection.fd.get(), SHUT_RDWR);
     const std::lock_guard lock(m_mutex);
     connection.finished = true;
+    wake();
 }
 
 void TcpServer::join(bool all)

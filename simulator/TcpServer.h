@@ -3,6 +3,7 @@
 
 #include "UniqueFd.h"
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <functional>
@@ -49,11 +50,13 @@ private:
     };
 
     void accept();
+    void wake();
     void serve(Connection &connection);
     void join(bool all);
 
     UniqueFd m_listener;
-    UniqueFd m_wake; ///< an event that ends the accepting thread
+    UniqueFd m_wake; ///< an event: a connection ended, or all is to end
+    std::atomic<bool> m_stopping{false};
     Session m_session;
     std::thread m_thread;
     std::mutex m_mutex; ///< of the list

@@ -12,8 +12,6 @@ namespace {
 
 constexpr ViUInt16 LargestPrimaryAddress = 30;
 constexpr ViUInt16 LargestSecondaryAddress = 126;
-// Longer texts would not fit the buffers that callers hand in for them.
-constexpr std::size_t LongestName = VI_FIND_BUFLEN - 32;
 
 bool isPlain(std::string_view text)
 {
@@ -151,19 +149,25 @@ std::optional<ViUInt16> parseNumber(std::string_view text, ViUInt16 largest)
 
 std::optional<ResourceName> parseResourceName(std::string_view text)
 {
-    if (text.size() > LongestName)
-        return std::nullopt;
     Sections sections = split(text, "::");
     const std::string interface = upperCase(sections.front());
-    if (sections.size() < 2)
+    // A colon of a section would merge with the separator behind it.
+    const auto hasColon = [](const std::string &section) {
+        return section.find(':') != std::string::npos;
+    };
+    if (sections.size() < 2 || std::any_of(sections.begin(), sections.end(), hasColon))
         return std::nullopt;
-    if (const auto board = boardNumber(interface, "TCPIP"))
-        return parseTcpip(std::move(sections), *board);
-    if (const auto board = boardNumber(interface, "USB"))
-        return parseUsb(std::move(sections), *board);
-    if (const auto board = boardNumber(interface, "GPIB"))
-        return parseGpib(std::move(sections), *board);
-    return std::nullopt;
+    std::optional<ResourceName> name;
+    if (const auto tcpip = boardNumber(interface, "TCPIP"))
+        name = parseTcpip(std::move(sections), *tcpip);
+    else if (const auto usb = boardNumber(interface, "USB"))
+        name = parseUsb(std::move(sections), *usb);
+    else if (const auto gpib = boardNumber(interface, "GPIB"))
+        name = parseGpib(std::move(sections), *gpib);
+    // A longer one would not fit the buffers that callers hand in for it.
+    if (name && resourceText(*name).size() >= VI_FIND_BUFLEN)
+        return std::nullopt;
+    return name;
 }
 
 std::string resourceText(const ResourceName &name)

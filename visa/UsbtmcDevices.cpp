@@ -82,6 +82,7 @@ std::vector<UsbtmcDevice> findUsbtmcDevices(const std::string &root)
             devices.push_back(std::move(*device));
     }
     std::vector<ResourceName> names;
+    names.reserve(devices.size());
     for (const UsbtmcDevice &device : devices)
         names.push_back(device.name);
     for (UsbtmcDevice &device : devices) {

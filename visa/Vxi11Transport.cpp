@@ -73,9 +73,10 @@ Vxi11Transport::~Vxi11Transport()
         return;
     // Waits for the answer, so that who opens the instrument again at once finds it free. An
     // interrupted session does not wait; the end of the connection frees the link then.
+    const Deadline deadline = Deadline::after(m_isSilent ? AbortMs : DestroyLinkMs);
     XdrValue<Device_Error> reply(xdr_Device_Error);
     (void)m_core.call<Device_Link, Device_Error>(coreProcedure(destroy_link), xdr_Device_Link,
-                                                 m_link, 0, reply, Deadline::after(DestroyLinkMs));
+                                                 m_link, 0, reply, deadline);
 }
 
 ViStatus Vxi11Transport::open(const Vxi11Address &address, const Deadline &deadline,
@@ -137,6 +138,7 @@ ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, XdrCode<Arguments> 
     const ViStatus status =
         m_core.call<Arguments, Results>(coreProcedure(procedure), encode, arguments, dataSize,
                                         results, deadline.extendedBy(ReplyGraceMs));
+    m_isSilent = status == VI_ERROR_TMO;
     if (status == VI_ERROR_TMO || status == VI_ERROR_ABORT)
         abortRunningCall();
     if (status != VI_SUCCESS)

@@ -58,6 +58,7 @@ private:
     std::vector<HostAddress> m_hostAddresses;
     RpcConnection m_core;
     bool m_hasLink = false;
+    bool m_isSilent = false; // the last call got no answer in time
     int m_link = 0;
     std::uint16_t m_abortPort = 0;  // 0: the instrument offers no abort channel
     std::size_t m_largestWrite = 0; // bytes that one device_write may carry

@@ -21,6 +21,7 @@
 #include <QTemporaryDir>
 
 #include <algorithm>
+#include <array>
 #include <memory>
 #include <vector>
 
@@ -33,9 +34,11 @@ constexpr int blockSamples = 256 * 1024;
 
 qint64 sampleCount()
 {
-    bool isNumber = false;
-    const qint64 count = qEnvironmentVariable("CORVANE_BENCH_SAMPLES").toLongLong(&isNumber);
-    return isNumber && count > 0 ? std::min(count, MaxSamples) : 100'000'000;
+    static const qint64 count = [] {
+        const qint64 wanted = qEnvironmentVariable("CORVANE_BENCH_SAMPLES").toLongLong();
+        return wanted > 0 ? std::min(wanted, MaxSamples) : 100'000'000;
+    }();
+    return count;
 }
 
 /// Which marker lists a file has.
@@ -83,17 +86,19 @@ public:
     std::pair<QString, qint64> waveform(qint64 markers)
     {
         const QString path = m_folder.filePath(QString("in%1.wv").arg(markers));
+        if (QFileInfo::exists(path)) {
+            return {path, m_offsets[static_cast<size_t>(markers)]};
+        }
         const QByteArray head = "{TYPE: TGX-WV,0}{CLOCK:1000000}{LEVEL OFFS:3.0,0.0}{SAMPLES:" +
                                 QByteArray::number(sampleCount()) + '}' + markerTags(markers) +
                                 "{WAVEFORM-" + QByteArray::number(4 * sampleCount() + 1) + ": #";
-        if (!QFileInfo::exists(path)) {
-            QFile file(path);
-            if (file.open(QIODevice::WriteOnly | QIODevice::Unbuffered)) {
-                file.write(head);
-                writeWords(file);
-                file.write("}");
-            }
+        QFile file(path);
+        if (file.open(QIODevice::WriteOnly | QIODevice::Unbuffered)) {
+            file.write(head);
+            writeWords(file);
+            file.write("}");
         }
+        m_offsets[static_cast<size_t>(markers)] = head.size();
         return {path, head.size()};
     }
 
@@ -120,6 +125,7 @@ private:
     }
 
     QTemporaryDir m_folder;
+    std::array<qint64, ManyMarkers + 1> m_offsets{};
 };
 
 /// Peak memory of this process since resetPeak, MiB.

@@ -11,10 +11,11 @@ AboutBox::AboutBox(QWidget *parent)
     setIconPixmap(QIcon(":/program/corvane-256.png").pixmap(96, 96));
     setText(QString("<h2>HV Corvane</h2>"
                     "<h4>Version %1, %2</h4>"
-                    "<p>The desktop workbench for arbitrary-waveform signal generators.</p>"
+                    "<p>The desktop workbench for<br/>"
+                    "arbitrary-waveform signal generators.</p>"
                     "<p>Made by the Corvane developers, Halvorn.<br/>"
-                    "Free software under the Apache License 2.0.</p>"
-                    "<p>Icons: the Tango icon theme (public domain),<br/>"
+                    "Apache License 2.0.</p>"
+                    "<p>Icons: Tango icon theme, public domain,<br/>"
                     "and drawings of the project's own.</p>")
                 .arg(programVersion(), CORVANE_BUILD_DATE));
     setStandardButtons(QMessageBox::Close);

@@ -15,8 +15,10 @@ namespace {
 InfoColors stripeColors(const QPalette &palette)
 {
     const auto name = [&](QPalette::ColorRole role) { return palette.color(role).name(); };
-    return {name(QPalette::Text), name(QPalette::Base), name(QPalette::Text),
-            name(QPalette::AlternateBase)};
+    // The toolkit's alternate base is too faint for a table without lines.
+    const QColor base = palette.color(QPalette::Base);
+    const QColor stripe = base.lightness() > 127 ? base.darker(108) : base.lighter(130);
+    return {name(QPalette::Text), base.name(), name(QPalette::Text), stripe.name()};
 }
 
 } // namespace
@@ -26,6 +28,8 @@ DlgInfo::DlgInfo(QWidget *parent)
     , m_ui(std::make_unique<Ui::DlgInfo>())
 {
     m_ui->setupUi(this);
+    m_ui->te_Info->document()->setDocumentMargin(12);
+    m_ui->te_Info->document()->setDefaultStyleSheet("td { padding: 3px 6px; }");
     connect(m_ui->cb_close, &QPushButton::clicked, this, &DlgInfo::reject);
     connect(this, &DlgInfo::rejected, this, &DlgInfo::slot_dialog_rejected);
 }

@@ -40,11 +40,6 @@ QString LocalPaneFiles::settingsName() const
     return "local";
 }
 
-QList<int> LocalPaneFiles::defaultColumnWidths() const
-{
-    return {220, 60, 60, 100};
-}
-
 QString LocalPaneFiles::pathOf(const QModelIndex &index) const
 {
     if (!index.isValid()) {

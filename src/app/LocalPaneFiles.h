@@ -15,7 +15,6 @@ public:
 
     [[nodiscard]] bool isLocal() const override { return true; }
     [[nodiscard]] QString settingsName() const override;
-    [[nodiscard]] QList<int> defaultColumnWidths() const override;
     [[nodiscard]] QString pathOf(const QModelIndex &index) const override;
     [[nodiscard]] QModelIndex indexOf(const QString &path) const override;
     void setNameFilters(const QStringList &wildcards) override;

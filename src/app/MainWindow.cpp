@@ -2,6 +2,7 @@
 #include "MainWindow.h"
 
 #include "AboutBox.h"
+#include "LocalFileModel.h"
 #include "QCustomTreeView.h"
 #include "mnemonics.h"
 #include "processage.h"
@@ -11,7 +12,7 @@
 #include "ui_MainWindow.h"
 
 #include <QCloseEvent>
-#include <QFileSystemModel>
+#include <QFileInfo>
 #include <QMessageBox>
 #include <QShortcut>
 #include <QSignalBlocker>
@@ -86,11 +87,7 @@ MainWindow::MainWindow()
     for (Pane &pane : m_panes) {
         pane.filter->addItems({"*.*", "*.wv"});
         connectPane(pane);
-        pane.localModel = std::make_unique<QFileSystemModel>();
-        pane.localModel->setIconProvider(&m_fileIcons);
-        pane.localModel->setRootPath({});
-        pane.localModel->setFilter(QDir::Files | QDir::Drives | QDir::AllDirs | QDir::NoSymLinks |
-                                   QDir::NoDotAndDotDot);
+        pane.localModel = std::make_unique<LocalFileModel>(&m_fileIcons);
     }
     Tracer::Trace(Tracer::Debug,
                   "System root path is " + m_panes[0].localModel->rootDirectory().path());

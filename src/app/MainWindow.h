@@ -11,9 +11,9 @@
 #include <array>
 #include <memory>
 
+class LocalFileModel;
 class QComboBox;
 class QCustomTreeView;
-class QFileSystemModel;
 class QLabel;
 class QSplitter;
 class QToolButton;
@@ -70,7 +70,7 @@ private:
         QLabel *activeMark = nullptr;
         QComboBox *history = nullptr;
         QCustomTreeView *tree = nullptr;
-        std::unique_ptr<QFileSystemModel> localModel;
+        std::unique_ptr<LocalFileModel> localModel;
     };
 
     void buildMenus();

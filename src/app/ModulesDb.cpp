@@ -7,6 +7,8 @@
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
 #include "tools/DlgResample.h"
+#include "tools/DlgView.h"
+#include "tools/DlgWvCreate.h"
 
 #include <QAction>
 #include <QMenu>
@@ -32,6 +34,8 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
 ModulesDb::ModulesDb()
 {
     addTool(std::make_unique<DlgInfo>());
+    addTool(std::make_unique<DlgView>());
+    addTool(std::make_unique<DlgWvCreate>());
     addTool(std::make_unique<DlgResample>());
 }
 
@@ -82,12 +86,20 @@ bool ModulesDb::isAllowed(const DlgBase &tool, const QString &path, bool local)
            (!isFile || tool.extensionAllowed(extension));
 }
 
+QList<DlgBase *> ModulesDb::allAllowed(const QString &path, bool local) const
+{
+    QList<DlgBase *> tools;
+    for (const auto &tool : m_tools) {
+        if (isAllowed(*tool, path, local)) {
+            tools.append(tool.get());
+        }
+    }
+    return tools;
+}
+
 DlgBase *ModulesDb::firstAllowed(const QString &path, bool local) const
 {
-    const auto found = std::find_if(m_tools.begin(), m_tools.end(), [&](const auto &tool) {
-        return isAllowed(*tool, path, local);
-    });
-    return found == m_tools.end() ? nullptr : found->get();
+    return allAllowed(path, local).value(0, nullptr);
 }
 
 bool ModulesDb::start(DlgBase &tool, const QString &path)

@@ -44,6 +44,9 @@ public:
     /// The first tool that accepts an entry; null if there is none.
     [[nodiscard]] DlgBase *firstAllowed(const QString &path, bool local) const;
 
+    /// All tools that accept an entry, in order.
+    [[nodiscard]] QList<DlgBase *> allAllowed(const QString &path, bool local) const;
+
     /// Starts a tool with a path and shows its window. False if the tool can't start; logged.
     bool start(DlgBase &tool, const QString &path);
 

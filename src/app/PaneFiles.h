@@ -28,11 +28,8 @@ public:
     /// Whether the entries lie on the local file system.
     [[nodiscard]] virtual bool isLocal() const = 0;
 
-    /// Name of this side in the keys of the settings, "local".
+    /// Name of this side in the keys of the settings, one of those that ColumnWidths knows.
     [[nodiscard]] virtual QString settingsName() const = 0;
-
-    /// Column widths, in pixels, until the user changes them.
-    [[nodiscard]] virtual QList<int> defaultColumnWidths() const = 0;
 
     /// Path of an entry of the model; empty for an invalid index.
     [[nodiscard]] virtual QString pathOf(const QModelIndex &index) const = 0;

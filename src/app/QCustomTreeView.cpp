@@ -15,16 +15,6 @@
 #include <QMimeData>
 #include <QRegularExpression>
 #include <QScrollBar>
-#include <QSettings>
-
-namespace {
-
-QString widthKey(int pane, const QString &kind, qsizetype section)
-{
-    return QString("tree%1.%2.section%3").arg(pane).arg(kind).arg(section);
-}
-
-} // namespace
 
 QCustomTreeView::QCustomTreeView(QWidget *parent)
     : QTreeView(parent)
@@ -46,6 +36,10 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
     m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
 
+    // The model delivers and sorts folders later, which moves the revealed entry out of sight.
+    m_revealTimer.setSingleShot(true);
+    m_revealTimer.setInterval(0);
+    connect(&m_revealTimer, &QTimer::timeout, this, &QCustomTreeView::revealCurrent);
     connect(verticalScrollBar(), &QScrollBar::actionTriggered, this,
             [this] { m_revealedPath.clear(); });
 }
@@ -85,13 +79,18 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
         return;
     }
     keepColumnWidths();
+    if (this->model()) {
+        this->model()->disconnect(&m_revealTimer);
+    }
     QTreeView::setModel(model);
     m_files = PaneFiles::create(model);
     if (m_files) {
         connect(m_files.get(), &PaneFiles::failed, this, &QCustomTreeView::errMsg);
-        connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::revealCurrent);
+        const auto reveal = qOverload<>(&QTimer::start);
+        connect(model, &QAbstractItemModel::rowsInserted, &m_revealTimer, reveal);
+        connect(model, &QAbstractItemModel::layoutChanged, &m_revealTimer, reveal);
         connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::folderLoaded);
-        applyColumnWidths();
+        m_columnWidths.apply(m_files->settingsName(), *header());
     }
 }
 
@@ -105,59 +104,24 @@ QString QCustomTreeView::currentPath() const
     return m_files ? m_files->pathOf(currentIndex()) : QString();
 }
 
-void QCustomTreeView::keepColumnWidths()
-{
-    if (!m_files) {
-        return;
-    }
-    QList<int> widths;
-    for (int section = 0; section < header()->count(); ++section) {
-        widths.append(header()->sectionSize(section));
-    }
-    m_columnWidths[m_files->settingsName()] = widths;
-}
-
-void QCustomTreeView::applyColumnWidths()
-{
-    QList<int> &widths = m_columnWidths[m_files->settingsName()];
-    if (widths.isEmpty()) {
-        widths = m_files->defaultColumnWidths();
-    }
-    for (int section = 0; section < widths.size() && section < header()->count(); ++section) {
-        header()->resizeSection(section, widths.at(section));
-    }
-}
-
 void QCustomTreeView::writeSettings(QSettings &settings, int pane)
 {
     keepColumnWidths();
-    for (auto kind = m_columnWidths.cbegin(); kind != m_columnWidths.cend(); ++kind) {
-        for (qsizetype section = 0; section < kind.value().size(); ++section) {
-            settings.setValue(widthKey(pane, kind.key(), section), kind.value().at(section));
-        }
-    }
+    m_columnWidths.write(settings, pane);
 }
 
 void QCustomTreeView::readSettings(const QSettings &settings, int pane)
 {
-    const QStringList kinds{"local"};
-    for (const QString &kind : kinds) {
-        QList<int> widths;
-        for (;;) {
-            bool isNumber = false;
-            const int width =
-                settings.value(widthKey(pane, kind, widths.size()), -1).toInt(&isNumber);
-            if (!isNumber || width < 0) {
-                break;
-            }
-            widths.append(width);
-        }
-        if (!widths.isEmpty()) {
-            m_columnWidths[kind] = widths;
-        }
-    }
+    m_columnWidths.read(settings, pane);
     if (m_files) {
-        applyColumnWidths();
+        m_columnWidths.apply(m_files->settingsName(), *header());
+    }
+}
+
+void QCustomTreeView::keepColumnWidths()
+{
+    if (m_files) {
+        m_columnWidths.keep(m_files->settingsName(), *header());
     }
 }
 
@@ -175,9 +139,8 @@ void QCustomTreeView::updateAndExpandTree(const QString &sDir)
         setExpanded(level, true);
     }
     setCurrentIndex(target);
-    // The model delivers the folders later, which moves the entry out of sight again.
     m_revealedPath = m_files->pathOf(target);
-    scrollTo(target);
+    revealCurrent();
 }
 
 void QCustomTreeView::updateAndExpandTree()
@@ -185,10 +148,15 @@ void QCustomTreeView::updateAndExpandTree()
     updateAndExpandTree(currentPath());
 }
 
-void QCustomTreeView::revealCurrent(const QString &folder)
+void QCustomTreeView::revealCurrent()
 {
-    if (!m_revealedPath.isEmpty() && m_revealedPath.startsWith(folder)) {
-        scrollTo(currentIndex());
+    if (m_revealedPath.isEmpty()) {
+        return;
+    }
+    // At the lower edge a folder would hide what it holds, and a file its neighbours.
+    const QRect row = visualRect(currentIndex());
+    if (row.top() < 0 || row.bottom() > viewport()->height() * 2 / 3) {
+        scrollTo(currentIndex(), PositionAtCenter);
     }
 }
 
@@ -430,12 +398,19 @@ void QCustomTreeView::dropEvent(QDropEvent *event)
         event->ignore();
         return;
     }
-    m_dropSource = event->mimeData()->text();
-    m_dropSourceLocal = static_cast<const QCustomTreeView *>(event->source())->isLocal();
-    const QModelIndex target = indexAt(event->position().toPoint());
-    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
     event->acceptProposedAction();
-    m_copyMenu->popup(viewport()->mapToGlobal(event->position().toPoint()));
+    offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
+              event->position().toPoint());
+}
+
+void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QString &path,
+                                const QPoint &position)
+{
+    const QModelIndex target = indexAt(position);
+    m_dropSource = path;
+    m_dropSourceLocal = source.isLocal();
+    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
+    m_copyMenu->popup(viewport()->mapToGlobal(position));
 }
 
 bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const

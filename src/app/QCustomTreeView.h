@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "ColumnWidths.h"
 #include "ModulesDb.h"
 
-#include <QMap>
+#include <QTimer>
 #include <QTreeView>
 
 #include <memory>
@@ -36,6 +37,10 @@ public:
 
     /// Path of the current entry, empty if there is none.
     [[nodiscard]] QString currentPath() const;
+
+    /// Opens the menu that copies an entry of another pane into the folder at a position of the
+    /// viewport, or into that of the file there.
+    void offerCopy(const QCustomTreeView &source, const QString &path, const QPoint &position);
 
     /// Saves and restores the column widths of pane 1 or 2.
     void writeSettings(QSettings &settings, int pane);
@@ -93,8 +98,7 @@ private:
     void addOperation(const QString &text, const QString &picture, const QKeySequence &key,
                       void (QCustomTreeView::*slot)());
     void keepColumnWidths();
-    void applyColumnWidths();
-    void revealCurrent(const QString &folder);
+    void revealCurrent();
     void startFirstTool();
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
     [[nodiscard]] bool acceptsName(const QString &parent, const QString &name,
@@ -105,8 +109,9 @@ private:
     QMenu *m_contextMenu;
     QMenu *m_copyMenu;
     QList<ModulesDb::ToolAction> m_toolActions;
-    QMap<QString, QList<int>> m_columnWidths; ///< by PaneFiles::settingsName()
+    ColumnWidths m_columnWidths;
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
+    QTimer m_revealTimer;
     QString m_dropSource;
     QString m_dropTarget;
     bool m_dropSourceLocal = true;

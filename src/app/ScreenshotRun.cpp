@@ -9,7 +9,9 @@
 #include <QDir>
 #include <QFileInfo>
 #include <QPixmap>
+#include <QPushButton>
 #include <QSettings>
+#include <QStackedWidget>
 #include <QTemporaryDir>
 #include <QTimer>
 
@@ -32,6 +34,11 @@ ScreenshotRun::ScreenshotRun(MainWindow &window, QString folder, const QString &
     , m_folder(std::move(folder))
     , m_file(file.isEmpty() ? QString() : QFileInfo(file).absoluteFilePath())
 {
+    const auto trees = m_window.findChildren<QCustomTreeView *>();
+    for (QCustomTreeView *tree : trees) {
+        connect(tree, &QCustomTreeView::folderLoaded, this,
+                [this, tree](const QString &path) { folderArrived(tree, path); });
+    }
 }
 
 void ScreenshotRun::detachSettings()
@@ -47,29 +54,46 @@ void ScreenshotRun::start()
         finish(1);
         return;
     }
+    if (!m_file.isEmpty() && !QFileInfo::exists(m_file)) {
+        complain(QString("there is no file '%1'").arg(m_file));
+        finish(1);
+        return;
+    }
     m_window.resize(PictureSize);
     QTimer::singleShot(TimeOutMs, this, [this] {
         complain("the panes were not loaded in time");
         finish(1);
     });
-    if (m_file.isEmpty()) {
-        connect(&m_window, &MainWindow::firstPainted, this, &ScreenshotRun::takePictures);
-        return;
-    }
-    const QString folder = QFileInfo(m_file).absolutePath();
-    const auto trees = m_window.findChildren<QCustomTreeView *>();
+    const QString shown = m_file.isEmpty() ? QDir::homePath() : m_file;
+    const QString folder = QFileInfo(shown).path();
     auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
-    for (QCustomTreeView *tree : trees) {
-        tree->updateAndExpandTree(tree == first ? m_file : folder);
-    }
+    auto *second = m_window.findChild<QCustomTreeView *>("tv_dev_2");
+    second->updateAndExpandTree(folder);
+    awaitFolders(*second, folder);
+    first->updateAndExpandTree(shown);
+    awaitFolders(*first, folder);
     first->setFocus();
-    // The second pane is filled later than the first.
-    connect(trees.last(), &QCustomTreeView::folderLoaded, this,
-            [this, folder](const QString &path) {
-                if (QDir(path) == QDir(folder)) {
-                    QTimer::singleShot(0, this, &ScreenshotRun::takePictures);
-                }
-            });
+    m_started = true;
+    folderArrived(nullptr, {});
+}
+
+void ScreenshotRun::awaitFolders(const QCustomTreeView &tree, const QString &path)
+{
+    QDir folder(path);
+    do {
+        m_awaited.insert({&tree, folder.path()});
+    } while (folder.cdUp());
+}
+
+void ScreenshotRun::folderArrived(const QCustomTreeView *tree, const QString &folder)
+{
+    m_arrived.insert({tree, QDir(folder).path()});
+    if (m_started && m_arrived.contains(m_awaited)) {
+        // The views sort, scroll and paint in later turns of the event loop.
+        constexpr int SettleMs = 200;
+        m_started = false;
+        QTimer::singleShot(SettleMs, this, &ScreenshotRun::takePictures);
+    }
 }
 
 void ScreenshotRun::takePictures()
@@ -79,16 +103,51 @@ void ScreenshotRun::takePictures()
     }
     bool done = save(m_window, "main-window.png");
     if (!m_file.isEmpty()) {
-        DlgBase *tool = m_window.modules().firstAllowed(m_file, true);
-        done = done && tool && m_window.modules().start(*tool, m_file) &&
-               save(*tool, "waveform-info.png");
+        const QList<DlgBase *> tools = m_window.modules().allAllowed(m_file, true);
+        for (DlgBase *tool : tools) {
+            done = done && m_window.modules().start(*tool, m_file) && saveTool(*tool);
+            tool->close();
+        }
         if (!done) {
-            complain(QString("no report on '%1'").arg(m_file));
+            complain(QString("not all tools could show '%1'").arg(m_file));
         }
     }
     std::printf("first paint %lld ms after the start\n",
                 static_cast<long long>(m_window.firstPaintMs()));
     finish(done ? 0 : 1);
+}
+
+/// A picture of the tool, or of each of its pages: first those on the way that "Next" leads, as a
+/// user would see them, then the others. Nothing is run, so no file is written.
+bool ScreenshotRun::saveTool(DlgBase &tool) const
+{
+    const QString name = tool.moduleName().toLower().replace(' ', '-');
+    auto *pages = tool.findChild<QStackedWidget *>("sw_assist");
+    auto *next = tool.findChild<QPushButton *>("pb_next");
+    if (!pages || !next) {
+        return save(tool, name + ".png");
+    }
+    QSet<int> taken;
+    const auto take = [&] {
+        const int page = pages->currentIndex();
+        taken.insert(page);
+        return save(tool, QString("%1-%2.png").arg(name).arg(page + 1, 2, 10, QChar('0')));
+    };
+    bool done = take();
+    while (done && next->isEnabled() && next->text().contains("Next")) {
+        next->click();
+        if (taken.contains(pages->currentIndex())) {
+            break;
+        }
+        done = take();
+    }
+    for (int page = 0; page < pages->count() && done; ++page) {
+        if (!taken.contains(page)) {
+            pages->setCurrentIndex(page);
+            done = take();
+        }
+    }
+    return done;
 }
 
 bool ScreenshotRun::save(QWidget &window, const QString &name) const

@@ -2,18 +2,23 @@
 #pragma once
 
 #include <QObject>
+#include <QPair>
+#include <QSet>
 #include <QString>
 
+class DlgBase;
 class MainWindow;
+class QCustomTreeView;
 
-/// Shows a file in the main window, leaves pictures of the window and of the file's report in a
-/// folder and ends the program, for documentation and for machines without a display.
+/// Shows a file in the main window, leaves pictures of the window and of the tools in a folder and
+/// ends the program, for documentation and for machines without a display.
 class ScreenshotRun : public QObject
 {
     Q_OBJECT
 
 public:
-    /// Writes "main-window.png" and, if `file` isn't empty, "waveform-info.png" into `folder`,
+    /// Writes "main-window.png" and, if `file` isn't empty, pictures of all tools that take it,
+    /// such as "waveform-info.png", into `folder`,
     /// which is made when missing. The window must live longer than the run.
     ScreenshotRun(MainWindow &window, QString folder, const QString &file);
 
@@ -25,12 +30,18 @@ public:
     void start();
 
 private:
+    void awaitFolders(const QCustomTreeView &tree, const QString &path);
+    void folderArrived(const QCustomTreeView *tree, const QString &folder);
     void takePictures();
+    [[nodiscard]] bool saveTool(DlgBase &tool) const;
     [[nodiscard]] bool save(QWidget &window, const QString &name) const;
     void finish(int status);
 
     MainWindow &m_window;
     QString m_folder;
-    QString m_file; ///< absolute, empty for none
+    QString m_file;                                          ///< absolute, empty for none
+    QSet<QPair<const QCustomTreeView *, QString>> m_arrived; ///< folders that the panes know
+    QSet<QPair<const QCustomTreeView *, QString>> m_awaited; ///< folders that the picture needs
+    bool m_started = false;
     bool m_finished = false;
 };

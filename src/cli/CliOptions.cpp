@@ -60,20 +60,36 @@ double parse(const std::string &name, const std::string &text, const NumberRange
                                    .toStdString());
 }
 
-/// A file with one longer text can't be read at all.
+/// A longer text can be written, but the file can't be read again; so the user is told.
 QString parseTagText(const std::string &name, const std::string &text)
 {
     constexpr qsizetype maxLength = 1024;
     QString tag = QString::fromLocal8Bit(text);
     const qsizetype length = stripBraces(tag).size();
     if (length > maxLength) {
-        throw CLI::ValidationError(QString("%1: %2 characters are too many; permitted: up to %3")
-                                       .arg(QString::fromStdString(name))
-                                       .arg(length)
-                                       .arg(maxLength)
-                                       .toStdString());
+        Tracer::Trace(Tracer::Warning,
+                      QString("%1: a file with a text of more than %2 characters can't be read; "
+                              "this one has %3.")
+                          .arg(QString::fromStdString(name))
+                          .arg(maxLength)
+                          .arg(length));
     }
     return tag;
+}
+
+/// An option whose number goes to `take`.
+template <typename Take>
+CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberRange &range,
+                       bool whole, const std::string &help, Take take)
+{
+    return command
+        .add_option_function<std::string>(
+            name,
+            [name, range, whole, take](const std::string &text) {
+                take(parse(name, text, range, whole));
+            },
+            help)
+        ->type_name(whole ? "COUNT" : "NUMBER");
 }
 
 } // namespace
@@ -81,23 +97,20 @@ QString parseTagText(const std::string &name, const std::string &text)
 CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional<double> &value,
                        const NumberRange &range, const std::string &help)
 {
-    return command
-        .add_option_function<std::string>(
-            name,
-            [&value, name, range](const std::string &text) {
-                value = parse(name, text, range, false);
-            },
-            help)
-        ->type_name("NUMBER");
+    return addParsed(command, name, range, false, help, [&value](double v) { value = v; });
 }
 
 CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<qint64> &value,
                         const NumberRange &range, const std::string &help)
 {
-    const auto take = [&value, name, range](const std::string &text) {
-        value = static_cast<qint64>(parse(name, text, range, true));
-    };
-    return command.add_option_function<std::string>(name, take, help)->type_name("COUNT");
+    return addParsed(command, name, range, true, help,
+                     [&value](double v) { value = static_cast<qint64>(v); });
+}
+
+CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<double> &value,
+                        const NumberRange &range, const std::string &help)
+{
+    return addParsed(command, name, range, true, help, [&value](double v) { value = v; });
 }
 
 CLI::Option *addText(CLI::App &command, const std::string &name, QString &value,

@@ -31,6 +31,10 @@ CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional
 CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<qint64> &value,
                         const NumberRange &range, const std::string &help);
 
+/// As above, for a number of which only whole values make sense.
+CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<double> &value,
+                        const NumberRange &range, const std::string &help);
+
 /// Adds a text option or file argument; texts are taken in the encoding of the terminal.
 CLI::Option *addText(CLI::App &command, const std::string &name, QString &value,
                      const std::string &help);

@@ -8,13 +8,11 @@
 #include "display/renderplot.h"
 #include "jobs/SampleReadJob.h"
 
-#include <QFileInfo>
 #include <QImageWriter>
 #include <QRegularExpression>
 
-#include <algorithm>
 #include <atomic>
-#include <vector>
+#include <span>
 
 namespace {
 
@@ -29,7 +27,41 @@ struct PlotArguments
     bool force = false;
 };
 
-/// Reads the samples and paints them as the viewer's display would.
+/// The samples of a file, with the progress and the cancel of a job.
+class PlotSource : public StreamSource
+{
+public:
+    PlotSource(ToolJob &job, SourceWaveform &source, qint64 first, qint64 count)
+        : StreamSource(*source.data(), *source.markers(), first, count)
+        , m_job(job)
+        , m_progress([&job](int percent) { emit job.ProgressUpdate(percent); }, m_never)
+    {
+    }
+
+    [[nodiscard]] bool restart() override
+    {
+        m_done = 0;
+        return StreamSource::restart();
+    }
+
+    [[nodiscard]] bool next(std::span<IqSample> samples, std::span<quint8> markers) override
+    {
+        // The tick lets the interrupt through, which the job then knows of.
+        if (m_progress.shouldStop(m_done, count()) || m_job.isCancelled()) {
+            return Tracer::fail("Action aborted by user.");
+        }
+        m_done += static_cast<qint64>(samples.size());
+        return StreamSource::next(samples, markers);
+    }
+
+private:
+    ToolJob &m_job;
+    const std::atomic<bool> m_never{false};
+    ProgressClock m_progress;
+    qint64 m_done = 0;
+};
+
+/// Paints a range of a file as the viewer's display would.
 class PlotJob : public SampleReadJob
 {
 public:
@@ -42,58 +74,24 @@ public:
 protected:
     [[nodiscard]] bool process(SourceWaveform &source, qint64 begin, qint64 count) override
     {
-        if (!fetch(source, begin, count)) {
-            return false;
-        }
         PlotRequest request;
         request.view = static_cast<PlotView>(m_arguments.view);
-        request.samples = m_samples;
-        request.markers = m_markers;
-        request.firstSample = begin;
         request.clockHz = source.info().clock;
         request.size = m_arguments.size;
         request.showMarkers = m_arguments.markers;
+        PlotSource samples(*this, source, begin, count);
+        emit stepStarted("Painting...");
+        const QImage picture = renderPlot(request, samples);
+        if (picture.isNull()) {
+            return false;
+        }
         QImageWriter writer(m_arguments.output, "png");
-        return writer.write(renderPlot(request)) ||
+        return writer.write(picture) ||
                Tracer::fail("Cannot write '" + m_arguments.output + "': " + writer.errorString());
     }
 
 private:
-    [[nodiscard]] bool fetch(SourceWaveform &source, qint64 begin, qint64 count)
-    {
-        if (!source.data()->restartAtPosition(BufferedIO::HeaderSize +
-                                              begin * BufferedIO::RecordSize) ||
-            !source.markers()->restartAtPosition(begin)) {
-            return Tracer::fail("Cannot set I/Q data stream start position.");
-        }
-        m_samples.resize(static_cast<size_t>(count));
-        m_markers.resize(static_cast<size_t>(count));
-        constexpr qint64 blockSamples = 64 * 1024;
-        std::vector<float> values(2 * static_cast<size_t>(std::min(count, blockSamples)));
-        const std::atomic<bool> never{false};
-        ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, never);
-        for (qint64 done = 0; done < count;) {
-            if (progress.shouldStop(done, count) || isCancelled()) {
-                return Tracer::fail("Action aborted by user.");
-            }
-            const auto wanted = static_cast<int>(std::min(count - done, blockSamples));
-            const int bytes = wanted * BufferedIO::RecordSize;
-            if (source.data()->readBlock(bytes, values.data()) != bytes ||
-                source.markers()->readBlock(wanted, m_markers.data() + done) != wanted) {
-                return Tracer::fail("Cannot read I/Q data.");
-            }
-            for (int i = 0; i < wanted; ++i) {
-                const auto at = 2 * static_cast<size_t>(i);
-                m_samples[static_cast<size_t>(done + i)] = {values[at], values[at + 1]};
-            }
-            done += wanted;
-        }
-        return true;
-    }
-
     const PlotArguments &m_arguments;
-    std::vector<IqSample> m_samples;
-    std::vector<quint8> m_markers;
 };
 
 int runPlot(PlotArguments &arguments)

@@ -18,6 +18,7 @@ struct CommandSet
 
 void addFileCommands(CommandSet &commands);
 void addPlotCommand(CommandSet &commands);
+void addCreateCommands(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);

@@ -71,6 +71,7 @@ int main(int argc, char **argv)
     CommandSet commands{app, console, action};
     addFileCommands(commands);
     addPlotCommand(commands);
+    addCreateCommands(commands);
     addEditCommands(commands);
     addImportCommands(commands);
     addInstrumentCommands(commands);

@@ -108,7 +108,7 @@ bool CWidgetBase::savePicture(const QString &fileName)
                            [this](QPainter &painter) { drawPlot(painter, QRectF(rect())); });
 }
 
-bool CWidgetBase::saveData(const QString &fileName) const
+bool CWidgetBase::saveData(const QString &fileName)
 {
     return savePlotData(fileName, [this](QTextStream &stream) { writeData(stream); });
 }
@@ -138,7 +138,7 @@ void CWidgetBase::chooseDataFile()
     }
 }
 
-void CWidgetBase::writeData(QTextStream &) const {}
+void CWidgetBase::writeData(QTextStream &) {}
 
 void CWidgetBase::extendContextMenu(QMenu &) {}
 

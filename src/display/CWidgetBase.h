@@ -61,7 +61,7 @@ public:
     [[nodiscard]] bool savePicture(const QString &fileName);
 
     /// Saves the shown data as CSV. Same failures.
-    [[nodiscard]] bool saveData(const QString &fileName) const;
+    [[nodiscard]] bool saveData(const QString &fileName);
 
     [[nodiscard]] QSize sizeHint() const override { return {400, 300}; }
     [[nodiscard]] QSize minimumSizeHint() const override { return {200, 120}; }
@@ -76,7 +76,7 @@ protected:
     virtual void drawPlot(QPainter &painter, const QRectF &area) = 0;
 
     /// Writes the shown data as CSV with a header line; nothing when there are none.
-    virtual void writeData(QTextStream &stream) const;
+    virtual void writeData(QTextStream &stream);
     [[nodiscard]] virtual bool hasData() const { return false; }
 
     /// Adds the entries of the derived display above those of the base.

@@ -78,7 +78,7 @@ void CWidgetConstellation::drawPlot(QPainter &painter, const QRectF &area)
     ConstellationPainter(plotStyle(), m_scene).paint(painter, area);
 }
 
-void CWidgetConstellation::writeData(QTextStream &stream) const
+void CWidgetConstellation::writeData(QTextStream &stream)
 {
     writeSampleTable(stream, m_samples, {}, 0);
 }

@@ -30,7 +30,7 @@ public slots:
 
 protected:
     void drawPlot(QPainter &painter, const QRectF &area) override;
-    void writeData(QTextStream &stream) const override;
+    void writeData(QTextStream &stream) override;
     [[nodiscard]] bool hasData() const override { return !m_samples.isEmpty(); }
     void extendContextMenu(QMenu &menu) override;
     void mouseMoveEvent(QMouseEvent *event) override;

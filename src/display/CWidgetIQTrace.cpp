@@ -109,7 +109,7 @@ void CWidgetIQTrace::drawPlot(QPainter &painter, const QRectF &area)
     TracePainter(plotStyle(), m_scene).paint(painter, area);
 }
 
-void CWidgetIQTrace::writeData(QTextStream &stream) const
+void CWidgetIQTrace::writeData(QTextStream &stream)
 {
     writeSampleTable(stream, m_samples, m_markers, m_firstSample);
 }

@@ -54,7 +54,7 @@ signals:
 
 protected:
     void drawPlot(QPainter &painter, const QRectF &area) override;
-    void writeData(QTextStream &stream) const override;
+    void writeData(QTextStream &stream) override;
     [[nodiscard]] bool hasData() const override { return !m_samples.isEmpty(); }
     void mousePressEvent(QMouseEvent *event) override;
     void mouseMoveEvent(QMouseEvent *event) override;

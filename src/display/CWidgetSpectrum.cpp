@@ -125,9 +125,9 @@ void CWidgetSpectrum::drawPlot(QPainter &painter, const QRectF &area)
     SpectrumPainter(plotStyle(), m_scene).paint(painter, area);
 }
 
-void CWidgetSpectrum::writeData(QTextStream &stream) const
+void CWidgetSpectrum::writeData(QTextStream &stream)
 {
-    writeSpectrumTable(stream, m_scene);
+    writeSpectrumTable(stream, scene());
 }
 
 void CWidgetSpectrum::extendContextMenu(QMenu &menu)

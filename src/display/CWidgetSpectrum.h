@@ -39,8 +39,11 @@ public slots:
 
 protected:
     void drawPlot(QPainter &painter, const QRectF &area) override;
-    void writeData(QTextStream &stream) const override;
-    [[nodiscard]] bool hasData() const override { return !m_scene.lines.lines().empty(); }
+    void writeData(QTextStream &stream) override;
+    [[nodiscard]] bool hasData() const override
+    {
+        return m_samples.size() >= SpectrumLines::FrameSize;
+    }
     void extendContextMenu(QMenu &menu) override;
     void mouseMoveEvent(QMouseEvent *event) override;
     void leaveEvent(QEvent *event) override;

@@ -5,7 +5,7 @@
 #include "log/Tracer.h"
 
 #include <algorithm>
-#include <vector>
+#include <utility>
 
 namespace {
 
@@ -45,11 +45,13 @@ bool MemorySource::next(std::span<IqSample> samples, std::span<quint8> markers)
     return true;
 }
 
-StreamSource::StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, qint64 count)
+StreamSource::StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, qint64 count,
+                           Proceed proceed)
     : m_data(data)
     , m_markers(markers)
     , m_first(first)
     , m_count(count)
+    , m_proceed(std::move(proceed))
 {
 }
 
@@ -61,21 +63,26 @@ bool StreamSource::restart()
     if (!m_markers.restartAtPosition(m_first)) {
         return fail("Cannot read marker data from temporary file.");
     }
+    m_done = 0;
     return true;
 }
 
 bool StreamSource::next(std::span<IqSample> samples, std::span<quint8> markers)
 {
-    std::vector<float> iq(2 * samples.size());
-    if (readSamples(m_data, iq) != static_cast<int>(samples.size())) {
+    if (m_proceed && !m_proceed(m_done)) {
+        return false;
+    }
+    m_block.resize(2 * samples.size());
+    if (readSamples(m_data, m_block) != static_cast<int>(samples.size())) {
         return fail("Cannot read I/Q data from temporary file.");
     }
     for (std::size_t k = 0; k < samples.size(); ++k) {
-        samples[k] = {iq[2 * k], iq[2 * k + 1]};
+        samples[k] = {m_block[2 * k], m_block[2 * k + 1]};
     }
     const int markerCount = static_cast<int>(markers.size());
     if (m_markers.readBlock(markerCount, markers.data()) != markerCount) {
         return fail("Cannot read marker data from temporary file.");
     }
+    m_done += static_cast<qint64>(samples.size());
     return true;
 }

@@ -5,7 +5,9 @@
 
 #include <QtGlobal>
 
+#include <functional>
 #include <span>
+#include <vector>
 
 class BufferedIO;
 
@@ -49,7 +51,12 @@ private:
 class StreamSource : public SampleSource
 {
 public:
-    StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, qint64 count);
+    /// Asked before each block with the number of samples handed out; false ends the reading
+    /// without a message.
+    using Proceed = std::function<bool(qint64 done)>;
+
+    StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, qint64 count,
+                 Proceed proceed = {});
 
     [[nodiscard]] qint64 count() const override { return m_count; }
     [[nodiscard]] qint64 first() const override { return m_first; }
@@ -61,4 +68,7 @@ private:
     BufferedIO &m_markers;
     qint64 m_first;
     qint64 m_count;
+    Proceed m_proceed;
+    qint64 m_done = 0;
+    std::vector<float> m_block;
 };

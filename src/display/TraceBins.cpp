@@ -1,17 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "TraceBins.h"
 
+#include "dsp/vectorclones.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <cstring>
-
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) &&                             \
-    !defined(__SANITIZE_ADDRESS__)
-#define CLONES __attribute__((target_clones("default", "arch=x86-64-v3", "arch=x86-64-v4")))
-#else
-#define CLONES
-#endif
 
 namespace {
 
@@ -43,7 +38,7 @@ struct Block
 /// atan(x) for x from 0 to 1. Arguments above tan(pi/8) are brought down by the addition theorem,
 /// the rest is a polynomial through Chebyshev nodes; the error is below 3e-16. It has no branch, so
 /// that the loop over samples vectorises, which a call of atan2 would prevent.
-inline double arcTangent(double smaller, double larger)
+CORVANE_INLINE double arcTangent(double smaller, double larger)
 {
     const bool upper = smaller > TanPiOver8 * larger;
     const double numerator = upper ? smaller - larger : smaller;
@@ -64,7 +59,7 @@ inline double arcTangent(double smaller, double larger)
 }
 
 /// Magnitude, phase and phase step of `count` samples.
-inline void analyse(const IqSample *samples, int count, Block &block)
+CORVANE_INLINE void analyse(const IqSample *samples, int count, Block &block)
 {
     for (int k = 0; k < count; ++k) {
         const double i = samples[k].i;
@@ -113,13 +108,13 @@ constexpr int ChunkSize = LaneCount * RowCount;
 using Lanes = double __attribute__((vector_size(LaneCount * sizeof(double))));
 using Rows = std::array<Lanes, RowCount>;
 
-inline void load(const double *values, Rows &rows)
+CORVANE_INLINE void load(const double *values, Rows &rows)
 {
     std::memcpy(rows.data(), values, sizeof(rows));
 }
 
 /// Least and greatest of `count` values and of the range so far.
-inline Range widen(Range range, const double *values, int count)
+CORVANE_INLINE Range widen(Range range, const double *values, int count)
 {
     int k = 0;
     if (count >= ChunkSize) {
@@ -148,7 +143,7 @@ inline Range widen(Range range, const double *values, int count)
     return range;
 }
 
-inline double sumOf(const double *values, int count)
+CORVANE_INLINE double sumOf(const double *values, int count)
 {
     Rows sums{};
     int k = 0;
@@ -167,7 +162,7 @@ inline double sumOf(const double *values, int count)
     return sum;
 }
 
-inline void foldMarkers(TraceBin &bin, std::span<const quint8> markers)
+CORVANE_INLINE void foldMarkers(TraceBin &bin, std::span<const quint8> markers)
 {
     unsigned high = 0;
     unsigned low = 0;
@@ -180,7 +175,7 @@ inline void foldMarkers(TraceBin &bin, std::span<const quint8> markers)
 }
 
 /// Folds `count` analysed samples into their bin. `sum` is the bin's sum of magnitudes.
-inline void fold(TraceBin &bin, const Block &block, int count, double &sum)
+CORVANE_INLINE void fold(TraceBin &bin, const Block &block, int count, double &sum)
 {
     const bool first = bin.count == 0;
     const auto range = [&block, count, first](const std::array<double, Block::Size> &values,
@@ -235,7 +230,8 @@ void TraceBins::begin(qint64 total)
     }
 }
 
-CLONES void TraceBins::append(std::span<const IqSample> samples, std::span<const quint8> markers)
+CORVANE_VECTOR_CLONES void TraceBins::append(std::span<const IqSample> samples,
+                                             std::span<const quint8> markers)
 {
     if (m_total < MinSamples) {
         return;

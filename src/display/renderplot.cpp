@@ -197,6 +197,12 @@ QImage renderPlot(const PlotRequest &request, SampleSource &source)
     return done ? image : QImage();
 }
 
+QImage renderPlot(const PlotRequest &request)
+{
+    MemorySource source(request.samples, request.markers, request.firstSample);
+    return renderPlot(request, source);
+}
+
 double constellationScale(double peak)
 {
     if (!(peak > 0) || !std::isfinite(peak)) {

@@ -37,10 +37,14 @@ enum class PlotView {
 struct PlotRequest
 {
     PlotView view = PlotView::Iq;
-    double clockHz = 0;       ///< 0 labels the axes in samples
-    QSize size{800, 600};     ///< logical pixels
-    double pixelRatio = 1;    ///< device pixels to a logical one
-    bool showMarkers = false; ///< the marker rows, in the views over time
+    // The samples, for the form of renderPlot that takes them from here.
+    std::span<const IqSample> samples;
+    std::span<const quint8> markers; ///< may be shorter than the samples
+    qint64 firstSample = 0;          ///< position of the first one in the waveform
+    double clockHz = 0;              ///< 0 labels the axes in samples
+    QSize size{800, 600};            ///< logical pixels
+    double pixelRatio = 1;           ///< device pixels to a logical one
+    bool showMarkers = false;        ///< the marker rows, in the views over time
 };
 
 /// The picture that the display of this view would show of the samples. Reads them block by block,
@@ -48,6 +52,9 @@ struct PlotRequest
 /// (the "offscreen" platform will do), but no display. A null image if the size is empty or, after
 /// a line in the log, if the source fails.
 [[nodiscard]] QImage renderPlot(const PlotRequest &request, SampleSource &source);
+
+/// As above, of the samples in the request.
+[[nodiscard]] QImage renderPlot(const PlotRequest &request);
 
 /// As renderPlot, into a part of any painter; size and pixel ratio of the request don't count.
 /// False if the source fails.

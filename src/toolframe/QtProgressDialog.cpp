@@ -88,6 +88,7 @@ QtProgressDialog::QtProgressDialog(const QString &labelText, QWidget *parent,
     connect(&m_delay, &QTimer::timeout, this, &QtProgressDialog::appear);
     connect(&m_clock, &QTimer::timeout, this, &QtProgressDialog::showTimes);
     m_delay.setSingleShot(true);
+    m_delay.setTimerType(Qt::PreciseTimer);
     m_delay.start(DelayMs);
     m_sinceStart.start();
     m_sinceStep.start();

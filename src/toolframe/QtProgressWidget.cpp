@@ -68,8 +68,12 @@ void QtProgressWidget::paintEvent(QPaintEvent * /*event*/)
     painter.fillRect(filled, highlight);
     painter.setPen(Qt::NoPen);
     painter.setBrush(highlight.lighter(118));
-    const qreal shift = m_phase % static_cast<int>(2 * StripeWidth);
-    for (qreal x = -2 * StripeWidth - bar.height() + shift; x < bar.right(); x += 2 * StripeWidth) {
+    // Slanted by the height of the bar, so the first begins that far to the left.
+    const int period = static_cast<int>(2 * StripeWidth);
+    const qreal first = m_phase % period - period - bar.height();
+    const int count = static_cast<int>((bar.width() + bar.height()) / period) + 2;
+    for (int i = 0; i < count; ++i) {
+        const qreal x = first + i * period;
         painter.drawPolygon(QPolygonF({{x, bar.bottom()},
                                        {x + StripeWidth, bar.bottom()},
                                        {x + StripeWidth + bar.height(), bar.top()},
@@ -83,6 +87,7 @@ void QtProgressWidget::paintEvent(QPaintEvent * /*event*/)
     }
     // The text changes its colour where the filled part ends, so that it can be read on both.
     const QString text = QString("%1 %").arg(m_value);
+    painter.setClipRect(bar.adjusted(filled.width(), 0, 0, 0));
     painter.setPen(palette().color(QPalette::Text));
     painter.drawText(bar, Qt::AlignCenter, text);
     painter.setClipRect(filled);

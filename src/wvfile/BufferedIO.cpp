@@ -291,13 +291,16 @@ bool BufferedIO::restartAtBegining()
     if (m_debug) {
         debug(Tracer::Debug, "restartAtBegining()");
     }
+    return restart() && (!m_readBuffer || firstFill());
+}
+
+bool BufferedIO::restart()
+{
     if (!isUsable() || (m_writeBuffer && !flush()) || !m_device->seek(0)) {
         return false;
     }
     m_readPosition = -1;
-    if (m_readBuffer && !firstFill()) {
-        return false;
-    }
+    m_bytesInReadBuffer = 0;
     m_readIndex = 0;
     m_writeFill = 0;
     m_writePosition = -1;
@@ -309,12 +312,11 @@ bool BufferedIO::restartAtPosition(qint64 position)
     if (m_debug) {
         debug(Tracer::Debug, "restartAtPosition()");
     }
-    if (!restartAtBegining() || !m_device->seek(position)) {
+    // The first block isn't read: jumps through long streams would read it each time for nothing.
+    if (!restart() || !m_device->seek(position)) {
         return false;
     }
     m_readPosition = position;
-    m_readIndex = 0;
-    m_bytesInReadBuffer = 0;
     return true;
 }
 

@@ -91,6 +91,7 @@ public:
 
 private:
     [[nodiscard]] bool firstFill();
+    [[nodiscard]] bool restart();
     [[nodiscard]] bool flush();
     [[nodiscard]] bool writeToDevice(const char *bytes, int count);
     [[nodiscard]] bool seekForWrite();

@@ -40,6 +40,15 @@ public:
                                           : NoByte;
     }
 
+    /// The next bytes as far as they are at hand; may be empty before the end of the file.
+    [[nodiscard]] std::span<const char> buffered() const
+    {
+        return {m_buffer.constData() + m_index, static_cast<size_t>(m_fill - m_index)};
+    }
+
+    /// Steps over the first `count` of the buffered bytes.
+    void take(size_t count) { m_index += static_cast<int>(count); }
+
     /// Moves to a byte position, which is held within the file.
     [[nodiscard]] bool seek(qint64 position);
 

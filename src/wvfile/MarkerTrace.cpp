@@ -8,20 +8,28 @@
 #include "log/Tracer.h"
 
 #include <algorithm>
+#include <charconv>
+#include <vector>
 
 namespace {
 
 constexpr qint64 blockSize = 256 * 1024;
 
-/// A file can repeat its lists at will; each costs a pass over the stream. This many passes over
+/// A file can repeat its lists at will; each costs a pass over the bytes. This many passes over
 /// the longest possible stream are far beyond any honest file and still proportional to its size.
 constexpr qint64 maxPasses = 64;
+
+/// Transitions between two looks at the clock.
+constexpr int transitionsPerTick = 1024;
+
+constexpr const char *abortText = "Action aborted by user.";
 
 } // namespace
 
 MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit, ProgressClock &progress)
     : m_stream(stream)
     , m_progress(progress)
+    , m_store(stream, progress)
     , m_fileLimit(fileLimit)
     , m_workLeft(maxPasses * std::max<qint64>(fileLimit, BufferedIO::BufferSize / maxPasses))
 {
@@ -31,9 +39,6 @@ MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit, ProgressClock &pr
 bool MarkerTrace::spendWork(qint64 bytes)
 {
     m_workLeft -= bytes;
-    if (m_progress.shouldStop(0)) {
-        return Tracer::fail("Action aborted by user.");
-    }
     return m_workLeft >= 0 ||
            Tracer::fail(
                "Too many MARKER LIST tags: their positions exceed what a file of this size can "
@@ -47,32 +52,72 @@ bool MarkerTrace::mergeList(ByteSource &source, const QString &name)
     if (!isNumber || marker < 1 || marker > MarkerCount) {
         return Tracer::fail("Invalid MARKER LIST tag. Index range is 1-4.");
     }
-    // A restart reads the stream's first block again.
-    if (!spendWork(std::min<qint64>(m_written, BufferedIO::BufferSize))) {
+    if (!spendWork(m_store.passCost())) {
         return false;
     }
-    if (!m_stream.restartAtBegining()) {
+    if (!m_store.restart()) {
         return Tracer::fail("Restarting marker data stream failed.");
     }
     List list;
     list.name = name;
     list.bit = static_cast<quint8>(1U << (marker - 1));
+    Transition transition;
     TagText token;
-    do {
-        if (!source.readText(';', token)) {
-            return Tracer::fail("Error in MARKER LIST tag.");
+    for (int count = 1; !transition.endedOnBrace; ++count) {
+        if (count % transitionsPerTick == 0 && m_progress.shouldStop(0)) {
+            return Tracer::fail(abortText);
         }
-        if (token.text.isEmpty()) {
-            break;
+        if (!takeTransition(source, transition)) {
+            if (!source.readText(';', token)) {
+                return Tracer::fail("Error in MARKER LIST tag.");
+            }
+            if (token.text.isEmpty()) {
+                break;
+            }
+            if (!parseToken(list, token.text, transition)) {
+                return false;
+            }
+            transition.endedOnBrace = token.endedOnBrace;
         }
-        if (!applyTransition(list, token.text)) {
+        if (!applyTransition(list, transition)) {
             return false;
         }
-    } while (!token.endedOnBrace);
+    }
     return completeList(list);
 }
 
-bool MarkerTrace::applyTransition(List &list, const QString &token)
+/// Takes a transition in its plain form, "12:1;" or "12:1}", straight from the buffer; that is what
+/// long lists consist of. False, and nothing taken, for whatever else stands there.
+bool MarkerTrace::takeTransition(ByteSource &source, Transition &transition)
+{
+    const std::span<const char> bytes = source.buffered();
+    const char *const end = bytes.data() + bytes.size();
+    const auto number = [end](const char *begin, auto &value) -> const char * {
+        // A sign is left to the general form.
+        if (begin == end || *begin < '0' || *begin > '9') {
+            return nullptr;
+        }
+        const auto [behind, error] = std::from_chars(begin, end, value);
+        return error == std::errc() && behind != end ? behind : nullptr;
+    };
+    const char *at = bytes.data();
+    while (at != end && *at == ' ') {
+        ++at;
+    }
+    at = number(at, transition.position);
+    if (at == nullptr || *at != ':') {
+        return false;
+    }
+    at = number(at + 1, transition.state);
+    if (at == nullptr || (*at != ';' && *at != '}')) {
+        return false;
+    }
+    transition.endedOnBrace = *at == '}';
+    source.take(static_cast<size_t>(at + 1 - bytes.data()));
+    return true;
+}
+
+bool MarkerTrace::parseToken(const List &list, const QString &token, Transition &transition)
 {
     const auto failWithToken = [&](const char *reason) {
         Tracer::Trace(Tracer::Error, reason);
@@ -83,33 +128,36 @@ bool MarkerTrace::applyTransition(List &list, const QString &token)
     }
     bool isPosition = false;
     bool isState = false;
-    const qint64 position = token.section(':', 0, 0).simplified().toLongLong(&isPosition);
-    const int state = token.section(':', 1, 1).simplified().toInt(&isState);
-    if (!isPosition || !isState) {
-        return failWithToken("Invalid MARKER LIST tag data.");
-    }
-    const quint8 next = state == 1 ? list.bit : quint8(0);
+    transition.position = token.section(':', 0, 0).simplified().toLongLong(&isPosition);
+    transition.state = token.section(':', 1, 1).simplified().toInt(&isState);
+    return (isPosition && isState) || failWithToken("Invalid MARKER LIST tag data.");
+}
+
+bool MarkerTrace::applyTransition(List &list, const Transition &transition)
+{
+    const qint64 position = transition.position;
+    const quint8 next = transition.state == 1 ? list.bit : quint8(0);
     if (!positionIsValid(list, position, next)) {
         return false;
     }
     if (position == list.pos - 1) {
         // The same position once more, with the same state: the byte handled last goes out again
         // at the next position.
-        if (!spendWork(1) || !appendRun(list.pos, 1, list.byte)) {
+        if (!spendWork(1)) {
             return false;
         }
-        ++list.pos;
     } else {
         if (!walkTo(list, position)) {
             return false;
         }
         list.current = next;
         list.byte |= next;
-        if (!appendRun(position, 1, list.byte)) {
-            return false;
-        }
-        list.pos = position + 1;
+        list.pos = position;
     }
+    if (!report(m_store.write(1, list.byte), Part::Walk, position)) {
+        return false;
+    }
+    ++list.pos;
     if (list.pos > m_written) {
         m_written = list.pos;
         m_lastByte = list.byte;
@@ -143,32 +191,45 @@ bool MarkerTrace::walkTo(List &list, qint64 position)
         return false;
     }
     const qint64 rewriteEnd = std::clamp(m_written, list.pos, position);
-    if (!rewriteRun(list.pos, rewriteEnd, list.current, Run::Walk, position)) {
+    if (!report(m_store.copy(rewriteEnd - list.pos, list.current), Part::Walk, position)) {
         return false;
     }
+    const auto carried = static_cast<quint8>(m_lastByte & ~list.bit);
     if (rewriteEnd < position) {
         noteCutByExtension(list);
-        const auto carried = static_cast<quint8>((m_lastByte & ~list.bit) | list.current);
-        if (!appendRun(rewriteEnd, position - rewriteEnd, carried)) {
+        if (!report(m_store.write(position - rewriteEnd, carried | list.current), Part::Walk,
+                    position)) {
             return false;
         }
     }
-    return takeOldByte(list, position, list.byte);
+    list.byte = carried;
+    return position >= m_written || report(m_store.read(list.byte), Part::Walk, position);
 }
 
-bool MarkerTrace::takeOldByte(const List &list, qint64 position, quint8 &byte)
+bool MarkerTrace::report(MarkerStore::Result result, Part part, qint64 target) const
 {
-    if (position >= m_written) {
-        byte = static_cast<quint8>(m_lastByte & ~list.bit);
+    const qint64 position = m_store.failedAt();
+    switch (result) {
+    case MarkerStore::Result::Done:
         return true;
+    case MarkerStore::Result::Cancelled:
+        return Tracer::fail(abortText);
+    case MarkerStore::Result::CannotWrite:
+        return Tracer::fail((part == Part::LowCompletion
+                                 ? QString("Writing marker stream failed at position %1")
+                                 : QString(" Cannot write to marker file at position %1"))
+                                .arg(position));
+    case MarkerStore::Result::CannotRead:
+        break;
     }
-    return m_stream.readBytes(1, &byte) || failToRead(position, position);
-}
-
-bool MarkerTrace::failToRead(qint64 position, qint64 target) const
-{
-    Tracer::Trace(Tracer::Error,
-                  QString(" Cannot read from marker file at position %1").arg(position));
+    if (part == Part::LowCompletion) {
+        return Tracer::fail(QString("Reading marker stream failed at position %1").arg(position));
+    }
+    const QString text = QString(" Cannot read from marker file at position %1").arg(position);
+    if (part == Part::HighCompletion) {
+        return Tracer::fail(text);
+    }
+    Tracer::Trace(Tracer::Error, text);
     Tracer::Trace(Tracer::Error, QString("       Previously written bytes: %1").arg(m_written));
     return Tracer::fail(QString("       Target position: %1").arg(target));
 }
@@ -191,13 +252,14 @@ bool MarkerTrace::completeList(List &list)
                                          .arg(list.pos));
     }
     if (list.pos < m_written) {
-        if (debug && list.current != 0) {
+        const bool high = list.current != 0;
+        if (debug && high) {
             Tracer::Trace(Tracer::Debug,
                           QString("Completing marker trace up to pos. %1").arg(m_written));
         }
         if (!spendWork(m_written - list.pos) ||
-            !rewriteRun(list.pos, m_written, list.current,
-                        list.current != 0 ? Run::HighCompletion : Run::LowCompletion, m_written)) {
+            !report(m_store.copy(m_written - list.pos, list.current),
+                    high ? Part::HighCompletion : Part::LowCompletion, m_written)) {
             return false;
         }
     }
@@ -208,54 +270,9 @@ bool MarkerTrace::completeList(List &list)
     return true;
 }
 
-bool MarkerTrace::rewriteRun(qint64 begin, qint64 end, quint8 mask, Run run, qint64 target)
+bool MarkerTrace::finishLists()
 {
-    m_block.resize(static_cast<size_t>(std::min(std::max<qint64>(end - begin, 1), blockSize)));
-    for (qint64 pos = begin; pos < end;) {
-        if (m_progress.shouldStop(0)) {
-            return Tracer::fail("Action aborted by user.");
-        }
-        const int wanted = static_cast<int>(std::min(end - pos, blockSize));
-        const int got = m_stream.readBlock(wanted, m_block.data());
-        if (got < wanted) {
-            const qint64 position = pos + std::max(got, 0);
-            switch (run) {
-            case Run::Walk:
-                return failToRead(position, target);
-            case Run::HighCompletion:
-                return Tracer::fail(
-                    QString(" Cannot read from marker file at position %1").arg(position));
-            case Run::LowCompletion:
-                return Tracer::fail(
-                    QString("Reading marker stream failed at position %1").arg(position));
-            }
-        }
-        for (int i = 0; i < got; ++i) {
-            m_block[static_cast<size_t>(i)] |= mask;
-        }
-        if (!m_stream.writeBytes(got, m_block.data())) {
-            return Tracer::fail((run == Run::LowCompletion
-                                     ? QString("Writing marker stream failed at position %1")
-                                     : QString(" Cannot write to marker file at position %1"))
-                                    .arg(pos));
-        }
-        pos += got;
-    }
-    return true;
-}
-
-bool MarkerTrace::appendRun(qint64 begin, qint64 count, quint8 byte)
-{
-    m_block.assign(static_cast<size_t>(std::min(count, blockSize)), byte);
-    for (qint64 done = 0; done < count;) {
-        const int size = static_cast<int>(std::min(count - done, blockSize));
-        if (!m_stream.writeBytes(size, m_block.data())) {
-            return Tracer::fail(
-                QString(" Cannot write to marker file at position %1").arg(begin + done));
-        }
-        done += size;
-    }
-    return true;
+    return report(m_store.finish(), Part::Walk, m_written);
 }
 
 bool MarkerTrace::extendTo(qint64 length)
@@ -263,11 +280,14 @@ bool MarkerTrace::extendTo(qint64 length)
     if (m_written >= length) {
         return true;
     }
-    const qint64 missing = length - m_written;
-    m_block.assign(static_cast<size_t>(std::min(missing, blockSize)), m_lastByte);
+    const std::vector<quint8> block(static_cast<size_t>(std::min(length - m_written, blockSize)),
+                                    m_lastByte);
     while (m_written < length) {
         const int size = static_cast<int>(std::min(length - m_written, blockSize));
-        if (!m_stream.writeBytes(size, m_block.data())) {
+        if (m_progress.shouldStop(0)) {
+            return Tracer::fail(abortText);
+        }
+        if (!m_stream.writeBytes(size, block.data())) {
             return Tracer::fail(
                 QString("Writing marker stream failed at position %1").arg(m_written));
         }
@@ -281,10 +301,10 @@ bool MarkerTrace::pad(qint64 count)
     if (count <= 0) {
         return true;
     }
-    m_block.assign(static_cast<size_t>(std::min(count, blockSize)), m_lastByte);
+    const std::vector<quint8> block(static_cast<size_t>(std::min(count, blockSize)), m_lastByte);
     for (qint64 done = 0; done < count;) {
         const int size = static_cast<int>(std::min(count - done, blockSize));
-        if (!m_stream.writeBytes(size, m_block.data())) {
+        if (!m_stream.writeBytes(size, block.data())) {
             return Tracer::fail("Cannot write to marker file!");
         }
         done += size;

@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "MarkerStore.h"
 #include "WvTypes.h"
 
 #include <QString>
 #include <QtGlobal>
 
 #include <array>
-#include <vector>
 
 class BufferedIO;
 class ByteSource;
@@ -28,6 +28,10 @@ public:
     /// Reads the list of the tag `name` up to its end and merges it. Logs and returns false on
     /// malformed lists, on stream failures and on a cancel.
     [[nodiscard]] bool mergeList(ByteSource &source, const QString &name);
+
+    /// To be called behind the last list: the stream holds what they have made. Logs and returns
+    /// false on a stream failure.
+    [[nodiscard]] bool finishLists();
 
     /// Appends the carried byte until `length` bytes stand; false on a stream failure.
     [[nodiscard]] bool extendTo(qint64 length);
@@ -51,26 +55,32 @@ private:
         quint8 byte = 0;    ///< the byte handled last
     };
 
-    [[nodiscard]] bool applyTransition(List &list, const QString &token);
+    struct Transition
+    {
+        qint64 position = 0;
+        int state = 0;
+        bool endedOnBrace = false;
+    };
+
+    /// What a pass over standing bytes belongs to; it decides the words of a failure.
+    enum class Part { Walk, HighCompletion, LowCompletion };
+
+    [[nodiscard]] static bool takeTransition(ByteSource &source, Transition &transition);
+    [[nodiscard]] bool parseToken(const List &list, const QString &token, Transition &transition);
+    [[nodiscard]] bool applyTransition(List &list, const Transition &transition);
     [[nodiscard]] bool positionIsValid(const List &list, qint64 position, quint8 state) const;
     [[nodiscard]] bool walkTo(List &list, qint64 position);
     [[nodiscard]] bool completeList(List &list);
-    /// What a run over standing bytes belongs to; it decides the words of a failure.
-    enum class Run { Walk, HighCompletion, LowCompletion };
-
-    [[nodiscard]] bool rewriteRun(qint64 begin, qint64 end, quint8 mask, Run run, qint64 target);
-    [[nodiscard]] bool appendRun(qint64 begin, qint64 count, quint8 byte);
-    [[nodiscard]] bool takeOldByte(const List &list, qint64 position, quint8 &byte);
+    [[nodiscard]] bool report(MarkerStore::Result result, Part part, qint64 target) const;
     [[nodiscard]] bool spendWork(qint64 bytes);
-    [[nodiscard]] bool failToRead(qint64 position, qint64 target) const;
     void noteCutByExtension(const List &list);
 
     BufferedIO &m_stream;
     ProgressClock &m_progress;
+    MarkerStore m_store;
     qint64 m_fileLimit = 0;
-    qint64 m_workLeft = 0; ///< stream bytes that may still be handled
-    qint64 m_written = 0;  ///< bytes that the stream holds
+    qint64 m_workLeft = 0; ///< bytes and runs that may still be handled
+    qint64 m_written = 0;  ///< bytes that the trace holds
     quint8 m_lastByte = 0; ///< the byte appended last, carried on behind the lists
     std::array<qint64, MarkerCount> m_cutAt;
-    std::vector<quint8> m_block;
 };

@@ -246,6 +246,9 @@ bool WvReader::keepUnknownTag(const QString &name)
 
 bool WvReader::openSampleBlock(const QString &name)
 {
+    if (!m_markers.finishLists()) {
+        return false;
+    }
     if (m_info.format == WvFormatUnknown) {
         return Tracer::fail("Unsupported waveform file type!");
     }

@@ -12,6 +12,7 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cmath>
 #include <cstring>
 #include <utility>
@@ -55,6 +56,18 @@ size_t findChange(std::span<const quint8> bytes, size_t from, quint8 mask, quint
         ++i;
     }
     return i;
+}
+
+/// Appends "0:1", or ";12:0" for any position but the first.
+void appendTransition(QByteArray &text, int position, bool high)
+{
+    if (position > 0) {
+        text.append(';');
+    }
+    std::array<char, 16> digits;
+    const auto [end, error] = std::to_chars(digits.begin(), digits.end(), position);
+    text.append(digits.data(), end - digits.data());
+    text.append(high ? ":1" : ":0", 2);
 }
 
 } // namespace
@@ -103,10 +116,18 @@ void WvWriter::prepareLevels()
     info("=======================================");
 }
 
-bool WvWriter::put(QIODevice &device, const QByteArray &bytes)
+bool WvWriter::put(QIODevice &device, std::span<const char> bytes)
 {
-    return device.write(bytes) == bytes.size() ||
-           Tracer::fail("Error writing output file: " + device.errorString());
+    // On a full disk the part that still fits is written without an error; the next write tells the
+    // reason.
+    while (!bytes.empty()) {
+        const qint64 written = device.write(bytes.data(), static_cast<qint64>(bytes.size()));
+        if (written <= 0) {
+            return Tracer::fail("Error writing output file: " + device.errorString());
+        }
+        bytes = bytes.subspan(static_cast<size_t>(written));
+    }
+    return true;
 }
 
 bool WvWriter::write(QIODevice &device)
@@ -117,8 +138,8 @@ bool WvWriter::write(QIODevice &device)
     }
     m_report(50);
     const auto blockBytes = 4 * static_cast<qint64>(m_job.samples) + 1;
-    if (!put(device, QString("{WAVEFORM-%1: #").arg(blockBytes).toLatin1()) ||
-        !writeSamples(device) || !put(device, "}")) {
+    if (!put(device, "{WAVEFORM-" + QByteArray::number(blockBytes) + ": #") ||
+        !writeSamples(device) || !put(device, QByteArray("}"))) {
         return false;
     }
     m_report(100);
@@ -162,7 +183,7 @@ bool WvWriter::copyTagsStream(QIODevice &device)
         if (got <= 0) {
             return got == 0 || warn();
         }
-        if (!put(device, block.left(got))) {
+        if (!put(device, std::span(block).first(static_cast<size_t>(got)))) {
             return false;
         }
     }
@@ -207,19 +228,16 @@ bool WvWriter::writeMarkerList(QIODevice &device, int marker)
         size_t i = begin == 0 ? 0 : findChange(bytes, 0, mask, state);
         while (i < bytes.size()) {
             state = bytes[i] & mask;
-            if (text.back() != ' ') {
-                text += ';';
-            }
-            text += QByteArray::number(begin + static_cast<qint64>(i)) + (state != 0 ? ":1" : ":0");
+            const int position = begin + static_cast<int>(i);
+            appendTransition(text, position, state != 0);
             i = findChange(bytes, i, mask, state);
         }
         begin += count;
         if (text.size() > blockSamples) {
-            // The last character stays behind, so that the separator above knows what it follows.
-            if (!put(device, text.chopped(1))) {
+            if (!put(device, text)) {
                 return false;
             }
-            text = text.right(1);
+            text.resize(0); // keeps the memory
         }
         if (m_progress.shouldStop(10 + 10 * (marker - 1))) {
             return Tracer::fail("Action aborted by user.");
@@ -268,9 +286,8 @@ bool WvWriter::writeSamples(QIODevice &device)
             fetchSamples(done, std::span(values).first(2 * static_cast<size_t>(wanted)));
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));
         encodeWords(std::span(values).first(2 * static_cast<size_t>(got)), bytes);
-        if (device.write(reinterpret_cast<const char *>(bytes.data()),
-                         static_cast<qint64>(bytes.size())) != static_cast<qint64>(bytes.size())) {
-            return Tracer::fail("Error writing output file: " + device.errorString());
+        if (!put(device, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
+            return false;
         }
         if (got < wanted) {
             return Tracer::fail("Error reading waveform data from temporary file.");

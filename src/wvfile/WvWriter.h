@@ -37,7 +37,7 @@ public:
     [[nodiscard]] bool write(QIODevice &device);
 
 private:
-    [[nodiscard]] bool put(QIODevice &device, const QByteArray &bytes);
+    [[nodiscard]] static bool put(QIODevice &device, std::span<const char> bytes);
     [[nodiscard]] bool writeTags(QIODevice &device);
     [[nodiscard]] bool copyTagsStream(QIODevice &device);
     [[nodiscard]] bool writeMarkers(QIODevice &device);

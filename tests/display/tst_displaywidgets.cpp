@@ -1,0 +1,509 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "display/CWidgetConstellation.h"
+#include "display/CWidgetIQTrace.h"
+#include "display/CWidgetSpectrum.h"
+#include "display/CWidgetTimeline.h"
+#include "displaysamples.h"
+#include "log/Tracer.h"
+
+#include <QApplication>
+#include <QClipboard>
+#include <QContextMenuEvent>
+#include <QFile>
+#include <QMenu>
+#include <QSignalSpy>
+#include <QTemporaryDir>
+#include <QTest>
+#include <QWheelEvent>
+
+#include <cmath>
+
+namespace {
+
+void wheel(QWidget &widget, int delta, bool &accepted)
+{
+    const QPointF center = widget.rect().center();
+    QWheelEvent event(center, widget.mapToGlobal(center), QPoint(), QPoint(0, delta), Qt::NoButton,
+                      Qt::NoModifier, Qt::NoScrollPhase, false);
+    event.setAccepted(false);
+    QApplication::sendEvent(&widget, &event);
+    accepted = event.isAccepted();
+}
+
+QMenu *openMenu(QWidget &widget)
+{
+    const QPoint center = widget.rect().center();
+    QContextMenuEvent event(QContextMenuEvent::Mouse, center, widget.mapToGlobal(center));
+    QApplication::sendEvent(&widget, &event);
+    return qobject_cast<QMenu *>(QApplication::activePopupWidget());
+}
+
+/// Chooses an entry of the context menu with the mouse.
+bool chooseEntry(QWidget &widget, const QString &text)
+{
+    QMenu *menu = openMenu(widget);
+    if (menu == nullptr) {
+        return false;
+    }
+    for (QAction *action : menu->actions()) {
+        if (action->text() == text && action->isEnabled()) {
+            QTest::mouseClick(menu, Qt::LeftButton, Qt::NoModifier,
+                              menu->actionGeometry(action).center());
+            return true;
+        }
+    }
+    menu->close();
+    return false;
+}
+
+QByteArray contentOf(const QString &fileName)
+{
+    QFile file(fileName);
+    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
+}
+
+/// The point of a trace's plot at a share of its width.
+QPoint tracePoint(const CWidgetIQTrace &trace, double share)
+{
+    const QRectF plot =
+        QRectF(trace.rect()).marginsRemoved(TracePainter::margins(PlotStyle::current().font));
+    return {static_cast<int>(std::round(plot.left() + share * plot.width())), 60};
+}
+
+bool differs(const QImage &a, const QImage &b, const QRect &part)
+{
+    return a.copy(part) != b.copy(part);
+}
+
+} // namespace
+
+class TestDisplayWidgets : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void init() { (void)Tracer::takeEntries(); }
+    void traceMouse();
+    void traceDragAndDoubleClick();
+    void traceWheel();
+    void traceCursors();
+    void traceModesAndZoom();
+    void traceKeepsNothingOfTheFormerData();
+    void spectrumReadOut();
+    void spectrumCache();
+    void colorModesFromTheMenu();
+    void constellationValueBox();
+    void picturesFromTheMenu();
+    void savedPicturesAndData();
+    void timelineDrag();
+    void powerOfTheBase();
+};
+
+void TestDisplayWidgets::traceMouse()
+{
+    CWidgetIQTrace trace;
+    trace.resize(600, 300);
+    QSignalSpy left(&trace, &CWidgetIQTrace::mouseLeftPress);
+    QSignalSpy right(&trace, &CWidgetIQTrace::mouseRightPress);
+    QSignalSpy data(&trace, &CWidgetIQTrace::mouseCsrData);
+
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.5));
+    QCOMPARE(left.count(), 0); // nothing to point at
+
+    IqList samples(1000);
+    for (qsizetype k = 0; k < samples.size(); ++k) {
+        samples[k] = {static_cast<double>(k), -static_cast<double>(k)};
+    }
+    trace.setData(samples);
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(left.count(), 1);
+    const int sample = left.at(0).at(0).toInt();
+    QVERIFY2(std::abs(sample - 250) <= 2, qPrintable(QString::number(sample)));
+    QCOMPARE(data.count(), 1);
+    QCOMPARE(data.at(0).at(0).toLongLong(), sample);
+    QCOMPARE(data.at(0).at(1).toDouble(), static_cast<double>(sample));
+    QCOMPARE(data.at(0).at(2).toDouble(), -static_cast<double>(sample));
+    QCOMPARE(trace.scene().mouseBin, sample * 512 / 1000);
+
+    // The same column again is no news, other data in it are.
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(data.count(), 1);
+    trace.setData(toneSamples(1000, 0.1));
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(data.count(), 2);
+
+    QTest::mousePress(&trace, Qt::RightButton, {}, tracePoint(trace, 0.75));
+    QCOMPARE(right.count(), 1);
+    QVERIFY(std::abs(right.at(0).at(0).toInt() - 750) <= 2);
+
+    // Outside the plot.
+    QTest::mousePress(&trace, Qt::LeftButton, {}, QPoint(3, 60));
+    QTest::mousePress(&trace, Qt::LeftButton, {}, QPoint(598, 60));
+    QCOMPARE(left.count(), 3);
+}
+
+void TestDisplayWidgets::traceDragAndDoubleClick()
+{
+    CWidgetIQTrace trace;
+    trace.resize(600, 300);
+    trace.setData(toneSamples(5000, 0.01));
+    QSignalSpy data(&trace, &CWidgetIQTrace::mouseCsrData);
+    QSignalSpy zoomSet(&trace, &CWidgetIQTrace::mouseZoomSet);
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.2));
+    for (const double share : {0.3, 0.4, 0.4}) {
+        const QPointF place = tracePoint(trace, share);
+        QMouseEvent move(QEvent::MouseMove, place, trace.mapToGlobal(place), Qt::NoButton,
+                         Qt::LeftButton, Qt::NoModifier);
+        QApplication::sendEvent(&trace, &move);
+    }
+    QTest::mouseRelease(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.4));
+    QCOMPARE(data.count(), 3);
+    QTest::mouseDClick(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.6));
+    QCOMPARE(zoomSet.count(), 1);
+    QVERIFY(std::abs(zoomSet.at(0).at(0).toInt() - 3000) <= 10);
+}
+
+void TestDisplayWidgets::traceWheel()
+{
+    CWidgetIQTrace trace;
+    QSignalSpy in(&trace, &CWidgetIQTrace::zoom_in);
+    QSignalSpy out(&trace, &CWidgetIQTrace::zoom_out);
+    bool accepted = false;
+    wheel(trace, 120, accepted);
+    QVERIFY(accepted);
+    QCOMPARE(in.count(), 1);
+    wheel(trace, -120, accepted);
+    QVERIFY(accepted);
+    QCOMPARE(in.count(), 1);
+    QCOMPARE(out.count(), 1);
+}
+
+void TestDisplayWidgets::traceCursors()
+{
+    CWidgetIQTrace trace;
+    trace.resize(600, 300);
+    trace.setView(3);
+    trace.setData(IqList(1000, {0.0, 0.0}));
+    const QImage plain = trace.picture();
+    trace.setCursor(2, 500);
+    QCOMPARE(trace.scene().cursorBins[1], 256);
+    const QImage reference = trace.picture();
+    trace.setCursor(2, -1);
+    QCOMPARE(trace.picture(), plain);
+    trace.setCursor(1, 500);
+    const QImage measuring = trace.picture();
+
+    // The reference cursor alone has serifs: three pixels to each side at both ends.
+    const QRectF plot =
+        QRectF(trace.rect()).marginsRemoved(TracePainter::margins(PlotStyle::current().font));
+    const int x = static_cast<int>(TracePainter::xOf(plot, 256));
+    const int top = static_cast<int>(std::round(TracePainter::yOf(plot, 0.95)));
+    const int bottom = static_cast<int>(std::round(TracePainter::yOf(plot, 0.05)));
+    for (const int y : {top, bottom}) {
+        QVERIFY(differs(reference, plain, {x - 3, y, 1, 1}));
+        QVERIFY(differs(reference, plain, {x + 3, y, 1, 1}));
+        QVERIFY(!differs(measuring, plain, {x - 3, y, 1, 1}));
+    }
+    for (const QImage &image : {reference, measuring}) {
+        QVERIFY(differs(image, plain, {x, (top + bottom) / 2, 1, 1}));
+        QVERIFY(!differs(image, plain, {x, 0, 1, top - 1}));
+        QVERIFY(!differs(image, plain, {x, bottom + 2, 1, 8}));
+    }
+
+    trace.setCursor(1, 1000); // behind the last sample
+    QCOMPARE(trace.scene().cursorBins[0], -1);
+    trace.setCursor(1, 999);
+    QCOMPARE(trace.scene().cursorBins[0], 511);
+    trace.setCursor(3, 10);
+    QCOMPARE(trace.scene().cursorBins[1], -1);
+}
+
+void TestDisplayWidgets::traceModesAndZoom()
+{
+    CWidgetIQTrace trace;
+    trace.setView(5);
+    QCOMPARE(trace.view(), 5);
+    trace.setView(6);
+    trace.setView(-1);
+    QCOMPARE(trace.view(), 5);
+    QList<double> zooms;
+    for (int k = 0; k < 4; ++k) {
+        trace.zoomInY();
+        zooms += trace.scene().zoomY;
+    }
+    for (int k = 0; k < 5; ++k) {
+        trace.zoomOutY();
+        zooms += trace.scene().zoomY;
+    }
+    QCOMPARE(zooms, QList<double>({2, 5, 10, 20, 10, 5, 2, 1, 1}));
+}
+
+void TestDisplayWidgets::traceKeepsNothingOfTheFormerData()
+{
+    CWidgetIQTrace trace;
+    trace.resize(500, 300);
+    const QImage empty = trace.picture();
+    trace.setData(toneSamples(1000, 0.01), QList<quint8>(1000, 3));
+    QVERIFY(trace.picture() != empty);
+    trace.setData({});
+    QCOMPARE(trace.picture(), empty);
+    trace.setData(toneSamples(1000, 0.01));
+    trace.setCursor(1, 5);
+    trace.clear();
+    QCOMPARE(trace.picture(), empty);
+    // Three samples leave the table alone, but what it holds isn't theirs and isn't shown.
+    trace.setData(toneSamples(1000, 0.01));
+    (void)trace.picture();
+    trace.setData(toneSamples(3, 0.01));
+    const QImage three = trace.picture();
+    trace.clear();
+    trace.setData(toneSamples(3, 0.01));
+    QCOMPARE(trace.picture(), three);
+}
+
+void TestDisplayWidgets::spectrumReadOut()
+{
+    CWidgetSpectrum spectrum;
+    spectrum.resize(800, 400);
+    spectrum.setClock(512e3); // a bin is 1 kHz
+    spectrum.setData(toneSamples(2560, 100 / 512.0, 0.1), 1000, 3559);
+    for (const int mode : {0, 1}) {
+        spectrum.setView(mode);
+        const PlotStyle style = PlotStyle::current();
+        const QRectF plot = QRectF(spectrum.rect())
+                                .marginsRemoved(SpectrumPainter::margins(
+                                    style.font, static_cast<SpectrumMode>(mode)));
+        const QPointF place(SpectrumPainter::xOf(plot, 356), plot.center().y());
+        const SpectrumPainter painter(style, spectrum.scene());
+        const QStringList lines = painter.readOut(place, plot);
+        QCOMPARE(lines.first(), "F 100 kHz");
+        QCOMPARE(lines.last(), "L -20.00 dB");
+        if (mode == 1) { // line 4 of 9, at sample 1000 + 4 * 256
+            QCOMPARE(lines.at(1), "T 3.953 ms");
+        }
+        QVERIFY(painter.readOut(QPointF(2, 2), plot).isEmpty());
+
+        const QImage before = spectrum.picture();
+        QTest::mouseMove(&spectrum, place.toPoint());
+        QMouseEvent move(QEvent::MouseMove, place, spectrum.mapToGlobal(place), Qt::NoButton,
+                         Qt::NoButton, Qt::NoModifier);
+        QApplication::sendEvent(&spectrum, &move);
+        QVERIFY(spectrum.picture() != before);
+        QEvent leave(QEvent::Leave);
+        QApplication::sendEvent(&spectrum, &leave);
+        QCOMPARE(spectrum.picture(), before);
+    }
+}
+
+void TestDisplayWidgets::spectrumCache()
+{
+    CWidgetSpectrum spectrum;
+    spectrum.resize(500, 300);
+    const IqList all = toneSamples(20000, 0.01);
+    spectrum.setData(all.mid(0, 5120), 0, 5119);
+    (void)spectrum.picture();
+    const qint64 made = spectrum.scene().lines.transformCount();
+    spectrum.col_blue();
+    spectrum.resize(700, 400);
+    spectrum.setView(0);
+    (void)spectrum.picture();
+    QCOMPARE(spectrum.scene().lines.transformCount(), made);
+    spectrum.setData(all.mid(256, 5120), 256, 5375);
+    QCOMPARE(spectrum.scene().lines.transformCount(), made + 1);
+    spectrum.setData(all.mid(256, 5120)); // replaces everything
+    QCOMPARE(spectrum.scene().lines.transformCount(), 2 * made + 1);
+    QCOMPARE(spectrum.scene().lines.lines().front().position, 0);
+    spectrum.clear();
+    QVERIFY(spectrum.scene().lines.lines().empty());
+}
+
+void TestDisplayWidgets::colorModesFromTheMenu()
+{
+    CWidgetSpectrum spectrum;
+    CWidgetConstellation constellation;
+    spectrum.setView(1);
+    spectrum.setData(toneSamples(3000, 0.1));
+    constellation.setData(toneSamples(3000, 0.01));
+    const QStringList names{"Black/White", "Blue", "Noise (Blue)", "Rainbow"};
+    QList<QImage> pictures;
+    for (const QString &name : names) {
+        QVERIFY(chooseEntry(spectrum, name));
+        QVERIFY(chooseEntry(constellation, name));
+        const QImage picture = spectrum.picture();
+        QVERIFY(!pictures.contains(picture));
+        pictures += picture;
+    }
+    QCOMPARE(spectrum.colorMode(), 0);
+    QCOMPARE(constellation.colorMode(), 0);
+    constellation.col_noise();
+    QCOMPARE(constellation.colorMode(), 3);
+    QMenu *menu = openMenu(constellation);
+    QVERIFY(menu);
+    for (int k = 0; k < 4; ++k) {
+        QCOMPARE(menu->actions().at(k)->isChecked(), k == 3);
+    }
+    menu->close();
+}
+
+void TestDisplayWidgets::constellationValueBox()
+{
+    CWidgetConstellation constellation;
+    constellation.resize(500, 400);
+    constellation.setScale(2, 2);
+    const PlotStyle style = PlotStyle::current();
+    const QRectF area(constellation.rect());
+    const QRectF square = ConstellationPainter::square(area, style.font);
+    const ConstellationPainter painter(style, constellation.scene());
+    const auto value =
+        painter.valueAt({square.left() + square.width() * 0.75, square.center().y()}, area);
+    QVERIFY(value.has_value());
+    QVERIFY(std::fabs(value->i - 1) < 1e-9);
+    QVERIFY(std::fabs(value->q) < 1e-9);
+    QVERIFY(!painter.valueAt({square.left() - 3, square.center().y()}, area).has_value());
+
+    const QImage before = constellation.picture();
+    const QPointF place = square.center() + QPointF(20, -20);
+    QMouseEvent move(QEvent::MouseMove, place, constellation.mapToGlobal(place), Qt::NoButton,
+                     Qt::NoButton, Qt::NoModifier);
+    QApplication::sendEvent(&constellation, &move);
+    QVERIFY(constellation.picture() != before);
+    QEvent leave(QEvent::Leave);
+    QApplication::sendEvent(&constellation, &leave);
+    QCOMPARE(constellation.picture(), before);
+}
+
+void TestDisplayWidgets::picturesFromTheMenu()
+{
+    CWidgetIQTrace trace;
+    trace.resize(320, 200);
+    trace.setData(toneSamples(1000, 0.01));
+    QApplication::clipboard()->clear();
+    QVERIFY(chooseEntry(trace, "Copy Picture"));
+    QCOMPARE(QApplication::clipboard()->image().convertToFormat(QImage::Format_RGB32),
+             trace.picture().convertToFormat(QImage::Format_RGB32));
+    trace.clear();
+    QVERIFY(!chooseEntry(trace, "Save Data..."));
+}
+
+void TestDisplayWidgets::savedPicturesAndData()
+{
+    const QTemporaryDir folder;
+    CWidgetIQTrace trace;
+    trace.resize(320, 200);
+    trace.setData({{0.5, -0.25}, {1.0 / 3, 0}, {0, 0}, {-1, 1}}, {1, 0, 15, 2});
+    trace.setFirstSample(40);
+    const QString png = folder.filePath("plot.png");
+    QVERIFY(trace.savePicture(png));
+    QCOMPARE(QImage(png).convertToFormat(QImage::Format_RGB32), trace.picture());
+    const QString svg = folder.filePath("plot.svg");
+    QVERIFY(trace.savePicture(svg));
+    QVERIFY(contentOf(svg).contains("<svg"));
+    QVERIFY(contentOf(svg).contains("full scale 1")); // texts stay texts
+    const QString csv = folder.filePath("plot.csv");
+    QVERIFY(trace.saveData(csv));
+    QCOMPARE(contentOf(csv), "sample,i,q,markers\n40,0.5,-0.25,1\n41,0.333333333,0,0\n42,0,0,15\n"
+                             "43,-1,1,2\n");
+
+    CWidgetSpectrum spectrum;
+    spectrum.setClock(512);
+    spectrum.setData(toneSamples(1000, 0.25, 1), 256, 1255);
+    spectrum.setView(0);
+    QVERIFY(spectrum.saveData(csv));
+    QList<QByteArray> lines = contentOf(csv).split('\n');
+    QCOMPARE(lines.size(), 514);
+    QCOMPARE(lines.first(), "frequency_hz,level_db");
+    QVERIFY(lines.at(1).startsWith("-256,"));
+    QCOMPARE(lines.at(1 + 384).split(',').first(), "128");
+    QVERIFY(std::fabs(lines.at(1 + 384).split(',').last().toDouble()) < 1e-6);
+    spectrum.setView(1);
+    QVERIFY(spectrum.saveData(csv));
+    lines = contentOf(csv).split('\n');
+    QCOMPARE(lines.size(), 3); // one frame
+    QVERIFY(lines.at(1).startsWith("256,"));
+    QCOMPARE(lines.at(1).count(','), 512);
+
+    (void)Tracer::takeEntries();
+    const QString nowhere = folder.filePath("missing/plot.png");
+    QVERIFY(!trace.savePicture(nowhere));
+    QVERIFY(!trace.savePicture(folder.filePath("plot.bmp")));
+    QVERIFY(!trace.saveData(folder.filePath("missing/plot.csv")));
+    const auto entries = Tracer::takeEntries();
+    QCOMPARE(entries.size(), 3);
+    QVERIFY(entries.at(0).first.contains("Cannot write '" + nowhere + "': "));
+    QVERIFY(entries.at(1).first.contains(".png or .svg"));
+}
+
+void TestDisplayWidgets::timelineDrag()
+{
+    CWidgetTimeline timeline;
+    timeline.resize(412, 44);
+    timeline.setWaveform(100000, 1e6);
+    timeline.setRange(20000, 10000);
+    QSignalSpy positions(&timeline, &CWidgetTimeline::mouse_xpos);
+    QSignalSpy states(&timeline, &CWidgetTimeline::state_xpos);
+    const QRectF bar =
+        TimelinePainter::bar(QRectF(timeline.rect()), PlotStyle::current().font); // 400 wide
+    const auto point = [&bar](double sample) {
+        return QPoint(static_cast<int>(std::round(bar.left() + sample / 100000 * bar.width())),
+                      static_cast<int>(bar.center().y()));
+    };
+    const auto drag = [&timeline](const QPoint &place) {
+        QMouseEvent move(QEvent::MouseMove, place, timeline.mapToGlobal(place), Qt::NoButton,
+                         Qt::LeftButton, Qt::NoModifier);
+        QApplication::sendEvent(&timeline, &move);
+    };
+
+    // Taken inside, the range follows by the point that was taken.
+    QTest::mousePress(&timeline, Qt::LeftButton, {}, point(25000));
+    QCOMPARE(positions.count(), 0);
+    drag(point(45000));
+    QCOMPARE(positions.last().at(0).toDouble(), 40000.0);
+    QCOMPARE(timeline.scene().first, 40000);
+    drag(point(200000));
+    QCOMPARE(positions.last().at(0).toDouble(), 90000.0);
+    drag(QPoint(-500, 10));
+    QCOMPARE(positions.last().at(0).toDouble(), 0.0);
+    QTest::mouseRelease(&timeline, Qt::LeftButton, {}, point(0));
+    QCOMPARE(states.count(), 2);
+    QCOMPARE(states.at(0).at(0).toBool(), true);
+    QCOMPARE(states.at(1).at(0).toBool(), false);
+
+    // Pressed beside the range, its middle goes there.
+    positions.clear();
+    QTest::mouseClick(&timeline, Qt::LeftButton, {}, point(70000));
+    QCOMPARE(positions.count(), 1);
+    QCOMPARE(positions.at(0).at(0).toDouble(), 65000.0);
+
+    // Set from outside it tells nobody.
+    positions.clear();
+    timeline.set_xpos(12345);
+    QCOMPARE(timeline.scene().first, 12345);
+    QCOMPARE(timeline.scene().count, 10000);
+    QCOMPARE(positions.count(), 0);
+
+    timeline.setWaveform(0, 0);
+    QTest::mousePress(&timeline, Qt::LeftButton, {}, point(5000));
+    QCOMPARE(positions.count(), 0);
+}
+
+void TestDisplayWidgets::powerOfTheBase()
+{
+    CWidgetIQTrace display;
+    double in[2] = {0, 0.01};
+    double out[2] = {};
+    display.powerToLog(out, in, 2);
+    QCOMPARE(out[0], 10.0);
+    QCOMPARE(in[0], 0.01);
+    QCOMPARE(display.powerToLog(0.001), 0.0);
+    QCOMPARE(display.formatPower(0, false), "  0.00 dBm");
+    display.setLinearPower(true);
+    double zero[1] = {0};
+    display.powerToLog(out, zero, 1);
+    QCOMPARE(out[0], 0.0);
+    QCOMPARE(zero[0], 0.0);
+    QCOMPARE(display.powerToLog(0.25), 0.25);
+    QCOMPARE(display.formatPower(0.25, false), "250.000 mW");
+}
+
+QTEST_MAIN(TestDisplayWidgets)
+#include "tst_displaywidgets.moc"

@@ -257,7 +257,9 @@ void TestPictures::shortAndEmptyData()
     TextRecorder recorder(PlotSize);
     QPainter painter(&recorder);
     MemorySource source(list);
-    QVERIFY(paintPlot(painter, PlotArea, {static_cast<PlotView>(view), 100e6}, source));
+    PlotRequest request;
+    request.view = static_cast<PlotView>(view);
+    QVERIFY(paintPlot(painter, PlotArea, request, source));
     painter.end();
     QStringList words;
     for (const TextRecorder::Text &text : recorder.texts()) {
@@ -519,6 +521,11 @@ void TestPictures::brokenStreamGivesNoPicture()
     const auto entries = Tracer::takeEntries();
     QCOMPARE(entries.size(), 1);
     QVERIFY(entries.first().first.endsWith("Cannot read I/Q data from temporary file."));
+
+    // Stopped by its caller, it says nothing.
+    StreamSource stopped(*data.stream(), *markers.stream(), 0, 100, [](qint64) { return false; });
+    QVERIFY(renderPlot({}, stopped).isNull());
+    QVERIFY(Tracer::takeEntries().isEmpty());
 }
 
 QTEST_MAIN(TestPictures)

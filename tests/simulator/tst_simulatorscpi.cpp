@@ -139,7 +139,7 @@ void tst_SimulatorScpi::commands_data()
     const int gen = CoderGenerator;
     row(gen, "*IDN?", "Halvorn,TGX-870,TGX870/100001/01,1.0\n");
     row(gen, "*opt?", "TGX870-R16,TGX870-P9,TGX870-P10,TGX870-P13,TGX870-K1\n");
-    row(IqAnalyzer, "*IDN?", "Halvorn,PAX-630,100001/01,1.0\n");
+    row(IqAnalyzer, "*IDN?", "Halvorn,PAX-630,100005/01,1.0\n");
     row(NoFilesGenerator, "*IDN?;*OPT?", "Halvorn,TQX-120,TQX120/77/01,2.5;0\n");
     row(gen, " *TST? ;\t:SYST:VERS?\r\n", "0;1999.0\n");
 

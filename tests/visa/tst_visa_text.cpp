@@ -52,6 +52,8 @@ void TestVisaText::resourceNames_data()
     row("TCPIP::", "");
     row("TCPIP::::INSTR", "");
     row("TCPIPx::10.0.0.1", "");
+    row("TCPIP::host:::inst0", "");
+    row("TCPIP::host:", "");
     row("TCPIP::two words::INSTR", "");
     row("USB::0x7fe3::0x00af::100001::INSTR", "USB0::0x7FE3::0x00AF::100001::INSTR");
     row("USB0::32739::175::100001", "USB0::0x7FE3::0x00AF::100001::INSTR");
@@ -65,6 +67,11 @@ void TestVisaText::resourceNames_data()
     row("GPIB0::-1::INSTR", "");
     row("GPIB0::INSTR", "");
     row("ASRL1::INSTR", "");
+    // 255 characters in full, which fit a buffer of 256, and one more.
+    const QByteArray host(255 - 8 - 14, 'h');
+    QTest::newRow("longest") << QString("TCPIP::" + host)
+                             << QString("TCPIP0::" + host + "::inst0::INSTR");
+    QTest::newRow("too long") << QString("TCPIP::" + host + "h") << QString();
     row("", "");
     row("::", "");
 }

@@ -2,6 +2,7 @@
 #include "Vxi11Peer.h"
 #include "visa/visa.h"
 
+#include <QDir>
 #include <QElapsedTimer>
 #include <QFile>
 #include <QTemporaryDir>
@@ -52,6 +53,7 @@ private slots:
     void attributes();
     void closeWakesReader();
     void sessionsSideBySide();
+    void nothingIsLeftBehind();
     void wrongHandles();
     void configurationFault();
 
@@ -616,6 +618,27 @@ void TestVisaVxi11::sessionsSideBySide()
     QCOMPARE(write(stalled, "*IDN?"), VI_ERROR_TMO);
     QCOMPARE(viClose(stalled), VI_SUCCESS);
     reader.join();
+}
+
+void TestVisaVxi11::nothingIsLeftBehind()
+{
+    const auto descriptorCount = [] {
+        return QDir("/proc/self/fd")
+            .entryList(QDir::NoDotAndDotDot | QDir::AllEntries | QDir::System)
+            .size();
+    };
+    const Vxi11Peer peer;
+    ViSession session = open(peer);
+    QCOMPARE(viClose(session), VI_SUCCESS);
+    // The peer keeps its own end of each connection.
+    const auto before = descriptorCount() - peer.connectionCount();
+    for (int i = 0; i < 20; ++i) {
+        QCOMPARE(viOpen(m_manager, "TCPIP::127.0.0.1", 0, 0, &session), VI_SUCCESS);
+        QCOMPARE(viClose(session), VI_SUCCESS);
+    }
+    QCOMPARE(peer.connectionCount(), 21);
+    QCOMPARE(descriptorCount() - peer.connectionCount(), before);
+    QCOMPARE(peer.calls(Vxi11Peer::DestroyLink).size(), std::size_t{21});
 }
 
 void TestVisaVxi11::wrongHandles()

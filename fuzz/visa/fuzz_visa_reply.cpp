@@ -1,0 +1,102 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "visa/MessageTracker.h"
+#include "visa/RpcRecord.h"
+#include "visa/XdrValue.h"
+
+#include <vxi11.h>
+
+#include <algorithm>
+#include <cstdlib>
+
+using namespace visa;
+
+namespace {
+
+constexpr std::size_t LargestRecord = 4096;
+
+// Touches each byte, so that the sanitizer sees a length without its bytes.
+unsigned sum(const char *data, unsigned size)
+{
+    unsigned total = 0;
+    for (unsigned i = 0; i < size; ++i)
+        total += static_cast<unsigned char>(data[i]);
+    return total;
+}
+
+template <typename T>
+bool decodes(XdrCode<T> *code, std::span<const std::uint8_t> results)
+{
+    XdrValue<T> value(code);
+    return value.decode(results);
+}
+
+void decodeRecord(std::span<const std::uint8_t> record)
+{
+    std::uint32_t transaction = 0;
+    for (const std::uint8_t byte : record.first(std::min<std::size_t>(record.size(), 4)))
+        transaction = transaction << 8U | byte;
+    const RpcReply reply = parseRpcReply(record, transaction);
+    if (reply.kind == RpcReplyKind::OtherCall && record.size() >= 4)
+        std::abort();
+    if (reply.results.size() > record.size())
+        std::abort();
+    if (reply.kind != RpcReplyKind::Accepted)
+        return;
+
+    XdrValue<Device_ReadResp> read(xdr_Device_ReadResp);
+    const bool isRead = read.decode(reply.results);
+    if (!isRead && read->data.data_len != 0)
+        std::abort();
+    if (sum(read->data.data_val, read->data.data_len) > 0xFFU * reply.results.size())
+        std::abort();
+    (void)decodes(xdr_Device_WriteResp, reply.results);
+    (void)decodes(xdr_Create_LinkResp, reply.results);
+    (void)decodes(xdr_Device_Error, reply.results);
+}
+
+// A stream that comes in other pieces must give the same messages.
+void trackMessages(std::span<const std::uint8_t> bytes, std::size_t pieceSize)
+{
+    MessageTracker whole;
+    MessageTracker cut;
+    while (!bytes.empty()) {
+        const std::size_t end = whole.advance(bytes);
+        std::size_t done = 0;
+        do {
+            const auto rest = bytes.subspan(done);
+            const std::size_t size = cut.advance(rest.first(std::min(rest.size(), pieceSize)));
+            if (size == 0)
+                std::abort();
+            done += size;
+        } while (!cut.endedMessage() && done < bytes.size());
+        if (done != end || whole.endedMessage() != cut.endedMessage())
+            std::abort();
+        bytes = bytes.subspan(end);
+    }
+}
+
+} // namespace
+
+/// The first byte is the size of the pieces in which the others arrive.
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
+{
+    if (size == 0)
+        return 0;
+    const std::size_t pieceSize = std::size_t{data[0]} + 1;
+    const std::span stream(data + 1, size - 1);
+    trackMessages(stream, pieceSize);
+
+    RpcRecordReader reader(LargestRecord);
+    auto rest = stream;
+    while (!rest.empty() && reader.state() != RpcRecordReader::State::TooLong) {
+        const std::size_t taken = reader.feed(rest.first(std::min(rest.size(), pieceSize)));
+        if (taken == 0 || reader.record().size() > LargestRecord)
+            std::abort();
+        rest = rest.subspan(taken);
+        if (reader.state() == RpcRecordReader::State::Complete) {
+            decodeRecord(reader.record());
+            reader.next();
+        }
+    }
+    return 0;
+}

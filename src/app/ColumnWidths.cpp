@@ -1,0 +1,67 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "ColumnWidths.h"
+
+#include <QHeaderView>
+#include <QSettings>
+
+#include <algorithm>
+
+namespace {
+
+QString widthKey(int pane, const QString &kind, qsizetype section)
+{
+    return QString("tree%1.%2.section%3").arg(pane).arg(kind).arg(section);
+}
+
+} // namespace
+
+ColumnWidths::ColumnWidths()
+    : m_widths{{"local", {220, 60, 60, 100}}}
+{
+}
+
+void ColumnWidths::keep(const QString &kind, const QHeaderView &header)
+{
+    QList<int> widths;
+    for (int section = 0; section < header.count(); ++section) {
+        widths.append(header.sectionSize(section));
+    }
+    m_widths[kind] = widths;
+}
+
+void ColumnWidths::apply(const QString &kind, QHeaderView &header) const
+{
+    const QList<int> widths = m_widths.value(kind);
+    const qsizetype count = std::min<qsizetype>(widths.size(), header.count());
+    for (int section = 0; section < count; ++section) {
+        header.resizeSection(section, widths.at(section));
+    }
+}
+
+void ColumnWidths::write(QSettings &settings, int pane) const
+{
+    for (auto kind = m_widths.cbegin(); kind != m_widths.cend(); ++kind) {
+        for (qsizetype section = 0; section < kind.value().size(); ++section) {
+            settings.setValue(widthKey(pane, kind.key(), section), kind.value().at(section));
+        }
+    }
+}
+
+void ColumnWidths::read(const QSettings &settings, int pane)
+{
+    for (auto kind = m_widths.begin(); kind != m_widths.end(); ++kind) {
+        QList<int> widths;
+        for (;;) {
+            bool isNumber = false;
+            const int width =
+                settings.value(widthKey(pane, kind.key(), widths.size()), -1).toInt(&isNumber);
+            if (!isNumber || width < 0) {
+                break;
+            }
+            widths.append(width);
+        }
+        if (!widths.isEmpty()) {
+            kind.value() = widths;
+        }
+    }
+}

@@ -1,0 +1,217 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "CliOptions.h"
+#include "Console.h"
+#include "commands.h"
+
+#include "base/EngineeringNumber.h"
+#include "jobs/CreateJob.h"
+
+#include <limits>
+#include <map>
+
+namespace {
+
+struct CreateArguments
+{
+    Console &console;
+    CreateKind kind;
+    CreateChoices choices;
+    int ramp = 0;
+    int scaling = 0;
+    bool zeroCrest = false;
+    std::optional<qint64> seed;
+    std::map<const CreateField *, std::optional<double>> numbers;
+    OutputArguments output;
+
+    [[nodiscard]] double value(const CreateField &field) const
+    {
+        const auto found = numbers.find(&field);
+        return found == numbers.end() ? field.start : found->second.value_or(field.start);
+    }
+};
+
+int runCreate(CreateArguments &arguments)
+{
+    if (!mayWrite(arguments.console, arguments.output.options.fileName, arguments.output.force)) {
+        return arguments.console.failed();
+    }
+    arguments.choices.ramp = static_cast<RampKind>(arguments.ramp);
+    arguments.choices.customOversampling =
+        arguments.numbers[&createfields::oversampling].has_value();
+    CreateRequest request;
+    request.output = arguments.output.options;
+    request.signal =
+        makeSettings(arguments.kind, arguments.choices,
+                     [&arguments](const CreateField &field) { return arguments.value(field); });
+    request.minClockHz = arguments.value(createfields::minClock);
+    request.maxClockHz = arguments.value(createfields::maxClock);
+    request.clockHz = arguments.numbers[&createfields::clockRate];
+    request.autoScaling = arguments.scaling == 0;
+    request.zeroCrest = arguments.zeroCrest;
+    if (arguments.seed) {
+        request.seed = static_cast<unsigned>(*arguments.seed);
+    }
+    CreateJob job(request);
+    return arguments.console.run(job);
+}
+
+/// One kind of signal as a command, with the options that all kinds share.
+class KindCommand
+{
+public:
+    KindCommand(CommandSet &commands, CLI::App &create, const std::string &name, CreateKind kind,
+                const std::string &help)
+        : m_arguments(std::make_shared<CreateArguments>(CreateArguments{.console = commands.console,
+                                                                        .kind = kind,
+                                                                        .choices = {},
+                                                                        .seed = {},
+                                                                        .numbers = {},
+                                                                        .output = {}}))
+        , m_command(addCommand<CreateArguments>(create, name, help, commands.action, m_arguments,
+                                                runCreate))
+    {
+        number("--min-clock", createfields::minClock);
+        number("--max-clock", createfields::maxClock);
+        addNumber(m_command, "--clock", m_arguments->numbers[&createfields::clockRate],
+                  rangeOf(createfields::clockRate), "Clock written to the file (default: fitted)");
+        addChoice(m_command, "--scaling", m_arguments->scaling, {"auto", "none"},
+                  "Level scaling (default: auto)");
+        m_command.add_flag("--zero-crest", m_arguments->zeroCrest,
+                           "State a peak to RMS ratio of 0 dB");
+        addInteger(m_command, "--seed", m_arguments->seed,
+                   {"", 0, static_cast<double>(std::numeric_limits<unsigned>::max())},
+                   "Seed of random values, for repeatable signals");
+        addOutputArguments(m_command, m_arguments->output);
+    }
+
+    KindCommand &number(const std::string &name, const CreateField &field)
+    {
+        addNumber(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
+        return *this;
+    }
+
+    /// A number of which only whole values make sense.
+    /// A number of which only whole values make sense.
+    KindCommand &count(const std::string &name, const CreateField &field)
+    {
+        addInteger(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
+        return *this;
+    }
+
+    KindCommand &subKind(const std::string &name, const QStringList &names, const std::string &help)
+    {
+        addChoice(m_command, name, m_arguments->choices.subKind, names, help);
+        return *this;
+    }
+
+    KindCommand &ramp()
+    {
+        addChoice(m_command, "--ramp", m_arguments->ramp, {"linear", "rcos"},
+                  "Shape of the edges (default: linear)");
+        return *this;
+    }
+
+    KindCommand &randomPhase()
+    {
+        m_command.add_flag("--random-phase,!--no-random-phase", m_arguments->choices.randomPhase,
+                           "Give each carrier a random phase (default: yes)");
+        return *this;
+    }
+
+private:
+    [[nodiscard]] static NumberRange rangeOf(const CreateField &field)
+    {
+        return {field.unit, field.min, field.max};
+    }
+
+    [[nodiscard]] static std::string helpOf(const CreateField &field)
+    {
+        const QString start = engineeringText(field.start, field.unit);
+        return std::string(field.text) + " (default: " + start.toStdString() + ")";
+    }
+
+    std::shared_ptr<CreateArguments> m_arguments;
+    CLI::App &m_command;
+};
+
+void addPeriodicKinds(CommandSet &commands, CLI::App &create)
+{
+    using namespace createfields;
+    KindCommand(commands, create, "function", CreateKind::Function, "Periodic function")
+        .subKind("--shape", {"sine", "square", "triangular", "sawtooth"}, "Shape (default: sine)")
+        .number("--freq", frequency)
+        .number("--amp-i", amplitudeI)
+        .number("--amp-q", amplitudeQ)
+        .number("--offset-i", offsetI)
+        .number("--offset-q", offsetQ)
+        .number("--phase-q", phaseQ)
+        .count("--oversampling", oversampling);
+    KindCommand(commands, create, "multicarrier", CreateKind::MultiCarrier, "Many carriers")
+        .number("--spacing", spacing)
+        .count("--carriers", carriers)
+        .number("--offset-i", carrierOffsetI)
+        .randomPhase();
+    KindCommand(commands, create, "noise", CreateKind::Noise, "Band-limited noise")
+        .subKind("--color", {"white", "pink", "brown"}, "Colour (default: white)")
+        .number("--bandwidth", noiseBandwidth)
+        .number("--duration", noiseDuration);
+}
+
+void addPulseKinds(CommandSet &commands, CLI::App &create)
+{
+    using namespace createfields;
+    KindCommand(commands, create, "pulse", CreateKind::Pulse, "Single pulse")
+        .number("--rise", pulseRise)
+        .number("--on", pulseOn)
+        .number("--fall", pulseFall)
+        .number("--blank", pulseBlank)
+        .ramp()
+        .number("--resolution", pulseResolution);
+    KindCommand(commands, create, "chirp", CreateKind::Chirp, "Pulse with a frequency ramp")
+        .number("--rise", chirpRise)
+        .number("--on", chirpOn)
+        .number("--fall", chirpFall)
+        .number("--blank", chirpBlank)
+        .ramp()
+        .number("--resolution", chirpResolution)
+        .number("--range", chirpRange);
+}
+
+void addModulatedKinds(CommandSet &commands, CLI::App &create)
+{
+    using namespace createfields;
+    KindCommand(commands, create, "fm", CreateKind::Fm, "Frequency modulation by one or two tones")
+        .subKind("--tones", {"1", "2"}, "Number of tones (default: 1)")
+        .number("--freq", fmFrequency)
+        .number("--dev", fmDeviation)
+        .number("--freq2", fmFrequency2)
+        .number("--dev2", fmDeviation2);
+    KindCommand(commands, create, "sweep", CreateKind::Sweep, "Frequency sweep")
+        .subKind("--shape", {"linear", "sine", "triangular"}, "Course (default: linear)")
+        .number("--dev", sweepDeviation)
+        .number("--time", sweepTime)
+        .number("--start-phase", sweepStart)
+        .number("--stop-phase", sweepStop);
+    KindCommand(commands, create, "am", CreateKind::Am, "Amplitude modulation")
+        .subKind("--mode",
+                 {"regular", "lsb", "usb", "lsb+c", "usb+c", "lsb+usb", "2-tone", "2-tone-nc"},
+                 "Mode (default: regular)")
+        .number("--freq", amFrequency)
+        .number("--depth", amDepth)
+        .number("--freq2", amFrequency2)
+        .number("--depth2", amDepth2);
+    KindCommand(commands, create, "pm", CreateKind::Pm, "Phase modulation by a tone")
+        .number("--freq", pmFrequency)
+        .number("--dev", pmDeviation);
+}
+
+} // namespace
+
+void addCreateCommands(CommandSet &commands)
+{
+    CLI::App *create = commands.app.add_subcommand("create", "Make a signal");
+    create->require_subcommand(1);
+    addPeriodicKinds(commands, *create);
+    addPulseKinds(commands, *create);
+    addModulatedKinds(commands, *create);
+}

@@ -1,0 +1,381 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "app/ModulesDb.h"
+#include "app/QCustomTreeView.h"
+#include "guitesting.h"
+#include "log/Tracer.h"
+#include "toolframe/DlgBase.h"
+
+#include <QComboBox>
+#include <QLabel>
+#include <QListWidget>
+#include <QMenu>
+#include <QMenuBar>
+#include <QMessageBox>
+#include <QScrollBar>
+#include <QSignalSpy>
+#include <QStatusBar>
+#include <QTest>
+#include <QToolButton>
+
+namespace {
+
+QString plain(QString text)
+{
+    return text.remove('&');
+}
+
+QAction *findEntry(const MainWindow &window, const QString &menu, const QString &entry)
+{
+    const QList<QAction *> menus = window.menuBar()->actions();
+    for (const QAction *title : menus) {
+        const QList<QAction *> entries = title->menu()->actions();
+        for (QAction *action : entries) {
+            if (plain(title->text()) == menu && plain(action->text()) == entry) {
+                return action;
+            }
+        }
+    }
+    return nullptr;
+}
+
+/// A tool for everything that begins under "File", as the registry must place it.
+class AnyTool : public DlgBase
+{
+public:
+    bool startModule(const QString &path) override
+    {
+        started.append(path);
+        return accepts;
+    }
+    QString moduleName() const override { return "Any Tool"; }
+    QString menuPath() const override { return "/Edit/Any"; }
+    bool selectionAllowed(bool /*isFile*/) const override { return true; }
+    bool extensionAllowed(const QString & /*extension*/) const override { return true; }
+
+    QStringList started;
+    bool accepts = true;
+};
+
+} // namespace
+
+class TestMainWindow : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void showsWhatItMust();
+    void menusHaveNoEmptyEntryAndUniqueMnemonics();
+    void selectionEnablesTools_data();
+    void selectionEnablesTools();
+    void registryPlacesAndStartsTools();
+    void historyHoldsElevenEntries();
+    void historyLeadsBack();
+    void activePaneIsMarked();
+    void masksHideOtherFiles();
+    void logKeepsTheLast256Lines();
+    void logIconsFollowTheLevel_data();
+    void logIconsFollowTheLevel();
+    void refreshGoesToTheDefaultFolder();
+    void aboutNamesTheOriginOfTheIcons();
+    void infoTextIsShownAsItIs();
+};
+
+void TestMainWindow::showsWhatItMust()
+{
+    Desk desk;
+    desk.open();
+    QCOMPARE(desk.window()->windowTitle(), "HV Corvane");
+    QCOMPARE(desk.window()->pos(), QPoint(50, 50));
+    QCOMPARE(desk.window()->size(), QSize(700, 500));
+    for (int pane = 1; pane <= 2; ++pane) {
+        const auto *device = desk.find<QComboBox>(QString("cb_dev_%1").arg(pane));
+        QCOMPARE(device->count(), 1);
+        QCOMPARE(device->itemText(0), "Local");
+        QVERIFY(device->itemData(0).toString().isEmpty());
+        const auto *mask = desk.find<QComboBox>(QString("cb_flt_%1").arg(pane));
+        QCOMPARE(mask->count(), 2);
+        QCOMPARE(mask->itemText(0), "*.*");
+        QCOMPARE(mask->itemText(1), "*.wv");
+        QCOMPARE(mask->toolTip(), "Filter Mask");
+        QCOMPARE(desk.tree(pane)->currentPath(), desk.path("") + '/');
+    }
+    QVERIFY(desk.log().contains("Loading program settings..."));
+    QCOMPARE(desk.log().last(), "Startup complete");
+    // All controls lie within the panes even at the smallest size.
+    const auto *button = desk.find<QToolButton>("tb_refresh_2");
+    const QWidget *central = desk.window()->centralWidget();
+    QVERIFY(central->rect().contains(QRect(button->mapTo(central, QPoint(0, 0)), button->size())));
+    QTRY_VERIFY(desk.window()->firstPaintMs() > 0);
+}
+
+void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
+{
+    Desk desk;
+    desk.open();
+    QStringList titles;
+    const QList<QAction *> menus = desk.window()->menuBar()->actions();
+    for (const QAction *title : menus) {
+        titles.append(plain(title->text()));
+        QVERIFY(!title->menu()->isEmpty());
+        QSet<QChar> keys;
+        const QList<QAction *> entries = title->menu()->actions();
+        for (const QAction *entry : entries) {
+            const QChar key = entry->text().section('&', 1).front().toLower();
+            QVERIFY2(!keys.contains(key), qPrintable(entry->text()));
+            keys.insert(key);
+        }
+    }
+    QCOMPARE(titles, QStringList({"File", "Analyze", "Help"}));
+    QVERIFY(findEntry(*desk.window(), "File", "Exit"));
+    QVERIFY(findEntry(*desk.window(), "Analyze", "File Info"));
+    QVERIFY(findEntry(*desk.window(), "Help", "About"));
+}
+
+void TestMainWindow::selectionEnablesTools_data()
+{
+    QTest::addColumn<QString>("entry");
+    QTest::addColumn<bool>("enabled");
+    QTest::newRow("waveform") << "tone.wv" << true;
+    QTest::newRow("mixed case") << "other.Wv" << true;
+    QTest::newRow("other type") << "data.txt" << false;
+    QTest::newRow("no type") << "readme" << false;
+    QTest::newRow("folder") << "sub" << false;
+    QTest::newRow("folder like a waveform") << "folder.wv" << false;
+}
+
+void TestMainWindow::selectionEnablesTools()
+{
+    QFETCH(QString, entry);
+    QFETCH(bool, enabled);
+    Desk desk;
+    QVERIFY(writeTone(desk.path("other.Wv")));
+    QVERIFY(QDir().mkpath(desk.path("folder.wv")));
+    desk.open();
+    desk.select(1, entry);
+    QCOMPARE(findEntry(*desk.window(), "Analyze", "File Info")->isEnabled(), enabled);
+}
+
+void TestMainWindow::registryPlacesAndStartsTools()
+{
+    ModulesDb modules;
+    auto owned = std::make_unique<AnyTool>();
+    AnyTool *tool = owned.get();
+    modules.addTool(std::move(owned));
+    QMenuBar bar;
+    bar.addMenu("&File");
+    modules.buildMenu(&bar);
+    modules.buildMenu(&bar);
+    QCOMPARE(bar.actions().size(), 3);
+    QAction *entry = bar.actions().last()->menu()->actions().constFirst();
+    QCOMPARE(entry->text(), "Any");
+    QVERIFY(!entry->isEnabled());
+
+    modules.setSelection("/data/some folder/", true);
+    QVERIFY(entry->isEnabled());
+    modules.setSelection("/data/x.dat", false);
+    QVERIFY2(!entry->isEnabled(), "tools never work on an instrument");
+    modules.setSelection("/data/x.dat", true);
+    entry->trigger();
+    QCOMPARE(tool->started, QStringList("/data/x.dat"));
+    QVERIFY(tool->isVisible());
+
+    modules.hideAll();
+    QVERIFY(!tool->isVisible());
+    modules.showAgain();
+    QVERIFY(tool->isVisible());
+    modules.closeAll();
+
+    tool->accepts = false;
+    (void)Tracer::takeEntries();
+    entry->trigger();
+    QVERIFY(!tool->isVisible());
+    const QList<Tracer::Entry> lines = Tracer::takeEntries();
+    QCOMPARE(lines.size(), 1);
+    QVERIFY(lines.first().first.endsWith("Cannot initialize module."));
+    QCOMPARE(lines.first().second, int(Tracer::Error));
+}
+
+void TestMainWindow::historyHoldsElevenEntries()
+{
+    Desk desk;
+    for (int i = 0; i < 15; ++i) {
+        QVERIFY(writeText(desk.path(QString("file%1.dat").arg(i)), "x"));
+    }
+    desk.open();
+    const auto *history = desk.find<QComboBox>("cb_entry1");
+    for (int i = 0; i < 15; ++i) {
+        desk.select(1, QString("file%1.dat").arg(i));
+        QVERIFY(history->count() <= 11);
+    }
+    QCOMPARE(history->count(), 11);
+    QCOMPARE(history->itemText(0), desk.path("file4.dat"));
+    QCOMPARE(history->currentText(), desk.path("file14.dat"));
+    // One that is known already is chosen, not entered again.
+    desk.select(1, "file7.dat");
+    QCOMPARE(history->count(), 11);
+    QCOMPARE(history->currentText(), desk.path("file7.dat"));
+}
+
+void TestMainWindow::historyLeadsBack()
+{
+    Desk desk;
+    desk.open();
+    desk.select(1, "tone.wv");
+    desk.select(1, "sub");
+    auto *history = desk.find<QComboBox>("cb_entry1");
+    history->setFocus();
+    QTest::keyClick(history, Qt::Key_Up);
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("tone.wv"));
+    QCOMPARE(desk.tree(2)->currentPath(), desk.path("") + '/');
+}
+
+void TestMainWindow::activePaneIsMarked()
+{
+    Desk desk;
+    desk.open();
+    const auto isMarked = [&](int pane) {
+        return !desk.find<QLabel>(QString("l_win%1").arg(pane))->pixmap().isNull();
+    };
+    QVERIFY(isMarked(1));
+    QVERIFY(!isMarked(2));
+    desk.tree(2)->setFocus();
+    desk.select(2, "tone.wv");
+    QVERIFY(!isMarked(1));
+    QVERIFY(isMarked(2));
+    // The tools follow the pane that is used, also when its selection stays as it was.
+    desk.tree(1)->setFocus();
+    QVERIFY(isMarked(1));
+    QVERIFY(!findEntry(*desk.window(), "Analyze", "File Info")->isEnabled());
+    desk.tree(2)->setFocus();
+    QVERIFY(findEntry(*desk.window(), "Analyze", "File Info")->isEnabled());
+}
+
+void TestMainWindow::masksHideOtherFiles()
+{
+    Desk desk;
+    QVERIFY(writeTone(desk.path("UPPER.WV")));
+    desk.open();
+    const auto names = [&](int pane) {
+        const QAbstractItemModel &model = *desk.tree(pane)->model();
+        const QModelIndex home = desk.tree(pane)->currentIndex();
+        QStringList list;
+        for (int row = 0; row < model.rowCount(home); ++row) {
+            list.append(model.index(row, 0, home).data().toString());
+        }
+        list.sort();
+        return list;
+    };
+    const QStringList all{"UPPER.WV", "data.txt", "readme", "sub", "tone.wv"};
+    QTRY_COMPARE(names(1), all);
+    auto *mask = desk.find<QComboBox>("cb_flt_1");
+    mask->setFocus();
+    QTest::keyClick(mask, Qt::Key_Down);
+    QCOMPARE(mask->currentText(), "*.wv");
+    QTRY_COMPARE(names(1), QStringList({"UPPER.WV", "sub", "tone.wv"}));
+    QTRY_COMPARE(names(2), all);
+    QTest::keyClick(mask, Qt::Key_Up);
+    QTRY_COMPARE(names(1), all);
+    desk.tree(1)->filterChanged("*.txt;*.wv");
+    QTRY_COMPARE(names(1), QStringList({"UPPER.WV", "data.txt", "sub", "tone.wv"}));
+}
+
+void TestMainWindow::logKeepsTheLast256Lines()
+{
+    Desk desk;
+    desk.open();
+    for (int i = 0; i < 1000; ++i) {
+        Tracer::Trace(Tracer::Information, QString("line %1").arg(i));
+    }
+    const QStringList lines = desk.log();
+    QCOMPARE(lines.size(), 256);
+    QCOMPARE(lines.first(), "line 744");
+    QCOMPARE(lines.last(), "line 999");
+    const QScrollBar *bar = desk.find<QListWidget>("lw_log")->verticalScrollBar();
+    QTRY_COMPARE(bar->value(), bar->maximum());
+
+    Tracer::Trace(Tracer::Debug, QString("bus traffic"));
+    QCOMPARE(desk.log().last(), "line 999");
+}
+
+void TestMainWindow::logIconsFollowTheLevel_data()
+{
+    QTest::addColumn<int>("level");
+    QTest::addColumn<QString>("icon");
+    QTest::newRow("information") << 1 << "bulb";
+    QTest::newRow("warning") << 2 << "yellowled";
+    QTest::newRow("information and warning") << 3 << "yellowled";
+    QTest::newRow("error") << 4 << "redflag";
+    QTest::newRow("severe") << 8 << "redflag";
+    QTest::newRow("error and severe") << 12 << "redflag";
+    QTest::newRow("debug") << 16 << "debug";
+    QTest::newRow("debug and warning") << 18 << "yellowled";
+}
+
+void TestMainWindow::logIconsFollowTheLevel()
+{
+    QFETCH(int, level);
+    QFETCH(QString, icon);
+    Desk desk;
+    desk.open();
+    Tracer::setMask(Tracer::DebugMask);
+    Tracer::Trace(level, QString("message"));
+    Tracer::setMask(Tracer::DefaultMask);
+    const auto *list = desk.find<QListWidget>("lw_log");
+    const QImage shown = list->item(list->count() - 1)->icon().pixmap(16, 16).toImage();
+    QVERIFY(!shown.isNull());
+    QCOMPARE(shown, QIcon(":/icons16/" + icon + ".png").pixmap(16, 16).toImage());
+}
+
+void TestMainWindow::refreshGoesToTheDefaultFolder()
+{
+    Desk desk;
+    desk.open();
+    desk.select(2, "sub");
+    desk.tree(2)->slot_default();
+    QCOMPARE(desk.log().last(), QString("Set local default folder '%1/'").arg(desk.path("sub")));
+    desk.select(1, "tone.wv");
+    QTest::mouseClick(desk.find<QToolButton>("tb_refresh_1"), Qt::LeftButton);
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("sub") + '/');
+    desk.select(1, "tone.wv");
+    desk.tree(1)->setFocus();
+    QTest::keyClick(desk.tree(1), Qt::Key_R, Qt::ControlModifier);
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("sub") + '/');
+}
+
+void TestMainWindow::aboutNamesTheOriginOfTheIcons()
+{
+    Desk desk;
+    desk.open();
+    QString text;
+    QString title;
+    QVERIFY(withModal([&] { findEntry(*desk.window(), "Help", "About")->trigger(); },
+                      [&](QWidget &box) {
+                          text = dynamic_cast<QMessageBox &>(box).text();
+                          title = box.windowTitle();
+                          QTest::keyClick(&box, Qt::Key_Escape);
+                      }));
+    QCOMPARE(title, "HV Corvane");
+    QVERIFY(text.contains("<h2>HV Corvane</h2>"));
+    QVERIFY(text.contains("Tango"));
+    QVERIFY(text.contains("Version "));
+}
+
+void TestMainWindow::infoTextIsShownAsItIs()
+{
+    Desk desk;
+    desk.open();
+    QString text;
+    QVERIFY(withModal([&] { emit desk.tree(1)->infoTextAvailable("<b>name</b>"); },
+                      [&](QWidget &box) {
+                          auto &message = dynamic_cast<QMessageBox &>(box);
+                          QCOMPARE(message.textFormat(), Qt::PlainText);
+                          text = message.text();
+                          press("OK")(box);
+                      }));
+    QCOMPARE(text, "<b>name</b>");
+    emit desk.tree(1)->errMsg("a reason");
+    QCOMPARE(desk.window()->statusBar()->currentMessage(), "a reason");
+}
+
+QTEST_MAIN(TestMainWindow)
+#include "tst_mainwindow.moc"

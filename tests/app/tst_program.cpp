@@ -1,0 +1,97 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "guitesting.h"
+
+#include <QDir>
+#include <QFileInfo>
+#include <QImage>
+#include <QProcess>
+#include <QTest>
+
+namespace {
+
+/// Runs the program with a home and settings of its own.
+struct Run
+{
+    Run(const QStringList &arguments, const QString &home)
+    {
+        QProcess process;
+        QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
+        environment.insert("HOME", home);
+        environment.insert("XDG_CONFIG_HOME", home + "/config");
+        process.setProcessEnvironment(environment);
+        process.start(qEnvironmentVariable("CORVANE_BIN") + "/corvane", arguments);
+        finished = process.waitForFinished(60000) && process.exitStatus() == QProcess::NormalExit;
+        status = process.exitCode();
+        output = QString::fromLocal8Bit(process.readAllStandardOutput());
+        errors = QString::fromLocal8Bit(process.readAllStandardError());
+    }
+
+    bool finished = false;
+    int status = -1;
+    QString output;
+    QString errors;
+};
+
+} // namespace
+
+class TestProgram : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void startsAndQuits();
+    void complainsAboutAMissingFile();
+    void answersWithoutADisplay_data();
+    void answersWithoutADisplay();
+
+private:
+    QTemporaryDir m_home;
+};
+
+void TestProgram::startsAndQuits()
+{
+    const QString file = m_home.filePath("tone.wv");
+    QVERIFY(writeTone(file));
+    const QDir pictures(m_home.filePath("pictures"));
+    const Run run({"--screenshot", pictures.path(), file, "--unknown"}, m_home.path());
+    QVERIFY2(run.finished && run.status == 0, qPrintable(run.errors));
+    const QImage window(pictures.filePath("main-window.png"));
+    QVERIFY(window.width() >= 700 && window.height() >= 500);
+    QVERIFY(!QImage(pictures.filePath("waveform-info.png")).isNull());
+    QVERIFY(run.output.startsWith("first paint "));
+    // Nothing of the user's is touched.
+    QVERIFY(!QFileInfo::exists(m_home.filePath("config/Halvorn")));
+}
+
+void TestProgram::complainsAboutAMissingFile()
+{
+    const Run run({"--screenshot", m_home.filePath("none"), "/no/such.wv"}, m_home.path());
+    QVERIFY(run.finished);
+    QCOMPARE(run.status, 1);
+    QVERIFY(run.errors.contains("there is no file '/no/such.wv'"));
+}
+
+void TestProgram::answersWithoutADisplay_data()
+{
+    QTest::addColumn<QString>("argument");
+    QTest::addColumn<QString>("answer");
+    QTest::newRow("version") << "--version"
+                             << "corvane ";
+    QTest::newRow("help") << "--help"
+                          << "Usage: corvane ";
+}
+
+void TestProgram::answersWithoutADisplay()
+{
+    QFETCH(QString, argument);
+    QFETCH(QString, answer);
+    qputenv("QT_QPA_PLATFORM", "xcb");
+    const Run run({argument}, m_home.path());
+    qputenv("QT_QPA_PLATFORM", "offscreen");
+    QVERIFY(run.finished);
+    QCOMPARE(run.status, 0);
+    QVERIFY(run.output.startsWith(answer));
+}
+
+QTEST_GUILESS_MAIN(TestProgram)
+#include "tst_program.moc"

@@ -1,0 +1,549 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "filebytes.h"
+#include "jobs/DumpJob.h"
+#include "jobs/LevelJob.h"
+#include "jobs/MeasureJob.h"
+#include "jobs/WavImportJob.h"
+#include "log/Tracer.h"
+#include "wvfile/TempStream.h"
+
+#include <QDir>
+#include <QRegularExpression>
+#include <QSignalSpy>
+#include <QTemporaryDir>
+#include <QTest>
+
+#include <algorithm>
+#include <cmath>
+#include <memory>
+
+using namespace filebytes;
+
+class TestJobs : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void initTestCase();
+    void init();
+    void cleanup();
+    void levelKeepsAllButTheLevels();
+    void levelKeepsEveryWord();
+    void levelKeepsLongUnknownTags();
+    void levelTranslatesKinds_data();
+    void levelTranslatesKinds();
+    void levelCompletesMarkers_data();
+    void levelCompletesMarkers();
+    void levelDefaults_data();
+    void levelDefaults();
+    void levelTellsItsSteps();
+    void importScales_data();
+    void importScales();
+    void importTellsItsSteps();
+    void importSetsTheClock_data();
+    void importSetsTheClock();
+    void importFails_data();
+    void importFails();
+    void measuresRanges_data();
+    void measuresRanges();
+    void cancelKeepsLaterStepsFromStarting_data();
+    void cancelKeepsLaterStepsFromStarting();
+    void cancelAfterTheEndIsHarmless();
+
+private:
+    [[nodiscard]] QString path(const QString &name) const { return m_folder.filePath(name); }
+
+    /// Runs a level copy of the file "in.wv" with these bytes and returns the result's bytes.
+    QByteArray levelCopy(const QByteArray &source, std::optional<double> peakDb = {},
+                         std::optional<double> peakToRmsDb = {})
+    {
+        if (!store(path("in.wv"), source)) {
+            return {};
+        }
+        LevelJob job({path("in.wv"), {path("out.wv"), {}, {}}, peakDb, peakToRmsDb});
+        return job.run() ? load(path("out.wv")) : QByteArray();
+    }
+
+    /// Files in the jobs' temporary folder, those counted that are open and have no name.
+    [[nodiscard]] qsizetype temporaryFiles() const
+    {
+        qsizetype count = QDir(m_temporary.path()).entryList(QDir::Files).size();
+        const QDir descriptors("/proc/self/fd");
+        for (const QFileInfo &open : descriptors.entryInfoList(QDir::Files | QDir::System)) {
+            const QString target = open.symLinkTarget();
+            count += target.startsWith(m_temporary.path()) && !QFile::exists(target) ? 1 : 0;
+        }
+        return count;
+    }
+
+    QTemporaryDir m_folder;
+    QTemporaryDir m_temporary; // where the jobs keep their streams
+};
+
+namespace {
+
+const QByteArray plainTags = "{TYPE: TGX-WV,0}{CLOCK:1000000}{LEVEL OFFS:3.5,1.25}";
+
+/// The content of a tag of a file; null if it has none.
+QByteArray tag(const QByteArray &file, const QByteArray &name)
+{
+    const qsizetype begin = file.indexOf('{' + name + ':');
+    if (begin < 0) {
+        return {};
+    }
+    const qsizetype content = begin + name.size() + 2;
+    return file.mid(content, file.indexOf('}', content) - content);
+}
+
+QByteArray sampleWords(const QByteArray &file)
+{
+    return file.mid(file.indexOf('#') + 1).chopped(1);
+}
+
+QStringList texts(const QSignalSpy &spy)
+{
+    QStringList lines;
+    for (const QList<QVariant> &arguments : spy) {
+        lines << arguments.first().toString();
+    }
+    return lines;
+}
+
+} // namespace
+
+void TestJobs::initTestCase()
+{
+    qputenv("TMPDIR", QFile::encodeName(m_temporary.path()));
+    TempStream held;
+    QVERIFY(held.open());
+    QCOMPARE(temporaryFiles(), 1);
+}
+
+void TestJobs::init()
+{
+    Tracer::setMask(Tracer::DebugMask);
+    (void)Tracer::takeEntries();
+    QFile::remove(path("out.wv"));
+}
+
+void TestJobs::cleanup()
+{
+    // Whatever a job has come to, its streams are gone.
+    QCOMPARE(temporaryFiles(), 0);
+}
+
+void TestJobs::levelKeepsAllButTheLevels()
+{
+    const QByteArray samples = words({1, 2, -3, 4, 0x7FFF, -0x7FFF, 0, -1});
+    const QByteArray source =
+        wvFile("{X: y}{TYPE: TVX-WV,0}{COMMENT:c d}{CLOCK:2500000.25}{CLOCK MARKER:5}"
+               "{SAMPLES:4}{clock marker: 7}{COPYRIGHT:me}{CLOCK MARKER: 6}{CLOCK MARKERS:{}"
+               "{LEVEL OFFS:3,1}{CONTROL LENGTH:4}{MARKER LIST 4: 0:0;3:1}"
+               "{MARKER LIST 1: 0:1;1:0;2:1}{MARKER LIST 2: 0:0}",
+               samples);
+    QByteArray copy = levelCopy(source, -2, 4.5);
+    copy.replace(tag(copy, "DATE"), "now");
+    QCOMPARE(copy,
+             wvFile("{TYPE: TVX-WV,0}{COMMENT:c d}{COPYRIGHT:me}{DATE:now}{CLOCK:2500000.250000}"
+                    "{CLOCK MARKER:2500000.250000}{LEVEL OFFS:6.500000,2.000000}{SAMPLES:4}"
+                    "{X: y}{clock marker: 7}{CLOCK MARKERS: {}{CONTROL LENGTH: 4}"
+                    "{MARKER LIST 1: 0:1;1:0;2:1}{MARKER LIST 2: 0:0}{MARKER LIST 3: 0:0}"
+                    "{MARKER LIST 4: 0:0;3:1}",
+                    samples));
+    // A copy of the copy changes nothing more.
+    QByteArray again = levelCopy(copy, -2, 4.5);
+    again.replace(tag(again, "DATE"), "now");
+    QCOMPARE(again, copy);
+}
+
+void TestJobs::levelKeepsEveryWord()
+{
+    QByteArray samples;
+    QByteArray expected;
+    for (int word = -0x8000; word <= 0x7FFF; ++word) {
+        samples += littleEndian(static_cast<qint16>(word));
+        // The writer never goes below -32767, so one word can't come back.
+        expected += littleEndian(static_cast<qint16>(std::max(word, -0x7FFF)));
+    }
+    QVERIFY(sampleWords(levelCopy(wvFile(plainTags, samples), 0, 0)) == expected);
+}
+
+void TestJobs::levelKeepsLongUnknownTags()
+{
+    // Longer than any block that they are copied in, with the name of a dropped tag in the middle.
+    const QByteArray longTag =
+        "{LONG: " + QByteArray(300000, 'a') + "{CLOCK MARKER:1" + QByteArray(65536, 'b') + '}';
+    const QByteArray dropped = "{CLOCK MARKER:" + QByteArray(200000, '1') + '}';
+    const QByteArray copy =
+        levelCopy(wvFile(plainTags + longTag + dropped + "{Z: }" + dropped, words({1, 2})), 0, 0);
+    QVERIFY(copy.contains("{SAMPLES:1}" + longTag + "{Z: }{CONTROL LENGTH: 1}"));
+}
+
+void TestJobs::levelTranslatesKinds_data()
+{
+    QTest::addColumn<QByteArray>("kind");
+    QTest::addColumn<QByteArray>("written");
+    QTest::newRow("TGX") << QByteArray("TGX-WV") << QByteArray(" TGX-WV,0");
+    QTest::newRow("TBX") << QByteArray("TBX-WV,4711") << QByteArray(" TGX-WV,0");
+    QTest::newRow("TVX") << QByteArray("tvx-wv") << QByteArray(" TVX-WV,0");
+    QTest::newRow("TQX-130") << QByteArray("TQX-130-WV") << QByteArray(" TGX-WV,0");
+    QTest::newRow("TQX-110") << QByteArray("WV-ADD") << QByteArray(" TGX-WV,0");
+}
+
+void TestJobs::levelTranslatesKinds()
+{
+    QFETCH(QByteArray, kind);
+    const QByteArray copy =
+        levelCopy(wvFile("{TYPE: " + kind + "}{CLOCK:1e6}", words({0, 0})), 0, 0);
+    QTEST(tag(copy, "TYPE"), "written");
+}
+
+void TestJobs::levelCompletesMarkers_data()
+{
+    QTest::addColumn<QByteArray>("tags");
+    QTest::addColumn<QByteArray>("first");
+    QTest::addColumn<QByteArray>("second");
+    QTest::newRow("no markers") << QByteArray() << QByteArray(" 0:0") << QByteArray(" 0:0");
+    QTest::newRow("ends high") << QByteArray("{CONTROL LENGTH:4}{MARKER LIST 1: 0:0;2:1}")
+                               << QByteArray(" 0:0;2:1") << QByteArray(" 0:0");
+    QTest::newRow("ends low") << QByteArray("{CONTROL LENGTH:4}{MARKER LIST 1: 0:1;2:0}")
+                              << QByteArray(" 0:1;2:0") << QByteArray(" 0:0");
+    QTest::newRow("length one short") << QByteArray("{CONTROL LENGTH:9}{MARKER LIST 2: 0:0;8:1}")
+                                      << QByteArray(" 0:0") << QByteArray(" 0:0;8:1");
+    // The second list is shorter than the first, with whose last byte the trace goes on.
+    QTest::newRow("cut by another list")
+        << QByteArray("{CONTROL LENGTH:4}{MARKER LIST 1: 0:1;3:0}{MARKER LIST 2: 0:0;1:1}")
+        << QByteArray(" 0:1;3:0") << QByteArray(" 0:0;1:1;4:0");
+    QTest::newRow("longer than the samples")
+        << QByteArray("{CONTROL LENGTH:20}{MARKER LIST 1: 0:0;5:1;15:0}") << QByteArray(" 0:0;5:1")
+        << QByteArray(" 0:0");
+}
+
+void TestJobs::levelCompletesMarkers()
+{
+    QFETCH(QByteArray, tags);
+    // Ten samples; the length of the file admits positions up to 20 and more.
+    const QByteArray copy = levelCopy(wvFile(plainTags + tags, QByteArray(40, '\1')), 0, 0);
+    QCOMPARE(tag(copy, "CONTROL LENGTH"), " 10");
+    QTEST(tag(copy, "MARKER LIST 1"), "first");
+    QTEST(tag(copy, "MARKER LIST 2"), "second");
+    QCOMPARE(tag(copy, "MARKER LIST 3"), " 0:0");
+    QCOMPARE(tag(copy, "MARKER LIST 4"), " 0:0");
+}
+
+void TestJobs::levelDefaults_data()
+{
+    // "Update" over the whole file: the peak level is minus the peak offset of the tag, the peak to
+    // RMS ratio is what the samples measure minus the RMS offset of the tag. What is written then
+    // is -peak, and ratio - peak.
+    const double measured = [] {
+        const double first = (0x4000 - 0.5) / 32767;
+        const double second = (100 - 0.5) / 32767;
+        return 20 * std::log10(1 / std::sqrt((2 * first * first + 2 * second * second) / 2));
+    }();
+    QTest::addColumn<QByteArray>("levels");
+    QTest::addColumn<std::optional<double>>("peak");
+    QTest::addColumn<std::optional<double>>("ratio");
+    QTest::addColumn<double>("writtenRms");
+    QTest::addColumn<double>("writtenPeak");
+    using Level = std::optional<double>;
+    const auto row = [](const char *name, const QByteArray &levels, Level peak, Level ratio,
+                        double rms, double peakOffset) {
+        QTest::newRow(name) << levels << peak << ratio << rms << peakOffset;
+    };
+    row("both", "3.5,1.25", {}, {}, measured - 3.5 + 1.25, 1.25);
+    row("peak given", "3.5,1.25", -4.0, {}, measured - 3.5 + 4, 4);
+    row("ratio given", "3.5,1.25", {}, 2.0, 3.25, 1.25);
+    row("positive peak", "3.5,1.25", 3.0, 2.0, -1, -3);
+    row("zero peak", "3.5,1.25", 0.0, 0.0, 0, 0);
+    row("peak held to the field", "3.5,80", {}, 1.0, 51, 50);
+    row("ratio held to the field", "99,0", {}, {}, -50, 0);
+    row("no tag", {}, {}, {}, measured, 0);
+}
+
+void TestJobs::levelDefaults()
+{
+    QFETCH(QByteArray, levels);
+    QFETCH(std::optional<double>, peak);
+    QFETCH(std::optional<double>, ratio);
+    QFETCH(double, writtenRms);
+    QFETCH(double, writtenPeak);
+    const QByteArray tags = "{TYPE: TGX-WV,0}{CLOCK:1000}" +
+                            (levels.isEmpty() ? QByteArray() : "{LEVEL OFFS:" + levels + '}');
+    const QByteArray copy = levelCopy(wvFile(tags, words({0x4000, 0x4000, 100, 100})), peak, ratio);
+    QCOMPARE(tag(copy, "LEVEL OFFS"),
+             QByteArray(QString::asprintf("%.6f,%.6f", writtenRms, writtenPeak).toLatin1()));
+}
+
+void TestJobs::levelTellsItsSteps()
+{
+    QVERIFY(store(path("in.wv"), wvFile(plainTags, words({0, 0x7FFF}))));
+    LevelJob job({path("in.wv"), {path("out.wv"), "new <&>", QString()}, {}, 0.25});
+    const QSignalSpy steps(&job, &ToolJob::stepStarted);
+    const QSignalSpy report(&job, &ToolJob::report);
+    QVERIFY(job.run());
+    QCOMPARE(texts(steps), (QStringList{"Reading Waveform...", "Saving waveform..."}));
+    QCOMPARE(texts(report), (QStringList{" File:       \t" + path("out.wv"), " Samples:    \t1",
+                                         " Peak Offset:\t1.25 dB", " Peak/RMS:   \t0.25 dB"}));
+    const QStringList log = takeLog(Tracer::Information);
+    QVERIFY(!log.contains("Rescaling from pos. 1 to pos 1."));
+    QCOMPARE(log.count("Creating rescaled waveform..."), 1);
+    QCOMPARE(tag(load(path("out.wv")), "COMMENT"), "new <&>");
+
+    LevelJob measuring({path("in.wv"), {path("out.wv"), {}, {}}, {}, {}});
+    const QSignalSpy measuringSteps(&measuring, &ToolJob::stepStarted);
+    QVERIFY(measuring.run());
+    QCOMPARE(texts(measuringSteps),
+             (QStringList{"Reading Waveform...", "Calculating...", "Saving waveform..."}));
+    QVERIFY(takeLog(Tracer::Information).contains("Rescaling from pos. 1 to pos 1."));
+}
+
+void TestJobs::importScales_data()
+{
+    QTest::addColumn<QByteArray>("source");
+    QTest::addColumn<ImportScaling>("scaling");
+    QTest::addColumn<QByteArray>("result");
+    QTest::addColumn<double>("peakOffset");
+    const auto row = [](const char *name, const QByteArray &source, ImportScaling scaling,
+                        const QByteArray &result, double peakOffset) {
+        QTest::newRow(name) << source << scaling << result << peakOffset;
+    };
+    // 32767 / 32768 in both gives a peak of 1.41417, -3.0100 dB; a third sample keeps the chunk
+    // above 8 bytes.
+    const QByteArray high = words({0x7FFF, 0x7FFF, 0, 0, 0, 0});
+    const double highOffset = -20 * std::log10(std::sqrt(2.0) * 32767 / 32768);
+    row("high, none", high, ImportScaling::None, words({32766, 32766, 0, 0, 0, 0}), highOffset);
+    row("high, down", high, ImportScaling::Down, words({23170, 23170, 0, 0, 0, 0}), 0);
+    row("high, auto", high, ImportScaling::Auto, words({23170, 23170, 0, 0, 0, 0}), 0);
+    const QByteArray low = words({0, 0, 0x4000, 0, 0, -0x1000});
+    const double lowOffset = 20 * std::log10(2.0);
+    // 0.5 x 32767 + 0.5 = 16384, -0.125 x 32767 + 0.5 = -4095.4
+    row("low, none", low, ImportScaling::None, words({0, 0, 16384, 0, 0, -4095}), lowOffset);
+    row("low, down", low, ImportScaling::Down, words({0, 0, 16384, 0, 0, -4095}), lowOffset);
+    row("low, auto", low, ImportScaling::Auto, words({0, 0, 32767, 0, 0, -8191}), 0);
+    const QByteArray full = words({-0x8000, 0, 0, 0, 0, 0x7FFF});
+    row("full scale, auto", full, ImportScaling::Auto, words({-32766, 0, 0, 0, 0, 32766}), 0);
+    const QByteArray silence(12, '\0');
+    row("silence, auto", silence, ImportScaling::Auto, silence, 240);
+}
+
+void TestJobs::importScales()
+{
+    QFETCH(QByteArray, source);
+    QFETCH(ImportScaling, scaling);
+    QFETCH(double, peakOffset);
+    QVERIFY(store(path("in.wav"), wavFile(formatChunk() + chunk("data", source))));
+    WavImportRequest request{path("in.wav"), {.output = {path("out.wv"), {}, {}}}};
+    request.target.scaling = scaling;
+    WavImportJob job(request);
+    QVERIFY(job.run());
+    const QByteArray result = load(path("out.wv"));
+    QTEST(sampleWords(result), "result");
+    QCOMPARE(tag(result, "LEVEL OFFS").split(',').value(1), QByteArray::number(peakOffset, 'f', 6));
+    QCOMPARE(tag(result, "SAMPLES"), "3");
+    // An import has no markers.
+    QVERIFY(!result.contains("MARKER LIST"));
+}
+
+void TestJobs::importTellsItsSteps()
+{
+    QVERIFY(store(path("in.wav"),
+                  wavFile(formatChunk() + chunk("data", words({0x7FFF, 0x7FFF, 0, 0, 0, 0})))));
+    WavImportJob job({path("in.wav"), {.output = {path("out.wv"), "a{bc}d", "me"}}});
+    const QSignalSpy steps(&job, &ToolJob::stepStarted);
+    const QSignalSpy report(&job, &ToolJob::report);
+    QVERIFY(job.run());
+    QCOMPARE(texts(steps), (QStringList{"Reading WAV-File Data...", "Analyzing Levels...",
+                                        "Rescaling...", "Creating Waveform File..."}));
+    QCOMPARE(texts(report),
+             (QStringList{"<b>Reading directory entry from cache.</b>\n", "<b>Opening file.</b>\n",
+                          "<b>Reading WAV-file data</b>\n", "<b>Scaling</b>\n", " Samples:    \t3",
+                          " Peak Offset:\t0.00 dB",
+                          // One sample of three at full scale: 10 log10(3)
+                          " Peak/RMS:   \t4.77 dB", "\n<b>Saving</b>",
+                          " File:       \t" + path("out.wv"),
+                          "\n<font color=\"#00C000\"><b>Import completed</b></font>"}));
+    const QByteArray result = load(path("out.wv"));
+    QCOMPARE(tag(result, "COMMENT"), "ac");
+    QCOMPARE(tag(result, "COPYRIGHT"), "me");
+    QVERIFY(QRegularExpression("^\\d{4}-\\d\\d-\\d\\d;\\d\\d:\\d\\d:\\d\\d$")
+                .match(tag(result, "DATE"))
+                .hasMatch());
+}
+
+void TestJobs::importSetsTheClock_data()
+{
+    QTest::addColumn<int>("rate");
+    QTest::addColumn<double>("given"); // 0: from the file
+    QTest::addColumn<QByteArray>("clock");
+    QTest::addColumn<bool>("warns");
+    QTest::newRow("from the file") << 44100 << 0.0 << QByteArray("44100.000000") << false;
+    QTest::newRow("given") << 44100 << 2.5e6 << QByteArray("2500000.000000") << false;
+    QTest::newRow("below all clocks") << 500 << 0.0 << QByteArray("1000.000000") << true;
+    QTest::newRow("negative") << -1 << 0.0 << QByteArray("1000.000000") << true;
+    QTest::newRow("above all clocks")
+        << 2'000'000'000 << 0.0 << QByteArray("600000000.000000") << true;
+}
+
+void TestJobs::importSetsTheClock()
+{
+    QFETCH(int, rate);
+    QFETCH(double, given);
+    QFETCH(bool, warns);
+    QByteArray format = formatChunk();
+    format.replace(12, 4, littleEndian(rate));
+    QVERIFY(store(path("in.wav"), wavFile(format + chunk("data", QByteArray(12, '\1')))));
+    WavImportRequest request{path("in.wav"), {.output = {path("out.wv"), {}, {}}}};
+    request.clockFromFile = given == 0;
+    request.target.clockHz = given;
+    QVERIFY(WavImportJob(request).run());
+    const QByteArray result = load(path("out.wv"));
+    QTEST(tag(result, "CLOCK"), "clock");
+    QTEST(tag(result, "CLOCK MARKER"), "clock");
+    QCOMPARE(takeLog(Tracer::Warning).size(), warns ? 1 : 0);
+}
+
+void TestJobs::importFails_data()
+{
+    QTest::addColumn<QByteArray>("bytes");
+    QTest::addColumn<QString>("output");
+    QTest::addColumn<QStringList>("errors");
+    const QByteArray data = chunk("data", QByteArray(12, '\1'));
+    const auto row = [](const char *name, const QByteArray &bytes, const char *output,
+                        const QStringList &errors) {
+        QTest::newRow(name) << bytes << output << errors;
+    };
+    row("no file", {}, "out.wv", {"Cannot open .wav file."});
+    row("no data", wavFile(formatChunk()), "out.wv", {"Cannot evaluate .wav file header."});
+    row("no fmt", wavFile(data), "out.wv", {"Cannot evaluate .wav file header."});
+    row("mono", wavFile(formatChunk(1, 1) + data), "out.wv", {"File must contain 2 channels."});
+    row("cut data", wavFile(formatChunk() + data).chopped(1), "out.wv",
+        {"Cannot read data from .wav file."});
+    row("no folder", wavFile(formatChunk() + data), "missing/out.wv",
+        {"Error opening output file.", "Waveform generation failed."});
+}
+
+void TestJobs::importFails()
+{
+    QFETCH(QByteArray, bytes);
+    QFETCH(QString, output);
+    QFile::remove(path("in.wav"));
+    QVERIFY(bytes.isEmpty() || store(path("in.wav"), bytes));
+    WavImportJob job({path("in.wav"), {.output = {path(output), {}, {}}}});
+    const QSignalSpy report(&job, &ToolJob::report);
+    QVERIFY(!job.run());
+    QVERIFY(!job.isCancelled());
+    QTEST(takeLog(Tracer::Error), "errors");
+    QCOMPARE(texts(report).last(), "\n<font color=\"#C00000\"><b>Import failed</b></font>");
+    QVERIFY(!QFile::exists(path(output)));
+}
+
+void TestJobs::measuresRanges_data()
+{
+    QTest::addColumn<qint64>("from");
+    QTest::addColumn<qint64>("count");
+    QTest::addColumn<QString>("error");
+    QTest::newRow("whole") << qint64(0) << qint64(100000) << QString();
+    QTest::newRow("across blocks") << qint64(65000) << qint64(1000) << QString();
+    QTest::newRow("last") << qint64(99999) << qint64(1) << QString();
+    QTest::newRow("behind the end")
+        << qint64(100000) << qint64(1)
+        << "--from: 100000 lies outside the file; permitted: 0 to 99999";
+    QTest::newRow("too many") << qint64(99999) << qint64(2)
+                              << "--count: 2 leads outside the file; permitted: 1 to 1";
+}
+
+void TestJobs::measuresRanges()
+{
+    QFETCH(qint64, from);
+    QFETCH(qint64, count);
+    QFETCH(QString, error);
+    QByteArray samples;
+    double sum = 0;
+    double peak = 0;
+    for (int i = 0; i < 100000; ++i) {
+        const auto inPhase = static_cast<qint16>(i * 31);
+        const auto quadrature = static_cast<qint16>(i * 57 + 3);
+        samples += littleEndian(inPhase) + littleEndian(quadrature);
+        if (i >= from && i < from + count) {
+            const double square = std::pow(inPhase - 0.5, 2) + std::pow(quadrature - 0.5, 2);
+            sum += square;
+            peak = std::max(peak, square);
+        }
+    }
+    QVERIFY(store(path("in.wv"), wvFile(plainTags, samples)));
+    MeasureJob job({path("in.wv"), from, count});
+    QCOMPARE(job.run(), error.isEmpty());
+    if (!error.isEmpty()) {
+        QCOMPARE(takeLog(Tracer::Error), QStringList{error});
+        return;
+    }
+    const double rms = std::sqrt(sum / static_cast<double>(count)) / 32767;
+    QCOMPARE(job.result().samples, count);
+    QVERIFY(std::fabs(job.result().rmsOffset + 20 * std::log10(rms + 1e-7)) < 1e-5);
+    QVERIFY(std::fabs(job.result().peakOffset + 20 * std::log10(std::sqrt(peak) / 32767 + 1e-7)) <
+            1e-5);
+}
+
+void TestJobs::cancelKeepsLaterStepsFromStarting_data()
+{
+    QTest::addColumn<bool>("level");
+    QTest::addColumn<QString>("at"); // the step in which the wish comes; empty: before the run
+    QTest::addColumn<int>("steps");
+    QTest::newRow("level, before") << true << "" << 0;
+    QTest::newRow("level, reading") << true << "Reading Waveform..." << 1;
+    QTest::newRow("level, measuring") << true << "Calculating..." << 2;
+    QTest::newRow("import, before") << false << "" << 1;
+    QTest::newRow("import, reading") << false << "Reading WAV-File Data..." << 1;
+    QTest::newRow("import, measuring") << false << "Analyzing Levels..." << 2;
+    QTest::newRow("import, scaling") << false << "Rescaling..." << 3;
+}
+
+void TestJobs::cancelKeepsLaterStepsFromStarting()
+{
+    QFETCH(bool, level);
+    QFETCH(QString, at);
+    QFETCH(int, steps);
+    QVERIFY(store(path("in.wv"), wvFile(plainTags, QByteArray(400, '\1'))));
+    QVERIFY(store(path("in.wav"), wavFile(formatChunk() + chunk("data", QByteArray(400, '\1')))));
+    std::unique_ptr<ToolJob> job;
+    if (level) {
+        job = std::make_unique<LevelJob>(
+            LevelRequest{path("in.wv"), {path("out.wv"), {}, {}}, {}, {}});
+    } else {
+        WavImportRequest request{path("in.wav"), {.output = {path("out.wv"), {}, {}}}};
+        request.target.scaling = ImportScaling::Auto;
+        job = std::make_unique<WavImportJob>(request);
+    }
+    const QSignalSpy spy(job.get(), &ToolJob::stepStarted);
+    connect(job.get(), &ToolJob::stepStarted, this, [&](const QString &label) {
+        if (label == at) {
+            job->cancel();
+            job->cancel();
+        }
+    });
+    if (at.isEmpty()) {
+        job->cancel();
+    }
+    QVERIFY(!job->run());
+    QVERIFY(job->isCancelled());
+    QCOMPARE(spy.size(), steps);
+    QCOMPARE(takeLog(Tracer::Error), QStringList{"Action aborted by user."});
+    QVERIFY(!QFile::exists(path("out.wv")));
+}
+
+void TestJobs::cancelAfterTheEndIsHarmless()
+{
+    QVERIFY(store(path("in.wv"), wvFile(plainTags, words({0, 1, 2, 3}))));
+    QByteArray dumped;
+    DumpJob job({path("in.wv"), 1, {}}, DumpFormat::Ci16, [&dumped](const QByteArray &bytes) {
+        dumped += bytes;
+        return true;
+    });
+    QVERIFY(job.run());
+    job.cancel();
+    QCOMPARE(dumped, words({2, 3}));
+}
+
+QTEST_GUILESS_MAIN(TestJobs)
+#include "tst_jobs.moc"

@@ -1,0 +1,325 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "WvTestFile.h"
+
+#include "wvfile/WvScanner.h"
+
+#include <QDate>
+#include <QTest>
+
+namespace {
+
+const QString tgxLine = "1|Waveform TYPE-tag : TGX Waveform File";
+const QString noLevels = "2|No LEVEL OFFS tag found in waveform file.";
+const QString noClock = "2|Invalid data in CLOCK tag.";
+const QByteArray levels = "{LEVEL OFFS:3.5,1.25}";
+const QByteArray clocked = levels + "{CLOCK:1000}";
+
+struct Scan
+{
+    bool ok = false;
+    WvFileSummary summary;
+    QStringList log;
+};
+
+Scan scan(const QByteArray &bytes, unsigned mask = Tracer::DefaultMask)
+{
+    Scan result;
+    CapturedLog log(mask);
+    TestDevice device;
+    device.bytes = bytes;
+    result.ok = device.open(QIODevice::ReadOnly) && WvScanner(result.summary).scan(device);
+    result.log = log.take();
+    return result;
+}
+
+QString suspicious(qint64 block, qint64 tag)
+{
+    return QString("2|Suspicious number of samples (WAVEFORM tag:%1, SAMPLES tag:%2)")
+        .arg(block)
+        .arg(tag);
+}
+
+} // namespace
+
+class TestWvScanner : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void words_data();
+    void words();
+    void kinds_data();
+    void kinds();
+    void fields();
+    void tagsBehindTheBlock();
+    void segments();
+    void unknownValues();
+    void names_data();
+    void names();
+    void debugWords();
+    void files();
+    void samplesAreNotRead();
+};
+
+void TestWvScanner::words_data()
+{
+    QTest::addColumn<QByteArray>("file");
+    QTest::addColumn<bool>("ok");
+    QTest::addColumn<QStringList>("log");
+    const auto good = [](const char *name, const QByteArray &file, const QStringList &log = {}) {
+        QTest::newRow(name) << file << true << log;
+    };
+    good("no tag at all", "", {noLevels, noClock});
+    good("clock and levels", clocked);
+    good("no levels", "{CLOCK:1}", {noLevels});
+    good("no clock", levels, {noClock});
+    good("clock 0", levels + "{CLOCK:0}", {noClock});
+    good("negative clock", levels + "{CLOCK:-5}", {noClock});
+    good("any clock above 0", levels + "{CLOCK:1e12}");
+    good("LEVEL OFFSET isn't known here", "{CLOCK:1}{LEVEL OFFSET:1,2}", {noLevels});
+    good("whatever the case", "{clock:1}{ Level   Offs :1,2}");
+    good("tags of no interest", clocked + "{CONTROL LENGTH:x}{CRESTFACTOR:{}{RESOLUTION:" +
+                                    QByteArray(2000, '1') + "}{FREE" + QByteArray(5, '\0') + ":}" +
+                                    "{MWV_SEGMENT_NEWS:" + QByteArray(2000, '1') + '}');
+    good("block as stated", clocked + "{SAMPLES:2}" + silentBlock(2));
+    good("block overrules SAMPLES", clocked + "{SAMPLES:3}" + silentBlock(2), {suspicious(2, 3)});
+    good("block without SAMPLES", clocked + silentBlock(2), {suspicious(2, -1)});
+    good("block of broken length", clocked + "{SAMPLES:1}{WAVEFORM-8:1,#abcdef}",
+         {"2|Resulting data length in WAVEFORM tag is invalid: 5",
+          "2|Tag begins with 'WAVEFORM-8:1,#'",
+          "2|Number of stripped bytes at beginning (including #): 3"});
+    good("empty block", clocked + "{SAMPLES:1}{WAVEFORM-1: #}",
+         {"2|Invalid number of samples in WAVEFORM tag: 0", suspicious(0, 1)});
+    good("largest block", clocked + "{SAMPLES:4000000000}{WAVEFORM-16000000001: #ab}");
+    good("block beyond belief", clocked + "{SAMPLES:1}{WAVEFORM-16000000005: #ab}",
+         {"2|Invalid number of samples in WAVEFORM tag: 4000000001", suspicious(4'000'000'001, 1)});
+    good("block shorter than its prefix", clocked + "{SAMPLES:1}{WAVEFORM-2:12345#}",
+         {"2|Invalid number of samples in WAVEFORM tag: 0", suspicious(0, 1)});
+
+    const auto bad = [](const char *name, const QByteArray &file, const QString &words) {
+        QTest::newRow(name) << clocked + file + "{CLOCK:0}" << false << QStringList(words);
+    };
+    bad("kind", "{TYPE:XYZ,0}", "4|Invalid file format in TYPE tag.");
+    bad("no kind", "{TYPE:}", "4|Invalid file format in TYPE tag.");
+    bad("clock", "{CLOCK:x}", "4|Invalid clock rate in CLOCK tag.");
+    bad("clock without end", "{CLOCK:inf}", "4|Invalid clock rate in CLOCK tag.");
+    bad("samples", "{SAMPLES:x}", "4|Invalid samples count in SAMPLES tag.");
+    bad("levels", "{LEVEL OFFS:1;2}", "4|Invalid parameters in LEVEL OFFS tag.");
+    bad("one level", "{LEVEL OFFS:1}", "4|Invalid parameters in LEVEL OFFS tag.");
+    bad("segment count", "{MWV_SEGMENT_COUNT:x}", "4|Invalid MWV_SEGMENT_COUNT tag.");
+    bad("negative segment count", "{MWV_SEGMENT_COUNT:-1}",
+        "4|Invalid count in MSW_SEGMENT_COUNT tag.");
+    for (const char *tag : {"DURATION", "CLOCK", "START", "LENGTH"}) {
+        for (const char *list : {"1,x", "1,,2", ""}) {
+            QTest::addRow("%s '%s'", tag, list)
+                << clocked + "{MWV_SEGMENT_" + tag + ':' + list + '}' << false
+                << QStringList(QString("4|Invalid MWV_SEGMENT_%1 tag.").arg(tag));
+        }
+    }
+    bad("segment levels", "{MWV_SEGMENT_LEVEL_OFFS:1,2,3,x}",
+        "4|Invalid MWV_SEGMENT_LEVEL_OFFS tag.");
+    bad("block without number", "{WAVEFORM: #}", "4|Invalid WAVEFORM tag.");
+    bad("block without mark", "{WAVEFORM-5:}", "4|Invalid WAVEFORM tag.");
+    QTest::newRow("marker list without end")
+        << clocked + "{MARKER LIST 1:0:1" << false << QStringList("4|Invalid MARKER LIST tag.");
+    for (const char *tag :
+         {"TYPE", "COMMENT", "COPYRIGHT", "DATE", "CLOCK", "SAMPLES", "LEVEL OFFS", "WAVEFORM-1",
+          "MWV_SEGMENT_SETTINGS_FILE", "MWV_SEGMENT_LEVEL_MODE", "MWV_SEGMENT_CLOCK_MODE",
+          "MWV_SEGMENT_COUNT", "MWV_SEGMENT_DURATION", "MWV_SEGMENT_CLOCK", "MWV_SEGMENT_START",
+          "MWV_SEGMENT_LENGTH", "MWV_SEGMENT_FILES", "MWV_SEGMENT_LEVEL_OFFS"}) {
+        const QString name = QString(tag).section('-', 0, 0);
+        QTest::addRow("endless %s", tag)
+            << clocked + '{' + tag + ':' + QByteArray(1025, '1') + '}' << false
+            << QStringList({"4|Tag content exceeds limit.", "4|Invalid " + name + " tag."});
+    }
+}
+
+void TestWvScanner::words()
+{
+    QFETCH(QByteArray, file);
+    QFETCH(bool, ok);
+    QFETCH(QStringList, log);
+    const Scan result = scan(file);
+    QCOMPARE(result.log, log);
+    QCOMPARE(result.ok, ok);
+}
+
+void TestWvScanner::kinds_data()
+{
+    QTest::addColumn<QByteArray>("content");
+    QTest::addColumn<QString>("text");
+    QTest::addColumn<bool>("checksum");
+    const auto row = [](const char *content, const char *text, bool checksum) {
+        QTest::newRow(content) << QByteArray(content) << QString(text) << checksum;
+    };
+    row("TGX-WV,0", "TGX Waveform File", false);
+    row(" tgx-wv , 0 ", "TGX Waveform File", false);
+    row("TBX-WV", "TBX Waveform File", false);
+    row("TVX-WV,", "TVX Waveform File", false);
+    row("TQX-130-WV,123456", "TQX-130 waveform file", true);
+    row("WV, -1", "TQX-110, TQX-120 waveform file", true);
+    row("WV-ADD,x", "TQX-110, TQX-120 additional waveform file", false);
+    row("TGX-MWV,1", "TGX Multi-Segment Waveform", true);
+    row("TGX-DL,0", "TGX data list", false);
+    row("TGX-CL,0,7", "TGX control list", false);
+}
+
+void TestWvScanner::kinds()
+{
+    QFETCH(QByteArray, content);
+    QFETCH(QString, text);
+    QFETCH(bool, checksum);
+    const Scan result = scan("{TYPE:" + content + '}' + clocked);
+    QVERIFY(result.ok);
+    QCOMPARE(result.log, QStringList("1|Waveform TYPE-tag : " + text));
+    QCOMPARE(result.summary.typeText, text);
+    QCOMPARE(result.summary.hasChecksum, checksum);
+}
+
+void TestWvScanner::fields()
+{
+    const Scan result =
+        scan("{TYPE: TGX-WV,0}{COMMENT:  a b}{COPYRIGHT:me}{DATE: 2011-04-18;09:30:00}"
+             "{CLOCK: 2000 }{LEVEL OFFS: 3.5 , 1.25}{SAMPLES:3}{MARKER LIST 1:0:1}" +
+             silentBlock(3));
+    QVERIFY(result.ok);
+    QCOMPARE(result.log, QStringList(tgxLine));
+    const WvFileSummary &summary = result.summary;
+    QCOMPARE(summary.comment, QString("a b"));
+    QCOMPARE(summary.copyright, QString("me"));
+    QCOMPARE(summary.date, QString("2011-04-18;09:30:00"));
+    QCOMPARE(summary.clock, 2000.0);
+    QCOMPARE(summary.samples, qint64(3));
+    QCOMPARE(summary.playTime, 0.0015);
+    QVERIFY(summary.levelsValid);
+    QCOMPARE(summary.rmsOffset, 3.5);
+    QCOMPARE(summary.peakOffset, 1.25);
+    QVERIFY(summary.hasMarkers);
+    QCOMPARE(summary.segmentCount, 0);
+}
+
+void TestWvScanner::tagsBehindTheBlock()
+{
+    // The samples look like tags, and must not be taken for some.
+    const QByteArray samples = "{COMMENT:no}";
+    const Scan result =
+        scan("{SAMPLES:3}{WAVEFORM-13: #" + samples + '}' + clocked + "{COMMENT:behind}");
+    QVERIFY(result.ok);
+    QCOMPARE(result.log, QStringList());
+    QCOMPARE(result.summary.comment, QString("behind"));
+    QCOMPARE(result.summary.samples, qint64(3));
+}
+
+void TestWvScanner::segments()
+{
+    const Scan result = scan(
+        clocked + "{TYPE:TGX-MWV,0}{MWV_SEGMENT_COUNT: 3}{MWV_SEGMENT_FILES:\"a.wv\",b \"c\".wv}"
+                  "{MWV_SEGMENT_START:0,9000000000}{MWV_SEGMENT_LENGTH: 10 , 20}"
+                  "{MWV_SEGMENT_CLOCK:1e6,2e6}{MWV_SEGMENT_DURATION:0.5,1,2}"
+                  "{MWV_SEGMENT_LEVEL_OFFS:1,2,3,4,5}{MWV_SEGMENT_LEVEL_MODE:UNCHANGED}"
+                  "{MWV_SEGMENT_CLOCK_MODE:HIGHEST}{MWV_SEGMENT_SETTINGS_FILE:\"s.inf\"}");
+    QVERIFY2(result.ok, qPrintable(result.log.join('\n')));
+    const WvFileSummary &summary = result.summary;
+    QCOMPARE(summary.segmentCount, 3);
+    QCOMPARE(summary.levelMode, QString("UNCHANGED"));
+    QCOMPARE(summary.clockMode, QString("HIGHEST"));
+    QCOMPARE(summary.settingsFile, QString("s.inf"));
+    QCOMPARE(summary.segments.size(), 3);
+    QCOMPARE(summary.segments.at(0).fileName, QString("a.wv"));
+    QCOMPARE(summary.segments.at(1).fileName, QString("b c.wv"));
+    QCOMPARE(summary.segments.at(1).start, qint64(9'000'000'000));
+    QCOMPARE(summary.segments.at(1).length, qint64(20));
+    QCOMPARE(summary.segments.at(0).clock, 1e6);
+    QCOMPARE(summary.segments.at(2).duration, 2.0);
+    QCOMPARE(summary.segments.at(1).rmsOffset, 3.0);
+    QCOMPARE(summary.segments.at(1).peakOffset, 4.0);
+    QCOMPARE(summary.segments.at(2).rmsOffset, 0.0);
+}
+
+void TestWvScanner::unknownValues()
+{
+    const WvFileSummary empty = scan("").summary;
+    QCOMPARE(empty.samples, qint64(-1));
+    QCOMPARE(empty.clock, -1.0);
+    QCOMPARE(empty.playTime, -1.0);
+    QVERIFY(!empty.levelsValid);
+    QCOMPARE(scan("{CLOCK:1000}").summary.playTime, -1.0);
+    QCOMPARE(scan("{SAMPLES:1000}").summary.playTime, -1.0);
+    QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
+}
+
+void TestWvScanner::names_data()
+{
+    QTest::addColumn<QByteArray>("before");
+    QTest::newRow("control byte in a name") << QByteArray("{COM\nMENT:no}");
+    QTest::newRow("byte beyond ASCII in a name") << QByteArray("{COMMENT\xE4:no}");
+    QTest::newRow("tilde in a name") << QByteArray("{COMMENT~:no}");
+    QTest::newRow("empty name") << QByteArray("{:no}");
+    QTest::newRow("blank name") << QByteArray("{   :no}");
+    QTest::newRow("name of 1024 characters") << '{' + QByteArray(1024, 'x') + ":no}";
+    QTest::newRow("longer name") << '{' + QByteArray(1100, 'x') + ":no}";
+    QTest::newRow("brace in a name") << QByteArray("{{COMMENT:no}");
+}
+
+void TestWvScanner::names()
+{
+    QFETCH(QByteArray, before);
+    const Scan result = scan(before + clocked + "{COMMENT:yes}");
+    QVERIFY(result.ok);
+    QCOMPARE(result.log, QStringList());
+    QCOMPARE(result.summary.comment, QString("yes"));
+}
+
+void TestWvScanner::debugWords()
+{
+    const Scan result = scan(clocked + "{ x  y :}{SAMPLES:1}" + silentBlock(1), Tracer::DebugMask);
+    QCOMPARE(result.log, QStringList({"16|Evaluating tag 'LEVEL OFFS'", "16|Evaluating tag 'CLOCK'",
+                                      "16|Evaluating tag 'X Y'", "16|Evaluating tag 'SAMPLES'",
+                                      "16|Evaluating tag 'WAVEFORM-5'", "16|WAVEFORM-tag found."}));
+}
+
+void TestWvScanner::files()
+{
+    const QTemporaryDir folder;
+    const QString path = folder.filePath("some.wv");
+    const QString reading = "1|Reading information from file: ";
+    CapturedLog log;
+    HvFileIO io;
+    WvFileSummary summary;
+    summary.comment = "old";
+    QVERIFY(!io.readWaveformInfo(path, &summary));
+    QCOMPARE(log.take(), QStringList({reading + path, "4|File does not exist."}));
+    QCOMPARE(summary.comment, QString());
+    QVERIFY(!io.readWaveformInfo(folder.path(), &summary));
+    QCOMPARE(log.take(), QStringList({reading + folder.path(), "4|Cannot open file."}));
+    QVERIFY(!io.readWaveformInfo(path, nullptr));
+
+    QFile file(path);
+    QVERIFY(file.open(QIODevice::WriteOnly));
+    file.write(clocked);
+    file.close();
+    static_cast<void>(log.take());
+    const QDate before = QDate::currentDate();
+    QVERIFY(io.readWaveformInfo(path, &summary));
+    QCOMPARE(log.take(), QStringList(reading + path));
+    QCOMPARE(summary.fileName, QString("some.wv"));
+    QCOMPARE(summary.fileSize, qint64(clocked.size()));
+    const QDate created = QDate::fromString(summary.created, "yyyy-MM-dd");
+    QVERIFY(created.isValid() && created >= before.addDays(-1) && created <= QDate::currentDate());
+}
+
+/// However long the block, a scan reads the tags alone.
+void TestWvScanner::samplesAreNotRead()
+{
+    TestDevice device;
+    device.bytes = clocked + "{SAMPLES:5000000}" + silentBlock(5'000'000) + "{COMMENT:behind}";
+    QVERIFY(device.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
+    CapturedLog log;
+    WvFileSummary summary;
+    QVERIFY(WvScanner(summary).scan(device));
+    QCOMPARE(summary.comment, QString("behind"));
+    QVERIFY2(device.bytesRead < 128 * 1024, qPrintable(QString::number(device.bytesRead)));
+}
+
+QTEST_GUILESS_MAIN(TestWvScanner)
+#include "tst_wvscanner.moc"
