@@ -55,7 +55,7 @@ ViStatus lookUpHost(const std::string &host, const Deadline &deadline,
         std::thread([lookup, host] {
             std::vector<HostAddress> found;
             try {
-                found = resolve(host, AI_ADDRCONFIG);
+                found = resolve(host, 0);
             } catch (const std::bad_alloc &) {
                 found.clear();
             }

@@ -10,7 +10,7 @@ namespace {
 
 // Largest reply: what one device_read asks for, and its frame.
 constexpr std::size_t LargestRecord = (1U << 20U) + 4096;
-constexpr std::size_t InputSize = 64U * 1024U;
+constexpr std::size_t InputSize = std::size_t{64} * 1024;
 
 constexpr std::uint32_t MessageCall = 0;
 constexpr std::uint32_t RpcVersion = 2;

@@ -3,7 +3,6 @@
 
 #include "FormatText.h"
 
-#include <chrono>
 #include <cstring>
 
 namespace visa {
@@ -169,11 +168,9 @@ ViStatus Session::perform(Transfer transfer)
 {
     const Attributes current = attributes();
     const Deadline deadline = Deadline::after(current.timeoutMs);
-    std::unique_lock lock(m_transportMutex, std::defer_lock);
-    while (!lock.try_lock_for(std::chrono::milliseconds(deadline.atMost(1000).remainingMs()))) {
-        if (deadline.isOver())
-            return VI_ERROR_TMO;
-    }
+    if (!m_turnstile.enter(deadline))
+        return VI_ERROR_TMO;
+    const Turnstile::Passage passage(m_turnstile);
     if (!m_transport)
         return VI_ERROR_INV_OBJECT;
     return transfer(*m_transport, current, deadline);
@@ -239,11 +236,11 @@ ViStatus Session::controlRemote(ViUInt16 mode)
 
 void Session::close()
 {
-    std::unique_lock lock(m_transportMutex, std::try_to_lock);
-    if (!lock.owns_lock()) {
+    if (!m_turnstile.enter(Deadline::after(0))) {
         m_interruptible->interrupt();
-        lock.lock();
+        (void)m_turnstile.enter(Deadline::after(VI_TMO_INFINITE));
     }
+    const Turnstile::Passage passage(m_turnstile);
     m_transport.reset();
 }
 

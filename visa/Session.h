@@ -4,6 +4,7 @@
 #include "ObjectTable.h"
 #include "ResourceName.h"
 #include "Transport.h"
+#include "Turnstile.h"
 
 #include <memory>
 #include <mutex>
@@ -60,7 +61,7 @@ private:
     mutable std::mutex m_attributesMutex; // never held during a transfer
     Attributes m_attributes;
 
-    std::timed_mutex m_transportMutex;      // held during a transfer
+    Turnstile m_turnstile;                  // entered during a transfer
     std::unique_ptr<Transport> m_transport; // null when closed
     Transport *const m_interruptible;       // the same, for close()
 };

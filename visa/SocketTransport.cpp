@@ -8,7 +8,7 @@ namespace visa {
 
 namespace {
 
-constexpr std::size_t InputSize = 64U * 1024U;
+constexpr std::size_t InputSize = std::size_t{64} * 1024;
 constexpr std::uint8_t LineFeed = '\n';
 
 // takeBuffered() has used up all bytes and the read has to go on. No status of VISA has this value.

@@ -15,7 +15,7 @@ namespace {
 
 // One request to the device; short enough that the time-out, which holds for each, stays near that
 // of the whole call.
-constexpr std::size_t LargestTransfer = 64U * 1024U;
+constexpr std::size_t LargestTransfer = std::size_t{64} * 1024;
 
 // What the driver takes (drivers/usb/class/usbtmc.c): not below 100 ms. Its upper end is a signed
 // number of ms; a day stands for no time-out.
