@@ -73,7 +73,7 @@ void type(QLineEdit *edit, const QString &text)
     edit->setFocus();
     edit->selectAll();
     QTest::keyClicks(edit, text);
-    QTest::keyClick(edit, Qt::Key_Return);
+    QTest::keyClick(edit, Qt::Key_Tab); // Return would go on to the next page
 }
 
 /// Answers the next message box with Yes or No; `text` gets what it asked.
