@@ -64,7 +64,7 @@ public:
 private:
     /// A read of a stream fetches a block of 16 MiB anyway; keeping a larger piece of it than the
     /// window shows spares most moves the read.
-    static constexpr qint64 PageSamples = 512 * 1024;
+    static constexpr qint64 PageSamples = 1 << 19;
 
     struct Page
     {

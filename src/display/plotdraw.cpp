@@ -110,7 +110,9 @@ void PixelGrid::dashedVertical(qreal x, qreal fromY, qreal toY, const QColor &co
 {
     constexpr qreal dash = 4;
     constexpr qreal period = 7;
-    for (qreal y = fromY; y < toY; y += period) {
+    const int dashes = static_cast<int>(std::ceil((toY - fromY) / period));
+    for (int k = 0; k < dashes; ++k) {
+        const qreal y = fromY + k * period;
         vertical(x, y, std::min(y + dash, toY), color);
     }
 }

@@ -17,7 +17,7 @@
 
 namespace {
 
-constexpr qint64 BlockSamples = 64 * 1024;
+constexpr qint64 BlockSamples = 1 << 16;
 
 /// Calls `take` with block after block of the source.
 template <typename Take>
