@@ -346,21 +346,23 @@ void TestPanes::contextMenuFitsTheEntry()
     const QStringList fileEntries{"Set As Default Folder", "Create Folder", "Rename", "Delete"};
 
     desk.select(1, "data.txt");
-    const QPoint onText = tree->visualRect(tree->currentIndex()).center();
+    const QPersistentModelIndex text = tree->currentIndex();
     desk.select(1, "tone.wv");
-    const QPoint onTone = tree->visualRect(tree->currentIndex()).center();
+    const QPersistentModelIndex tone = tree->currentIndex();
+    tree->scrollTo(text);
 
-    rightClick(tree, onText);
+    rightClick(tree, tree->visualRect(text).center());
     QTRY_VERIFY(openMenu());
     QCOMPARE(tree->currentPath(), desk.path("data.txt"));
     QCOMPARE(visibleEntries(*openMenu()).mid(0, 4), fileEntries);
     QVERIFY(!visibleEntries(*openMenu()).contains("Waveform Info"));
     openMenu()->close();
 
-    rightClick(tree, onTone);
+    rightClick(tree, tree->visualRect(tone).center());
     QTRY_VERIFY(openMenu());
     QCOMPARE(tree->currentPath(), desk.path("tone.wv"));
-    QCOMPARE(visibleEntries(*openMenu()), fileEntries + QStringList({"-", "Waveform Info"}));
+    QCOMPARE(visibleEntries(*openMenu()).mid(0, 6),
+             fileEntries + QStringList({"-", "Waveform Info"}));
     QTest::keyClick(openMenu(), Qt::Key_S); // the mnemonic of "Set As Default Folder"
     QTRY_COMPARE(desk.log().last(), QString("Set local default folder '%1/'").arg(desk.path("")));
 }
@@ -383,14 +385,15 @@ void TestPanes::doubleClickStartsTheFirstTool()
     desk.open();
     desk.select(1, "data.txt");
     QCustomTreeView *tree = desk.tree(1);
-    QSignalSpy status(tree, &QCustomTreeView::errMsg);
     const auto doubleClick = [&] {
         const QPoint position = tree->visualRect(tree->currentIndex()).center();
         QTest::mouseClick(tree->viewport(), Qt::LeftButton, {}, position);
         QTest::mouseDClick(tree->viewport(), Qt::LeftButton, {}, position);
     };
     doubleClick();
-    QCOMPARE(status.last().first().toString(), "No tool works on 'data.txt'.");
+    // Only the making of a signal takes a file of any type.
+    QTRY_COMPARE(QApplication::activeWindow()->windowTitle(), "Create Signal");
+    QApplication::activeWindow()->close();
     desk.select(1, "tone.wv");
     doubleClick();
     QTRY_VERIFY(qobject_cast<DlgInfo *>(QApplication::activeWindow()));
