@@ -69,21 +69,23 @@ public:
         return done;
     }
 
+    /// The instrument's own words on a failure that has another reason besides.
+    [[nodiscard]] const QString &instrumentWords() const { return m_instrumentWords; }
+
 private:
-    /// Makes the instrument's own words the last line, where it has any.
     void explain(VisaDevice &device)
     {
-        const QString reason = m_console.lastReason();
         if (device.isOpen()) {
             device.checkErrorQueue();
         }
         const QString reported = device.takeLastError().trimmed().replace('\n', "; ");
         if (!reported.isEmpty()) {
-            m_console.error("The instrument reports: " + reported);
-        } else if (reason.isEmpty()) {
-            m_console.error("The instrument did not do as it was told.");
-        } else if (m_console.lastReason() != reason) {
-            m_console.error(reason);
+            m_instrumentWords = "The instrument reports: " + reported;
+        }
+        if (m_console.lastReason().isEmpty()) {
+            m_console.error(reported.isEmpty() ? "The instrument did not do as it was told."
+                                               : m_instrumentWords);
+            m_instrumentWords.clear();
         }
     }
 
@@ -91,6 +93,7 @@ private:
     QString m_resource;
     QString m_label;
     Work m_work;
+    QString m_instrumentWords;
 };
 
 int runSession(const InstrumentArguments &arguments, const QString &label, const Work &work)
@@ -100,7 +103,12 @@ int runSession(const InstrumentArguments &arguments, const QString &label, const
         return arguments.console.wrongUsage("RES: the name of the instrument is empty");
     }
     DeviceJob job(arguments.console, resource, label, work);
-    return arguments.console.run(job);
+    const int exitCode = arguments.console.run(job);
+    // Behind the reason that the program saw, as they tell more.
+    if (exitCode == ExitFailed && !job.instrumentWords().isEmpty()) {
+        arguments.console.error(job.instrumentWords());
+    }
+    return exitCode;
 }
 
 /// Ends a command with its result on standard output.
@@ -126,7 +134,9 @@ QString pathProblem(const QString &path)
 QString fullPathProblem(const QString &path)
 {
     const RemotePath parts = splitPath(path);
-    const bool isFull = !parts.fileName.isEmpty() && parts.directory != parts.drive;
+    const bool isName =
+        !parts.fileName.isEmpty() && parts.fileName != "." && parts.fileName != "..";
+    const bool isFull = isName && parts.directory != parts.drive;
     return !pathProblem(path).isEmpty() || isFull ? pathProblem(path)
                                                   : "'" + path + "' is no full path";
 }
