@@ -99,15 +99,18 @@ void ScreenshotRun::takePictures()
     if (m_finished) {
         return;
     }
-    bool done = save(m_window, "main-window.png");
+    bool done = true;
     if (!m_file.isEmpty()) {
+        // The report first, since reading the file fills the log of the main window.
         DlgBase *tool = m_window.modules().firstAllowed(m_file, true);
-        done = done && tool && m_window.modules().start(*tool, m_file) &&
-               save(*tool, "waveform-info.png");
-        if (!done) {
+        done = tool && m_window.modules().start(*tool, m_file);
+        if (done) {
+            done = save(*tool, "waveform-info.png");
+        } else {
             complain(QString("no report on '%1'").arg(m_file));
         }
     }
+    done = save(m_window, "main-window.png") && done;
     std::printf("first paint %lld ms after the start\n",
                 static_cast<long long>(m_window.firstPaintMs()));
     finish(done ? 0 : 1);
