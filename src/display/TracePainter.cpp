@@ -166,7 +166,7 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
 {
     const QRectF plot = area.marginsRemoved(margins(m_style.font));
     painter.save();
-    painter.fillRect(area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(PlotColor::Background));
     if (plot.width() > 0 && plot.height() > 0) {
         const PixelGrid grid(painter);
         const QList<QRectF> rects = panes(plot);

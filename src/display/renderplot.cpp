@@ -6,6 +6,7 @@
 #include "TracePainter.h"
 #include "base/parallel.h"
 #include "plotdraw.h"
+#include "vectorstate.h"
 #include "waterfall.h"
 
 #include <QPainter>
@@ -164,6 +165,7 @@ std::optional<PlotView> plotViewOf(const QString &name)
 bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
                SampleSource &source)
 {
+    clearVectorState();
     switch (request.view) {
     case PlotView::Iq:
     case PlotView::LogMag:
