@@ -513,15 +513,18 @@ void TestVisaDevice::arbWait()
     VisaDevice device;
     QVERIFY(device.openResource(resource));
     const bool fails = conditions.value(0).toInt() == 0 && conditions.value(0).size() == 4;
-    fake->answer = [&](const std::string &message) -> std::string {
-        if (fails && QString::fromStdString(message).contains(conditions.first())) {
+    const QString failing = fails ? conditions.first() : QString();
+    fake->answer = [&, failing](const std::string &message) -> std::string {
+        if (fails && QString::fromStdString(message).contains(failing)) {
             fake->errors = {"-300,\"Device-specific error\""};
         }
         if (message == "SOUR:BB:PROG:MCOD?") {
             return "37\n";
         }
-        return message == "STAT:OPER:COND?" ? conditions.takeFirst().toStdString() + "\n"
-                                            : std::string();
+        if (message != "STAT:OPER:COND?" || conditions.isEmpty()) {
+            return {};
+        }
+        return conditions.takeFirst().toStdString() + "\n";
     };
     (void)fake.takeMessages();
     (void)takeLog();
