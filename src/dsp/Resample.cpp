@@ -21,17 +21,17 @@ namespace {
 
 /// Outputs between two looks at the clock: a block, the one before and their inputs shall stay in
 /// the second cache.
-constexpr qint64 MaxBlockOutputs = 96 * 1024;
+constexpr qint64 MaxBlockOutputs = 96LL * 1024;
 
 /// Products in a block, some 10 ms of one core.
-constexpr qint64 MaxBlockProducts = 16 * 1024 * 1024;
+constexpr qint64 MaxBlockProducts = 16LL * 1024 * 1024;
 
 /// Parts of a block that go to the processors. The level is summed part by part, so that it doesn't
 /// depend on the number of threads.
 constexpr qint64 PartsPerBlock = 24;
 
 /// Samples of the input window that a block may need.
-constexpr qint64 MaxBlockInput = 512 * 1024;
+constexpr qint64 MaxBlockInput = 512LL * 1024;
 
 [[nodiscard]] bool fail(const QString &text)
 {

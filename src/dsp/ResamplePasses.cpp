@@ -38,11 +38,6 @@ qint64 failedWriteSample(qint64 first)
     return (boundary - BufferedIO::HeaderSize) / BufferedIO::RecordSize;
 }
 
-size_t floatsOf(int samples)
-{
-    return 2 * static_cast<size_t>(samples);
-}
-
 CORVANE_VECTOR_CLONES void scale(std::span<float> iq, float gain)
 {
     for (float &value : iq) {

@@ -20,7 +20,7 @@ constexpr int PlanSize = 1024;
 constexpr int MaxOffset = 1024 * 1024;
 
 /// Larger banks of phases would come from main memory.
-constexpr std::size_t MaxBankBytes = 4 * 1024 * 1024;
+constexpr std::size_t MaxBankBytes = 4ULL * 1024 * 1024;
 
 /// Up to this sum of the magnitudes of the coefficients, single precision holds the bound.
 constexpr double MaxSinglePrecisionSum = 12.0;
