@@ -13,7 +13,6 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
-#include <thread>
 #include <utility>
 #include <vector>
 
@@ -102,26 +101,6 @@ private:
     std::vector<char> m_result;
 };
 
-/// Spreads the parts over the processors while the calling thread first does its own work, such as
-/// reading and writing streams, and then joins in.
-template <typename Work, typename OwnWork>
-void shareParts(std::size_t count, const Work &work, const OwnWork &ownWork)
-{
-    std::atomic<std::size_t> next{0};
-    const auto drain = [&] {
-        for (std::size_t part = next++; part < count; part = next++) {
-            work(part);
-        }
-    };
-    const std::size_t helperCount = std::min<std::size_t>(threadCount() - 1, count);
-    std::vector<std::jthread> helpers;
-    for (std::size_t i = 0; i < helperCount; ++i) {
-        helpers.emplace_back(drain);
-    }
-    ownWork();
-    drain();
-}
-
 /// Some outputs that follow each other, on their way from the input to the output stream.
 struct OutputBlock
 {
@@ -141,7 +120,7 @@ struct OutputBlock
 } // namespace
 
 /// One run: the state of the loop over the outputs. While a block is computed, the one before is
-/// written and the input of the next one is read.
+/// written and the input of the next one is read; each stream is used by one thread at a time.
 class Resample::Conversion
 {
 public:
@@ -181,13 +160,21 @@ public:
             if (clock.shouldStop(percentOf(current.begin, m_outputCount))) {
                 return fail("*** Action aborted by user.");
             }
-            bool ok = true;
             current.result.resize(2 * current.count());
             current.levels.resize(current.partCount());
-            shareParts(
-                current.partCount(), [&](std::size_t part) { compute(current, part); },
-                [&] { ok = store(done) && fetch(current.end, next); });
-            if (!ok) {
+            // Both streams first: they take as long as all the sums.
+            bool stored = false;
+            bool fetched = false;
+            parallelFor(2 + current.partCount(), [&](std::size_t task) {
+                if (task == 0) {
+                    stored = store(done);
+                } else if (task == 1) {
+                    fetched = fetch(current.end, next);
+                } else {
+                    compute(current, task - 2);
+                }
+            });
+            if (!stored || !fetched) {
                 return false;
             }
             std::swap(done, current);
