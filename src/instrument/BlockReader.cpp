@@ -13,15 +13,20 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <utility>
 
 namespace {
 
 constexpr qint64 fileBlockBytes = 32768;
+/// Blocks that go to the local file at once: a write for each would hold up the next request.
+constexpr qint64 blocksPerWrite = 8;
 constexpr qint64 streamBlockBytes = 2048;
 /// Short reads in a row that are taken for a slow instrument.
 constexpr int maxRetries = 3;
 /// Digits of the byte count; one digit tells their number.
 constexpr quint32 maxDigits = 9;
+
+const char *const localWriteFailed = "Writing data to local file failed.";
 
 void note(const QString &text)
 {
@@ -69,7 +74,7 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
     note("Destination \t: " + localPath);
     note(QString("R/W Timeout \t: %1 ms").arg(m_device.timeoutMs()));
     QFile file(localPath);
-    if (!file.open(QIODevice::WriteOnly)) {
+    if (!file.open(QIODevice::WriteOnly | QIODevice::Unbuffered)) {
         return Tracer::fail("Cannot open local file for writing.");
     }
     emit m_device.ProgressUpdate(0);
@@ -85,8 +90,14 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
     note(QString("Reading %1 bytes.").arg(*length));
     QElapsedTimer rateTimer;
     rateTimer.start();
-    if (!receiveFile(file, *length)) {
+    const bool received = receiveFile(file, *length);
+    // After a failure too, so that the file tells how far it came.
+    const bool written = writePending(file);
+    if (!received) {
         return false;
+    }
+    if (!written) {
+        return fail(localWriteFailed);
     }
     char terminator = 0;
     quint32 count = 0;
@@ -96,9 +107,6 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
         (void)fail("No terminating character received.", status);
     }
     const qint64 elapsedMs = rateTimer.elapsed();
-    if (!file.flush()) {
-        return fail("Writing data to local file failed.");
-    }
     emit m_device.ProgressUpdate(100);
     if (!m_device.checkErrorQueue()) {
         return false;
@@ -148,14 +156,15 @@ std::optional<qint64> BlockReader::readFileLength() const
 bool BlockReader::receiveFile(QFile &file, qint64 length)
 {
     note(QString("Read block size is %1 bytes.").arg(fileBlockBytes));
-    m_buffer.resize(fileBlockBytes);
+    m_buffer.resize(blocksPerWrite * fileBlockBytes);
+    m_pending = 0;
     ProgressClock progress([this](int percent) { emit m_device.ProgressUpdate(percent); },
                            m_cancelled);
     int retries = 0;
     for (qint64 remaining = length; remaining > 0;) {
         const auto wanted = static_cast<quint32>(std::min(remaining, fileBlockBytes));
         quint32 count = 0;
-        const ViStatus status = m_session.read(m_buffer.data(), wanted, count);
+        const ViStatus status = m_session.read(m_buffer.data() + m_pending, wanted, count);
         if (!VisaSession::isGoodRead(status)) {
             (void)fail("Reading binary data block failed.");
             Tracer::Trace(Tracer::Error,
@@ -166,7 +175,8 @@ bool BlockReader::receiveFile(QFile &file, qint64 length)
         }
         if (count != wanted) {
             if (retries == maxRetries) {
-                return failIncomplete(length - remaining, length, count, status);
+                const QByteArray block(m_buffer.constData() + m_pending, count);
+                return failIncomplete(length - remaining, length, block, status);
             }
             Tracer::Trace(Tracer::Debug,
                           "viRead() has returned less bytes than expected. Retrying...");
@@ -174,8 +184,9 @@ bool BlockReader::receiveFile(QFile &file, qint64 length)
         } else {
             retries = 0;
         }
-        if (file.write(m_buffer.constData(), count) != static_cast<qint64>(count)) {
-            return fail("Writing data to local file failed.");
+        m_pending += count;
+        if (m_pending + fileBlockBytes > m_buffer.size() && !writePending(file)) {
+            return fail(localWriteFailed);
         }
         remaining -= count;
         if (progress.shouldStop(length - remaining, length)) {
@@ -185,18 +196,25 @@ bool BlockReader::receiveFile(QFile &file, qint64 length)
     return true;
 }
 
-bool BlockReader::failIncomplete(qint64 total, qint64 length, quint32 count, ViStatus status) const
+bool BlockReader::writePending(QFile &file)
 {
-    constexpr quint32 shownBytes = 6;
+    const qint64 count = std::exchange(m_pending, 0);
+    return file.write(m_buffer.constData(), count) == count;
+}
+
+bool BlockReader::failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
+                                 ViStatus status) const
+{
+    constexpr qsizetype shownBytes = 6;
     (void)fail("viRead(): Binary data transfer incomplete.");
     Tracer::Trace(
         Tracer::Error,
         QString("viRead(): Received %1 bytes but expected %2 bytes.").arg(total).arg(length));
-    Tracer::Trace(Tracer::Error, QString("%1 bytes received.").arg(count));
-    if (count >= shownBytes) {
+    Tracer::Trace(Tracer::Error, QString("%1 bytes received.").arg(lastBlock.size()));
+    if (lastBlock.size() >= shownBytes) {
         QString text = "Last received data: ";
-        for (quint32 i = count - shownBytes; i < count; ++i) {
-            text += QString::asprintf("%02X ", static_cast<unsigned char>(m_buffer.at(i)));
+        for (const char byte : lastBlock.last(shownBytes)) {
+            text += QString::asprintf("%02X ", static_cast<unsigned char>(byte));
         }
         Tracer::Trace(Tracer::Error, text);
     }

@@ -32,8 +32,9 @@ private:
     [[nodiscard]] bool fail(const char *text, ViStatus status) const;
     [[nodiscard]] std::optional<qint64> readFileLength() const;
     [[nodiscard]] bool receiveFile(QFile &file, qint64 length);
-    [[nodiscard]] bool failIncomplete(qint64 total, qint64 length, quint32 count,
+    [[nodiscard]] bool failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
                                       ViStatus status) const;
+    [[nodiscard]] bool writePending(QFile &file);
     [[nodiscard]] bool abandon() const;
     [[nodiscard]] std::optional<qint64> readStreamLength() const;
     [[nodiscard]] std::optional<qint64> receiveStream(BufferedIO &stream, qint64 length,
@@ -43,4 +44,5 @@ private:
     VisaSession m_session;
     const std::atomic<bool> &m_cancelled;
     QByteArray m_buffer;
+    qint64 m_pending = 0; ///< bytes at the front of the buffer that are not in the file yet
 };

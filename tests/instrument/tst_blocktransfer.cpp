@@ -199,6 +199,9 @@ void TestBlockTransfer::readFileOfManyBlocks()
     const QStringList calls = fake.takeCalls().filter("viRead");
     QCOMPARE(calls, (QStringList{"viRead 2", "viRead 6", "viRead 32768", "viRead 32768",
                                  "viRead 32768", "viRead 1696", "viRead 1", "viRead 1023"}));
+    // A disk that is full.
+    QVERIFY(!m_device->readRemoteFile(remoteName, "/dev/full"));
+    QCOMPARE(takeLog(), QStringList{"4 Writing data to local file failed."});
     // An error that waits in the queue spoils it, though all bytes are there.
     fake->errors = {"-310,\"System error\""};
     QVERIFY(!m_device->readRemoteFile(remoteName, local()));

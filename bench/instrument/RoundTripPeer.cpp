@@ -1,0 +1,95 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "RoundTripPeer.h"
+
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+namespace {
+
+bool sendAll(int socket, const std::vector<char> &bytes)
+{
+    std::size_t sent = 0;
+    while (sent < bytes.size()) {
+        const ssize_t count = send(socket, bytes.data() + sent, bytes.size() - sent, MSG_NOSIGNAL);
+        if (count <= 0) {
+            return false;
+        }
+        sent += static_cast<std::size_t>(count);
+    }
+    return true;
+}
+
+bool receiveAll(int socket, std::vector<char> &bytes)
+{
+    std::size_t received = 0;
+    while (received < bytes.size()) {
+        const ssize_t count = recv(socket, bytes.data() + received, bytes.size() - received, 0);
+        if (count <= 0) {
+            return false;
+        }
+        received += static_cast<std::size_t>(count);
+    }
+    return true;
+}
+
+void sendAtOnce(int socket)
+{
+    const int on = 1;
+    setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+}
+
+} // namespace
+
+RoundTripPeer::RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes)
+    : m_request(requestBytes)
+    , m_reply(replyBytes)
+{
+    const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof address;
+    auto *generic = reinterpret_cast<sockaddr *>(&address);
+    if (bind(listener, generic, length) != 0 || listen(listener, 1) != 0 ||
+        getsockname(listener, generic, &length) != 0) {
+        close(listener);
+        return;
+    }
+    m_socket = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sendAtOnce(m_socket);
+    if (connect(m_socket, generic, length) != 0) {
+        close(m_socket);
+        close(listener);
+        m_socket = -1;
+        return;
+    }
+    m_server = std::thread([this, listener] { serve(listener); });
+}
+
+RoundTripPeer::~RoundTripPeer()
+{
+    if (m_socket >= 0) {
+        close(m_socket);
+    }
+    if (m_server.joinable()) {
+        m_server.join();
+    }
+}
+
+void RoundTripPeer::serve(int listener) const
+{
+    const int peer = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
+    close(listener);
+    sendAtOnce(peer);
+    std::vector<char> request(m_request.size());
+    while (receiveAll(peer, request) && sendAll(peer, m_reply)) {
+    }
+    close(peer);
+}
+
+bool RoundTripPeer::exchange()
+{
+    return sendAll(m_socket, m_request) && receiveAll(m_socket, m_reply);
+}

@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include <cstddef>
+#include <thread>
+#include <vector>
+
+/// The least that a request and its reply over loopback can cost: a thread at the other end of a
+/// TCP connection takes a request of a fixed size and sends a reply of a fixed size, and neither
+/// side looks at a byte of them.
+class RoundTripPeer
+{
+public:
+    RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes);
+    ~RoundTripPeer();
+    RoundTripPeer(const RoundTripPeer &) = delete;
+    RoundTripPeer &operator=(const RoundTripPeer &) = delete;
+
+    [[nodiscard]] bool isConnected() const { return m_socket >= 0; }
+
+    /// One request and its reply.
+    [[nodiscard]] bool exchange();
+
+private:
+    void serve(int listener) const;
+
+    std::vector<char> m_request;
+    std::vector<char> m_reply;
+    int m_socket = -1;
+    std::thread m_server;
+};
