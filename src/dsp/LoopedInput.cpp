@@ -25,9 +25,9 @@ LoopedInput::LoopedInput(BufferedIO &stream, int sampleCount, int filterLength)
     : m_stream(stream)
     , m_count(sampleCount)
     , m_filterLength(filterLength)
-    , m_block(2 * StreamBlockSamples)
-    , m_head(2 * WrapSamples)
-    , m_tail(2 * WrapSamples)
+    , m_block(floatsOf(StreamBlockSamples))
+    , m_head(floatsOf(WrapSamples))
+    , m_tail(floatsOf(WrapSamples))
 {
 }
 

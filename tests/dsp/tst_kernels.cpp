@@ -2,6 +2,7 @@
 #include "dsp/fft.h"
 #include "dsp/fir.h"
 #include "dsp/polar.h"
+#include "dsp/vectormath.h"
 #include "dsp/windows.h"
 
 #include <QTest>
@@ -41,6 +42,50 @@ Complex directBin(const std::vector<Complex> &x, std::size_t k)
     return {static_cast<double>(re), static_cast<double>(im)};
 }
 
+/// The plain three loops of a radix-2 transform with twiddles by recurrence.
+std::vector<Complex> plainFft(const std::vector<Complex> &in)
+{
+    const std::size_t n = in.size();
+    std::vector<Complex> x(n);
+    std::size_t reversed = 0;
+    for (const Complex &sample : in) {
+        x[reversed] = sample;
+        std::size_t m = n / 2;
+        while ((reversed & m) != 0) {
+            reversed &= ~m;
+            m /= 2;
+        }
+        reversed |= m;
+    }
+    for (std::size_t d = 1; d < n; d *= 2) {
+        const double angle = -pi / static_cast<double>(d);
+        const double alpha = -2 * std::sin(angle / 2) * std::sin(angle / 2);
+        const double beta = std::sin(angle);
+        double wr = 1;
+        double wi = 0;
+        for (std::size_t j = 0; j < d; ++j) {
+            for (std::size_t i = j; i < n; i += 2 * d) {
+                const double re = wr * x[i + d].real() - wi * x[i + d].imag();
+                const double im = wr * x[i + d].imag() + wi * x[i + d].real();
+                x[i + d] = {x[i].real() - re, x[i].imag() - im};
+                x[i] = {x[i].real() + re, x[i].imag() + im};
+            }
+            const double old = wr;
+            wr = wr + (wr * alpha - wi * beta);
+            wi = wi + (wi * alpha + old * beta);
+        }
+    }
+    return x;
+}
+
+/// The error in units of the last place of the exact value.
+double unitsOff(double value, long double exact)
+{
+    const double nearest = std::abs(static_cast<double>(exact));
+    const double unit = std::nextafter(nearest, HUGE_VAL) - nearest;
+    return static_cast<double>(std::abs(static_cast<long double>(value) - exact)) / unit;
+}
+
 } // namespace
 
 class TestKernels : public QObject
@@ -50,6 +95,7 @@ class TestKernels : public QObject
 private slots:
     void fftEqualsDirectSum_data();
     void fftEqualsDirectSum();
+    void fftEqualsPlainForm();
     void fftRefusesWrongLengths();
     void fftCentredPutsZeroInTheMiddle();
     void windowsFollowTheirRows_data();
@@ -61,6 +107,9 @@ private slots:
     void polarAxes();
     void polarRoundTrip();
     void interpolationPassesThroughTheTable();
+    void sinesAreExact_data();
+    void sinesAreExact();
+    void sinesOfNoNumber();
 };
 
 void TestKernels::fftEqualsDirectSum_data()
@@ -83,6 +132,17 @@ void TestKernels::fftEqualsDirectSum()
     const std::size_t stride = std::max<std::size_t>(1, in.size() / 64);
     for (std::size_t k = 0; k < in.size(); k += stride) {
         QVERIFY2(std::abs(out[k] - directBin(in, k)) <= bound, qPrintable(QString::number(k)));
+    }
+}
+
+void TestKernels::fftEqualsPlainForm()
+{
+    // Bound: none, each butterfly is the same. Above 131072 twiddles aren't kept any more.
+    for (const int n : {32, 64, 128, 512, 1024, 8192, 262144}) {
+        const std::vector<Complex> in = randomSamples(static_cast<std::size_t>(n));
+        std::vector<Complex> out(in.size());
+        QVERIFY(fft(in, out));
+        QVERIFY2(out == plainFft(in), qPrintable(QString::number(n)));
     }
 }
 
@@ -269,6 +329,55 @@ void TestKernels::interpolationPassesThroughTheTable()
     std::vector<double> two(3, -1.0);
     interpolateQuadratic(std::vector<double>{1.0, 5.0}, 1.0, two, 1.0);
     QCOMPARE(two, (std::vector<double>{1.0, 5.0, 5.0}));
+}
+
+void TestKernels::sinesAreExact_data()
+{
+    QTest::addColumn<double>("from");
+    QTest::addColumn<double>("to");
+    QTest::newRow("eighth turn") << -0.8 << 0.8;
+    QTest::newRow("some turns") << -100.0 << 100.0;
+    QTest::newRow("many turns") << 1e5 << 1.001e5;
+    QTest::newRow("largest reduced") << 1.342e8 << 1.3421772e8;
+    QTest::newRow("beyond") << 1e12 << 1.000001e12;
+    QTest::newRow("next to half a turn") << 3.1415926 << 3.1415927;
+    QTest::newRow("next to 1000 turns") << 6283.1853 << 6283.1854;
+    QTest::newRow("next to zero") << -1e-9 << 1e-9;
+}
+
+void TestKernels::sinesAreExact()
+{
+    QFETCH(double, from);
+    QFETCH(double, to);
+    std::mt19937 generator(5);
+    std::uniform_real_distribution<double> angle(from, to);
+    std::vector<double> angles(20000);
+    std::generate(angles.begin(), angles.end(), [&] { return angle(generator); });
+    std::vector<double> sine(angles.size());
+    std::vector<double> cosine(angles.size());
+    std::vector<double> alone(angles.size());
+    sinCos(angles, sine, cosine);
+    sines(angles, alone);
+    double worst = 0;
+    for (std::size_t i = 0; i < angles.size(); ++i) {
+        // The extended form reduces by the exact circle as well.
+        worst = std::max(worst, unitsOff(sine[i], std::sin(static_cast<long double>(angles[i]))));
+        worst = std::max(worst, unitsOff(cosine[i], std::cos(static_cast<long double>(angles[i]))));
+    }
+    QVERIFY2(worst < 1.0, qPrintable(QString::number(worst)));
+    QCOMPARE(alone, sine);
+}
+
+void TestKernels::sinesOfNoNumber()
+{
+    const std::vector<double> angles{0.0, std::nan(""), HUGE_VAL, 1.0};
+    std::vector<double> sine(4);
+    std::vector<double> cosine(4);
+    sinCos(angles, sine, cosine);
+    QCOMPARE(sine[0], 0.0);
+    QCOMPARE(cosine[0], 1.0);
+    QVERIFY(std::isnan(sine[1]) && std::isnan(cosine[2]));
+    QCOMPARE(sine[3], std::sin(1.0));
 }
 
 QTEST_GUILESS_MAIN(TestKernels)
