@@ -83,4 +83,21 @@ inline QStringList takeLog(int levels)
     return lines;
 }
 
+/// The content of a tag of a file; null if it has none.
+inline QByteArray tag(const QByteArray &file, const QByteArray &name)
+{
+    const qsizetype begin = file.indexOf('{' + name + ':');
+    if (begin < 0) {
+        return {};
+    }
+    const qsizetype content = begin + name.size() + 2;
+    return file.mid(content, file.indexOf('}', content) - content);
+}
+
+/// The words of the sample block of a written file.
+inline QByteArray sampleWords(const QByteArray &file)
+{
+    return file.mid(file.indexOf('#') + 1).chopped(1);
+}
+
 } // namespace filebytes
