@@ -176,9 +176,11 @@ CORVANE_INLINE void dotSlopedRowsBody(const SlopedBlock<Real> &sloped)
 constexpr int TileVectors = 4;
 
 template <typename Real>
-CORVANE_INLINE void
-filterTile(std::span<const Real> taps, const float *x,
-           std::array<float, static_cast<std::size_t>(TileVectors *KernelLanes<Real>)> &result)
+constexpr std::size_t TileSamples = std::size_t{TileVectors} * std::size_t{KernelLanes<Real>};
+
+template <typename Real>
+CORVANE_INLINE void filterTile(std::span<const Real> taps, const float *x,
+                               std::array<float, TileSamples<Real>> &result)
 {
     using Vector = typename Kernel<Real>::Vector;
     constexpr int Lanes = Kernel<Real>::Lanes;
@@ -202,7 +204,7 @@ filterTile(std::span<const Real> taps, const float *x,
         ++x;
     }
     const std::array<Vector, TileVectors> sums{sum0, sum1, sum2, sum3};
-    std::array<Real, static_cast<std::size_t>(TileVectors * Lanes)> lanes;
+    std::array<Real, TileSamples<Real>> lanes;
     std::memcpy(lanes.data(), sums.data(), sizeof(lanes));
     for (std::size_t i = 0; i < lanes.size(); ++i) {
         result[i] = static_cast<float>(lanes[i]);
@@ -212,7 +214,7 @@ filterTile(std::span<const Real> taps, const float *x,
 template <typename Real>
 CORVANE_INLINE void filterSamplesBody(const FilterBlock<Real> &block)
 {
-    constexpr auto Tile = static_cast<std::size_t>(TileVectors * KernelLanes<Real>);
+    constexpr std::size_t Tile = TileSamples<Real>;
     std::array<float, Tile> inPhase;
     std::array<float, Tile> quadrature;
     const std::size_t count = block.result.size() / 2;
