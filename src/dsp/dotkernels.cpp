@@ -214,6 +214,36 @@ CORVANE_VECTOR_CLONES SquareLevel measureSquares(std::span<const float> iq)
     return level;
 }
 
+CORVANE_VECTOR_CLONES void addSquares(std::span<const float> iq, SquareLevel &level)
+{
+    constexpr std::size_t Lanes = 16;
+    double highest = level.highest;
+    double sum = level.sum;
+    const float *samples = iq.data();
+    const std::size_t count = iq.size() / 2;
+    std::size_t n = 0;
+    std::array<double, Lanes> squares;
+    for (; n + Lanes <= count; n += Lanes) {
+        for (std::size_t i = 0; i < Lanes; ++i) {
+            const double inPhase = samples[2 * (n + i)];
+            const double quadrature = samples[2 * (n + i) + 1];
+            squares[i] = inPhase * inPhase + quadrature * quadrature;
+        }
+        for (const double square : squares) {
+            highest = square > highest ? square : highest;
+            sum += square;
+        }
+    }
+    for (; n < count; ++n) {
+        const double inPhase = samples[2 * n];
+        const double quadrature = samples[2 * n + 1];
+        const double square = inPhase * inPhase + quadrature * quadrature;
+        highest = square > highest ? square : highest;
+        sum += square;
+    }
+    level = {highest, sum};
+}
+
 CORVANE_VECTOR_CLONES void deinterleave(std::span<const float> iq, float *inPhase,
                                         float *quadrature)
 {

@@ -70,5 +70,9 @@ struct SquareLevel
 /// Measures interleaved samples; the order of the sum is fixed but not that of the samples.
 [[nodiscard]] SquareLevel measureSquares(std::span<const float> iq);
 
+/// Adds interleaved samples to a level in their order, for sums that must not depend on how a
+/// stream is cut into blocks.
+void addSquares(std::span<const float> iq, SquareLevel &level);
+
 /// Parts interleaved samples into two arrays.
 void deinterleave(std::span<const float> iq, float *inPhase, float *quadrature);
