@@ -86,6 +86,7 @@ enum class InstructionSet { Baseline, Avx2, Avx512 };
 
 /// Defines `function(argument)` as the call of `body<bytes>(argument)`, compiled once for each
 /// instruction set with its register size. The body must be CORVANE_INLINE.
+// NOLINTBEGIN(bugprone-macro-parentheses): the names of templates and types take none.
 #if CORVANE_HAS_VECTOR_CLONES
 #define CORVANE_WIDE_KERNEL(function, Argument, body)                                              \
     namespace {                                                                                    \
@@ -116,3 +117,4 @@ enum class InstructionSet { Baseline, Avx2, Avx512 };
         body<16>(argument);                                                                        \
     }
 #endif
+// NOLINTEND(bugprone-macro-parentheses)
