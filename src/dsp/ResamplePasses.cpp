@@ -3,6 +3,7 @@
 
 #include "base/ProgressClock.h"
 #include "base/parallel.h"
+#include "dotkernels.h"
 #include "log/Tracer.h"
 #include "samplestream.h"
 #include "vectorclones.h"
@@ -230,22 +231,15 @@ bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double 
     if (!stream->checkHeader("IQF")) {
         return fail("*** Cannot validate data stream header.");
     }
-    double highest = 0;
-    double sum = 0;
+    SquareLevel level;
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
     const bool done = forEachBlock(*stream, samples, clock, [&](std::span<const float> iq, qint64) {
-        for (size_t i = 0; i < iq.size(); i += 2) {
-            const double inPhase = iq[i];
-            const double quadrature = iq[i + 1];
-            const double square = inPhase * inPhase + quadrature * quadrature;
-            highest = std::max(highest, square);
-            sum += square;
-        }
+        addSquares(iq, level);
         return true;
     });
     if (done) {
-        *rms = std::sqrt(sum / samples);
-        *peak = std::sqrt(highest);
+        *rms = std::sqrt(level.sum / samples);
+        *peak = std::sqrt(level.highest);
     }
     return done;
 }

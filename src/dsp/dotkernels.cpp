@@ -6,55 +6,25 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
-#include <cstring>
 
 namespace {
 
-template <typename Real>
-struct Kernel
-{
-    static constexpr int Lanes = KernelLanes<Real>;
-    typedef Real Vector __attribute__((vector_size(KernelVectorBytes)));
-    typedef float Samples __attribute__((vector_size(Lanes * sizeof(float))));
-};
-
-// The bodies hand vectors over by reference: by value, the way would depend on the instruction set.
-
-template <typename Vector, typename Real>
-CORVANE_INLINE void load(Vector &vector, const Real *from)
-{
-    std::memcpy(&vector, from, sizeof(vector));
-}
-
-template <typename Real>
-CORVANE_INLINE void loadSamples(typename Kernel<Real>::Vector &vector, const float *from)
-{
-    typename Kernel<Real>::Samples samples;
-    std::memcpy(&samples, from, sizeof(samples));
-    vector = __builtin_convertvector(samples, typename Kernel<Real>::Vector);
-}
-
-/// The sums of the lanes of four vectors. Halves are added first, which every instruction set can
-/// do at the cost of taking them out of a register.
-CORVANE_INLINE void sumLanes(const Kernel<float>::Vector &i0, const Kernel<float>::Vector &q0,
-                             const Kernel<float>::Vector &i1, const Kernel<float>::Vector &q1,
+/// The sums of the lanes of four vectors.
+template <std::size_t Bytes>
+CORVANE_INLINE void sumLanes(const WideVector<float, Bytes> &i0, const WideVector<float, Bytes> &q0,
+                             const WideVector<float, Bytes> &i1, const WideVector<float, Bytes> &q1,
                              float *sums)
 {
-    typedef float Quarter __attribute__((vector_size(KernelVectorBytes / 4)));
-    const auto quarterOf = [](const Kernel<float>::Vector &vector, Quarter &quarter) {
-        const auto half = __builtin_shufflevector(vector, vector, 0, 1, 2, 3, 4, 5, 6, 7) +
-                          __builtin_shufflevector(vector, vector, 8, 9, 10, 11, 12, 13, 14, 15);
-        quarter = __builtin_shufflevector(half, half, 0, 1, 2, 3) +
-                  __builtin_shufflevector(half, half, 4, 5, 6, 7);
-    };
+    using Sum = QuarterSum<float, Bytes>;
+    using Quarter = typename Sum::Vector;
     Quarter a;
     Quarter b;
     Quarter c;
     Quarter d;
-    quarterOf(i0, a);
-    quarterOf(q0, b);
-    quarterOf(i1, c);
-    quarterOf(q1, d);
+    Sum::of(i0, a);
+    Sum::of(q0, b);
+    Sum::of(i1, c);
+    Sum::of(q1, d);
     const Quarter ab =
         __builtin_shufflevector(a, b, 0, 4, 1, 5) + __builtin_shufflevector(a, b, 2, 6, 3, 7);
     const Quarter cd =
@@ -64,21 +34,20 @@ CORVANE_INLINE void sumLanes(const Kernel<float>::Vector &i0, const Kernel<float
     std::memcpy(sums, &all, sizeof(all));
 }
 
-CORVANE_INLINE void sumLanes(const Kernel<double>::Vector &i0, const Kernel<double>::Vector &q0,
-                             const Kernel<double>::Vector &i1, const Kernel<double>::Vector &q1,
-                             float *sums)
+template <std::size_t Bytes>
+CORVANE_INLINE void
+sumLanes(const WideVector<double, Bytes> &i0, const WideVector<double, Bytes> &q0,
+         const WideVector<double, Bytes> &i1, const WideVector<double, Bytes> &q1, float *sums)
 {
-    const auto sumOf = [](const Kernel<double>::Vector &vector) {
-        const auto half = __builtin_shufflevector(vector, vector, 0, 1, 2, 3) +
-                          __builtin_shufflevector(vector, vector, 4, 5, 6, 7);
-        const auto quarter =
-            __builtin_shufflevector(half, half, 0, 1) + __builtin_shufflevector(half, half, 2, 3);
-        return static_cast<float>(quarter[0] + quarter[1]);
-    };
-    sums[0] = sumOf(i0);
-    sums[1] = sumOf(q0);
-    sums[2] = sumOf(i1);
-    sums[3] = sumOf(q1);
+    using Sum = QuarterSum<double, Bytes>;
+    typename Sum::Vector quarters[4];
+    Sum::of(i0, quarters[0]);
+    Sum::of(q0, quarters[1]);
+    Sum::of(i1, quarters[2]);
+    Sum::of(q1, quarters[3]);
+    for (int i = 0; i < 4; ++i) {
+        sums[i] = static_cast<float>(quarters[i][0] + quarters[i][1]);
+    }
 }
 
 /// Where one output of a block takes its coefficients and samples from.
@@ -97,25 +66,27 @@ CORVANE_INLINE void locate(const RowBlock<Real> &block, std::size_t n, Output<Re
               block.rows + block.rowStarts[n]};
 }
 
-template <typename Real>
-CORVANE_INLINE void
-accumulate(const typename Kernel<Real>::Vector &coefficients, const Output<Real> &output, int place,
-           typename Kernel<Real>::Vector &sumI, typename Kernel<Real>::Vector &sumQ)
+template <typename Real, std::size_t Bytes>
+CORVANE_INLINE void accumulate(const WideVector<Real, Bytes> &coefficients,
+                               const Output<Real> &output, int place, WideVector<Real, Bytes> &sumI,
+                               WideVector<Real, Bytes> &sumQ)
 {
-    typename Kernel<Real>::Vector xi;
-    typename Kernel<Real>::Vector xq;
-    loadSamples<Real>(xi, output.inPhase + place);
-    loadSamples<Real>(xq, output.quadrature + place);
-    sumI += coefficients * xi;
-    sumQ += coefficients * xq;
+    using Wide = WideVector<Real, Bytes>;
+    for (std::size_t part = 0; part < Wide::Parts; ++part) {
+        typename Wide::Part xi;
+        typename Wide::Part xq;
+        loadPart<Real, Bytes>(xi, output.inPhase + place + part * Wide::PartLanes);
+        loadPart<Real, Bytes>(xq, output.quadrature + place + part * Wide::PartLanes);
+        sumI.parts[part] += coefficients.parts[part] * xi;
+        sumQ.parts[part] += coefficients.parts[part] * xq;
+    }
 }
 
 /// Two outputs at a time share the work of adding up lanes. An odd last one is computed twice.
-template <typename Real, typename Coefficients>
+template <std::size_t Bytes, typename Real, typename Coefficients>
 CORVANE_INLINE void dotPairs(const RowBlock<Real> &block, const Coefficients &coefficientsOf)
 {
-    using Vector = typename Kernel<Real>::Vector;
-    constexpr int Lanes = Kernel<Real>::Lanes;
+    using Wide = WideVector<Real, Bytes>;
     const std::size_t count = block.offsets.size();
     for (std::size_t n = 0; n < count; n += 2) {
         const std::size_t second = std::min(n + 1, count - 1);
@@ -123,17 +94,17 @@ CORVANE_INLINE void dotPairs(const RowBlock<Real> &block, const Coefficients &co
         Output<Real> output1;
         locate(block, n, output0);
         locate(block, second, output1);
-        Vector i0{};
-        Vector q0{};
-        Vector i1{};
-        Vector q1{};
-        for (int place = 0; place < block.vectors * Lanes; place += Lanes) {
-            Vector c0;
-            Vector c1;
+        Wide i0{};
+        Wide q0{};
+        Wide i1{};
+        Wide q1{};
+        for (int place = 0; place < block.vectors * Wide::Lanes; place += Wide::Lanes) {
+            Wide c0;
+            Wide c1;
             coefficientsOf(n, output0.row + place, place, c0);
             coefficientsOf(second, output1.row + place, place, c1);
-            accumulate<Real>(c0, output0, place, i0, q0);
-            accumulate<Real>(c1, output1, place, i1, q1);
+            accumulate(c0, output0, place, i0, q0);
+            accumulate(c1, output1, place, i1, q1);
         }
         std::array<float, 4> sums;
         sumLanes(i0, q0, i1, q1, sums.data());
@@ -141,123 +112,83 @@ CORVANE_INLINE void dotPairs(const RowBlock<Real> &block, const Coefficients &co
     }
 }
 
-template <typename Real>
+template <std::size_t Bytes, typename Real>
 CORVANE_INLINE void dotRowsBody(const RowBlock<Real> &block)
 {
-    using Vector = typename Kernel<Real>::Vector;
-    dotPairs(
-        block, [](std::size_t, const Real *row, int, Vector &c)
+    dotPairs<Bytes>(
+        block, [](std::size_t, const Real *row, int, WideVector<Real, Bytes> &c)
                    __attribute__((always_inline)) { load(c, row); });
 }
 
-template <typename Real>
+template <std::size_t Bytes, typename Real>
 CORVANE_INLINE void dotSlopedRowsBody(const SlopedBlock<Real> &sloped)
 {
-    using Vector = typename Kernel<Real>::Vector;
-    const std::ptrdiff_t width =
-        static_cast<std::ptrdiff_t>(sloped.base.vectors) * Kernel<Real>::Lanes;
-    dotPairs(
-        sloped.base, [&](std::size_t n, const Real *row, int place, Vector &c)
+    using Wide = WideVector<Real, Bytes>;
+    const std::ptrdiff_t width = static_cast<std::ptrdiff_t>(sloped.base.vectors) * Wide::Lanes;
+    dotPairs<Bytes>(
+        sloped.base, [&](std::size_t n, const Real *row, int place, Wide &c)
                          __attribute__((always_inline)) {
-                             Vector value;
-                             Vector up;
-                             Vector down;
-                             Vector shift;
+                             Wide value;
+                             Wide up;
+                             Wide down;
+                             Wide shift;
                              load(value, row);
                              load(up, row + width);
                              load(down, row - width);
                              load(shift, sloped.shifts + place);
-                             const Vector d = sloped.fractions[n] - shift;
-                             c = value + d * (d >= 0 ? up : down);
+                             for (std::size_t part = 0; part < Wide::Parts; ++part) {
+                                 const auto d = sloped.fractions[n] - shift.parts[part];
+                                 const auto slope = d >= 0 ? up.parts[part] : down.parts[part];
+                                 c.parts[part] = value.parts[part] + d * slope;
+                             }
                          });
 }
 
-/// Sums of this many kernel vectors of outputs are kept in registers.
-constexpr int TileVectors = 4;
+/// Registers of outputs whose sums are kept while the taps go by.
+constexpr std::size_t TileParts = 8;
 
-template <typename Real>
-CORVANE_INLINE void
-filterTile(std::span<const Real> taps, const float *x,
-           std::array<float, static_cast<std::size_t>(TileVectors *KernelLanes<Real>)> &result)
+template <std::size_t Bytes, typename Real>
+CORVANE_INLINE void filterTile(std::span<const Real> taps, const float *x, Real *result)
 {
-    using Vector = typename Kernel<Real>::Vector;
-    constexpr int Lanes = Kernel<Real>::Lanes;
-    Vector sum0{};
-    Vector sum1{};
-    Vector sum2{};
-    Vector sum3{};
+    using Wide = WideVector<Real, Bytes>;
+    typename Wide::Part sums[TileParts] = {};
     for (const Real tap : taps) {
-        Vector x0;
-        Vector x1;
-        Vector x2;
-        Vector x3;
-        loadSamples<Real>(x0, x);
-        loadSamples<Real>(x1, x + Lanes);
-        loadSamples<Real>(x2, x + Lanes + Lanes);
-        loadSamples<Real>(x3, x + Lanes + Lanes + Lanes);
-        sum0 += tap * x0;
-        sum1 += tap * x1;
-        sum2 += tap * x2;
-        sum3 += tap * x3;
+        for (std::size_t part = 0; part < TileParts; ++part) {
+            typename Wide::Part samples;
+            loadPart<Real, Bytes>(samples, x + part * Wide::PartLanes);
+            sums[part] += tap * samples;
+        }
         ++x;
     }
-    const std::array<Vector, TileVectors> sums{sum0, sum1, sum2, sum3};
-    std::array<Real, static_cast<std::size_t>(TileVectors * Lanes)> lanes;
-    std::memcpy(lanes.data(), sums.data(), sizeof(lanes));
-    for (std::size_t i = 0; i < lanes.size(); ++i) {
-        result[i] = static_cast<float>(lanes[i]);
-    }
+    std::memcpy(result, sums, sizeof(sums));
 }
 
-template <typename Real>
+template <std::size_t Bytes, typename Real>
 CORVANE_INLINE void filterSamplesBody(const FilterBlock<Real> &block)
 {
-    constexpr auto Tile = static_cast<std::size_t>(TileVectors * KernelLanes<Real>);
-    std::array<float, Tile> inPhase;
-    std::array<float, Tile> quadrature;
+    constexpr std::size_t Tile = TileParts * WideVector<Real, Bytes>::PartLanes;
+    std::array<Real, Tile> inPhase;
+    std::array<Real, Tile> quadrature;
     const std::size_t count = block.result.size() / 2;
     for (std::size_t n = 0; n < count; n += Tile) {
-        filterTile<Real>(block.taps, block.input.inPhase + n, inPhase);
-        filterTile<Real>(block.taps, block.input.quadrature + n, quadrature);
+        filterTile<Bytes>(block.taps, block.input.inPhase + n, inPhase.data());
+        filterTile<Bytes>(block.taps, block.input.quadrature + n, quadrature.data());
         const std::size_t used = std::min(Tile, count - n);
         for (std::size_t i = 0; i < used; ++i) {
-            block.result[2 * (n + i)] = inPhase[i];
-            block.result[2 * (n + i) + 1] = quadrature[i];
+            block.result[2 * (n + i)] = static_cast<float>(inPhase[i]);
+            block.result[2 * (n + i) + 1] = static_cast<float>(quadrature[i]);
         }
     }
 }
 
 } // namespace
 
-CORVANE_VECTOR_CLONES void dotRows(const RowBlock<float> &block)
-{
-    dotRowsBody(block);
-}
-
-CORVANE_VECTOR_CLONES void dotRows(const RowBlock<double> &block)
-{
-    dotRowsBody(block);
-}
-
-CORVANE_VECTOR_CLONES void dotSlopedRows(const SlopedBlock<float> &block)
-{
-    dotSlopedRowsBody(block);
-}
-
-CORVANE_VECTOR_CLONES void dotSlopedRows(const SlopedBlock<double> &block)
-{
-    dotSlopedRowsBody(block);
-}
-
-CORVANE_VECTOR_CLONES void filterSamples(const FilterBlock<float> &block)
-{
-    filterSamplesBody(block);
-}
-
-CORVANE_VECTOR_CLONES void filterSamples(const FilterBlock<double> &block)
-{
-    filterSamplesBody(block);
-}
+CORVANE_WIDE_KERNEL(dotRows, const RowBlock<float> &, dotRowsBody)
+CORVANE_WIDE_KERNEL(dotRows, const RowBlock<double> &, dotRowsBody)
+CORVANE_WIDE_KERNEL(dotSlopedRows, const SlopedBlock<float> &, dotSlopedRowsBody)
+CORVANE_WIDE_KERNEL(dotSlopedRows, const SlopedBlock<double> &, dotSlopedRowsBody)
+CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<float> &, filterSamplesBody)
+CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<double> &, filterSamplesBody)
 
 CORVANE_VECTOR_CLONES SquareLevel measureSquares(std::span<const float> iq)
 {
@@ -281,6 +212,36 @@ CORVANE_VECTOR_CLONES SquareLevel measureSquares(std::span<const float> iq)
         level.sum += sum[i];
     }
     return level;
+}
+
+CORVANE_VECTOR_CLONES void addSquares(std::span<const float> iq, SquareLevel &level)
+{
+    constexpr std::size_t Lanes = 16;
+    double highest = level.highest;
+    double sum = level.sum;
+    const float *samples = iq.data();
+    const std::size_t count = iq.size() / 2;
+    std::size_t n = 0;
+    std::array<double, Lanes> squares;
+    for (; n + Lanes <= count; n += Lanes) {
+        for (std::size_t i = 0; i < Lanes; ++i) {
+            const double inPhase = samples[2 * (n + i)];
+            const double quadrature = samples[2 * (n + i) + 1];
+            squares[i] = inPhase * inPhase + quadrature * quadrature;
+        }
+        for (const double square : squares) {
+            highest = square > highest ? square : highest;
+            sum += square;
+        }
+    }
+    for (; n < count; ++n) {
+        const double inPhase = samples[2 * n];
+        const double quadrature = samples[2 * n + 1];
+        const double square = inPhase * inPhase + quadrature * quadrature;
+        highest = square > highest ? square : highest;
+        sum += square;
+    }
+    level = {highest, sum};
 }
 
 CORVANE_VECTOR_CLONES void deinterleave(std::span<const float> iq, float *inPhase,

@@ -1,16 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "widevector.h"
+
 #include <cstdint>
 #include <span>
 
-/// Bytes of the vectors that the kernels are written for; instruction sets with shorter registers
-/// split them.
-inline constexpr int KernelVectorBytes = 64;
-
 /// Coefficients in one kernel vector. Rows of coefficients are padded with zeros to a multiple.
 template <typename Real>
-inline constexpr int KernelLanes = KernelVectorBytes / static_cast<int>(sizeof(Real));
+inline constexpr int KernelLanes = static_cast<int>(KernelVectorBytes / sizeof(Real));
 
 /// A stretch of input samples with the parts in arrays of their own. Behind the last tap of the
 /// last output both are readable for one more kernel vector.
@@ -45,8 +43,8 @@ struct SlopedBlock
 };
 
 /// Outputs that share their coefficients and whose places follow each other: a FIR filter. The
-/// place of the first output is index 0 of the input; the input is readable for one kernel vector
-/// of outputs behind the last one.
+/// place of the first output is index 0 of the input; the input is readable for eight kernel
+/// vectors of outputs behind the last one.
 template <typename Real>
 struct FilterBlock
 {
@@ -71,6 +69,10 @@ struct SquareLevel
 
 /// Measures interleaved samples; the order of the sum is fixed but not that of the samples.
 [[nodiscard]] SquareLevel measureSquares(std::span<const float> iq);
+
+/// Adds interleaved samples to a level in their order, for sums that must not depend on how a
+/// stream is cut into blocks.
+void addSquares(std::span<const float> iq, SquareLevel &level);
 
 /// Parts interleaved samples into two arrays.
 void deinterleave(std::span<const float> iq, float *inPhase, float *quadrature);

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "fft.h"
 
-#include "vectorclones.h"
+#include "widevector.h"
 
 #include <algorithm>
 #include <array>
@@ -123,42 +123,69 @@ void transformShort(std::span<const Complex> in, std::span<Complex> out)
     }
 }
 
-typedef double Lanes __attribute__((vector_size(BlockSize * sizeof(double))));
-
 /// Eight samples, or one sample of each of eight groups.
+template <std::size_t Bytes>
 struct Block
 {
-    Lanes re;
-    Lanes im;
+    WideVector<double, Bytes> re;
+    WideVector<double, Bytes> im;
 };
 
-CORVANE_INLINE void load(Block &block, const double *from)
+template <std::size_t Bytes>
+CORVANE_INLINE void load(Block<Bytes> &block, const double *from)
 {
-    std::memcpy(&block, from, sizeof(block));
+    load(block.re, from);
+    load(block.im, from + BlockSize);
 }
 
-CORVANE_INLINE void store(const Block &block, double *to)
+template <std::size_t Bytes>
+CORVANE_INLINE void store(const Block<Bytes> &block, double *to)
 {
-    std::memcpy(to, &block, sizeof(block));
+    store(block.re, to);
+    store(block.im, to + BlockSize);
 }
 
-/// Twiddles are a block of their own or shared by all lanes.
-template <typename W>
-CORVANE_INLINE void butterfly(Block &upper, Block &lower, const W &wRe, const W &wIm)
+/// Twiddles are those of a block, or one for all lanes.
+template <std::size_t Bytes>
+CORVANE_INLINE const typename WideVector<double, Bytes>::Part &
+partOf(const WideVector<double, Bytes> &twiddles, std::size_t part)
 {
-    const Lanes re = wRe * lower.re - wIm * lower.im;
-    const Lanes im = wRe * lower.im + wIm * lower.re;
-    lower.re = upper.re - re;
-    lower.im = upper.im - im;
-    upper.re = upper.re + re;
-    upper.im = upper.im + im;
+    return twiddles.parts[part];
 }
 
-CORVANE_INLINE void plainButterfly(Block &upper, Block &lower)
+CORVANE_INLINE double partOf(double twiddle, std::size_t)
 {
-    const Block sum{upper.re + lower.re, upper.im + lower.im};
-    lower = {upper.re - lower.re, upper.im - lower.im};
-    upper = sum;
+    return twiddle;
+}
+
+template <std::size_t Bytes, typename W>
+CORVANE_INLINE void butterfly(Block<Bytes> &upper, Block<Bytes> &lower, const W &wRe, const W &wIm)
+{
+    for (std::size_t part = 0; part < WideVector<double, Bytes>::Parts; ++part) {
+        auto &upperRe = upper.re.parts[part];
+        auto &upperIm = upper.im.parts[part];
+        auto &lowerRe = lower.re.parts[part];
+        auto &lowerIm = lower.im.parts[part];
+        const auto re = partOf(wRe, part) * lowerRe - partOf(wIm, part) * lowerIm;
+        const auto im = partOf(wRe, part) * lowerIm + partOf(wIm, part) * lowerRe;
+        lowerRe = upperRe - re;
+        lowerIm = upperIm - im;
+        upperRe = upperRe + re;
+        upperIm = upperIm + im;
+    }
+}
+
+template <std::size_t Bytes>
+CORVANE_INLINE void plainButterfly(Block<Bytes> &upper, Block<Bytes> &lower)
+{
+    for (std::size_t part = 0; part < WideVector<double, Bytes>::Parts; ++part) {
+        const auto re = lower.re.parts[part];
+        const auto im = lower.im.parts[part];
+        lower.re.parts[part] = upper.re.parts[part] - re;
+        lower.im.parts[part] = upper.im.parts[part] - im;
+        upper.re.parts[part] = upper.re.parts[part] + re;
+        upper.im.parts[part] = upper.im.parts[part] + im;
+    }
 }
 
 /// Twiddles of the stages with distance 2 and 4, at index distance + j.
@@ -176,14 +203,15 @@ const std::array<Twiddle, BlockSize> &shortTwiddles()
 
 /// The first three stages. Eight groups of eight samples that end up beside each other are
 /// transformed at a time, a group in each lane; their samples lie n / 8 apart in the input.
-CORVANE_VECTOR_CLONES void firstStages(const double *in, std::size_t n, double *out)
+template <std::size_t Bytes>
+CORVANE_INLINE void firstStages(const double *in, std::size_t n, double *out)
 {
     const std::array<Twiddle, BlockSize> &w = shortTwiddles();
     const std::size_t groups = n / BlockSize;
     constexpr std::array<std::size_t, BlockSize> Reversed{0, 4, 2, 6, 1, 5, 3, 7};
     std::size_t target = 0;
     for (std::size_t first = 0; first < groups; first += BlockSize) {
-        std::array<Block, BlockSize> x;
+        std::array<Block<Bytes>, BlockSize> x;
         for (std::size_t b = 0; b < BlockSize; ++b) {
             const double *from = in + 2 * (first + Reversed[b] * groups);
             double re[BlockSize];
@@ -192,8 +220,8 @@ CORVANE_VECTOR_CLONES void firstStages(const double *in, std::size_t n, double *
                 re[lane] = from[2 * lane];
                 im[lane] = from[2 * lane + 1];
             }
-            std::memcpy(&x[b].re, re, sizeof(re));
-            std::memcpy(&x[b].im, im, sizeof(im));
+            load(x[b].re, re);
+            load(x[b].im, im);
         }
         for (std::size_t b = 0; b < BlockSize; b += 2) {
             plainButterfly(x[b], x[b + 1]);
@@ -206,25 +234,29 @@ CORVANE_VECTOR_CLONES void firstStages(const double *in, std::size_t n, double *
         for (std::size_t b = 1; b < 4; ++b) {
             butterfly(x[b], x[b + 4], w[4 + b].re, w[4 + b].im);
         }
+        double lanes[BlockSize][2][BlockSize];
+        for (std::size_t b = 0; b < BlockSize; ++b) {
+            store(x[b], lanes[b][0]);
+        }
         for (std::size_t lane = 0; lane < BlockSize; ++lane) {
             double *to = out + 2 * BlockSize * target;
             for (std::size_t b = 0; b < BlockSize; ++b) {
-                to[b] = x[b].re[lane];
-                to[b + BlockSize] = x[b].im[lane];
+                to[b] = lanes[b][0][lane];
+                to[b + BlockSize] = lanes[b][1][lane];
             }
             target = nextReversed(target, groups);
         }
     }
 }
 
-CORVANE_VECTOR_CLONES void oneStage(double *x, std::size_t n, std::size_t distance,
-                                    const double *twiddles)
+template <std::size_t Bytes>
+CORVANE_INLINE void oneStage(double *x, std::size_t n, std::size_t distance, const double *twiddles)
 {
     for (std::size_t group = 0; group < 2 * n; group += 4 * distance) {
         for (std::size_t j = 0; j < 2 * distance; j += 2 * BlockSize) {
-            Block w;
-            Block upper;
-            Block lower;
+            Block<Bytes> w;
+            Block<Bytes> upper;
+            Block<Bytes> lower;
             load(w, twiddles + j);
             load(upper, x + group + j);
             load(lower, x + group + j + 2 * distance);
@@ -236,17 +268,18 @@ CORVANE_VECTOR_CLONES void oneStage(double *x, std::size_t n, std::size_t distan
 }
 
 /// The stages of a distance and of twice that.
-CORVANE_VECTOR_CLONES void twoStages(double *x, std::size_t n, std::size_t distance,
-                                     const double *twiddles, const double *nextTwiddles)
+template <std::size_t Bytes>
+CORVANE_INLINE void twoStages(double *x, std::size_t n, std::size_t distance,
+                              const double *twiddles, const double *nextTwiddles)
 {
     const std::size_t step = 2 * distance;
     for (std::size_t group = 0; group < 2 * n; group += 4 * step) {
         for (std::size_t j = 0; j < step; j += 2 * BlockSize) {
-            Block w;
-            Block x0;
-            Block x1;
-            Block x2;
-            Block x3;
+            Block<Bytes> w;
+            Block<Bytes> x0;
+            Block<Bytes> x1;
+            Block<Bytes> x2;
+            Block<Bytes> x3;
             double *from = x + group + j;
             load(w, twiddles + j);
             load(x0, from);
@@ -268,7 +301,7 @@ CORVANE_VECTOR_CLONES void twoStages(double *x, std::size_t n, std::size_t dista
 }
 
 /// From blocks to samples, in place.
-CORVANE_VECTOR_CLONES void interleave(double *x, std::size_t n)
+CORVANE_INLINE void interleave(double *x, std::size_t n)
 {
     for (std::size_t block = 0; block < 2 * n; block += 2 * BlockSize) {
         double parts[2 * BlockSize];
@@ -280,24 +313,33 @@ CORVANE_VECTOR_CLONES void interleave(double *x, std::size_t n)
     }
 }
 
-void transformBlocked(std::span<const Complex> in, std::span<Complex> out)
+struct Transform
 {
-    const std::size_t n = in.size();
+    std::span<const Complex> in;
+    std::span<Complex> out;
+};
+
+template <std::size_t Bytes>
+CORVANE_INLINE void transformBody(const Transform &transform)
+{
+    const std::size_t n = transform.in.size();
     // Complex numbers may be taken as pairs of their parts, [complex.numbers].
-    const auto *source = reinterpret_cast<const double *>(in.data());
-    auto *x = reinterpret_cast<double *>(out.data());
-    firstStages(source, n, x);
+    const auto *source = reinterpret_cast<const double *>(transform.in.data());
+    auto *x = reinterpret_cast<double *>(transform.out.data());
+    firstStages<Bytes>(source, n, x);
     std::size_t distance = BlockSize;
     if (std::countr_zero(n / BlockSize) % 2 != 0) {
-        oneStage(x, n, distance, StageTwiddles(distance).data());
+        oneStage<Bytes>(x, n, distance, StageTwiddles(distance).data());
         distance *= 2;
     }
     for (; distance < n; distance *= 4) {
-        twoStages(x, n, distance, StageTwiddles(distance).data(),
-                  StageTwiddles(2 * distance).data());
+        twoStages<Bytes>(x, n, distance, StageTwiddles(distance).data(),
+                         StageTwiddles(2 * distance).data());
     }
     interleave(x, n);
 }
+
+CORVANE_WIDE_KERNEL(transformBlocked, const Transform &, transformBody)
 
 } // namespace
 
@@ -310,7 +352,7 @@ bool fft(std::span<const Complex> in, std::span<Complex> out)
     if (n < MinBlockedLength) {
         transformShort(in, out);
     } else {
-        transformBlocked(in, out);
+        transformBlocked({in, out});
     }
     return true;
 }

@@ -18,7 +18,7 @@ class Interpolator
 public:
     /// Samples behind the last tap of the last output that must be readable; their values are
     /// multiplied by zero.
-    static constexpr int ReadAhead = 128;
+    static constexpr int ReadAhead = 192;
 
     Interpolator() = default;
     virtual ~Interpolator() = default;

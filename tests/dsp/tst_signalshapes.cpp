@@ -3,7 +3,6 @@
 #include "dsp/CreateSignal.h"
 
 #include "dsp/fft.h"
-#include "dsp/signalgenerators.h"
 #include "stream_helpers.h"
 
 #include <QTest>
@@ -89,13 +88,10 @@ private slots:
     void chirpPhase();
     void carriersAreEven_data();
     void carriersAreEven();
-    void pulseEdges();
     void noiseBand();
     void noiseSlope_data();
     void noiseSlope();
     void loopsHaveNoStep();
-    void doublePulse();
-    void codedPulse();
 
 private:
     template <typename Settings>
@@ -332,24 +328,6 @@ void TestSignalShapes::carriersAreEven()
     }
 }
 
-void TestSignalShapes::pulseEdges()
-{
-    const Samples samples = make(SignalType::Pulse, &CreateSignal::configurePulse,
-                                 PulseSettings{1e-5, 1e-4, 2e-5, 1e-4, RampKind::Linear, 1e-7});
-    QCOMPARE(samples.size(), size_t{2300});
-    QCOMPARE(samples[0].real(), 0.0F);
-    QCOMPARE(samples[50].real(), 0.5F);
-    QCOMPARE(samples[100].real(), 1.0F);
-    QCOMPARE(samples[1100].real(), 1.0F);
-    QCOMPARE(samples[1200].real(), 0.5F);
-    QCOMPARE(samples[1300].real(), 0.0F);
-    const Samples square = make(SignalType::Pulse, &CreateSignal::configurePulse,
-                                PulseSettings{0, 1e-4, 0, 1e-4, RampKind::Linear, 1e-7});
-    QCOMPARE(square[0].real(), 1.0F);
-    QCOMPARE(square[999].real(), 1.0F);
-    QCOMPARE(square[1000].real(), 0.0F);
-}
-
 void TestSignalShapes::noiseBand()
 {
     // 16384 samples at 1.5 times the bandwidth: the band is +-1/3 of the clock. As the filter runs
@@ -430,75 +408,6 @@ void TestSignalShapes::loopsHaveNoStep()
                SweepSettings{SweepKind::Sine, 1e5, 0.01, 0, 360}));
     check(make(SignalType::Noise, &CreateSignal::configureNoise,
                NoiseSettings{NoiseKind::White, 1e6, 0.1}));
-}
-
-void TestSignalShapes::doublePulse()
-{
-    // At 1 MHz: rise 2, on 3, fall 4, pause 5, blank 10. The second pulse ends at 2 x 9 + 5 = 23;
-    // its last value, a quarter, stays up to 23 - 4 + 10 = 29.
-    PulseRecord record;
-    record.kind = PulseKind::Double;
-    record.pulse = {2e-6, 3e-6, 4e-6, 10e-6, RampKind::Linear, 1e-6};
-    record.pause = 5e-6;
-    record.level1 = 0.5;
-    record.level2 = 0.8;
-    record.phase2 = 60;
-    SignalFit fit;
-    fit.clock = 1e6;
-    fit.samples = 35;
-    const auto generator = makePulse(record, fit);
-    QVERIFY(generator != nullptr);
-    std::vector<double> inPhase(35);
-    std::vector<double> quadrature(35);
-    generator->fill(0, inPhase, quadrature);
-    const std::vector<double> envelope{0, 0.5, 1, 1, 1, 1, 0.75, 0.5, 0.25};
-    for (size_t i = 0; i < 35; ++i) {
-        const bool isFirst = i < 9;
-        const bool isSecond = i >= 14 && i < 29;
-        const double second = isSecond ? envelope[std::min<size_t>(i - 14, 8)] * 0.8 : 0.0;
-        const double expectedQ = isFirst ? 0.5 * envelope[i] : second * std::sin(pi / 3);
-        QVERIFY(std::abs(inPhase[i] - second * 0.5) < 1e-8);
-        QVERIFY(std::abs(quadrature[i] - expectedQ) < 1e-8);
-    }
-}
-
-void TestSignalShapes::codedPulse()
-{
-    // At 1 MHz: rise 2, on 28, fall 2, transitions of 4: symbols of (28 + 4) / 4 = 8 samples. The
-    // transition of a symbol fills its last 4 samples, and the fall cuts off the last one's.
-    PulseRecord record;
-    record.kind = PulseKind::Coded;
-    record.pulse = {2e-6, 28e-6, 2e-6, 4e-6, RampKind::Linear, 1e-6};
-    record.pattern = "1101";
-    record.transitionTime = 4e-6;
-    SignalFit fit;
-    fit.clock = 1e6;
-    fit.samples = 36;
-    auto generator = makePulse(record, fit);
-    QVERIFY(generator != nullptr);
-    std::vector<double> inPhase(36);
-    std::vector<double> q(36);
-    // In two pieces, as a stream would be.
-    generator->fill(0, std::span(inPhase).first(11), std::span(q).first(11));
-    generator->fill(11, std::span(inPhase).subspan(11), std::span(q).subspan(11));
-    const std::vector<double> expected{
-        0,   0.5,                             // rise
-        1,   1,   1,   1,  1,  1,    1, 1,    // equal symbols have no transition between them
-        1,   1,   1,   1,  1,  0.5,  0, -0.5, // from +1 to -1 in steps of 2 / 4
-        -1,  -1,  -1,  -1, -1, -0.5, 0, 0.5,  1, 1, 1, 1, // the last symbol has no next one
-        1,   0.5,                                         // fall
-        0.5, 0.5, 0.5, 0.5};                              // the last value stays
-    QCOMPARE(q, expected);
-    QCOMPARE(inPhase, std::vector<double>(36));
-
-    record.pattern.clear();
-    QVERIFY(makePulse(record, fit) == nullptr);
-    record.pattern = "1";
-    record.pulse.onTime = 0;
-    record.transitionTime = 0;
-    QVERIFY(makePulse(record, fit) == nullptr);
-    record.kind = static_cast<PulseKind>(4);
-    QVERIFY(makePulse(record, fit) == nullptr);
 }
 
 QTEST_GUILESS_MAIN(TestSignalShapes)

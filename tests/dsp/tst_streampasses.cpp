@@ -1,0 +1,248 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "dsp/Resample.h"
+
+#include "stream_helpers.h"
+
+#include <QTest>
+
+#include <numbers>
+
+using std::numbers::pi;
+
+class TestStreamPasses : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void init() { (void)Tracer::takeEntries(); }
+    void rescaleAndStatistics();
+    void frequencyShiftFollowsTheLoop();
+    void polarSplitConjugates();
+    void cancelAndReuse_data();
+    void cancelAndReuse();
+    void fullDisk_data();
+    void fullDisk();
+};
+
+void TestStreamPasses::rescaleAndStatistics()
+{
+    TempStream stream;
+    QVERIFY(stream.open());
+    const Samples samples = randomSamples(100000);
+    QVERIFY(writeStream(*stream.stream(), samples));
+    Resample resample;
+    QVERIFY(resample.rescale(99999, 0.3, stream.stream()));
+    const Samples scaled = readStream(*stream.stream());
+    double highest = 0;
+    double sum = 0;
+    for (size_t i = 0; i < scaled.size(); ++i) {
+        const std::complex<float> expected =
+            i < 99999 ? std::complex<float>(samples[i].real() * 0.3F, samples[i].imag() * 0.3F)
+                      : samples[i];
+        QVERIFY(scaled[i] == expected);
+        highest = std::max(highest, std::norm(std::complex<double>(expected)));
+        sum += std::norm(std::complex<double>(expected));
+    }
+    double peak = 0;
+    double rms = 0;
+    QVERIFY(resample.statistics(100000, stream.stream(), &peak, &rms));
+    QCOMPARE(peak, std::sqrt(highest));
+    QCOMPARE(rms, std::sqrt(sum / 100000));
+
+    QVERIFY(!resample.rescale(100001, 0.5, stream.stream()));
+    QVERIFY(!resample.rescale(0, 0.5, stream.stream()));
+    QVERIFY(!resample.rescale(1, 0.5, nullptr));
+    QVERIFY(!resample.rescale(1, std::nan(""), stream.stream()));
+    QVERIFY(!resample.rescale(1, 1e300, stream.stream()));
+    QVERIFY(!resample.statistics(100001, stream.stream(), &peak, &rms));
+    QVERIFY(!resample.statistics(-1, stream.stream(), &peak, &rms));
+    QVERIFY(!resample.statistics(1, stream.stream(), nullptr, &rms));
+    QVERIFY(stream->writeHeader("XYZ"));
+    QVERIFY(!resample.rescale(1, 0.5, stream.stream()));
+    QCOMPARE(
+        takeMessages(),
+        (QStringList{"*** Reading failed for sample 100000.", "*** Invalid input data length.",
+                     "*** Invalid data buffer.", "*** Invalid scaling factor nan.",
+                     "*** Invalid scaling factor 1e+300.", "*** Reading failed for sample 100000.",
+                     "*** Invalid input data length.", "*** Invalid input arguments.",
+                     "*** Cannot validate data stream header."}));
+}
+
+void TestStreamPasses::frequencyShiftFollowsTheLoop()
+{
+    TempStream stream;
+    QVERIFY(stream.open());
+    Samples samples = randomSamples(200000);
+    samples[7] = {0.0F, 0.5F}; // the axis with the full circle
+    samples[8] = {0.0F, -0.5F};
+    samples[9] = {-0.5F, 0.0F};
+    samples[10] = {0.0F, 0.0F};
+    Resample resample;
+    // The last one passes the angles that the vector form reduces itself.
+    for (const double frequency : {1000.0, -3.3e6, 4e9}) {
+        QVERIFY(writeStream(*stream.stream(), samples));
+        QVERIFY(resample.frequencyShift(200000, frequency, 1e7, stream.stream()));
+        const Samples shifted = readStream(*stream.stream());
+        double angle = 0.0;
+        for (size_t i = 0; i < samples.size(); ++i) {
+            const double re = samples[i].real();
+            const double im = samples[i].imag();
+            const double phase = re == 0 ? (im > 0 ? 2 * pi : -2 * pi) : std::atan2(im, re);
+            const std::complex<double> expected = std::polar(std::hypot(re, im), phase + angle);
+            QVERIFY(std::abs(std::complex<double>(shifted[i]) - expected) < 1e-7);
+            angle += frequency * 6.283185307179586 / 1e7;
+        }
+    }
+    for (const double bad : {0.0, std::nan("")}) {
+        QVERIFY(!resample.frequencyShift(10, 1e3, bad, stream.stream()));
+        QCOMPARE(takeMessages().size(), 1);
+    }
+    QVERIFY(!resample.frequencyShift(10, 1e300, 1e6, stream.stream()));
+    QCOMPARE(takeMessages(),
+             QStringList{"*** Invalid frequency shift of 1e+300 Hz at a clock of 1e+06 Hz."});
+}
+
+void TestStreamPasses::polarSplitConjugates()
+{
+    TempStream source;
+    TempStream phase;
+    TempStream amplitude;
+    QVERIFY(source.open() && phase.open() && amplitude.open());
+    Samples samples = randomSamples(50000);
+    samples[0] = 0;
+    samples[1] = {0.0F, 0.5F};
+    samples[2] = {0.0F, -0.5F};
+    samples[3] = {-0.5F, 0.0F};
+    samples[4] = {0.5F, 0.0F};
+    QVERIFY(writeStream(*source.stream(), samples));
+    Resample resample;
+    QVERIFY(
+        resample.polarSplit(50000, source.stream(), phase.stream(), amplitude.stream(), 0.25, 0.5));
+    const Samples unit = readStream(*phase.stream());
+    const Samples level = readStream(*amplitude.stream());
+    QCOMPARE(unit.size(), samples.size());
+    QCOMPARE(level.size(), samples.size());
+    for (size_t i = 0; i < samples.size(); ++i) {
+        const double re = samples[i].real();
+        const double im = samples[i].imag();
+        const double angle = re == 0 ? (im > 0 ? 2 * pi : -2 * pi) : std::atan2(im, re);
+        QVERIFY(std::abs(unit[i].real() - std::cos(angle)) < 1e-7);
+        QVERIFY(std::abs(unit[i].imag() + std::sin(angle)) < 1e-7);
+        QVERIFY(std::abs(level[i].real() - ((2 * std::hypot(re, im) - 1) * 0.5 + 0.25)) < 1e-7);
+        QCOMPARE(level[i].imag(), 0.0F);
+    }
+    QVERIFY(!resample.polarSplit(0, source.stream(), phase.stream(), amplitude.stream(), 0, 1));
+    QVERIFY(!resample.polarSplit(1, source.stream(), nullptr, amplitude.stream(), 0, 1));
+    QVERIFY(!resample.polarSplit(50001, source.stream(), phase.stream(), amplitude.stream(), 0, 1));
+    QCOMPARE(takeMessages(),
+             (QStringList{"*** Invalid input data length.", "*** Invalid data buffer.",
+                          "*** Reading failed for sample 50000."}));
+}
+
+void TestStreamPasses::cancelAndReuse_data()
+{
+    QTest::addColumn<int>("pass");
+    QTest::newRow("run") << 0;
+    QTest::newRow("rescale") << 1;
+    QTest::newRow("frequencyShift") << 2;
+    QTest::newRow("polarSplit") << 3;
+    QTest::newRow("statistics") << 4;
+}
+
+void TestStreamPasses::cancelAndReuse()
+{
+    QFETCH(int, pass);
+    // As many samples as can be asked for, so that no machine is done before the first tick.
+    constexpr int count = std::numeric_limits<int>::max();
+    EndlessDevice devices[3];
+    BufferedIO streams[3];
+    for (int i = 0; i < 3; ++i) {
+        QVERIFY(streams[i].initBuf(&devices[i], BufferedIO::ReadWrite));
+    }
+    Resample resample;
+    resample.setInput(&streams[0], count);
+    resample.setOutput(&streams[1], count);
+    double peak = 0;
+    double rms = 0;
+    const auto call = [&](int samples) {
+        switch (pass) {
+        case 0:
+            resample.setInput(&streams[0], samples);
+            return resample.run();
+        case 1:
+            return resample.rescale(samples, 1.0, &streams[0]);
+        case 2:
+            return resample.frequencyShift(samples, 1.0, 100.0, &streams[0]);
+        case 3:
+            return resample.polarSplit(samples, &streams[0], &streams[1], &streams[2], 0, 1);
+        default:
+            return resample.statistics(samples, &streams[0], &peak, &rms);
+        }
+    };
+    int ticks = 0;
+    connect(&resample, &Resample::ProgressUpdate, &resample, [&](int percent) {
+        QVERIFY(percent >= 0 && percent <= 100);
+        ++ticks;
+        resample.cancel();
+        resample.cancel();
+    });
+    resample.cancel(); // before the start it means nothing
+    QVERIFY(!call(count));
+    QCOMPARE(ticks, 1);
+    QCOMPARE(takeMessages(), QStringList{"*** Action aborted by user."});
+    resample.setOutput(&streams[1], 1000);
+    QVERIFY(call(1000));
+}
+
+void TestStreamPasses::fullDisk_data()
+{
+    QTest::addColumn<int>("pass");
+    QTest::addColumn<QString>("message");
+    // A buffer of 16 MiB goes to the disk when it is full: with 3 bytes of header that is within
+    // sample 2097151.
+    QTest::newRow("run") << 0 << "*** Cannot write output data.";
+    QTest::newRow("rescale") << 1 << "*** Writing failed for sample 2097151.";
+    QTest::newRow("frequencyShift") << 2 << "*** Writing failed for sample 2097151.";
+    QTest::newRow("polarSplit phase") << 3 << "*** Writing phase data failed for sample 2097151.";
+    QTest::newRow("polarSplit amplitude")
+        << 4 << "*** Writing amplitude data failed for sample 2097151.";
+}
+
+void TestStreamPasses::fullDisk()
+{
+    QFETCH(int, pass);
+    QFETCH(QString, message);
+    constexpr int count = 4000000;
+    EndlessDevice good;
+    EndlessDevice other;
+    EndlessDevice full(1000);
+    BufferedIO goodStream;
+    BufferedIO otherStream;
+    BufferedIO fullStream;
+    QVERIFY(goodStream.initBuf(&good, BufferedIO::ReadWrite));
+    QVERIFY(otherStream.initBuf(&other, BufferedIO::ReadWrite));
+    QVERIFY(fullStream.initBuf(&full, BufferedIO::ReadWrite));
+    Resample resample;
+    resample.setInput(&goodStream, count);
+    resample.setOutput(&fullStream, count);
+    switch (pass) {
+    case 0:
+        QVERIFY(!resample.run());
+        break;
+    case 1:
+        QVERIFY(!resample.rescale(count, 1.0, &fullStream));
+        break;
+    case 2:
+        QVERIFY(!resample.frequencyShift(count, 1.0, 100.0, &fullStream));
+        break;
+    case 3:
+        QVERIFY(!resample.polarSplit(count, &goodStream, &fullStream, &otherStream, 0, 1));
+        break;
+    default:
+        QVERIFY(!resample.polarSplit(count, &goodStream, &otherStream, &fullStream, 0, 1));
+    }
+    QCOMPARE(takeMessages(), QStringList{message});
+}
+
+QTEST_GUILESS_MAIN(TestStreamPasses)
+#include "tst_streampasses.moc"
