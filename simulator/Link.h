@@ -69,7 +69,6 @@ public:
     /// Wakes a waiting reader; any thread may call it.
     void abort() { m_aborted = true; }
     [[nodiscard]] bool takeAbort() { return m_aborted.exchange(false); }
-    [[nodiscard]] bool isAborted() const { return m_aborted; }
 
     /// The error of the file that came with the block of the current unit, and whether there was
     /// such a file at all.

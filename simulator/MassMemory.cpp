@@ -3,9 +3,9 @@
 
 #include "ErrorQueue.h"
 #include "ProgramUnit.h"
+#include "hostfolder.h"
 #include "wildcard.h"
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <strings.h>
 #include <sys/stat.h>
@@ -21,65 +21,7 @@
 namespace simulator {
 namespace {
 
-constexpr int FolderFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC;
-// Without O_NONBLOCK a named pipe in the folder would hang its opener.
-constexpr int FileFlags = O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK;
 constexpr std::size_t MaxNameLength = 255;
-
-int errorOf(int systemError)
-{
-    switch (systemError) {
-    case ENOENT:
-        return FileNameNotFound;
-    case ENOSPC:
-    case EDQUOT:
-        return MediaFull;
-    case EACCES:
-    case EPERM:
-    case EROFS:
-        return MediaProtected;
-    case ELOOP:
-    case ENOTDIR:
-    case EISDIR:
-    case EEXIST:
-    case ENAMETOOLONG:
-    case EINVAL:
-    case ENXIO:
-        return FileNameError;
-    default:
-        return MassStorageError;
-    }
-}
-
-struct DirectoryCloser
-{
-    void operator()(DIR *directory) const { ::closedir(directory); }
-};
-using Directory = std::unique_ptr<DIR, DirectoryCloser>;
-
-// The folder's descriptor stays with the caller: the stream gets one of its own, which starts at
-// the first entry each time.
-Directory openDirectory(int folder)
-{
-    UniqueFd fd(::openat(folder, ".", FolderFlags));
-    Directory directory(fd.isValid() ? ::fdopendir(fd.get()) : nullptr);
-    if (directory)
-        (void)fd.release();
-    return directory;
-}
-
-template <typename Visitor>
-void forEachName(int folder, Visitor visitor)
-{
-    const Directory directory = openDirectory(folder);
-    if (!directory)
-        return;
-    while (const dirent *entry = ::readdir(directory.get())) {
-        const std::string_view name = entry->d_name;
-        if (name != "." && name != "..")
-            visitor(name);
-    }
-}
 
 bool isPrintable(std::string_view name)
 {
@@ -102,20 +44,6 @@ std::string_view typeOf(std::string_view name)
         SettingsSuffixes.end())
         return "SET";
     return "BIN";
-}
-
-int openRegular(int folder, const std::string &name, int flags, UniqueFd &fd)
-{
-    UniqueFd opened(::openat(folder, name.c_str(), flags | FileFlags, 0666));
-    if (!opened.isValid())
-        return errorOf(errno);
-    struct stat status
-    {
-    };
-    if (::fstat(opened.get(), &status) != 0 || !S_ISREG(status.st_mode))
-        return FileNameError;
-    fd = std::move(opened);
-    return NoError;
 }
 
 } // namespace
@@ -240,7 +168,7 @@ int MassMemory::enter(UniqueFd &folder, const std::string &name) const
 {
     UniqueFd child(::openat(folder.get(), actualName(folder.get(), name).c_str(), FolderFlags));
     if (!child.isValid())
-        return errorOf(errno);
+        return scpiErrorOf(errno);
     folder = std::move(child);
     return NoError;
 }
@@ -261,7 +189,7 @@ int MassMemory::locate(std::string_view path, Place &place) const
     place.isRoot = isRoot(components);
     place.folder = UniqueFd(::openat(m_top.get(), ".", FolderFlags));
     if (!place.folder.isValid())
-        return errorOf(errno);
+        return scpiErrorOf(errno);
     if (components.empty())
         return NoError;
     for (std::size_t i = 0; i + 1 < components.size(); ++i) {
@@ -341,7 +269,7 @@ int MassMemory::openForReading(std::string_view path, UniqueFd &fd, std::uint64_
     {
     };
     if (::fstat(fd.get(), &status) != 0)
-        return errorOf(errno);
+        return scpiErrorOf(errno);
     size = static_cast<std::uint64_t>(status.st_size);
     return NoError;
 }
@@ -359,7 +287,7 @@ int MassMemory::openForWriting(std::string_view path, std::unique_ptr<FileWriter
         return error;
     // Cut only now that it is known to be a plain file.
     if (::ftruncate(fd.get(), 0) != 0)
-        return errorOf(errno);
+        return scpiErrorOf(errno);
     writer = std::make_unique<FileWriter>(std::move(fd));
     return NoError;
 }
@@ -371,7 +299,8 @@ int MassMemory::remove(std::string_view path)
         return error;
     if (place.isRoot)
         return FileNameError;
-    return ::unlinkat(place.folder.get(), place.name.c_str(), 0) == 0 ? NoError : errorOf(errno);
+    return ::unlinkat(place.folder.get(), place.name.c_str(), 0) == 0 ? NoError
+                                                                      : scpiErrorOf(errno);
 }
 
 int MassMemory::makeDirectory(std::string_view path)
@@ -381,7 +310,8 @@ int MassMemory::makeDirectory(std::string_view path)
         return error;
     if (place.name.empty() || place.name.find_first_of("*?") != std::string::npos)
         return FileNameError;
-    return ::mkdirat(place.folder.get(), place.name.c_str(), 0777) == 0 ? NoError : errorOf(errno);
+    return ::mkdirat(place.folder.get(), place.name.c_str(), 0777) == 0 ? NoError
+                                                                        : scpiErrorOf(errno);
 }
 
 int MassMemory::removeDirectory(std::string_view path)
@@ -391,8 +321,9 @@ int MassMemory::removeDirectory(std::string_view path)
         return error;
     if (place.isRoot)
         return MediaProtected;
-    return ::unlinkat(place.folder.get(), place.name.c_str(), AT_REMOVEDIR) == 0 ? NoError
-                                                                                 : errorOf(errno);
+    return ::unlinkat(place.folder.get(), place.name.c_str(), AT_REMOVEDIR) == 0
+               ? NoError
+               : scpiErrorOf(errno);
 }
 
 int MassMemory::move(std::string_view from, std::string_view to)
@@ -410,7 +341,7 @@ int MassMemory::move(std::string_view from, std::string_view to)
     return ::renameat2(source.folder.get(), source.name.c_str(), target.folder.get(),
                        target.name.c_str(), RENAME_NOREPLACE) == 0
                ? NoError
-               : errorOf(errno);
+               : scpiErrorOf(errno);
 }
 
 int MassMemory::copy(std::string_view from, std::string_view to)
@@ -436,7 +367,7 @@ int MassMemory::copy(std::string_view from, std::string_view to)
     while ((count = ::read(source.get(), piece.data(), piece.size())) > 0)
         writer.write(std::span(piece).first(static_cast<std::size_t>(count)));
     if (count < 0)
-        return errorOf(errno);
+        return scpiErrorOf(errno);
     return writer.finish();
 }
 

@@ -5,9 +5,9 @@
 #include "dsp/Resample.h"
 #include "wvfile/BufferedIO.h"
 
-#include <QBuffer>
 #include <QTemporaryFile>
 #include <benchmark/benchmark.h>
+#include <omp.h>
 #include <soxr.h>
 
 #include <cmath>
@@ -127,7 +127,9 @@ void BM_Soxr(benchmark::State &state)
     void *out[] = {outI.data(), outQ.data()};
     const soxr_io_spec_t io = soxr_io_spec(SOXR_FLOAT32_S, SOXR_FLOAT32_S);
     const soxr_quality_spec_t quality = soxr_quality_spec(SOXR_HQ, 0);
-    const soxr_runtime_spec_t runtime = soxr_runtime_spec(threads);
+    // With 0 soxr takes as many threads as OpenMP offers, one for each channel; above 1 none more.
+    omp_set_num_threads(static_cast<int>(threads));
+    const soxr_runtime_spec_t runtime = soxr_runtime_spec(threads == 1 ? 1 : 0);
     size_t done = 0;
     for (auto _ : state) {
         const soxr_error_t error =

@@ -11,9 +11,6 @@
 
 bool LocalTreeRemover::remove(const QString &folder)
 {
-    m_cancelled = false;
-    m_failedPath.clear();
-    m_reason.clear();
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
     return removeContents(folder, clock);
 }
@@ -27,7 +24,7 @@ bool LocalTreeRemover::removeContents(const QString &folder, ProgressClock &cloc
 {
     const QFileInfoList entries = QDir(folder).entryInfoList(Everything, QDir::Unsorted);
     for (const QFileInfo &entry : entries) {
-        if (clock.shouldStop(-1)) {
+        if (clock.shouldStop(-1) || m_cancelled) {
             return fail(folder, "Cancelled.");
         }
         const QString path = entry.filePath();

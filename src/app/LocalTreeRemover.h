@@ -10,7 +10,7 @@
 class ProgressClock;
 
 /// Removes a local folder with all that lies in it. A link to a folder is removed as a link and
-/// never followed.
+/// never followed. An object serves one removal.
 class LocalTreeRemover : public QObject
 {
     Q_OBJECT

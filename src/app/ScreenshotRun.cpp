@@ -101,8 +101,9 @@ void ScreenshotRun::takePictures()
     if (m_finished) {
         return;
     }
-    bool done = save(m_window, "main-window.png");
+    bool done = true;
     if (!m_file.isEmpty()) {
+        // The tools first, since their reading fills the log of the main window.
         const QList<DlgBase *> tools = m_window.modules().allAllowed(m_file, true);
         for (DlgBase *tool : tools) {
             done = done && m_window.modules().start(*tool, m_file) && saveTool(*tool);
@@ -112,6 +113,7 @@ void ScreenshotRun::takePictures()
             complain(QString("not all tools could show '%1'").arg(m_file));
         }
     }
+    done = save(m_window, "main-window.png") && done;
     std::printf("first paint %lld ms after the start\n",
                 static_cast<long long>(m_window.firstPaintMs()));
     finish(done ? 0 : 1);

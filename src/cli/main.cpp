@@ -7,6 +7,8 @@
 
 #include <algorithm>
 #include <clocale>
+#include <cstdio>
+#include <exception>
 #include <functional>
 #include <memory>
 #include <sstream>
@@ -44,9 +46,7 @@ QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
         .arg(QString::fromLocal8Bit(unknown.front()));
 }
 
-} // namespace
-
-int main(int argc, char **argv)
+int run(int argc, char **argv)
 {
     Console::reserveStandardStreams();
     qInstallMessageHandler(logToolkitMessage);
@@ -91,4 +91,19 @@ int main(int argc, char **argv)
     console.setVerbose(verbose);
     console.setShowProgress(!noProgress);
     return action();
+}
+
+} // namespace
+
+int main(int argc, char **argv)
+{
+    try {
+        return run(argc, argv);
+    } catch (const std::exception &problem) {
+        // Only memory can run out here: the parser's exceptions end where it is called.
+        std::fprintf(stderr, "error: %s\n", problem.what());
+    } catch (...) {
+        std::fputs("error: unknown failure\n", stderr);
+    }
+    return ExitFailed;
 }

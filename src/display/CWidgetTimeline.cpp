@@ -48,14 +48,14 @@ QString TimelinePainter::positionText(qint64 sample) const
 void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    painter.fillRect(area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(PlotColor::Background));
     const QRectF place = bar(area, m_style.font);
     if (place.width() <= 0 || place.height() <= 0) {
         painter.restore();
         return;
     }
     const PixelGrid pixels(painter);
-    painter.fillRect(place, m_style.color(PlotColor::Marked));
+    fillArea(painter, place, m_style.color(PlotColor::Marked));
     painter.setFont(m_style.font);
     painter.setPen(m_style.color(PlotColor::Text));
     const QRectF texts(place.left(), place.bottom() + 1, place.width(),
@@ -66,7 +66,7 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
         const double width = std::max(to - from, LeastRangeWidth);
         const double left = std::max(place.left(), std::min(from, place.right() - width));
         const QRectF range(pixels.snap(left), place.top(), pixels.snap(width), place.height());
-        painter.fillRect(range, m_style.color(PlotColor::PeakTrace, 110));
+        fillArea(painter, range, m_style.color(PlotColor::PeakTrace, 110));
         pixels.frame(range, m_style.color(PlotColor::PeakTrace));
         painter.drawText(texts, Qt::AlignLeft | Qt::AlignVCenter, positionText(0));
         painter.drawText(texts, Qt::AlignRight | Qt::AlignVCenter, positionText(m_scene.total));

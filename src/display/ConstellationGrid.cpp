@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ConstellationGrid.h"
 
+#include "vectorstate.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
@@ -18,6 +20,7 @@ int ConstellationGrid::cellOf(double value)
 
 void ConstellationGrid::compute(std::span<const IqSample> samples, double scaleI, double scaleQ)
 {
+    clearVectorState();
     clear();
     append(samples, scaleI, scaleQ);
 }

@@ -39,6 +39,6 @@ private:
         return static_cast<std::size_t>(row) * Size + static_cast<std::size_t>(column);
     }
 
-    std::array<double, Size * Size> m_counts{};
+    std::array<double, std::size_t{Size} * Size> m_counts{};
     double m_greatest = 0;
 };

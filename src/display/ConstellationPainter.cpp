@@ -82,7 +82,7 @@ std::optional<IqSample> ConstellationPainter::valueAt(const QPointF &place,
 void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    painter.fillRect(area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(PlotColor::Background));
     const QRectF plot = square(area, m_style.font);
     if (!plot.isEmpty()) {
         const PixelGrid pixels(painter);
@@ -116,8 +116,8 @@ void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels
             const double top = pixels.snap(center.y() - q.high * half);
             const double bottom = pixels.snap(center.y() - q.low * half);
             const double level = m_scene.grid.levelDb(row, column);
-            painter.fillRect(QRectF(left, top, right - left, bottom - top),
-                             QColor(ColorTable::colorOfLevel(m_scene.colorMode, level)));
+            fillArea(painter, QRectF(left, top, right - left, bottom - top),
+                     QColor(ColorTable::colorOfLevel(m_scene.colorMode, level)));
         }
     }
 }
@@ -134,9 +134,10 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
         const double i = sample.i / m_scene.scaleI;
         const double q = sample.q / m_scene.scaleQ;
         if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {
-            painter.fillRect(QRectF(pixels.snap(center.x() + i * half - size / 2),
-                                    pixels.snap(center.y() - q * half - size / 2), size, size),
-                             color);
+            fillArea(painter,
+                     QRectF(pixels.snap(center.x() + i * half - size / 2),
+                            pixels.snap(center.y() - q * half - size / 2), size, size),
+                     color);
         }
     }
     painter.setClipping(false);

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "SpectrumLines.h"
 
+#include "vectorstate.h"
+
 #include "base/parallel.h"
 #include "dsp/fft.h"
 #include "dsp/windows.h"
@@ -22,6 +24,7 @@ constexpr std::size_t FewFrames = 32;
 
 void SpectrumLines::update(std::span<const IqSample> samples, qint64 first)
 {
+    clearVectorState();
     std::vector<Line> next;
     const auto count = static_cast<qint64>(samples.size());
     if (count >= FrameSize) {

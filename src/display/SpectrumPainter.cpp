@@ -74,7 +74,7 @@ double SpectrumPainter::yOf(const QRectF &plot, double db) const
 void SpectrumPainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    painter.fillRect(area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(PlotColor::Background));
     painter.setFont(m_style.font);
     const QRectF plot = area.marginsRemoved(margins(m_style.font, m_scene.mode));
     if (plot.width() > 0 && plot.height() > LevelInset) {
@@ -158,9 +158,10 @@ void SpectrumPainter::paintColorBar(QPainter &painter, const PixelGrid &pixels, 
     const int rows = static_cast<int>(std::lround(bar.height() * pixels.ratio()));
     for (int row = 0; row < rows; ++row) {
         const double level = static_cast<double>(row) / rows * ColorTable::LowestDb;
-        painter.fillRect(QRectF(bar.left(), pixels.snap(bar.top()) + row / pixels.ratio(),
-                                bar.width(), 1 / pixels.ratio()),
-                         QColor(ColorTable::colorOfLevel(m_scene.colors.mode(), level)));
+        fillArea(painter,
+                 QRectF(bar.left(), pixels.snap(bar.top()) + row / pixels.ratio(), bar.width(),
+                        1 / pixels.ratio()),
+                 QColor(ColorTable::colorOfLevel(m_scene.colors.mode(), level)));
     }
     pixels.frame(bar, m_style.color(PlotColor::Grid));
     painter.setPen(m_style.color(PlotColor::Text));

@@ -178,8 +178,8 @@ CORVANE_INLINE void foldMarkers(TraceBin &bin, std::span<const quint8> markers)
 CORVANE_INLINE void fold(TraceBin &bin, const Block &block, int count, double &sum)
 {
     const bool first = bin.count == 0;
-    const auto range = [&block, count, first](const std::array<double, Block::Size> &values,
-                                              double low, double high) {
+    const auto range = [count, first](const std::array<double, Block::Size> &values, double low,
+                                      double high) {
         return widen(first ? Range{values[0], values[0]} : Range{low, high}, values.data(), count);
     };
     const Range i = range(block.i, bin.iMin, bin.iMax);

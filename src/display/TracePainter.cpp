@@ -46,7 +46,10 @@ void fillBetween(const PixelGrid &pixels, const QPolygonF &upper, const QPolygon
     for (qsizetype k = 1; k < upper.size(); ++k) {
         const double left = upper.at(k - 1).x();
         const double width = upper.at(k).x() - left;
-        for (double x = pixels.snap(left); x < left + width; x += column) {
+        const double start = pixels.snap(left);
+        const int columns = static_cast<int>(std::ceil((left + width - start) / column));
+        for (int step = 0; step < columns; ++step) {
+            const double x = start + step * column;
             const double share = std::max(0.0, (x - left) / width);
             const double first = upper.at(k - 1).y() * (1 - share) + upper.at(k).y() * share;
             const double second = lower.at(k - 1).y() * (1 - share) + lower.at(k).y() * share;
@@ -163,7 +166,7 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
 {
     const QRectF plot = area.marginsRemoved(margins(m_style.font));
     painter.save();
-    painter.fillRect(area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(PlotColor::Background));
     if (plot.width() > 0 && plot.height() > 0) {
         const PixelGrid grid(painter);
         const QList<QRectF> rects = panes(plot);
@@ -261,7 +264,7 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
 {
     QPolygonF upperEdge;
     QPolygonF lowerEdge;
-    upperEdge.reserve(2 * TraceBins::BinCount);
+    upperEdge.reserve(qsizetype{2} * TraceBins::BinCount);
     lowerEdge.reserve(TraceBins::BinCount);
     const auto &bins = m_scene.bins.bins();
     for (int k = 0; k < TraceBins::BinCount; ++k) {

@@ -60,11 +60,13 @@ public:
     /// A step of the playback: a little one, in whole spectrum frames where it is long enough, so
     /// that their transforms are used again.
     [[nodiscard]] qint64 playStep() const;
+    /// Where the playback goes next; the present start once the end is reached.
+    [[nodiscard]] qint64 playTarget() const { return qMin(m_first + playStep(), end()); }
 
 private:
     /// A read of a stream fetches a block of 16 MiB anyway; keeping a larger piece of it than the
     /// window shows spares most moves the read.
-    static constexpr qint64 PageSamples = 512 * 1024;
+    static constexpr qint64 PageSamples = 1 << 19;
 
     struct Page
     {

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "plotdraw.h"
 
+#include "vectorstate.h"
+
 #include <QFontMetricsF>
 #include <QPaintDevice>
 
@@ -68,6 +70,12 @@ qreal fitted(qreal position, qreal length, qreal low, qreal high)
 
 } // namespace
 
+void fillArea(QPainter &painter, const QRectF &rect, const QColor &color)
+{
+    painter.fillRect(rect, color);
+    clearVectorState();
+}
+
 PixelGrid::PixelGrid(QPainter &painter)
     : m_painter(painter)
     , m_ratio(painter.device() != nullptr ? painter.device()->devicePixelRatioF() : 1.0)
@@ -83,17 +91,17 @@ qreal PixelGrid::snap(qreal coordinate) const
 void PixelGrid::fill(const QRectF &rect, const QColor &color) const
 {
     const QPointF topLeft(snap(rect.left()), snap(rect.top()));
-    m_painter.fillRect(QRectF(topLeft, QPointF(snap(rect.right()), snap(rect.bottom()))), color);
+    fillArea(m_painter, QRectF(topLeft, QPointF(snap(rect.right()), snap(rect.bottom()))), color);
 }
 
 void PixelGrid::horizontal(qreal y, qreal fromX, qreal toX, const QColor &color) const
 {
-    m_painter.fillRect(QRectF(snap(fromX), snap(y), snap(toX) - snap(fromX), m_lineWidth), color);
+    fillArea(m_painter, QRectF(snap(fromX), snap(y), snap(toX) - snap(fromX), m_lineWidth), color);
 }
 
 void PixelGrid::vertical(qreal x, qreal fromY, qreal toY, const QColor &color) const
 {
-    m_painter.fillRect(QRectF(snap(x), snap(fromY), m_lineWidth, snap(toY) - snap(fromY)), color);
+    fillArea(m_painter, QRectF(snap(x), snap(fromY), m_lineWidth, snap(toY) - snap(fromY)), color);
 }
 
 void PixelGrid::frame(const QRectF &rect, const QColor &color) const
@@ -110,7 +118,9 @@ void PixelGrid::dashedVertical(qreal x, qreal fromY, qreal toY, const QColor &co
 {
     constexpr qreal dash = 4;
     constexpr qreal period = 7;
-    for (qreal y = fromY; y < toY; y += period) {
+    const int dashes = static_cast<int>(std::ceil((toY - fromY) / period));
+    for (int k = 0; k < dashes; ++k) {
+        const qreal y = fromY + k * period;
         vertical(x, y, std::min(y + dash, toY), color);
     }
 }
@@ -166,7 +176,7 @@ void drawCaption(QPainter &painter, const PlotStyle &style, const QRectF &area,
                              .boundingRect(area.adjusted(5, 3, -5, -3),
                                            static_cast<int>(alignment) | Qt::TextWordWrap, text)
                              .adjusted(-3, -1, 3, 1);
-    painter.fillRect(place, style.color(PlotColor::Background, 190));
+    fillArea(painter, place, style.color(PlotColor::Background, 190));
     painter.setPen(style.color(PlotColor::Text));
     painter.drawText(place, Qt::AlignCenter | Qt::TextWordWrap, text);
     painter.restore();

@@ -7,6 +7,9 @@
 #include <QRectF>
 #include <QStringList>
 
+/// QPainter::fillRect that leaves the processor ready for the arithmetic of the painters.
+void fillArea(QPainter &painter, const QRectF &rect, const QColor &color);
+
 /// The grid of device pixels under a painter. Straight lines are drawn as filled rectangles on it,
 /// so that they stay sharp where a logical pixel is 1.5 device pixels.
 class PixelGrid

@@ -100,7 +100,7 @@ void writeSpectrumTable(QTextStream &stream, const SpectrumScene &scene)
     constexpr int digits = 6;
     const bool hasClock = scene.clockHz > 0;
     const auto frequency = [&](int bin) {
-        const double share = static_cast<double>(bin - bins / 2) / bins;
+        const double share = static_cast<double>(bin) / bins - 0.5;
         return QString::number(hasClock ? share * scene.clockHz : share, 'g', SampleDigits);
     };
     if (scene.mode == SpectrumMode::Spectrum) {

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
+#include <numbers>
 
 namespace {
 
@@ -87,7 +88,10 @@ void powerToDbm(std::span<double> in, std::span<double> out)
 
 double magnitudeToDb(double magnitude)
 {
-    return 20 * std::log10(magnitude + 1e-32);
+    // The natural logarithm is several times as fast as the decimal one, and a spectrum takes 512
+    // of them a line; the results agree to the last digits.
+    constexpr double nepersToDb = 20 / std::numbers::ln10;
+    return nepersToDb * std::log(magnitude + 1e-32);
 }
 
 int labelStride(double spacing, double extent)

@@ -6,6 +6,7 @@
 #include "TracePainter.h"
 #include "base/parallel.h"
 #include "plotdraw.h"
+#include "vectorstate.h"
 #include "waterfall.h"
 
 #include <QPainter>
@@ -17,7 +18,7 @@
 
 namespace {
 
-constexpr qint64 BlockSamples = 64 * 1024;
+constexpr qint64 BlockSamples = 1 << 16;
 
 /// Calls `take` with block after block of the source.
 template <typename Take>
@@ -164,6 +165,7 @@ std::optional<PlotView> plotViewOf(const QString &name)
 bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
                SampleSource &source)
 {
+    clearVectorState();
     switch (request.view) {
     case PlotView::Iq:
     case PlotView::LogMag:

@@ -305,10 +305,10 @@ bool CreateSignal::limitBand()
     if (!filtered->checkHeader("IQF")) {
         return fail("*** Cannot read the filtered noise.");
     }
-    std::vector<float> block(2 * static_cast<std::size_t>(std::min(samples, StreamBlockSamples)));
+    std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
     for (int done = 0; done < samples; done += StreamBlockSamples) {
         const int count = std::min(samples - done, StreamBlockSamples);
-        const std::span<float> iq = std::span(block).first(2 * static_cast<std::size_t>(count));
+        const std::span<float> iq = std::span(block).first(floatsOf(count));
         if (readSamples(*filtered.stream(), iq) < count) {
             return fail("*** Cannot read the filtered noise.");
         }

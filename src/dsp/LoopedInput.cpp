@@ -19,49 +19,46 @@ constexpr qint64 NominalBlock = 5000;
     return false;
 }
 
+[[nodiscard]] bool failAt(qint64 sample)
+{
+    return fail(QString("*** Reading failed for sample %1.").arg(sample));
+}
+
 } // namespace
 
 LoopedInput::LoopedInput(BufferedIO &stream, int sampleCount, int filterLength)
     : m_stream(stream)
     , m_count(sampleCount)
     , m_filterLength(filterLength)
-    , m_block(2 * StreamBlockSamples)
-    , m_head(2 * WrapSamples)
-    , m_tail(2 * WrapSamples)
+    , m_block(floatsOf(StreamBlockSamples))
+    , m_head(floatsOf(WrapSamples))
+    , m_tail(floatsOf(WrapSamples))
 {
 }
 
 bool LoopedInput::open()
 {
+    // Each restart reads a whole buffer, so the tail comes first: behind the head the stream is
+    // where the window goes on. Failures are told in the order of the stream all the same.
+    const int filled = static_cast<int>(std::min<qint64>(m_count, WrapSamples));
+    const qint64 tailStart = m_count - filled;
+    const bool positioned =
+        m_stream.restartAtPosition(BufferedIO::HeaderSize + BufferedIO::RecordSize * tailStart);
+    const int tailCount =
+        positioned ? readSamples(m_stream, std::span(m_tail).last(floatsOf(filled))) : 0;
     if (!m_stream.checkHeader("IQF")) {
         return fail("*** Cannot reset read buffer.");
     }
     Tracer::Trace(Tracer::Information, "Buffering waveform head...");
-    const auto filled = static_cast<std::size_t>(std::min<qint64>(m_count, WrapSamples));
-    if (!readEnd(0, std::span(m_head).first(2 * filled))) {
-        return false;
+    const int headCount = readSamples(m_stream, std::span(m_head).first(floatsOf(filled)));
+    if (headCount < filled) {
+        return failAt(headCount);
     }
     Tracer::Trace(Tracer::Information, "Buffering waveform tail...");
-    const qint64 tailStart = std::max<qint64>(m_count - WrapSamples, 0);
-    if (!m_stream.restartAtPosition(BufferedIO::HeaderSize + BufferedIO::RecordSize * tailStart)) {
+    if (!positioned) {
         return fail("*** Cannot set read buffer position.");
     }
-    if (!readEnd(tailStart, std::span(m_tail).last(2 * filled))) {
-        return false;
-    }
-    if (!m_stream.checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
-    }
-    return true;
-}
-
-bool LoopedInput::readEnd(qint64 first, std::span<float> target)
-{
-    const int got = readSamples(m_stream, target);
-    if (got < static_cast<int>(target.size() / 2)) {
-        return fail(QString("*** Reading failed for sample %1.").arg(first + got));
-    }
-    return true;
+    return tailCount == filled || failAt(tailStart + tailCount);
 }
 
 bool LoopedInput::failReading(qint64 sample) const
@@ -94,6 +91,13 @@ void LoopedInput::copyWrapped(Window &window, qint64 index) const
 
 bool LoopedInput::readInner(Window &window, qint64 first, qint64 end)
 {
+    // The head was read when the stream was opened.
+    for (; first < std::min<qint64>(end, WrapSamples); ++first) {
+        const auto entry = 2 * static_cast<std::size_t>(first);
+        const auto place = static_cast<std::size_t>(first - window.start);
+        window.inPhase[place] = m_head[entry];
+        window.quadrature[place] = m_head[entry + 1];
+    }
     while (first < end) {
         const auto count =
             static_cast<std::size_t>(std::min<qint64>(end - first, StreamBlockSamples));

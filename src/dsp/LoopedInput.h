@@ -22,7 +22,7 @@ public:
     /// error message.
     LoopedInput(BufferedIO &stream, int sampleCount, int filterLength);
 
-    /// Reads both ends of the stream and goes to its first sample. Logs the reason of a failure.
+    /// Checks the header and reads both ends of the stream. Logs the reason of a failure.
     [[nodiscard]] bool open();
 
     /// Makes the samples from `first` to before `end` available, and zeros for `readAhead` more.
@@ -46,7 +46,6 @@ private:
         std::vector<float> quadrature;
     };
 
-    [[nodiscard]] bool readEnd(qint64 first, std::span<float> target);
     [[nodiscard]] bool readInner(Window &window, qint64 first, qint64 end);
     void copyWrapped(Window &window, qint64 index) const;
     [[nodiscard]] bool failReading(qint64 sample) const;

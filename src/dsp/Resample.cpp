@@ -13,22 +13,24 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
-#include <thread>
 #include <utility>
 #include <vector>
 
 namespace {
 
-/// Outputs that one thread computes at a time. The level is summed over such parts, so that it
-/// doesn't depend on the number of threads.
-constexpr std::size_t PartSize = 4096;
+/// Outputs between two looks at the clock: a block, the one before and their inputs shall stay in
+/// the second cache.
+constexpr qint64 MaxBlockOutputs = 96LL * 1024;
 
-/// Products between two looks at the clock, below 10 ms of one core. The block, the one before and
-/// their inputs shall stay in the second cache.
-constexpr qint64 ProductsPerBlock = 4 * 1024 * 1024;
+/// Products in a block, some 10 ms of one core.
+constexpr qint64 MaxBlockProducts = 16LL * 1024 * 1024;
+
+/// Parts of a block that go to the processors. The level is summed part by part, so that it doesn't
+/// depend on the number of threads.
+constexpr qint64 PartsPerBlock = 24;
 
 /// Samples of the input window that a block may need.
-constexpr qint64 MaxBlockInput = 512 * 1024;
+constexpr qint64 MaxBlockInput = 512LL * 1024;
 
 [[nodiscard]] bool fail(const QString &text)
 {
@@ -99,26 +101,6 @@ private:
     std::vector<char> m_result;
 };
 
-/// Spreads the parts over the processors while the calling thread first does its own work, such as
-/// reading and writing streams, and then joins in.
-template <typename Work, typename OwnWork>
-void shareParts(std::size_t count, const Work &work, const OwnWork &ownWork)
-{
-    std::atomic<std::size_t> next{0};
-    const auto drain = [&] {
-        for (std::size_t part = next++; part < count; part = next++) {
-            work(part);
-        }
-    };
-    const std::size_t helperCount = std::min<std::size_t>(threadCount() - 1, count);
-    std::vector<std::jthread> helpers;
-    for (std::size_t i = 0; i < helperCount; ++i) {
-        helpers.emplace_back(drain);
-    }
-    ownWork();
-    drain();
-}
-
 /// Some outputs that follow each other, on their way from the input to the output stream.
 struct OutputBlock
 {
@@ -126,18 +108,19 @@ struct OutputBlock
     qint64 end = 0;
     PlanarInput input;
     qint64 inputStart = 0; ///< sample at index 0 of the input
+    std::size_t partSize = 1;
     std::vector<float> result;
     std::vector<SquareLevel> levels; ///< of the parts
 
     [[nodiscard]] bool isEmpty() const { return begin >= end; }
     [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(end - begin); }
-    [[nodiscard]] std::size_t partCount() const { return (count() + PartSize - 1) / PartSize; }
+    [[nodiscard]] std::size_t partCount() const { return (count() + partSize - 1) / partSize; }
 };
 
 } // namespace
 
 /// One run: the state of the loop over the outputs. While a block is computed, the one before is
-/// written and the input of the next one is read.
+/// written and the input of the next one is read; each stream is used by one thread at a time.
 class Resample::Conversion
 {
 public:
@@ -146,6 +129,7 @@ public:
         , m_inputCount(inputCount)
         , m_outputCount(outputCount)
         , m_geometry(owner.m_settings.length, inputCount, outputCount)
+        , m_blockSize(blockSize())
         , m_interpolator(makeInterpolator(owner.m_table, m_geometry, inputCount, outputCount))
         , m_input(*owner.m_input, inputCount, owner.m_settings.length)
         , m_markers(owner.m_markerInput, owner.m_markerOutput, m_geometry)
@@ -176,13 +160,21 @@ public:
             if (clock.shouldStop(percentOf(current.begin, m_outputCount))) {
                 return fail("*** Action aborted by user.");
             }
-            bool ok = true;
             current.result.resize(2 * current.count());
             current.levels.resize(current.partCount());
-            shareParts(
-                current.partCount(), [&](std::size_t part) { compute(current, part); },
-                [&] { ok = store(done) && fetch(current.end, next); });
-            if (!ok) {
+            // Both streams first: they take as long as all the sums.
+            bool stored = false;
+            bool fetched = false;
+            parallelFor(2 + current.partCount(), [&](std::size_t task) {
+                if (task == 0) {
+                    stored = store(done);
+                } else if (task == 1) {
+                    fetched = fetch(current.end, next);
+                } else {
+                    compute(current, task - 2);
+                }
+            });
+            if (!stored || !fetched) {
                 return false;
             }
             std::swap(done, current);
@@ -200,9 +192,10 @@ public:
 private:
     [[nodiscard]] qint64 blockSize() const
     {
-        const qint64 byWork = std::max<qint64>(ProductsPerBlock / m_geometry.maxTaps(), 1);
+        const qint64 byWork = MaxBlockProducts / m_geometry.maxTaps();
         const double byInput = static_cast<double>(MaxBlockInput) * m_geometry.ratio();
-        return std::clamp<qint64>(static_cast<qint64>(std::min(byInput, 1e9)), 1, byWork);
+        const qint64 limit = std::min(byWork, MaxBlockOutputs);
+        return std::clamp<qint64>(static_cast<qint64>(std::min(byInput, 1e9)), 1, limit);
     }
 
     /// Whether an output's first tap lies behind the sample up to which the input was read: then
@@ -227,7 +220,9 @@ private:
     [[nodiscard]] bool fetch(qint64 begin, OutputBlock &block)
     {
         block.begin = begin;
-        block.end = std::min(begin + blockSize(), m_outputCount);
+        block.end = std::min(begin + m_blockSize, m_outputCount);
+        block.partSize =
+            static_cast<std::size_t>((m_blockSize + PartsPerBlock - 1) / PartsPerBlock);
         if (block.isEmpty()) {
             return true;
         }
@@ -246,9 +241,10 @@ private:
 
     void compute(OutputBlock &block, std::size_t part) const
     {
-        const std::size_t from = part * PartSize;
+        const std::size_t from = part * block.partSize;
         const std::span<float> result =
-            std::span(block.result).subspan(2 * from, 2 * std::min(PartSize, block.count() - from));
+            std::span(block.result)
+                .subspan(2 * from, 2 * std::min(block.partSize, block.count() - from));
         m_interpolator->compute(block.begin + static_cast<qint64>(from), block.input,
                                 block.inputStart, result);
         block.levels[part] = measureSquares(result);
@@ -273,6 +269,7 @@ private:
     qint64 m_inputCount;
     qint64 m_outputCount;
     TapGeometry m_geometry;
+    qint64 m_blockSize; ///< outputs
     std::unique_ptr<Interpolator> m_interpolator;
     LoopedInput m_input;
     MarkerCopy m_markers;
@@ -345,7 +342,7 @@ bool Resample::run()
     if (inputCount < 1 || outputCount < 1) {
         return fail("*** Invalid input or output data length.");
     }
-    if (m_input == nullptr || m_output == nullptr) {
+    if (m_input == nullptr || m_output == nullptr || m_input == m_output) {
         return fail("*** Invalid data buffer.");
     }
     if (m_tableSettings != m_settings) {

@@ -38,11 +38,6 @@ qint64 failedWriteSample(qint64 first)
     return (boundary - BufferedIO::HeaderSize) / BufferedIO::RecordSize;
 }
 
-size_t floatsOf(int samples)
-{
-    return 2 * static_cast<size_t>(samples);
-}
-
 CORVANE_VECTOR_CLONES void scale(std::span<float> iq, float gain)
 {
     for (float &value : iq) {
@@ -138,13 +133,18 @@ bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork
 bool Resample::rescale(int samples, double factor, BufferedIO *stream)
 {
     const auto gain = static_cast<float>(factor);
+    if (!std::isfinite(gain)) {
+        return fail(QString("*** Invalid scaling factor %1.").arg(factor));
+    }
     return transformInPlace(samples, stream, [gain](std::span<float> iq) { scale(iq, gain); });
 }
 
 bool Resample::frequencyShift(int samples, double frequency, double clock, BufferedIO *stream)
 {
     const double step = frequency * Circle / clock;
-    if (!std::isfinite(step)) {
+    // An angle that large has no fraction of a circle left.
+    constexpr double MaxAngle = 1e15;
+    if (!(std::abs(step) * std::max(samples, 1) <= MaxAngle)) {
         return fail(QString("*** Invalid frequency shift of %1 Hz at a clock of %2 Hz.")
                         .arg(frequency)
                         .arg(clock));
@@ -184,6 +184,9 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
     }
     if (source == nullptr || phase == nullptr || amplitude == nullptr) {
         return fail("*** Invalid data buffer.");
+    }
+    if (!std::isfinite(offset) || !std::isfinite(gain)) {
+        return fail(QString("*** Invalid amplitude offset %1 or gain %2.").arg(offset).arg(gain));
     }
     if (!source->checkHeader("IQF")) {
         return fail("*** Cannot validate data stream header.");

@@ -193,8 +193,8 @@ filterTile(std::span<const Real> taps, const float *x,
         Vector x3;
         loadSamples<Real>(x0, x);
         loadSamples<Real>(x1, x + Lanes);
-        loadSamples<Real>(x2, x + 2 * Lanes);
-        loadSamples<Real>(x3, x + 3 * Lanes);
+        loadSamples<Real>(x2, x + Lanes + Lanes);
+        loadSamples<Real>(x3, x + Lanes + Lanes + Lanes);
         sum0 += tap * x0;
         sum1 += tap * x1;
         sum2 += tap * x2;

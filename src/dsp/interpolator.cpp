@@ -16,8 +16,11 @@ namespace {
 /// Outputs that are planned and computed at a time.
 constexpr int PlanSize = 1024;
 
+/// Bound of the input samples in a repeated period.
+constexpr int MaxOffset = 1024 * 1024;
+
 /// Larger banks of phases would come from main memory.
-constexpr std::size_t MaxBankBytes = 4 * 1024 * 1024;
+constexpr std::size_t MaxBankBytes = 4ULL * 1024 * 1024;
 
 /// Up to this sum of the magnitudes of the coefficients, single precision holds the bound.
 constexpr double MaxSinglePrecisionSum = 12.0;
@@ -139,7 +142,7 @@ public:
         , m_rows(geometry.maxTaps(), static_cast<std::size_t>(outputPeriod) + OnSampleRows)
     {
         // Short periods are repeated, so that the kernel has long stretches to work on.
-        const int repeats = (PlanSize + outputPeriod - 1) / outputPeriod;
+        const int repeats = std::max(std::min(PlanSize / outputPeriod, MaxOffset / inputPeriod), 1);
         m_inputPeriod = static_cast<qint64>(inputPeriod) * repeats;
         m_outputPeriod = static_cast<qint64>(outputPeriod) * repeats;
         const std::int32_t stride = m_rows.vectors() * KernelLanes<Real>;
@@ -316,7 +319,8 @@ std::unique_ptr<Interpolator> makeFor(const FilterTable &table, const TapGeometr
     const int divisor = std::gcd(inputCount, outputCount);
     const int phases = outputCount / divisor;
     const std::size_t rowBytes = static_cast<std::size_t>(geometry.maxTaps()) * sizeof(Real);
-    if (static_cast<std::size_t>(phases) * rowBytes <= MaxBankBytes) {
+    const std::size_t paddedBytes = rowBytes + KernelVectorBytes;
+    if (static_cast<std::size_t>(phases) * paddedBytes <= MaxBankBytes) {
         return std::make_unique<PhaseBank<Real>>(table, geometry, inputCount / divisor, phases);
     }
     return std::make_unique<SlopedTable<Real>>(table, geometry);

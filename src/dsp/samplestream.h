@@ -12,6 +12,12 @@
 /// enough to stay in the cache of one core.
 inline constexpr int StreamBlockSamples = 32 * 1024;
 
+/// Numbers in a block of samples.
+[[nodiscard]] inline std::size_t floatsOf(int samples)
+{
+    return 2 * static_cast<std::size_t>(samples);
+}
+
 /// Reads samples into the span of interleaved I and Q. Returns the number of whole samples that
 /// came.
 [[nodiscard]] inline int readSamples(BufferedIO &stream, std::span<float> iq)

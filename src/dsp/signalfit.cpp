@@ -262,9 +262,9 @@ std::optional<SignalFit> fitMultiCarrier(const MultiCarrierSettings &settings,
                      .arg(settings.carriers));
         return {};
     }
-    const double half = settings.carriers / 2; // on each side of zero
-    const FrequencyFit result = fitFrequency(settings.spacing, half * 512, limits);
-    if ((result.fit.samples < half * 4 && refuseUpper()) || !checkCount(result.fit, limits)) {
+    const int half = settings.carriers / 2; // on each side of zero
+    const FrequencyFit result = fitFrequency(settings.spacing, half * 512.0, limits);
+    if ((result.fit.samples < half * 4.0 && refuseUpper()) || !checkCount(result.fit, limits)) {
         return {};
     }
     return result.fit;

@@ -3,10 +3,61 @@
 
 #include "vectorclones.h"
 
-#include <cmath>
+#include <array>
+#include <bit>
 #include <cstddef>
+#include <cstdint>
+#include <numeric>
 
 namespace {
+
+constexpr std::size_t MaxCount = TapPlan<double>::MaxCount;
+
+using PlanArray = std::array<double, MaxCount>;
+
+/// 0, 1, 2 ...: compilers don't vectorise loops that count and compute in doubles.
+const PlanArray &counts()
+{
+    static const PlanArray values = [] {
+        PlanArray made{};
+        std::iota(made.begin(), made.end(), 0.0);
+        return made;
+    }();
+    return values;
+}
+
+/// Floor and ceiling of numbers below 2^51. The library's may raise exceptions, for whose sake
+/// compilers leave them scalar.
+constexpr double RoundingOffset = 0x1.8p52;
+
+/// 1 for negative numbers, else 0, without a branch.
+CORVANE_INLINE double isNegative(double value)
+{
+    const std::uint64_t sign = std::bit_cast<std::uint64_t>(value) >> 63;
+    return std::bit_cast<double>((0 - sign) & std::bit_cast<std::uint64_t>(1.0));
+}
+
+CORVANE_INLINE double floorOf(double value)
+{
+    const double nearest = (value + RoundingOffset) - RoundingOffset;
+    return nearest - isNegative(value - nearest);
+}
+
+CORVANE_INLINE double ceilingOf(double value)
+{
+    const double nearest = (value + RoundingOffset) - RoundingOffset;
+    return nearest + isNegative(nearest - value);
+}
+
+template <typename Target>
+CORVANE_INLINE void convert(const PlanArray &values, std::span<Target> target)
+{
+    Target *to = target.data();
+    const std::size_t count = target.size();
+    for (std::size_t i = 0; i < count; ++i) {
+        to[i] = static_cast<Target>(values[i]);
+    }
+}
 
 template <typename Real>
 CORVANE_INLINE void planTapsBody(const TapGeometry &geometry, const SlopedLayout &layout,
@@ -18,25 +69,34 @@ CORVANE_INLINE void planTapsBody(const TapGeometry &geometry, const SlopedLayout
     const double ratio = geometry.ratio();
     const double scale = geometry.scale();
     const double onSampleLimit = (geometry.length() - 1.5) * scale;
+    const double lowest = layout.lowest;
+    const double stride = layout.rowStride;
+    const double roundedRow = layout.onSampleNext;
+    const double exactRow = layout.onSample - roundedRow;
     const auto start = static_cast<double>(firstOutput);
     const auto origin = static_cast<double>(inputStart);
-    const int count = static_cast<int>(plan.offsets.size());
-    std::int32_t *offsets = plan.offsets.data();
-    std::int32_t *rowStarts = plan.rowStarts.data();
-    Real *fractions = plan.fractions.data();
-    for (int i = 0; i < count; ++i) {
-        const double t = (start + i) / ratio;
-        const double first = std::ceil(t - half);
-        const double end = std::floor(half + t);
-        const double position = (t - std::ceil(t) + back) * scale;
-        const auto whole = static_cast<std::int32_t>(position);
-        const std::int32_t between = (whole - layout.lowest) * layout.rowStride;
-        const std::int32_t onSample =
-            position > onSampleLimit ? layout.onSample : layout.onSampleNext;
-        offsets[i] = static_cast<std::int32_t>(first - origin);
-        rowStarts[i] = end - first < maxTaps ? between : onSample;
-        fractions[i] = static_cast<Real>(position - whole);
+    const PlanArray &index = counts();
+    PlanArray offsets;
+    PlanArray rowStarts;
+    PlanArray fractions;
+    const std::size_t count = plan.offsets.size();
+    for (std::size_t i = 0; i < count; ++i) {
+        const double t = (start + index[i]) / ratio;
+        const double first = ceilingOf(t - half);
+        const double taps = floorOf(half + t) - first;
+        const double position = (t - ceilingOf(t) + back) * scale;
+        const double whole = floorOf(position);
+        // Choices are written as sums of whole numbers, which are exact and no branches.
+        const double isExact = floorOf((position - onSampleLimit) / scale) + 1;
+        const double isBetween = maxTaps - taps;
+        const double onSample = roundedRow + isExact * exactRow;
+        offsets[i] = first - origin;
+        rowStarts[i] = onSample + isBetween * ((whole - lowest) * stride - onSample);
+        fractions[i] = position - whole;
     }
+    convert(offsets, plan.offsets);
+    convert(rowStarts, plan.rowStarts);
+    convert(fractions, plan.fractions);
 }
 
 } // namespace

@@ -21,6 +21,8 @@ struct SlopedLayout
 template <typename Real>
 struct TapPlan
 {
+    static constexpr int MaxCount = 1024;
+
     std::span<std::int32_t> offsets;   ///< first tap, counted from `inputStart`
     std::span<std::int32_t> rowStarts; ///< index of the row's first number
     std::span<Real> fractions;         ///< table points above the row's

@@ -173,7 +173,7 @@ void RemoteEntry::publishStaged(const QList<RemoteEntry *> &order)
 
 QList<RemoteEntry *> RemoteEntry::takeFirstChildren(qsizetype count)
 {
-    const QList<RemoteEntry *> taken = m_data->children.first(count);
+    QList<RemoteEntry *> taken = m_data->children.first(count);
     m_data->children.remove(0, count);
     m_data->numberChildren();
     return taken;

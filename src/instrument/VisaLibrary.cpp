@@ -23,8 +23,9 @@ QStringList candidates()
     QStringList names{"visa32", "visa"};
     // Beside the program, in the bin folder of a build whose tests stand elsewhere, and where an
     // installation puts libraries.
-    for (const char *folder : {".", "../bin", CORVANE_LIBRARY_FOLDER "/corvane",
-                               CORVANE_LIBRARY_FOLDER, "../lib/corvane", "../lib"}) {
+    constexpr const char *ownFolder = CORVANE_LIBRARY_FOLDER "/corvane";
+    for (const char *folder :
+         {".", "../bin", ownFolder, CORVANE_LIBRARY_FOLDER, "../lib/corvane", "../lib"}) {
         const QString name = QDir::cleanPath(QCoreApplication::applicationDirPath() + "/" + folder +
                                              "/libcorvane_visa.so");
         if (QFileInfo::exists(name) && !names.contains(name)) {

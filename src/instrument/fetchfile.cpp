@@ -21,7 +21,7 @@ QString makePartFile(const QString &target)
     constexpr int maxTries = 100;
     QString reason;
     for (int i = 0; i < maxTries; ++i) {
-        const QString name = i == 0 ? target + ".part" : QString("%1.part%2").arg(target).arg(i);
+        QString name = i == 0 ? target + ".part" : QString("%1.part%2").arg(target).arg(i);
         QFile file(name);
         if (file.open(QIODevice::WriteOnly | QIODevice::NewOnly)) {
             return name;

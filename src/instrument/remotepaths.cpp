@@ -75,7 +75,7 @@ QList<RemoteFileEntry> parseCatalogue(const QString &answer)
 
 QString resourceOf(const QString &text)
 {
-    const QString trimmed = text.trimmed();
+    QString trimmed = text.trimmed();
     if (trimmed.isEmpty() || trimmed.contains("::")) {
         return trimmed;
     }

@@ -75,17 +75,17 @@ QString stripBraces(const QString &text)
 
 QString tagText(const QString &tag, const QString &text)
 {
-    const QString kept = stripBraces(text);
+    QString kept = stripBraces(text);
     const auto canStand = [](QChar character) {
         return character >= QChar(' ') && character < QChar('}');
     };
-    const auto *const problem = std::find_if_not(kept.begin(), kept.end(), canStand);
-    if (problem != kept.end()) {
+    const auto *const problem = std::find_if_not(kept.cbegin(), kept.cend(), canStand);
+    if (problem != kept.cend()) {
         Tracer::Trace(Tracer::Warning,
                       QString("The %1 will not read back as it was given: its character %2 "
                               "(U+%3) is none that the tags of a waveform file can hold.")
                           .arg(tag)
-                          .arg(problem - kept.begin() + 1)
+                          .arg(problem - kept.cbegin() + 1)
                           .arg(QString::number(problem->unicode(), 16).toUpper(), 4, '0'));
     }
     return kept;

@@ -120,12 +120,15 @@ void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
         QSet<QChar> keys;
         const QList<QAction *> entries = title->menu()->actions();
         for (const QAction *entry : entries) {
+            if (entry->isSeparator()) {
+                continue;
+            }
             const QChar key = entry->text().section('&', 1).front().toLower();
             QVERIFY2(!keys.contains(key), qPrintable(entry->text()));
             keys.insert(key);
         }
     }
-    QCOMPARE(titles, QStringList({"File", "Analyze", "Help"}));
+    QCOMPARE(titles, QStringList({"File", "Analyze", "Edit", "Help"}));
     QVERIFY(findEntry(*desk.window(), "File", "Exit"));
     QVERIFY(findEntry(*desk.window(), "Analyze", "File Info"));
     QVERIFY(findEntry(*desk.window(), "Help", "About"));
@@ -165,9 +168,18 @@ void TestMainWindow::registryPlacesAndStartsTools()
     bar.addMenu("&File");
     modules.buildMenu(&bar);
     modules.buildMenu(&bar);
-    QCOMPARE(bar.actions().size(), 3);
-    QAction *entry = bar.actions().last()->menu()->actions().constFirst();
-    QCOMPARE(entry->text(), "Any");
+    QStringList titles;
+    for (const QAction *title : bar.actions()) {
+        titles.append(title->text());
+    }
+    QCOMPARE(titles.removeDuplicates(), 0); // built once, and "File" was found
+    QAction *entry = nullptr;
+    for (const QAction *title : bar.actions()) {
+        for (QAction *action : title->menu()->actions()) {
+            entry = action->text() == "Any" ? action : entry;
+        }
+    }
+    QVERIFY(entry);
     QVERIFY(!entry->isEnabled());
 
     modules.setSelection("/data/some folder/", true);

@@ -203,17 +203,10 @@ void TestPaneFiles::treeRemovalStopsAtTheFirstFailure()
 void TestPaneFiles::treeRemovalCanBeCancelled()
 {
     LocalTreeRemover remover;
-    for (int i = 0; i < 20000; ++i) {
-        QVERIFY(QFile(path(QString("folder/%1").arg(i))).open(QIODevice::WriteOnly));
-    }
-    connect(&remover, &LocalTreeRemover::ProgressUpdate, &remover, &LocalTreeRemover::cancel);
-    if (remover.remove(path("folder"))) {
-        QSKIP("this machine removes 20 000 files between two reports");
-    }
-    QVERIFY(QFileInfo::exists(path("folder")));
+    remover.cancel();
+    QVERIFY(!remover.remove(path("folder")));
     QCOMPARE(remover.reason(), "Cancelled.");
-    disconnect(&remover, &LocalTreeRemover::ProgressUpdate, &remover, nullptr);
-    QVERIFY(remover.remove(path("folder")));
+    QVERIFY(QFileInfo::exists(path("folder/inner/file")));
 }
 
 void TestPaneFiles::linksAreNotShown()

@@ -73,8 +73,15 @@ QStringList visibleEntries(const QMenu &menu)
     return texts;
 }
 
-void rightClick(QCustomTreeView *tree, const QPoint &position)
+/// A click with the right button on a neighbour of the current entry.
+void rightClick(QCustomTreeView *tree, const QString &name)
 {
+    const QModelIndex folder = tree->currentIndex().parent();
+    const QModelIndexList found = tree->model()->match(tree->model()->index(0, 0, folder),
+                                                       Qt::DisplayRole, name, 1, Qt::MatchExactly);
+    QVERIFY(!found.isEmpty());
+    tree->scrollTo(found.first());
+    const QPoint position = tree->visualRect(found.first()).center();
     QTest::mouseClick(tree->viewport(), Qt::RightButton, {}, position);
     QContextMenuEvent event(QContextMenuEvent::Mouse, position,
                             tree->viewport()->mapToGlobal(position));
@@ -345,22 +352,19 @@ void TestPanes::contextMenuFitsTheEntry()
     QCustomTreeView *tree = desk.tree(1);
     const QStringList fileEntries{"Set As Default Folder", "Create Folder", "Rename", "Delete"};
 
-    desk.select(1, "data.txt");
-    const QPoint onText = tree->visualRect(tree->currentIndex()).center();
     desk.select(1, "tone.wv");
-    const QPoint onTone = tree->visualRect(tree->currentIndex()).center();
-
-    rightClick(tree, onText);
+    rightClick(tree, "data.txt");
     QTRY_VERIFY(openMenu());
     QCOMPARE(tree->currentPath(), desk.path("data.txt"));
     QCOMPARE(visibleEntries(*openMenu()).mid(0, 4), fileEntries);
     QVERIFY(!visibleEntries(*openMenu()).contains("Waveform Info"));
     openMenu()->close();
 
-    rightClick(tree, onTone);
+    rightClick(tree, "tone.wv");
     QTRY_VERIFY(openMenu());
     QCOMPARE(tree->currentPath(), desk.path("tone.wv"));
-    QCOMPARE(visibleEntries(*openMenu()), fileEntries + QStringList({"-", "Waveform Info"}));
+    QCOMPARE(visibleEntries(*openMenu()).mid(0, 6),
+             fileEntries + QStringList({"-", "Waveform Info"}));
     QTest::keyClick(openMenu(), Qt::Key_S); // the mnemonic of "Set As Default Folder"
     QTRY_COMPARE(desk.log().last(), QString("Set local default folder '%1/'").arg(desk.path("")));
 }
@@ -383,14 +387,15 @@ void TestPanes::doubleClickStartsTheFirstTool()
     desk.open();
     desk.select(1, "data.txt");
     QCustomTreeView *tree = desk.tree(1);
-    QSignalSpy status(tree, &QCustomTreeView::errMsg);
     const auto doubleClick = [&] {
         const QPoint position = tree->visualRect(tree->currentIndex()).center();
         QTest::mouseClick(tree->viewport(), Qt::LeftButton, {}, position);
         QTest::mouseDClick(tree->viewport(), Qt::LeftButton, {}, position);
     };
     doubleClick();
-    QCOMPARE(status.last().first().toString(), "No tool works on 'data.txt'.");
+    // Only the making of a signal takes a file of any type.
+    QTRY_COMPARE(QApplication::activeWindow()->windowTitle(), "Create Signal");
+    QApplication::activeWindow()->close();
     desk.select(1, "tone.wv");
     doubleClick();
     QTRY_VERIFY(qobject_cast<DlgInfo *>(QApplication::activeWindow()));
@@ -431,18 +436,18 @@ void TestPanes::largeFolderStaysInOrder()
 {
     Desk desk;
     QVERIFY(QDir().mkpath(desk.path("many")));
-    for (int i = 0; i < 3000; ++i) {
+    for (int i = 0; i < 1000; ++i) {
         QVERIFY(writeText(desk.path(QString("many/f%1.wv").arg(i, 5, 10, QChar('0'))), "x"));
     }
     desk.open();
-    desk.select(1, "many/f02500.wv");
+    desk.select(1, "many/f00800.wv");
     QCustomTreeView *tree = desk.tree(1);
-    QTRY_COMPARE(tree->model()->rowCount(tree->currentIndex().parent()), 3000);
+    QTRY_COMPARE(tree->model()->rowCount(tree->currentIndex().parent()), 1000);
     // Although the rows came in afterwards, the entry stands in sight, and in its order.
-    QTRY_COMPARE(tree->currentIndex().row(), 2500);
+    QTRY_COMPARE(tree->currentIndex().row(), 800);
     QTRY_VERIFY(tree->viewport()->rect().contains(tree->visualRect(tree->currentIndex()).center()));
     pressKey(tree, Qt::Key_Down);
-    QCOMPARE(tree->currentPath(), desk.path("many/f02501.wv"));
+    QCOMPARE(tree->currentPath(), desk.path("many/f00801.wv"));
 }
 
 QTEST_MAIN(TestPanes)

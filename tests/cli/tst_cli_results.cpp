@@ -118,21 +118,21 @@ void TestCliResults::dumpsEachForm()
 void TestCliResults::dumpsRanges_data()
 {
     QTest::addColumn<QString>("range");
-    QTest::addColumn<int>("begin");
-    QTest::addColumn<int>("count");
+    QTest::addColumn<qsizetype>("begin");
+    QTest::addColumn<qsizetype>("count");
     // Blocks of the dump hold 16384 samples, those of the reader 65536.
-    QTest::newRow("all") << "" << 0 << 70000;
-    QTest::newRow("from") << "--from 69999" << 69999 << 1;
-    QTest::newRow("count") << "--count 16385" << 0 << 16385;
-    QTest::newRow("both") << "--from 16383 --count 49155" << 16383 << 49155;
-    QTest::newRow("prefix") << "--from 65.5k --count 3" << 65500 << 3;
+    QTest::newRow("all") << "" << qsizetype(0) << qsizetype(70000);
+    QTest::newRow("from") << "--from 69999" << qsizetype(69999) << qsizetype(1);
+    QTest::newRow("count") << "--count 16385" << qsizetype(0) << qsizetype(16385);
+    QTest::newRow("both") << "--from 16383 --count 49155" << qsizetype(16383) << qsizetype(49155);
+    QTest::newRow("prefix") << "--from 65.5k --count 3" << qsizetype(65500) << qsizetype(3);
 }
 
 void TestCliResults::dumpsRanges()
 {
     QFETCH(QString, range);
-    QFETCH(int, begin);
-    QFETCH(int, count);
+    QFETCH(qsizetype, begin);
+    QFETCH(qsizetype, count);
     QByteArray samples;
     for (int i = 0; i < 140000; ++i) {
         samples += littleEndian(static_cast<qint16>((i * 7919) % 32767));

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "display/PlayInterval.h"
 #include "display/ViewWindow.h"
 #include "log/Tracer.h"
 #include "wvfile/TempStream.h"
@@ -80,6 +81,8 @@ private slots:
     void readsAnewAfterAWrite();
     void playStep_data();
     void playStep();
+    void playbackReachesTheEnd();
+    void playInterval();
 };
 
 void TestViewWindow::movesShowTheRightSamples()
@@ -255,6 +258,44 @@ void TestViewWindow::playStep()
     ViewWindow window;
     window.setSource(waveform.data.stream(), waveform.markers.stream(), samples);
     QTEST(static_cast<int>(window.playStep()), "step");
+}
+
+void TestViewWindow::playbackReachesTheEnd()
+{
+    Waveform waveform(5600);
+    ViewWindow window;
+    window.setSource(waveform.data.stream(), waveform.markers.stream(), 5600);
+    QVERIFY(window.show(0));
+    QList<qint64> starts;
+    while (window.playTarget() != window.first()) {
+        QVERIFY(window.show(window.playTarget()));
+        starts += window.first();
+    }
+    QCOMPARE(starts, QList<qint64>({250, 500, 600}));
+    // Long steps are whole spectrum frames: 20 000 / 20 = 1000 = 3 * 256 + 232.
+    Waveform longer(30000);
+    window.setSource(longer.data.stream(), longer.markers.stream(), 30000);
+    QVERIFY(window.zoomOut() && window.zoomOut());
+    QCOMPARE(window.points(), 20000);
+    QCOMPARE(window.playStep(), 768);
+}
+
+void TestViewWindow::playInterval()
+{
+    PlayInterval interval;
+    QVERIFY(!interval.fit(39));
+    QCOMPARE(interval.milliseconds(), PlayInterval::StartMs);
+    QVERIFY(interval.fit(100));
+    QCOMPARE(takeLog(), "Play interval adjusted.");
+    QCOMPARE(interval.milliseconds(), 150);
+    QVERIFY(!interval.fit(149));
+    QVERIFY(interval.fit(5'000'000'000));
+    QCOMPARE(interval.milliseconds(), PlayInterval::LongestMs);
+    (void)takeLog();
+    QVERIFY(!interval.fit(2000)); // no line for every tick from then on
+    QVERIFY(takeLog().isEmpty());
+    interval.reset();
+    QCOMPARE(interval.milliseconds(), PlayInterval::StartMs);
 }
 
 QTEST_APPLESS_MAIN(TestViewWindow)

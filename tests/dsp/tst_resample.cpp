@@ -142,6 +142,8 @@ void TestResample::equalsLiteral_data()
     row("shortest", 0, 0, 3, 0.4, 0.5, 3000, 4001);
     row("shortest even", 0, 0, 4, 0.4, 0.5, 3000, 4001);
     row("largest step", 1, 0, 50, 0.45, 0.5, 48 * 500, 500);
+    row("one output", 1, 0, 50, 0.45, 0.5, 100000, 1);
+    row("many phases, few taps", 0, 0, 5, 0.45, 0.5, 100000, 100003);
 }
 
 void TestResample::equalsLiteral()
@@ -528,16 +530,20 @@ void TestResample::rescaleAndStatistics()
     QVERIFY(!resample.rescale(100001, 0.5, stream.stream()));
     QVERIFY(!resample.rescale(0, 0.5, stream.stream()));
     QVERIFY(!resample.rescale(1, 0.5, nullptr));
+    QVERIFY(!resample.rescale(1, std::nan(""), stream.stream()));
+    QVERIFY(!resample.rescale(1, 1e300, stream.stream()));
     QVERIFY(!resample.statistics(100001, stream.stream(), &peak, &rms));
     QVERIFY(!resample.statistics(-1, stream.stream(), &peak, &rms));
     QVERIFY(!resample.statistics(1, stream.stream(), nullptr, &rms));
     QVERIFY(stream->writeHeader("XYZ"));
     QVERIFY(!resample.rescale(1, 0.5, stream.stream()));
-    QCOMPARE(takeMessages(),
-             (QStringList{"*** Reading failed for sample 100000.", "*** Invalid input data length.",
-                          "*** Invalid data buffer.", "*** Reading failed for sample 100000.",
-                          "*** Invalid input data length.", "*** Invalid input arguments.",
-                          "*** Cannot validate data stream header."}));
+    QCOMPARE(
+        takeMessages(),
+        (QStringList{"*** Reading failed for sample 100000.", "*** Invalid input data length.",
+                     "*** Invalid data buffer.", "*** Invalid scaling factor nan.",
+                     "*** Invalid scaling factor 1e+300.", "*** Reading failed for sample 100000.",
+                     "*** Invalid input data length.", "*** Invalid input arguments.",
+                     "*** Cannot validate data stream header."}));
 }
 
 void TestResample::frequencyShiftFollowsTheLoop()
@@ -565,8 +571,13 @@ void TestResample::frequencyShiftFollowsTheLoop()
             angle += frequency * 6.283185307179586 / 1e7;
         }
     }
-    QVERIFY(!resample.frequencyShift(10, 1e3, 0.0, stream.stream()));
-    QCOMPARE(takeMessages().size(), 1);
+    for (const double bad : {0.0, std::nan("")}) {
+        QVERIFY(!resample.frequencyShift(10, 1e3, bad, stream.stream()));
+        QCOMPARE(takeMessages().size(), 1);
+    }
+    QVERIFY(!resample.frequencyShift(10, 1e300, 1e6, stream.stream()));
+    QCOMPARE(takeMessages(),
+             QStringList{"*** Invalid frequency shift of 1e+300 Hz at a clock of 1e+06 Hz."});
 }
 
 void TestResample::polarSplitConjugates()

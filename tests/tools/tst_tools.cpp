@@ -11,6 +11,7 @@
 
 #include <QApplication>
 #include <QComboBox>
+#include <QFocusEvent>
 #include <QLabel>
 #include <QLineEdit>
 #include <QMessageBox>
@@ -73,7 +74,9 @@ void type(QLineEdit *edit, const QString &text)
     edit->setFocus();
     edit->selectAll();
     QTest::keyClicks(edit, text);
-    QTest::keyClick(edit, Qt::Key_Return);
+    // Leaving the field takes the text; Return would go on to the next page as well.
+    QFocusEvent leave(QEvent::FocusOut);
+    QApplication::sendEvent(edit, &leave);
 }
 
 /// Answers the next message box with Yes or No; `text` gets what it asked.

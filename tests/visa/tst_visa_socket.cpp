@@ -1,22 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ScriptedPeer.h"
-#include "visa/visa.h"
+#include "VisaFixture.h"
 
 #include <QElapsedTimer>
-#include <QFile>
-#include <QTemporaryDir>
 #include <QTest>
 
-#include <mutex>
-
 /// SCPI lines over a plain TCP port, through the functions of the library.
-class TestVisaSocket : public QObject
+class TestVisaSocket : public QObject, protected VisaFixture
 {
     Q_OBJECT
 
 private slots:
-    void init();
-    void cleanup();
+    void init() { configure(""); }
+    void cleanup() { closeManager(); }
     void reads_data();
     void reads();
     void suppressedEnd();
@@ -28,25 +24,7 @@ private slots:
 
 private:
     ViSession open(const ScriptedPeer &peer, ViUInt32 timeoutMs = 5000);
-    std::pair<ViStatus, QByteArray> read(ViSession session, ViUInt32 size);
-
-    QTemporaryDir m_folder;
-    ViSession m_manager = VI_NULL;
 };
-
-void TestVisaSocket::init()
-{
-    QFile file(m_folder.filePath("visa.ini"));
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.close();
-    qputenv("CORVANE_VISA_CONFIG", file.fileName().toUtf8());
-    QCOMPARE(viOpenDefaultRM(&m_manager), VI_SUCCESS);
-}
-
-void TestVisaSocket::cleanup()
-{
-    QCOMPARE(viClose(m_manager), VI_SUCCESS);
-}
 
 ViSession TestVisaSocket::open(const ScriptedPeer &peer, ViUInt32 timeoutMs)
 {
@@ -58,18 +36,8 @@ ViSession TestVisaSocket::open(const ScriptedPeer &peer, ViUInt32 timeoutMs)
     return session;
 }
 
-std::pair<ViStatus, QByteArray> TestVisaSocket::read(ViSession session, ViUInt32 size)
-{
-    QByteArray buffer(qsizetype(size), '\0');
-    ViUInt32 count = 0;
-    const ViStatus status =
-        viRead(session, reinterpret_cast<ViByte *>(buffer.data()), size, &count);
-    return {status, buffer.left(count)};
-}
-
 void TestVisaSocket::reads_data()
 {
-    using Result = std::pair<ViStatus, QByteArray>;
     QTest::addColumn<QByteArrayList>("pieces"); // sent each on a word of the reader
     QTest::addColumn<ViUInt32>("size");
     QTest::addColumn<int>("terminator"); // -1: off
@@ -99,7 +67,6 @@ void TestVisaSocket::reads_data()
 
 void TestVisaSocket::reads()
 {
-    using Result = std::pair<ViStatus, QByteArray>;
     QFETCH(QByteArrayList, pieces);
     QFETCH(ViUInt32, size);
     QFETCH(int, terminator);
