@@ -2,13 +2,13 @@
 #include "RemoteDirModel.h"
 
 #include "VisaDevice.h"
+#include "remoteorder.h"
 
 #include <QHash>
 #include <QScopedValueRollback>
 
 #include <algorithm>
 #include <utility>
-#include <vector>
 
 namespace {
 
@@ -66,44 +66,6 @@ void collectExpanded(const RemoteEntry &entry, QStringList &paths)
 }
 
 } // namespace
-
-/// What is compared of an entry, made once for each sort.
-struct RemoteDirModel::SortKey
-{
-    explicit SortKey(RemoteEntry *sortedEntry)
-        : entry(sortedEntry)
-        , isDirectory(entry->info().isDirectory)
-        , size(isDirectory ? entry->children().size() : entry->info().size)
-        , name(entry->fullPath().toLower().section('/', -1, -1, QString::SectionSkipEmpty))
-    {
-    }
-
-    /// Folders lead in both orders, except by type.
-    static bool isLess(const SortKey &a, const SortKey &b, int column, bool ascending)
-    {
-        if (column != TypeColumn && a.isDirectory != b.isDirectory) {
-            return a.isDirectory;
-        }
-        const QString &aType = a.entry->info().owner;
-        const QString &bType = b.entry->info().owner;
-        switch (column) {
-        case SizeColumn:
-            return ascending ? a.size < b.size : b.size < a.size;
-        case TypeColumn:
-            if (aType == bType) {
-                return a.name < b.name;
-            }
-            return ascending ? aType < bType : bType < aType;
-        default:
-            return ascending ? a.name < b.name : b.name < a.name;
-        }
-    }
-
-    RemoteEntry *entry;
-    bool isDirectory;
-    qint64 size; ///< bytes; of a folder, children
-    QString name;
-};
 
 RemoteDirModel::RemoteDirModel(QObject *parent)
     : QAbstractItemModel(parent)
@@ -279,23 +241,16 @@ Qt::ItemFlags RemoteDirModel::flags(const QModelIndex &index) const
 
 QList<RemoteEntry *> RemoteDirModel::sorted(const QList<RemoteEntry *> &entries) const
 {
-    if (m_sortColumn < 0) {
+    switch (m_sortColumn) {
+    case -1:
         return entries;
+    case SizeColumn:
+        return sortedEntries(entries, RemoteSortKey::Size, m_sortOrder);
+    case TypeColumn:
+        return sortedEntries(entries, RemoteSortKey::Type, m_sortOrder);
+    default:
+        return sortedEntries(entries, RemoteSortKey::Name, m_sortOrder);
     }
-    std::vector<SortKey> keys;
-    keys.reserve(static_cast<size_t>(entries.size()));
-    for (RemoteEntry *entry : entries) {
-        keys.emplace_back(entry);
-    }
-    std::stable_sort(keys.begin(), keys.end(), [this](const SortKey &a, const SortKey &b) {
-        return SortKey::isLess(a, b, m_sortColumn, m_sortOrder == Qt::AscendingOrder);
-    });
-    QList<RemoteEntry *> order;
-    order.reserve(entries.size());
-    for (const SortKey &key : keys) {
-        order.append(key.entry);
-    }
-    return order;
 }
 
 void RemoteDirModel::sortChildren(RemoteEntry *entry)

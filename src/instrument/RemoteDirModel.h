@@ -86,8 +86,6 @@ public slots:
     void slotReadingFailed(RemoteEntry *entry);
 
 private:
-    struct SortKey;
-
     [[nodiscard]] QVariant entryData(const RemoteEntry &entry, int column, int role) const;
     [[nodiscard]] QList<RemoteEntry *> sorted(const QList<RemoteEntry *> &entries) const;
     void sortChildren(RemoteEntry *entry);

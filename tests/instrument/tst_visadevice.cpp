@@ -5,7 +5,6 @@
 #include "instrument/VisaDevice.h"
 #include "visa/visa.h"
 
-#include <QElapsedTimer>
 #include <QSignalSpy>
 #include <QTcpServer>
 #include <QTest>
@@ -43,11 +42,6 @@ private slots:
     void openElsewhere();
     void scan();
     void scanFails();
-    void arbWait_data();
-    void arbWait();
-    void arbStart_data();
-    void arbStart();
-    void arbCancel();
 };
 
 void TestVisaDevice::libraryLacksFunction_data()
@@ -477,116 +471,6 @@ void TestVisaDevice::scanFails()
     QVERIFY(!device.scanResources(found, VisaDevice::ScanUsb));
     QCOMPARE(found.size(), 1);
     qDeleteAll(found);
-}
-
-void TestVisaDevice::arbWait_data()
-{
-    QTest::addColumn<QString>("model");
-    QTest::addColumn<QStringList>("conditions");
-    QTest::addColumn<int>("seconds");
-    QTest::addColumn<bool>("ready");
-    QTest::addColumn<QStringList>("words");
-    QTest::newRow("no time") << "TGX-870" << QStringList{} << 0 << false << QStringList{};
-    QTest::newRow("ready") << "TGX-870" << QStringList{"0"} << 3 << true << QStringList{};
-    QTest::newRow("other bits") << "TGX-870" << QStringList{"5"} << 3 << true << QStringList{};
-    QTest::newRow("busy, then ready")
-        << "TGX-840" << QStringList{"2", "4"} << 4 << true << QStringList{};
-    QTest::newRow("busy too long") << "TGX-840" << QStringList{"2", "2", "2"} << 2 << false
-                                   << QStringList{"4 ARB did not get ready in time."};
-    QTest::newRow("nonsense") << "TGX-870" << QStringList{"abc"} << 3 << false
-                              << QStringList{"4 Invalid instrument response."};
-    QTest::newRow("no progress") << "TGX-870" << QStringList{"MCOD"} << 3 << false
-                                 << QStringList{"4 Cannot read MCOD progress."};
-    QTest::newRow("no condition") << "TGX-870" << QStringList{"COND"} << 3 << false
-                                  << QStringList{"4 Cannot read instrument status."};
-}
-
-void TestVisaDevice::arbWait()
-{
-    QFETCH(const QString, model);
-    QFETCH(QStringList, conditions);
-    QFETCH(const int, seconds);
-    QFETCH(const bool, ready);
-    QFETCH(const QStringList, words);
-    FakeInstrument fake;
-    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    const bool fails = conditions.value(0).toInt() == 0 && conditions.value(0).size() == 4;
-    const QString failing = fails ? conditions.first() : QString();
-    fake->answer = [&, failing](const std::string &message) -> std::string {
-        if (fails && QString::fromStdString(message).contains(failing)) {
-            fake->errors = {"-300,\"Device-specific error\""};
-        }
-        if (message == "SOUR:BB:PROG:MCOD?") {
-            return "37\n";
-        }
-        if (message != "STAT:OPER:COND?" || conditions.isEmpty()) {
-            return {};
-        }
-        return conditions.takeFirst().toStdString() + "\n";
-    };
-    (void)fake.takeMessages();
-    (void)takeLog();
-    QSignalSpy progress(&device, &VisaDevice::ProgressUpdate);
-    QCOMPARE(device.waitForArbReady(seconds), ready);
-    QCOMPARE(takeLog(), words);
-    const bool asksProgress = model == "TGX-870" && seconds > 0;
-    QCOMPARE(fake.takeMessages().contains("SOUR:BB:PROG:MCOD?"), asksProgress);
-    if (ready) {
-        QCOMPARE(progress.last().first().toInt(), 100);
-    }
-    if (words.value(0).contains("in time")) {
-        // Without a coder the progress is the time in seconds.
-        QCOMPARE(progress.last().first().toInt(), 1);
-    }
-}
-
-void TestVisaDevice::arbStart_data()
-{
-    QTest::addColumn<QString>("model");
-    QTest::addColumn<QStringList>("messages");
-    QTest::newRow("with a coder") << "TGX-870"
-                                  << QStringList{"SOUR:BB:ARB:WAV:SEL '/var/user/a.wv'",
-                                                 "SOUR:BB:PROG:MCOD?", "STAT:OPER:COND?",
-                                                 "SOUR:BB:ARB:STAT ON; *OPC?"};
-    QTest::newRow("without") << "TGX-840"
-                             << QStringList{"SOUR:WAV:SEL '/var/user/a.wv'", "STAT:OPER:COND?",
-                                            "SOUR:STAT ON; *OPC?"};
-}
-
-void TestVisaDevice::arbStart()
-{
-    QFETCH(const QString, model);
-    QFETCH(const QStringList, messages);
-    FakeInstrument fake;
-    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    fake->answer = [&](const std::string &message) {
-        return message == "STAT:OPER:COND?" || message == "SOUR:BB:PROG:MCOD?" ? std::string("0\n")
-                                                                               : std::string();
-    };
-    // An old error is no error of this start.
-    fake->errors = {"-1,\"Old\""};
-    (void)fake.takeMessages();
-    QVERIFY(device.startArb("/var/user/a.wv"));
-    QCOMPARE(fake.takeMessages(), messages);
-}
-
-void TestVisaDevice::arbCancel()
-{
-    FakeInstrument fake;
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    (void)takeLog();
-    QElapsedTimer timer;
-    timer.start();
-    // One left over from before ends the wait as well.
-    device.cancel();
-    QVERIFY(!device.waitForArbReady(100));
-    QVERIFY(timer.elapsed() < 5000);
-    QCOMPARE(takeLog(), QStringList{"4 *** User break."});
 }
 
 QTEST_GUILESS_MAIN(TestVisaDevice)
