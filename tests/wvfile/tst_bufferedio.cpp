@@ -11,7 +11,7 @@
 
 namespace {
 
-constexpr qint64 mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 
 /// Bytes whose place can be told from them.
 QByteArray pattern(qint64 size)

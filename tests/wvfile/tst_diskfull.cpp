@@ -23,7 +23,7 @@
 
 namespace {
 
-constexpr qint64 mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 
 bool writeText(const char *path, const QByteArray &text)
 {

@@ -20,7 +20,7 @@
 
 namespace {
 
-constexpr qint64 mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 const QByteArray tgx = "{TYPE:TGX-WV}";
 
 QByteArray repeated(const QByteArray &text, qsizetype count)

@@ -489,7 +489,7 @@ void TestWvWriter::cancelLeavesACutFile()
             return TestDevice::readData(data, length);
         }
     };
-    constexpr int samples = 3'000'000;
+    constexpr qsizetype samples = 3'000'000;
     SlowDevice device;
     device.bytes = dataBytes(QList<float>(2 * samples, 0.25F));
     BufferedIO data;
