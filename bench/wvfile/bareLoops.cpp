@@ -9,7 +9,7 @@
 
 namespace {
 
-constexpr size_t blockBytes = 1024 * 1024;
+constexpr size_t blockBytes = 1'048'576;
 
 /// Reads `total` values of one kind in blocks, converts and writes them; the count that came
 /// through.
@@ -61,7 +61,8 @@ qint64 bareEncode(const std::string &source, qint64 offset, qint64 samples,
 {
     const auto encode = [](float value) {
         const float limited = std::min(1.0F, std::max(-1.0F, value));
-        return static_cast<qint16>(static_cast<int>(limited * 32767.0F + 0.5F));
+        const float scaled = limited * 32767.0F + 0.5F;
+        return static_cast<qint16>(static_cast<int>(scaled));
     };
     return convertFile<float, qint16>(source, offset, 2 * samples, target, encode) / 2;
 }

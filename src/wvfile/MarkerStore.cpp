@@ -10,10 +10,10 @@
 
 namespace {
 
-constexpr qint64 blockSize = 256 * 1024;
+constexpr qint64 blockSize = 262'144;
 
 /// Some 4 MiB for each side: little beside the buffers of the streams.
-constexpr size_t maxRuns = 512 * 1024;
+constexpr size_t maxRuns = 524'288;
 
 } // namespace
 

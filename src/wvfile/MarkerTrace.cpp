@@ -13,7 +13,7 @@
 
 namespace {
 
-constexpr qint64 blockSize = 256 * 1024;
+constexpr qint64 blockSize = 262'144;
 
 /// A file can repeat its lists at will; each costs a pass over the bytes. This many passes over
 /// the longest possible stream are far beyond any honest file and still proportional to its size.

@@ -163,6 +163,7 @@ void TestTracer::threadsKeepTheirOrder()
     constexpr int threads = 4;
     constexpr int lines = 1000;
     std::vector<std::thread> workers;
+    workers.reserve(threads);
     for (int i = 0; i < threads; ++i) {
         workers.emplace_back([i] {
             for (int k = 0; k < lines; ++k) {

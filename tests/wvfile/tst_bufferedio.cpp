@@ -11,7 +11,7 @@
 
 namespace {
 
-constexpr int mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 
 /// Bytes whose place can be told from them.
 QByteArray pattern(qint64 size)
@@ -122,7 +122,7 @@ void TestBufferedIO::anyBlockSize_data()
     const int buffer = BufferedIO::BufferSize;
     QTest::newRow("write 7, read 8") << 7 << 8 << false;
     for (const int size : {64 * 1024, 256 * 1024 + 1, buffer - 1, buffer, buffer + 1,
-                           2 * buffer + 5, 36 * mebibyte}) {
+                           2 * buffer + 5, 36 * 1024 * 1024}) {
         QTest::addRow("write %d, read 65536", size) << size << 65536 << false;
         QTest::addRow("write 65536, read %d", size) << 65536 << size << false;
         QTest::addRow("write %d at once, read %d", size, size) << size << size << true;
@@ -191,11 +191,12 @@ void TestBufferedIO::nothingIsReadBeforeARestart()
     BufferedIO stream;
     QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
     const QByteArray bytes = pattern(mebibyte);
+    const auto size = static_cast<int>(bytes.size());
     QByteArray block(mebibyte, '\0');
-    QVERIFY(stream.writeBytes(mebibyte, bytes.constData()));
-    QVERIFY(!stream.readBytes(mebibyte, block.data()));
+    QVERIFY(stream.writeBytes(size, bytes.constData()));
+    QVERIFY(!stream.readBytes(size, block.data()));
     QVERIFY(stream.restartAtBegining());
-    QVERIFY(stream.readBytes(mebibyte, block.data()));
+    QVERIFY(stream.readBytes(size, block.data()));
     QVERIFY(block == bytes);
 }
 
@@ -287,18 +288,17 @@ void TestBufferedIO::mixedUse()
     QByteArray block;
     QByteArray expected;
     for (int i = 0; i < 300; ++i) {
-        constexpr int sizes[] = {1, 100, 70'000, 300'000, mebibyte, 9 * mebibyte, 17 * mebibyte};
+        constexpr int sizes[] = {1, 100, 70'000, 300'000, 1'000'000, 9'000'000, 17'000'000};
         const int size =
             1 + static_cast<int>(random() % static_cast<unsigned>(sizes[random() % 7]));
-        const QByteArray piece =
-            source.mid(static_cast<qsizetype>(random() % (40 * mebibyte)), size);
+        const QByteArray piece = source.mid(static_cast<qsizetype>(random() % 40'000'000), size);
         switch (random() % 8) {
         case 0:
             QVERIFY(stream.restartAtBegining());
             plain.restart(-1);
             break;
         case 1: {
-            const auto position = static_cast<qint64>(random() % (20 * mebibyte));
+            const auto position = static_cast<qint64>(random() % 20'000'000);
             QVERIFY(stream.restartAtPosition(position));
             plain.restart(position);
             break;

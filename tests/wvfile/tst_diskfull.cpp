@@ -23,7 +23,7 @@
 
 namespace {
 
-constexpr int mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 
 bool writeText(const char *path, const QByteArray &text)
 {
@@ -121,14 +121,14 @@ void TestDiskFull::cleanupTestCase()
 
 void TestDiskFull::writingAFile_data()
 {
-    QTest::addColumn<int>("freeBytes");
-    QTest::newRow("not a page left") << 0;
+    QTest::addColumn<qint64>("freeBytes");
+    QTest::newRow("not a page left") << qint64(0);
     QTest::newRow("some samples fit") << mebibyte;
 }
 
 void TestDiskFull::writingAFile()
 {
-    QFETCH(int, freeBytes);
+    QFETCH(qint64, freeBytes);
     QFile filler(m_disk + "/filler");
     QVERIFY(filler.open(QIODevice::WriteOnly | QIODevice::Unbuffered));
     const QByteArray zeros(m_freeAtStart - freeBytes, '\0');
@@ -136,7 +136,7 @@ void TestDiskFull::writingAFile()
     filler.close();
     WvWriteJob job;
     job.clock = 1;
-    job.samples = mebibyte;
+    job.samples = 1000 * 1000;
     job.iSamples = job.qSamples = QList<float>(job.samples, 0.5F);
     job.markers = QList<int>(job.samples, 1);
     const QString path = m_disk + "/out.wv";

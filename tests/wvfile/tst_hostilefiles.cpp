@@ -20,10 +20,10 @@
 
 namespace {
 
-constexpr int mebibyte = 1024 * 1024;
+constexpr qint64 mebibyte = 1'048'576;
 const QByteArray tgx = "{TYPE:TGX-WV}";
 
-QByteArray repeated(const QByteArray &text, int count)
+QByteArray repeated(const QByteArray &text, qsizetype count)
 {
     return QByteArray(text).repeated(count);
 }

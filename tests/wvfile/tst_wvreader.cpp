@@ -304,7 +304,7 @@ void TestWvReader::blocksJoinSeamlessly()
     QCOMPARE(values.size(), words.size());
     double sum = 0;
     double peak = 0;
-    for (int i = 0; i < samples; ++i) {
+    for (qsizetype i = 0; i < samples; ++i) {
         const double inPhase = (static_cast<float>(words.at(2 * i)) - 0.5F) / 32767.0F;
         const double quadrature = (static_cast<float>(words.at(2 * i + 1)) - 0.5F) / 32767.0F;
         if (static_cast<double>(values.at(2 * i)) != inPhase ||
@@ -476,6 +476,8 @@ void TestWvReader::debugWords()
     ReadRun run(tgx + "{MARKER LIST 1: 0:0;2:1}{MARKER LIST 2: 0:1}{FREE:}" + silentBlock(4));
     run.read(Tracer::DebugMask);
     QVERIFY(run.ok);
+    const QString cut = "2|The list of marker 2 ends high, but the marker falls at position 3, "
+                        "where the other lists end.";
     QCOMPARE(run.log,
              QStringList({"16|Processing tag 'TYPE' ...", tgxLine,
                           "16|Processing tag 'MARKER LIST 1' ...",
@@ -483,9 +485,7 @@ void TestWvReader::debugWords()
                           "16|Processing tag 'MARKER LIST 2' ...",
                           "16|Marker section finished with value 0x2 at pos. 1",
                           "16|Completing marker trace up to pos. 3", "16|Processing tag 'FREE' ...",
-                          noSamples, disagree, takesBlock, noControl(4), finalizing(4, 1),
-                          "2|The list of marker 2 ends high, but the marker falls at position 3, "
-                          "where the other lists end.",
+                          noSamples, disagree, takesBlock, noControl(4), finalizing(4, 1), cut,
                           "1|Reading 4 samples @ 16 bit from waveform..."}));
     QCOMPARE(run.markers(), QByteArray("\x02\x02\x03\x01", 4));
 }

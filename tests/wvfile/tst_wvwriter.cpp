@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvTestFile.h"
+#include "WvWriteRun.h"
 
-#include <QDateTime>
 #include <QFileInfo>
-#include <QRegularExpression>
 #include <QSignalSpy>
 #include <QTest>
 
@@ -26,60 +25,6 @@ WvWriteJob smallJob()
     job.qSamples = {-1.0F, 1.5F};
     return job;
 }
-
-/// One write to a file in a folder of its own.
-class WriteRun
-{
-public:
-    QStringList log;
-    QByteArray bytes; ///< with "#DATE#" where the tag DATE stands
-    QString path;
-
-    bool write(WvWriteJob &job, BufferedIO *data = nullptr, BufferedIO *markers = nullptr,
-               BufferedIO *tags = nullptr)
-    {
-        path = m_folder.filePath("out.wv");
-        CapturedLog captured;
-        const QDateTime before = QDateTime::currentDateTime().addSecs(-1);
-        HvFileIO io;
-        const bool ok = io.writeWaveform(job, path, data, markers, tags);
-        log = captured.take();
-        QFile file(path);
-        bytes = file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray("no file");
-        static const QRegularExpression date(
-            "\\{DATE:(\\d{4}-\\d\\d-\\d\\d;\\d\\d:\\d\\d:\\d\\d)\\}");
-        const auto match = date.match(QString::fromLatin1(bytes));
-        if (match.hasMatch()) {
-            const auto written = QDateTime::fromString(match.captured(1), "yyyy-MM-dd;HH:mm:ss");
-            if (written >= before && written <= QDateTime::currentDateTime()) {
-                bytes.replace(match.captured(0).toLatin1(), "#DATE#");
-            }
-        }
-        return ok;
-    }
-
-private:
-    QTemporaryDir m_folder;
-};
-
-/// A stream in memory with some content.
-class Filled
-{
-public:
-    explicit Filled(const QByteArray &content)
-    {
-        m_device.bytes = content;
-        m_ready = m_stream.initBuf(&m_device, BufferedIO::ReadWrite);
-    }
-
-    BufferedIO *stream() { return m_ready ? &m_stream : nullptr; }
-    TestDevice &device() { return m_device; }
-
-private:
-    TestDevice m_device;
-    BufferedIO m_stream;
-    bool m_ready = false;
-};
 
 QByteArray dataBytes(const QList<float> &values)
 {
@@ -489,7 +434,7 @@ void TestWvWriter::cancelLeavesACutFile()
             return TestDevice::readData(data, length);
         }
     };
-    constexpr int samples = 3'000'000;
+    constexpr qsizetype samples = 3'000'000;
     SlowDevice device;
     device.bytes = dataBytes(QList<float>(2 * samples, 0.25F));
     BufferedIO data;
