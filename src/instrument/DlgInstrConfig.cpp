@@ -138,7 +138,7 @@ void DlgInstrConfig::instr_refresh()
     }
     rebuildTree();
     say({});
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::rebuildTree()
@@ -223,7 +223,7 @@ void DlgInstrConfig::instr_add_manual()
     say(QString(isNew ? "The instrument '%1' was added." : "The instrument '%1' was already added.")
             .arg(instrumentName(device.model(), device.serial())));
     m_ui->le_manual->selectAll();
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_scan_gpib()
@@ -266,7 +266,7 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
     say(added == 0   ? QString("The scan found no new instrument.")
         : added == 1 ? QString("The scan found 1 new instrument.")
                      : QString("The scan found %1 new instruments.").arg(added));
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_clearlist()
@@ -278,7 +278,7 @@ void DlgInstrConfig::instr_clearlist()
     m_ui->tw_instruments->clear();
     updateView();
     say({});
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_removedevice()
@@ -303,7 +303,7 @@ void DlgInstrConfig::instr_itemChanged(QTreeWidgetItem *item, int column)
     }
     const bool isChecked = item->checkState(DeviceColumn) == Qt::Checked;
     if (m_list.setEnabled(m_list.indexOf(itemResource(*item)), isChecked)) {
-        emit instrumentsChanged();
+        emit updateInstruments();
     }
 }
 
@@ -324,7 +324,7 @@ void DlgInstrConfig::widgetItemDoubleClicked(QTreeWidgetItem *item, int /*column
     if (QTreeWidgetItem *present = itemOf(resource)) {
         present->setText(CommentColumn, comment);
     }
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 bool DlgInstrConfig::addOnline(const InstrumentSummary &summary, const QString &origin)

@@ -64,7 +64,7 @@ public slots:
 
 signals:
     /// The list has changed, or what is known of its instruments.
-    void instrumentsChanged();
+    void updateInstruments();
 
 private:
     void addActions();

@@ -132,7 +132,7 @@ void TestDlgInstrConfig::init()
     QFile::remove(iniFile());
 
     m_dialog = std::make_unique<DlgInstrConfig>();
-    m_changes = std::make_unique<QSignalSpy>(m_dialog.get(), &DlgInstrConfig::instrumentsChanged);
+    m_changes = std::make_unique<QSignalSpy>(m_dialog.get(), &DlgInstrConfig::updateInstruments);
     m_dialog->show();
     m_dialog->activateWindow();
     QVERIFY(QTest::qWaitForWindowActive(m_dialog.get()));
@@ -581,7 +581,7 @@ void TestDlgInstrConfig::settings()
     other.readSettings(none);
     QCOMPARE(other.size(), QSize(520, 580));
     QCOMPARE(other.pos(), QPoint(200, 200));
-    const QSignalSpy changes(&other, &DlgInstrConfig::instrumentsChanged);
+    const QSignalSpy changes(&other, &DlgInstrConfig::updateInstruments);
     other.readSettings(settings);
     QCOMPARE(changes.size(), 1);
     QVERIFY(settings.group().isEmpty());
@@ -596,7 +596,7 @@ void TestDlgInstrConfig::withoutVisa()
     const FakeInstrument fake;
     VisaDevice first(true); // as the main window's, before the list is read
     m_dialog = std::make_unique<DlgInstrConfig>(true);
-    m_changes = std::make_unique<QSignalSpy>(m_dialog.get(), &DlgInstrConfig::instrumentsChanged);
+    m_changes = std::make_unique<QSignalSpy>(m_dialog.get(), &DlgInstrConfig::updateInstruments);
     m_dialog->show();
     fill({entry("TGX-870", "100001", "TCPIP::127.0.0.2::INSTR"),
           entry("TGX-810", "200002", otherGenerator)});
