@@ -78,13 +78,13 @@ MainWindow::MainWindow()
         pane.tree->setPeer(otherPane(pane).tree);
     }
     const QStringList arguments = QCoreApplication::arguments();
-    const bool noVisa = arguments.contains("--no-visa");
-    m_instrConfig = std::make_unique<DlgInstrConfig>(noVisa, this);
+    m_noVisa = arguments.contains("--no-visa");
+    m_instrConfig = std::make_unique<DlgInstrConfig>(m_noVisa, this);
 
     Tracer::setMask(arguments.contains("--debug") ? Tracer::DebugMask : Tracer::DefaultMask);
     connect(&m_tracer, &Tracer::TraceDataAvailable, this, &MainWindow::TraceDataAvailable);
 
-    createDevices(noVisa);
+    createDevices();
     for (Pane &pane : m_panes) {
         pane.filter->addItems({"*.*", "*.wv"});
         connectPane(pane);
@@ -128,12 +128,12 @@ MainWindow::~MainWindow()
     }
 }
 
-void MainWindow::createDevices(bool noVisa)
+void MainWindow::createDevices()
 {
     QString failures;
     bool failed = false;
     for (std::size_t i = 0; i < m_panes.size(); ++i) {
-        auto device = std::make_unique<VisaDevice>(noVisa);
+        auto device = std::make_unique<VisaDevice>(m_noVisa);
         device->setQuestion([this](const QString &title, const QString &text) {
             return askYesNo(this, title, text);
         });
@@ -278,6 +278,11 @@ void MainWindow::selectDevice(Pane &pane)
         pane.device->setCurrentIndex(0);
     }
     pane.tree->clearSelection();
+    {
+        // Paths of another device lead nowhere.
+        const QSignalBlocker blocker(pane.history);
+        pane.history->clear();
+    }
     if (pane.device->currentData().toString().isEmpty()) {
         showLocal(pane);
     } else {
@@ -335,7 +340,8 @@ QString MainWindow::defaultFolder(const Pane &pane) const
 void MainWindow::instrListUpdated()
 {
     Tracer::Trace(Tracer::Information, "Instruments updated");
-    const QList<InstrConfigEntry> instruments = m_instrConfig->instruments();
+    const QList<InstrConfigEntry> instruments =
+        m_noVisa ? QList<InstrConfigEntry>() : m_instrConfig->instruments();
     for (Pane &pane : m_panes) {
         const QString resource = pane.device->currentData().toString();
         int index = 0;

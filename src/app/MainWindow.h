@@ -84,7 +84,7 @@ private:
 
     void buildMenus();
     void connectPane(Pane &pane);
-    void createDevices(bool noVisa);
+    void createDevices();
     void selectDevice(Pane &pane);
     void showLocal(Pane &pane);
     void showInstrument(Pane &pane);
@@ -109,4 +109,5 @@ private:
     QString m_locPath;
     qint64 m_firstPaintMs = -1;
     bool m_paintSeen = false;
+    bool m_noVisa = false;
 };
