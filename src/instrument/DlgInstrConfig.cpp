@@ -79,8 +79,9 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     connect(tree, &QTreeWidget::itemChanged, this, &DlgInstrConfig::instr_itemChanged);
     connect(tree, &QTreeWidget::itemDoubleClicked, this, &DlgInstrConfig::widgetItemDoubleClicked);
     connect(tree, &QTreeWidget::currentItemChanged, this, &DlgInstrConfig::updateView);
-    connect(tree, &QTreeWidget::itemExpanded, this, &DlgInstrConfig::updateView);
+    connect(tree, &QTreeWidget::itemExpanded, this, &DlgInstrConfig::fitColumns);
     addActions();
+    fitColumns();
     updateView();
 }
 
@@ -101,8 +102,15 @@ void DlgInstrConfig::addActions()
     connect(add("&Comment...", {Qt::Key_F2, Qt::Key_Return, Qt::Key_Enter}), &QAction::triggered,
             this,
             [this, tree] { widgetItemDoubleClicked(topItem(tree->currentItem()), CommentColumn); });
+    // The view's own key works in the first column alone.
+    connect(add("&Enable or Disable", {Qt::Key_Space}), &QAction::triggered, this, [tree] {
+        if (QTreeWidgetItem *item = topItem(tree->currentItem())) {
+            const bool isChecked = item->checkState(DeviceColumn) == Qt::Checked;
+            item->setCheckState(DeviceColumn, isChecked ? Qt::Unchecked : Qt::Checked);
+        }
+    });
     QAction *remove = add("&Delete", {QKeySequence::Delete});
-    remove->setIcon(m_ui->pb_delete->icon());
+    remove->setIcon(QIcon(":/icons16/delete.png"));
     connect(remove, &QAction::triggered, this, &DlgInstrConfig::instr_removedevice);
 }
 
@@ -186,6 +194,7 @@ void DlgInstrConfig::rebuildTree()
         }
     }
     tree->setCurrentItem(itemOf(current));
+    fitColumns();
     updateView();
 }
 
@@ -216,7 +225,7 @@ void DlgInstrConfig::instr_add_manual()
     if (!isOpen) {
         const QString reason = QString("The device '%1' was not added.").arg(resource);
         Tracer::Trace(Tracer::Error, reason);
-        say(reason + " The log tells why.");
+        say(reason + " See the log.");
         return;
     }
     const bool isNew = addOnline(summaryOf(device), "Manually Added");
@@ -260,7 +269,7 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
     const bool isChanged = !found.isEmpty();
     qDeleteAll(found);
     if (!done && !isChanged) {
-        say("The scan found nothing. The log tells why.");
+        say("The scan found nothing. See the log.");
         return;
     }
     say(added == 0   ? QString("The scan found no new instrument.")
@@ -336,6 +345,7 @@ bool DlgInstrConfig::addOnline(const InstrumentSummary &summary, const QString &
     showOnline(m_list.entries().at(index), summary);
     QTreeWidget *tree = m_ui->tw_instruments;
     tree->setCurrentItem(itemOf(summary.resource));
+    fitColumns();
     updateView();
     return true;
 }
@@ -411,8 +421,16 @@ void DlgInstrConfig::updateView()
         action->setEnabled(hasCurrent);
     }
     m_ui->pb_clear->setEnabled(!m_list.entries().isEmpty());
-    tree->resizeColumnToContents(DeviceColumn);
-    tree->resizeColumnToContents(ValueColumn);
+}
+
+void DlgInstrConfig::fitColumns()
+{
+    constexpr int Gap = 12;
+    QTreeWidget *tree = m_ui->tw_instruments;
+    for (const int column : {DeviceColumn, ValueColumn}) {
+        tree->resizeColumnToContents(column);
+        tree->setColumnWidth(column, tree->columnWidth(column) + Gap);
+    }
 }
 
 /// Tells the outcome of the last action, which has its full words in the log.
