@@ -438,23 +438,33 @@ void TestCliUsage::interruptCancels_data()
 {
     QTest::addColumn<QString>("arguments");
     QTest::addColumn<QString>("sign"); // printed when the long step runs
+    QTest::addColumn<qint64>("bytes"); // of samples
+    // Sparse files, so long that a step lasts for seconds; saving needs room for the samples.
+    constexpr qint64 huge = 2'000'000'000;
+    constexpr qint64 large = 400'000'000;
     QTest::newRow("import") << "import wav long.wav -o out.wv"
-                            << "Reading WAV-file data";
+                            << "Reading WAV-file data" << huge;
     QTest::newRow("level") << "--verbose level long.wv -o out.wv"
-                           << "samples @ 16 bit";
+                           << "samples @ 16 bit" << huge;
+    QTest::newRow("measure") << "--verbose measure long.wv"
+                             << "samples @ 16 bit" << huge;
+    QTest::newRow("level, saving over the source")
+        << "--verbose level long.wv -o long.wv --force --peak 0 --pkrms 0"
+        << "Creating waveform file" << large;
 }
 
 void TestCliUsage::interruptCancels()
 {
     QFETCH(QString, arguments);
     QFETCH(QString, sign);
-    // Sparse files of 2 GB, so that a step lasts for seconds.
-    constexpr qint64 bytes = 2'000'000'000;
+    QFETCH(qint64, bytes);
+    const QByteArray head =
+        "{TYPE: TGX-WV,0}{CLOCK:1e6}{WAVEFORM-" + QByteArray::number(bytes + 1) + ": #";
     QVERIFY(store(path("long.wav"), wavFile(formatChunk() + chunk("data", {}, bytes))));
-    QVERIFY(store(path("long.wv"),
-                  "{TYPE: TGX-WV,0}{CLOCK:1e6}{WAVEFORM-" + QByteArray::number(bytes + 1) + ": #"));
+    QVERIFY(store(path("long.wv"), head));
     QVERIFY(QFile::resize(path("long.wav"), bytes + 44));
     QVERIFY(QFile::resize(path("long.wv"), bytes + 1000));
+    const QStringList files = QDir(m_folder.path()).entryList(QDir::Files);
 
     QProcess process;
     process.setWorkingDirectory(m_folder.path());
@@ -469,7 +479,10 @@ void TestCliUsage::interruptCancels()
     QCOMPARE(process.exitCode(), 130);
     QVERIFY2(read().contains("Action aborted by user."), errors);
     QVERIFY(process.readAllStandardOutput().isEmpty());
-    QVERIFY(!QFile::exists(path("out.wv")));
+    QCOMPARE(QDir(m_folder.path()).entryList(QDir::Files), files);
+    QFile source(path("long.wv"));
+    QCOMPARE(source.size(), bytes + 1000);
+    QVERIFY(source.open(QIODevice::ReadOnly) && source.read(head.size()) == head);
     QVERIFY(QDir(m_temporary.path()).isEmpty());
 }
 
