@@ -145,8 +145,6 @@ void addPlotCommand(CommandSet &commands)
     addChoice(command, "--view", plot->view, plotViewNames(), "What to show (default: iq)");
     addSize(command, plot->size);
     command.add_flag("--markers", plot->markers, "Show the marker rows, in the views over time");
-    addText(command, "-o,--output", plot->output, "Picture to write, PNG")
-        ->type_name("FILE")
-        ->required();
+    addOutputFile(command, plot->output, "Picture to write, PNG")->required();
     command.add_flag("--force", plot->force, "Overwrite an existing file");
 }

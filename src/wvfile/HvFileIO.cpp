@@ -8,6 +8,7 @@
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
+#include "base/vectorstate.h"
 #include "log/Tracer.h"
 
 #include <QCoreApplication>
@@ -80,6 +81,7 @@ bool HvFileIO::readWaveform(WvFileInfo *info)
     }
     emit ProgressUpdate(100);
     QCoreApplication::processEvents();
+    clearVectorState();
     if (!info->dataStream->restartAtBegining() || !info->markerStream->restartAtBegining()) {
         return Tracer::fail("Writing to temporary data storage failed.");
     }
