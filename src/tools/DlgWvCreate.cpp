@@ -264,7 +264,7 @@ bool DlgWvCreate::preview()
     m_ui->le_samples->setVal(facts.samples);
     m_ui->le_arbclock->setVal(facts.clockHz);
     m_ui->le_peak->setVal(facts.peak);
-    m_ui->le_crf->setVal(20 * std::log10(facts.peak / facts.rms));
+    m_ui->le_crf->setVal(facts.rms > 0 ? 20 * std::log10(facts.peak / facts.rms) : 0.0);
     m_ui->le_clockrate->setVal(facts.clockHz);
     return true;
 }
