@@ -8,7 +8,7 @@ cd "$(dirname "$0")"
 # One line a size: the sizes in pixels and the names of the drawings that exist at that size.
 names16="about bulb cancel debug delete device_busy device_offline device_online drive exit file_ascii
          file_binary file_settings file_waveform fileclose folder
-         folder_new home next prev redflag refresh rename yellowled"
+         folder_new home next prev redflag refresh rename run yellowled"
 names22="attach refresh"
 names32="cancel drive file_ascii file_binary file_settings file_waveform folder"
 

@@ -95,10 +95,7 @@ QtProgressDialog::QtProgressDialog(const QString &labelText, QWidget *parent,
     m_sinceStart.start();
     m_sinceStep.start();
     m_sinceTick.start();
-
-    m_blocking = true;
-    qApp->installEventFilter(this);
-    QApplication::setOverrideCursor(Qt::BusyCursor);
+    startBlocking();
 }
 
 QtProgressDialog::~QtProgressDialog()
@@ -145,6 +142,16 @@ void QtProgressDialog::startStep(const QString &labelText)
     showTimes();
 }
 
+void QtProgressDialog::setBytes(qint64 done, qint64 total)
+{
+    m_bytesTotal = total;
+    if (!m_sinceBytes.isValid()) {
+        m_sinceBytes.start();
+        m_bytesAtStart = done;
+    }
+    m_bytesDone = done;
+}
+
 void QtProgressDialog::reject()
 {
     if (m_canceled) {
@@ -181,6 +188,32 @@ void QtProgressDialog::appear()
     show();
 }
 
+void QtProgressDialog::suspend()
+{
+    m_delay.stop();
+    m_clock.stop();
+    stopBlocking();
+    hide();
+}
+
+void QtProgressDialog::resume()
+{
+    startBlocking();
+    m_sinceStart.start();
+    m_sinceStep.start();
+    m_sinceBytes.invalidate();
+    m_delay.start(DelayMs);
+}
+
+void QtProgressDialog::startBlocking()
+{
+    if (!m_blocking) {
+        m_blocking = true;
+        qApp->installEventFilter(this);
+        QApplication::setOverrideCursor(Qt::BusyCursor);
+    }
+}
+
 void QtProgressDialog::stopBlocking()
 {
     if (m_blocking) {
@@ -196,9 +229,33 @@ void QtProgressDialog::showTimes()
         return;
     }
     QString text = QString("Elapsed %1").arg(minutesAndSeconds(m_sinceStart.elapsed()));
+    if (m_bytesTotal > 0 && m_sinceBytes.isValid()) {
+        m_times->setText(text + transferText());
+        return;
+    }
     const qint64 step = m_sinceStep.elapsed();
     if (value() >= EstimateFromPercent && value() < 100 && step >= EstimateAfterMs) {
         text += QString(", about %1 left").arg(minutesAndSeconds(step * (100 - value()) / value()));
     }
     m_times->setText(text);
+}
+
+QString QtProgressDialog::transferText() const
+{
+    constexpr double megabyte = 1024.0 * 1024.0;
+    const auto megabytes = [](double bytes) { return QString::number(bytes / megabyte, 'f', 1); };
+    const auto done = static_cast<double>(m_bytesDone);
+    const auto total = static_cast<double>(m_bytesTotal);
+    QString text = QString(", %1 of %2 MB").arg(megabytes(done), megabytes(total));
+    const auto elapsed = static_cast<double>(m_sinceBytes.elapsed());
+    const double moved = done - static_cast<double>(m_bytesAtStart);
+    if (moved <= 0 || elapsed <= 0) {
+        return text;
+    }
+    text += QString(" at %1 MB/s").arg(megabytes(1000.0 * moved / elapsed));
+    if (m_sinceBytes.elapsed() >= EstimateAfterMs) {
+        text += QString(", about %1 left")
+                    .arg(minutesAndSeconds(static_cast<qint64>((total - done) * elapsed / moved)));
+    }
+    return text;
 }

@@ -43,6 +43,14 @@ public slots:
     /// A new step of the same job: its label, with progress and times starting over.
     void startStep(const QString &labelText);
 
+    /// How far a transfer is, in bytes; its rate and the remaining time are shown from the second
+    /// call on.
+    void setBytes(qint64 done, qint64 total);
+
+    /// Makes way for a question: gives the input free and hides until resume().
+    void suspend();
+    void resume();
+
     /// Does what the cancel button does.
     void reject() override;
 
@@ -55,8 +63,10 @@ protected:
 
 private:
     void appear();
+    void startBlocking();
     void stopBlocking();
     void showTimes();
+    [[nodiscard]] QString transferText() const;
 
     QLabel *m_label = nullptr;
     QLabel *m_times = nullptr;
@@ -67,6 +77,10 @@ private:
     QElapsedTimer m_sinceStart;
     QElapsedTimer m_sinceStep;
     QElapsedTimer m_sinceTick;
+    QElapsedTimer m_sinceBytes;
+    qint64 m_bytesAtStart = 0; ///< of the measurement of the rate
+    qint64 m_bytesDone = 0;
+    qint64 m_bytesTotal = 0; ///< 0 when no bytes are counted
     bool m_canceled = false;
     bool m_blocking = false;
     bool m_inTick = false;
