@@ -174,11 +174,10 @@ void DlgInstrConfig::rebuildTree()
                                       .arg(instrumentName(entry.model, entry.serial)));
             progress.setValue(static_cast<int>(100 * i / entries.size()));
             // Those behind a cancel are shown as well, without being asked.
-            if (!entry.enabled || progress.wasCanceled()) {
-                showOffline(entry, false);
-            } else if (device.isOpenElsewhere(entry.model, entry.serial)) {
+            const bool isAsked = entry.enabled && !progress.wasCanceled();
+            if (isAsked && device.isOpenElsewhere(entry.model, entry.serial)) {
                 showOffline(entry, true);
-            } else if (device.openResource(entry.resource)) {
+            } else if (isAsked && device.openResource(entry.resource)) {
                 device.closeResource();
                 const InstrumentSummary summary = summaryOf(device);
                 m_list.identify(i, entryOf(summary, {}));
