@@ -143,7 +143,12 @@ bool ScreenshotRun::saveInstruments()
 {
     auto *dialog = m_window.findChild<QDialog *>("DlgInstrConfig");
     m_window.findChild<QToolButton *>("tb_instruments_1")->click();
-    dialog->findChild<QTreeWidget *>()->expandAll();
+    // One by one, so that the columns follow; they are laid out in the event loop.
+    const auto *tree = dialog->findChild<QTreeWidget *>();
+    for (int row = 0; row < tree->topLevelItemCount(); ++row) {
+        tree->topLevelItem(row)->setExpanded(true);
+    }
+    QCoreApplication::processEvents();
     bool done = save(*dialog, "instruments.png");
     dialog->close();
 
