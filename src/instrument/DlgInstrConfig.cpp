@@ -64,6 +64,7 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     m_hint->setForegroundRole(QPalette::PlaceholderText);
     m_hint->setAttribute(Qt::WA_TransparentForMouseEvents);
     (new QVBoxLayout(m_ui->tw_instruments->viewport()))->addWidget(m_hint);
+    m_ui->tw_instruments->setHeaderLabels({"Device", QString(), "Comment"});
     QHeaderView *header = m_ui->tw_instruments->header();
     header->setStretchLastSection(true);
     header->setSectionsMovable(false);
@@ -175,15 +176,14 @@ void DlgInstrConfig::rebuildTree()
             progress.setValue(static_cast<int>(100 * i / entries.size()));
             // Those behind a cancel are shown as well, without being asked.
             const bool isAsked = entry.enabled && !progress.wasCanceled();
-            if (isAsked && device.isOpenElsewhere(entry.model, entry.serial)) {
-                showOffline(entry, true);
-            } else if (isAsked && device.openResource(entry.resource)) {
+            const bool isBusy = isAsked && device.isOpenElsewhere(entry.model, entry.serial);
+            if (isAsked && !isBusy && device.openResource(entry.resource)) {
                 device.closeResource();
                 const InstrumentSummary summary = summaryOf(device);
                 m_list.identify(i, entryOf(summary, {}));
                 showOnline(entry, summary);
             } else {
-                showOffline(entry, false);
+                showOffline(entry, isBusy);
             }
         }
     }

@@ -23,8 +23,9 @@ InstrConfigEntry entry(const QString &model, const QString &serial, const QStrin
 QString stateOf(const QTreeWidgetItem *item)
 {
     const QImage shown = item->icon(0).pixmap(16, 16).toImage();
-    for (const QString state : {"online", "busy", "offline"}) {
-        if (shown == QIcon(":/icons16/device_" + state + ".png").pixmap(16, 16).toImage()) {
+    for (const char *state : {"online", "busy", "offline"}) {
+        if (shown ==
+            QIcon(QString(":/icons16/device_%1.png").arg(state)).pixmap(16, 16).toImage()) {
             return state;
         }
     }

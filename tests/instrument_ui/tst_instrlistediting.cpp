@@ -241,6 +241,9 @@ void TestInstrListEditing::showsEverything()
     for (int row = 0; row < 3; ++row) {
         item(row)->setExpanded(true);
     }
+    QCOMPARE(tree()->headerItem()->text(0) + '|' + tree()->headerItem()->text(1) + '|' +
+                 tree()->headerItem()->text(2),
+             "Device||Comment");
     const QFontMetrics metrics(tree()->font());
     for (int row = 0; row < 3; ++row) {
         for (const QString &texts : childRows(row)) {
