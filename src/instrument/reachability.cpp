@@ -3,31 +3,50 @@
 
 #include "log/Tracer.h"
 
+#include <QAbstractEventDispatcher>
+#include <QCoreApplication>
+#include <QDeadlineTimer>
+#include <QEventLoop>
 #include <QHostAddress>
 #include <QHostInfo>
 #include <QNetworkProxy>
 #include <QTcpSocket>
+#include <QTimer>
+
+#include <array>
 
 namespace {
 
 constexpr int connectTimeoutMs = 5000;
 
-bool isPortOpen(const QHostAddress &address, quint16 port)
+/// Whether the socket gets connected in time. Windows are painted meanwhile; what the user does
+/// waits, so that nothing is started on a device that is being opened.
+bool waitForConnection(QTcpSocket &socket, const QDeadlineTimer &deadline)
 {
-    QTcpSocket socket;
-    // The test is about this very machine, which no proxy may stand for.
-    socket.setProxy(QNetworkProxy::NoProxy);
-    socket.connectToHost(address, port, QIODevice::ReadWrite);
-    const bool connected = socket.waitForConnected(connectTimeoutMs);
-    socket.abort();
-    if (connected) {
+    if (QAbstractEventDispatcher::instance() == nullptr) {
+        return socket.waitForConnected(static_cast<int>(deadline.remainingTime()));
+    }
+    // Wakes the wait below when nothing else happens.
+    QTimer wake;
+    wake.setSingleShot(true);
+    wake.start(static_cast<int>(deadline.remainingTime()));
+    while (socket.state() != QAbstractSocket::ConnectedState &&
+           socket.state() != QAbstractSocket::UnconnectedState && !deadline.hasExpired()) {
+        QCoreApplication::processEvents(QEventLoop::ExcludeUserInputEvents |
+                                        QEventLoop::WaitForMoreEvents);
+    }
+    return socket.state() == QAbstractSocket::ConnectedState;
+}
+
+void report(quint16 port, bool isOpen)
+{
+    if (isOpen) {
         Tracer::Trace(Tracer::Information, QString("Port %1 is accessible.").arg(port));
     } else {
         Tracer::Trace(
             Tracer::Warning,
             QString("Port %1 is not accessible. Check your firewall settings.").arg(port));
     }
-    return connected;
 }
 
 } // namespace
@@ -45,7 +64,21 @@ bool isHostReachable(const QString &resource)
         }
         address = info.addresses().first();
     }
-    const bool hasPortMapper = isPortOpen(address, 111);
-    const bool hasPlainScpi = isPortOpen(address, 5025);
-    return hasPortMapper && hasPlainScpi;
+    // Both at once: a host that is switched off costs the time of one.
+    constexpr std::array<quint16, 2> ports{111, 5025};
+    std::array<QTcpSocket, ports.size()> sockets;
+    for (std::size_t i = 0; i < ports.size(); ++i) {
+        // The test is about this very machine, which no proxy may stand for.
+        sockets.at(i).setProxy(QNetworkProxy::NoProxy);
+        sockets.at(i).connectToHost(address, ports.at(i), QIODevice::ReadWrite);
+    }
+    const QDeadlineTimer deadline(connectTimeoutMs);
+    bool areOpen = true;
+    for (std::size_t i = 0; i < ports.size(); ++i) {
+        const bool isOpen = waitForConnection(sockets.at(i), deadline);
+        report(ports.at(i), isOpen);
+        areOpen = areOpen && isOpen;
+        sockets.at(i).abort();
+    }
+    return areOpen;
 }
