@@ -73,7 +73,7 @@ constexpr std::array<ModelInfo, 28> Table{{
     analyzer("PAX-660", "PAX600-A1,PAX660-K1"),
     analyzer("PAX-640", "PAX600-D1,PAX640-K1"),
     analyzer("PAX-650", "PAX650-K1"),
-    {.name = "PAX-710", .roots = "D:|E:|F:", .analyzer = true, .defaultOptions = "PAX710-K1"},
+    {.name = "PAX-710", .roots = "D:|E:|F:", .defaultOptions = "PAX710-K1"},
 }};
 
 } // namespace

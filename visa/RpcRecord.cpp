@@ -51,7 +51,10 @@ std::size_t RpcRecordReader::feed(std::span<const std::uint8_t> bytes)
                 beginFragment();
         } else {
             const auto part = bytes.subspan(taken, std::min(bytes.size() - taken, m_fragmentLeft));
-            m_record.insert(m_record.end(), part.begin(), part.end());
+            if (m_isLastFragment && m_record.empty() && part.size() == m_fragmentLeft)
+                m_whole = part;
+            else
+                m_record.insert(m_record.end(), part.begin(), part.end());
             m_fragmentLeft -= part.size();
             taken += part.size();
         }
@@ -77,6 +80,7 @@ void RpcRecordReader::beginFragment()
 void RpcRecordReader::next()
 {
     m_record.clear();
+    m_whole = {};
     m_state = State::Incomplete;
 }
 

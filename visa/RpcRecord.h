@@ -11,7 +11,8 @@
 namespace visa {
 
 /// Puts the records of an RPC stream together from bytes as they come (record marking standard,
-/// RFC 5531 section 11). Memory grows with what arrived, never with what a header announces.
+/// RFC 5531 section 11). Memory grows with what arrived, never with what a header announces. A
+/// record that comes whole is not copied.
 class RpcRecordReader
 {
 public:
@@ -24,11 +25,15 @@ public:
     /// `limit` is the size in bytes of the longest record that is taken.
     explicit RpcRecordReader(std::size_t limit);
 
-    /// Takes bytes up to the end of a record and returns how many it took.
+    /// Takes bytes up to the end of a record and returns how many it took. They have to stay where
+    /// they are until next().
     [[nodiscard]] std::size_t feed(std::span<const std::uint8_t> bytes);
 
     [[nodiscard]] State state() const { return m_state; }
-    [[nodiscard]] std::span<const std::uint8_t> record() const { return m_record; }
+    [[nodiscard]] std::span<const std::uint8_t> record() const
+    {
+        return m_whole.empty() ? std::span<const std::uint8_t>(m_record) : m_whole;
+    }
 
     /// Drops the complete record and makes ready for the next.
     void next();
@@ -46,6 +51,7 @@ private:
     std::size_t m_fragmentLeft = 0; // bytes still to come of the current fragment
     bool m_isLastFragment = false;
     std::vector<std::uint8_t> m_record;
+    std::span<const std::uint8_t> m_whole; // the record, where it came in one piece
 };
 
 enum class RpcReplyKind {

@@ -7,7 +7,6 @@
 #include <vxi11.h>
 
 #include <algorithm>
-#include <cstring>
 
 namespace visa {
 
@@ -52,6 +51,26 @@ ViStatus statusOf(Device_ErrorCode error)
     default:
         return VI_ERROR_IO;
     }
+}
+
+/// Device_ReadResp, with the data decoded straight into the reader's memory.
+struct ReadReply
+{
+    Device_ErrorCode error = DEVICE_ERROR_NONE;
+    int reason = 0;
+    std::span<std::uint8_t> target{};
+    unsigned size = 0; ///< beyond that of the target, nothing is stored
+};
+
+bool_t decodeReadReply(XDR *stream, ReadReply *reply)
+{
+    if (stream->x_op == XDR_FREE)
+        return TRUE;
+    if (!xdr_Device_ErrorCode(stream, &reply->error) || !xdr_int(stream, &reply->reason) ||
+        !xdr_u_int(stream, &reply->size))
+        return FALSE;
+    return reply->size > reply->target.size() ||
+           xdr_opaque(stream, reinterpret_cast<char *>(reply->target.data()), reply->size);
 }
 
 constexpr RpcProcedure coreProcedure(std::uint32_t number)
@@ -185,24 +204,21 @@ ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions 
     count = 0;
     int idleReplies = 0;
     for (;;) {
-        const std::size_t wanted = std::min(buffer.size() - count, LargestRead);
+        const auto target = buffer.subspan(count, std::min(buffer.size() - count, LargestRead));
         Device_ReadParms arguments{};
         arguments.lid = m_link;
-        arguments.requestSize = static_cast<unsigned>(wanted);
+        arguments.requestSize = static_cast<unsigned>(target.size());
         arguments.io_timeout = deadline.remainingMs();
         if (options.terminator) {
             arguments.flags = DEVICE_FLAG_TERMCHRSET;
             arguments.termChar = static_cast<char>(*options.terminator);
         }
-        XdrValue<Device_ReadResp> reply(xdr_Device_ReadResp);
-        const ViStatus status = callDevice<Device_ReadParms, Device_ReadResp>(
+        XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
+        const ViStatus status = callDevice<Device_ReadParms, ReadReply>(
             device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
-        const std::size_t size = reply->data.data_len;
-        if (size > wanted)
+        if (reply->size > target.size())
             return VI_ERROR_IO;
-        if (size > 0)
-            std::memcpy(buffer.data() + count, reply->data.data_val, size);
-        count += size;
+        count += reply->size;
         if (status != VI_SUCCESS)
             return status;
         if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd)
@@ -211,7 +227,7 @@ ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions 
             return VI_SUCCESS_TERM_CHAR;
         if (count == buffer.size())
             return VI_SUCCESS_MAX_CNT;
-        idleReplies = size == 0 ? idleReplies + 1 : 0;
+        idleReplies = reply->size == 0 ? idleReplies + 1 : 0;
         if (idleReplies > MostIdleReplies)
             return VI_ERROR_IO;
         if (deadline.isOver())

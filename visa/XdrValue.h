@@ -35,15 +35,18 @@ template <typename T>
 class XdrValue
 {
 public:
-    explicit XdrValue(XdrCode<T> *code)
+    /// `initial` is the value before decoding; what it points to stays the caller's.
+    explicit XdrValue(XdrCode<T> *code, const T &initial = {})
         : m_code(code)
+        , m_initial(initial)
+        , m_value(initial)
     {
     }
     ~XdrValue() { release(); }
     XdrValue(const XdrValue &) = delete;
     XdrValue &operator=(const XdrValue &) = delete;
 
-    /// On failure the value is that of T{}.
+    /// On failure the value is the initial one.
     [[nodiscard]] bool decode(std::span<const std::uint8_t> bytes)
     {
         release();
@@ -70,11 +73,12 @@ private:
         XDR stream{};
         stream.x_op = XDR_FREE;
         m_code(&stream, &m_value);
-        m_value = T{};
+        m_value = m_initial;
     }
 
     XdrCode<T> *m_code;
-    T m_value{};
+    T m_initial;
+    T m_value;
 };
 
 } // namespace visa

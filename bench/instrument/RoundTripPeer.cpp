@@ -3,6 +3,7 @@
 
 #include <netinet/in.h>
 #include <netinet/tcp.h>
+#include <sched.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -42,6 +43,14 @@ void sendAtOnce(int socket)
 
 } // namespace
 
+void runOnProcessor(Side side)
+{
+    cpu_set_t one;
+    CPU_ZERO(&one);
+    CPU_SET(side == Side::Instrument ? 1 : 0, &one);
+    sched_setaffinity(0, sizeof one, &one);
+}
+
 RoundTripPeer::RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes)
     : m_request(requestBytes)
     , m_reply(replyBytes)
@@ -80,6 +89,7 @@ RoundTripPeer::~RoundTripPeer()
 
 void RoundTripPeer::serve(int listener) const
 {
+    runOnProcessor(Side::Instrument);
     const int peer = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
     close(listener);
     sendAtOnce(peer);

@@ -5,6 +5,13 @@
 #include <thread>
 #include <vector>
 
+enum class Side { Controller, Instrument };
+
+/// Binds the calling thread, and what it starts from now on, to a processor of its side. The
+/// scheduler else puts both sides on one processor or on two as it likes, which changes a round
+/// trip many times over.
+void runOnProcessor(Side side);
+
 /// The least that a request and its reply over loopback can cost: a thread at the other end of a
 /// TCP connection takes a request of a fixed size and sends a reply of a fixed size, and neither
 /// side looks at a byte of them.

@@ -26,6 +26,7 @@ constexpr int maxRetries = 3;
 /// Digits of the byte count; one digit tells their number.
 constexpr quint32 maxDigits = 9;
 
+const char *const queryFailed = "Cannot query file from instrument.";
 const char *const localWriteFailed = "Writing data to local file failed.";
 
 void note(const QString &text)
@@ -73,13 +74,18 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
     note("Source   \t: " + remotePath);
     note("Destination \t: " + localPath);
     note(QString("R/W Timeout \t: %1 ms").arg(m_device.timeoutMs()));
+    // Before the local file is touched.
+    if (!m_device.isOpen()) {
+        Tracer::Trace(Tracer::Error, "Device is not open.");
+        return Tracer::fail(queryFailed);
+    }
     QFile file(localPath);
     if (!file.open(QIODevice::WriteOnly | QIODevice::Unbuffered)) {
         return Tracer::fail("Cannot open local file for writing.");
     }
     emit m_device.ProgressUpdate(0);
     if (!m_device.sendCommand(":MMEM:DATA? '" + remotePath + "'")) {
-        return fail("Cannot query file from instrument.");
+        return fail(queryFailed);
     }
     // The data may hold any byte.
     m_session.setAttribute(VI_ATTR_TERMCHAR_EN, VI_FALSE);

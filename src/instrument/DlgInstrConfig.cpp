@@ -64,6 +64,7 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     m_hint->setForegroundRole(QPalette::PlaceholderText);
     m_hint->setAttribute(Qt::WA_TransparentForMouseEvents);
     (new QVBoxLayout(m_ui->tw_instruments->viewport()))->addWidget(m_hint);
+    m_ui->tw_instruments->setHeaderLabels({"Device", QString(), "Comment"});
     QHeaderView *header = m_ui->tw_instruments->header();
     header->setStretchLastSection(true);
     header->setSectionsMovable(false);
@@ -79,8 +80,9 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     connect(tree, &QTreeWidget::itemChanged, this, &DlgInstrConfig::instr_itemChanged);
     connect(tree, &QTreeWidget::itemDoubleClicked, this, &DlgInstrConfig::widgetItemDoubleClicked);
     connect(tree, &QTreeWidget::currentItemChanged, this, &DlgInstrConfig::updateView);
-    connect(tree, &QTreeWidget::itemExpanded, this, &DlgInstrConfig::updateView);
+    connect(tree, &QTreeWidget::itemExpanded, this, &DlgInstrConfig::fitColumns);
     addActions();
+    fitColumns();
     updateView();
 }
 
@@ -101,8 +103,15 @@ void DlgInstrConfig::addActions()
     connect(add("&Comment...", {Qt::Key_F2, Qt::Key_Return, Qt::Key_Enter}), &QAction::triggered,
             this,
             [this, tree] { widgetItemDoubleClicked(topItem(tree->currentItem()), CommentColumn); });
+    // The view's own key works in the first column alone.
+    connect(add("&Enable or Disable", {Qt::Key_Space}), &QAction::triggered, this, [tree] {
+        if (QTreeWidgetItem *item = topItem(tree->currentItem())) {
+            const bool isChecked = item->checkState(DeviceColumn) == Qt::Checked;
+            item->setCheckState(DeviceColumn, isChecked ? Qt::Unchecked : Qt::Checked);
+        }
+    });
     QAction *remove = add("&Delete", {QKeySequence::Delete});
-    remove->setIcon(m_ui->pb_delete->icon());
+    remove->setIcon(QIcon(":/icons16/delete.png"));
     connect(remove, &QAction::triggered, this, &DlgInstrConfig::instr_removedevice);
 }
 
@@ -138,7 +147,7 @@ void DlgInstrConfig::instr_refresh()
     }
     rebuildTree();
     say({});
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::rebuildTree()
@@ -166,17 +175,15 @@ void DlgInstrConfig::rebuildTree()
                                       .arg(instrumentName(entry.model, entry.serial)));
             progress.setValue(static_cast<int>(100 * i / entries.size()));
             // Those behind a cancel are shown as well, without being asked.
-            if (!entry.enabled || progress.wasCanceled()) {
-                showOffline(entry, false);
-            } else if (device.isOpenElsewhere(entry.model, entry.serial)) {
-                showOffline(entry, true);
-            } else if (device.openResource(entry.resource)) {
+            const bool isAsked = entry.enabled && !progress.wasCanceled();
+            const bool isBusy = isAsked && device.isOpenElsewhere(entry.model, entry.serial);
+            if (isAsked && !isBusy && device.openResource(entry.resource)) {
                 device.closeResource();
                 const InstrumentSummary summary = summaryOf(device);
                 m_list.identify(i, entryOf(summary, {}));
                 showOnline(entry, summary);
             } else {
-                showOffline(entry, false);
+                showOffline(entry, isBusy);
             }
         }
     }
@@ -186,6 +193,7 @@ void DlgInstrConfig::rebuildTree()
         }
     }
     tree->setCurrentItem(itemOf(current));
+    fitColumns();
     updateView();
 }
 
@@ -216,14 +224,14 @@ void DlgInstrConfig::instr_add_manual()
     if (!isOpen) {
         const QString reason = QString("The device '%1' was not added.").arg(resource);
         Tracer::Trace(Tracer::Error, reason);
-        say(reason + " The log tells why.");
+        say(reason + " See the log.");
         return;
     }
     const bool isNew = addOnline(summaryOf(device), "Manually Added");
     say(QString(isNew ? "The instrument '%1' was added." : "The instrument '%1' was already added.")
             .arg(instrumentName(device.model(), device.serial())));
     m_ui->le_manual->selectAll();
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_scan_gpib()
@@ -260,13 +268,13 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
     const bool isChanged = !found.isEmpty();
     qDeleteAll(found);
     if (!done && !isChanged) {
-        say("The scan found nothing. The log tells why.");
+        say("The scan found nothing. See the log.");
         return;
     }
     say(added == 0   ? QString("The scan found no new instrument.")
         : added == 1 ? QString("The scan found 1 new instrument.")
                      : QString("The scan found %1 new instruments.").arg(added));
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_clearlist()
@@ -278,7 +286,7 @@ void DlgInstrConfig::instr_clearlist()
     m_ui->tw_instruments->clear();
     updateView();
     say({});
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 void DlgInstrConfig::instr_removedevice()
@@ -303,7 +311,7 @@ void DlgInstrConfig::instr_itemChanged(QTreeWidgetItem *item, int column)
     }
     const bool isChecked = item->checkState(DeviceColumn) == Qt::Checked;
     if (m_list.setEnabled(m_list.indexOf(itemResource(*item)), isChecked)) {
-        emit instrumentsChanged();
+        emit updateInstruments();
     }
 }
 
@@ -324,7 +332,7 @@ void DlgInstrConfig::widgetItemDoubleClicked(QTreeWidgetItem *item, int /*column
     if (QTreeWidgetItem *present = itemOf(resource)) {
         present->setText(CommentColumn, comment);
     }
-    emit instrumentsChanged();
+    emit updateInstruments();
 }
 
 bool DlgInstrConfig::addOnline(const InstrumentSummary &summary, const QString &origin)
@@ -336,6 +344,7 @@ bool DlgInstrConfig::addOnline(const InstrumentSummary &summary, const QString &
     showOnline(m_list.entries().at(index), summary);
     QTreeWidget *tree = m_ui->tw_instruments;
     tree->setCurrentItem(itemOf(summary.resource));
+    fitColumns();
     updateView();
     return true;
 }
@@ -411,8 +420,16 @@ void DlgInstrConfig::updateView()
         action->setEnabled(hasCurrent);
     }
     m_ui->pb_clear->setEnabled(!m_list.entries().isEmpty());
-    tree->resizeColumnToContents(DeviceColumn);
-    tree->resizeColumnToContents(ValueColumn);
+}
+
+void DlgInstrConfig::fitColumns()
+{
+    constexpr int Gap = 12;
+    QTreeWidget *tree = m_ui->tw_instruments;
+    for (const int column : {DeviceColumn, ValueColumn}) {
+        tree->resizeColumnToContents(column);
+        tree->setColumnWidth(column, tree->columnWidth(column) + Gap);
+    }
 }
 
 /// Tells the outcome of the last action, which has its full words in the log.

@@ -64,7 +64,7 @@ public slots:
 
 signals:
     /// The list has changed, or what is known of its instruments.
-    void instrumentsChanged();
+    void updateInstruments();
 
 private:
     void addActions();
@@ -78,6 +78,7 @@ private:
                               const QString &state);
     [[nodiscard]] QTreeWidgetItem *itemOf(const QString &resource) const;
     void updateView();
+    void fitColumns();
     void say(const QString &text);
 
     std::unique_ptr<Ui::DlgInstrConfig> m_ui;

@@ -319,13 +319,15 @@ QString VisaDevice::takeLastError()
 
 bool VisaDevice::setTimeoutMs(quint32 milliseconds)
 {
+    const VisaFunctions *visa = library().functions(&VisaFunctions::viSetAttribute);
+    if (visa == nullptr) {
+        return false;
+    }
     if (!m_isOpen) {
         return notOpen();
     }
-    const VisaFunctions *visa = library().functions(&VisaFunctions::viSetAttribute);
-    return visa != nullptr &&
-           VisaSession(*visa, m_session).setAttribute(VI_ATTR_TMO_VALUE, milliseconds) ==
-               VI_SUCCESS;
+    return VisaSession(*visa, m_session).setAttribute(VI_ATTR_TMO_VALUE, milliseconds) ==
+           VI_SUCCESS;
 }
 
 quint32 VisaDevice::timeoutMs() const

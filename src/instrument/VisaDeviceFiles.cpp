@@ -2,6 +2,7 @@
 // Files and folders of the instrument.
 #include "VisaDevice.h"
 
+#include "CancelScope.h"
 #include "VisaLibrary.h"
 #include "remotepaths.h"
 
@@ -24,11 +25,13 @@ bool tooDeep(const QString &directory)
                             .arg(maxDepth));
 }
 
-/// A path must name more than a root, and a folder to be removed must not turn into its parent.
-bool isUsable(const QString &path, const char *reason)
+/// A path must name more than a root, and with an empty name a folder would turn into its parent.
+bool isUsable(const QString &path, const QString &name, const char *reason)
 {
-    return (path.size() >= 2 && !path.endsWith('/') && !path.endsWith('\\')) ||
-           Tracer::fail(reason);
+    const bool isNamed = std::any_of(name.cbegin(), name.cend(), [](QChar character) {
+        return character != '/' && character != '\\' && character != '\'';
+    });
+    return (isNamed && path.size() >= 2) || Tracer::fail(reason);
 }
 
 const char *const emptyDirectory = "Directory path cannot be empty.";
@@ -136,7 +139,7 @@ bool VisaDevice::deleteRemoteFile(const QString &path, bool ask)
 bool VisaDevice::makeDirectory(const QString &parent, const QString &name)
 {
     const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, emptyDirectory)) {
+    if (!isUsable(path, name, emptyDirectory)) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Creating directory '" + path + "'");
@@ -148,8 +151,8 @@ bool VisaDevice::renameEntry(const QString &directory, const QString &oldName,
 {
     const QString oldPath = joinRemotePath(directory, oldName, pathSeparator());
     const QString newPath = joinRemotePath(directory, newName, pathSeparator());
-    if (!isUsable(oldPath, "Entry name cannot be empty.") ||
-        !isUsable(newPath, "Entry name cannot be empty.")) {
+    if (!isUsable(oldPath, oldName, "Entry name cannot be empty.") ||
+        !isUsable(newPath, newName, "Entry name cannot be empty.")) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Renaming '" + oldPath + "'");
@@ -159,7 +162,7 @@ bool VisaDevice::renameEntry(const QString &directory, const QString &oldName,
 bool VisaDevice::removeDirectory(const QString &parent, const QString &name)
 {
     const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, emptyDirectory)) {
+    if (!isUsable(path, name, emptyDirectory)) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Removing directory '" + path + "'");
@@ -174,7 +177,7 @@ bool VisaDevice::removeEmptyTree(const QString &parent, const QString &name)
 bool VisaDevice::removeFolders(const QString &parent, const QString &name, int depth)
 {
     const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, emptyDirectory)) {
+    if (!isUsable(path, name, emptyDirectory)) {
         return false;
     }
     if (depth > maxDepth) {
@@ -200,11 +203,11 @@ bool VisaDevice::removeFolders(const QString &parent, const QString &name, int d
 
 bool VisaDevice::removeTree(const QString &parent, const QString &name)
 {
-    m_cancelRequested = false;
+    const CancelScope cancelScope(m_cancelRequested);
     const QString path = joinRemotePath(parent, name, pathSeparator());
     Tracer::Trace(Tracer::Information, "Removing tree '" + path + "'");
     QCoreApplication::processEvents();
-    if (!isUsable(path, emptyDirectory)) {
+    if (!isUsable(path, name, emptyDirectory)) {
         return false;
     }
     // Old errors would be taken for errors of the removal.

@@ -2,6 +2,7 @@
 // What kind of instrument this is, what it can do, and which are there.
 #include "VisaDevice.h"
 
+#include "CancelScope.h"
 #include "VisaLibrary.h"
 #include "instrumentmodels.h"
 
@@ -98,7 +99,7 @@ bool VisaDevice::scanResources(QList<VisaDevice *> &found, int kind)
     if (visa == nullptr) {
         return false;
     }
-    m_cancelRequested = false;
+    const CancelScope cancelScope(m_cancelRequested);
     Tracer::Trace(Tracer::Information, kind == ScanGpib ? "Scanning for local GPIB devices..."
                                                         : "Scanning for local USB devices...");
     // On USB the vendor number keeps other makers' devices out of the search.

@@ -25,10 +25,6 @@ bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localP
     if (!areNamed(localPath, remotePath)) {
         return false;
     }
-    // Before the local file is touched.
-    if (!m_isOpen) {
-        return Tracer::fail("Device is not open.");
-    }
     const VisaFunctions *visa = VisaLibrary::instance().functions(
         &VisaFunctions::viClear, &VisaFunctions::viSetAttribute, &VisaFunctions::viRead);
     return visa != nullptr && BlockReader(*this, VisaSession(*visa, m_session), m_cancelRequested)

@@ -38,7 +38,7 @@ constexpr std::array<InstrumentModel, 28> models{{
     {"PAX-660", false, "D:", "", false, false, true},
     {"PAX-640", false, "D:", "", false, false, true},
     {"PAX-650", false, "D:", "", false, false, true},
-    {"PAX-710", false, "D:|E:|F:", "", false, true, true},
+    {"PAX-710", false, "D:|E:|F:", "", false, true, false},
 }};
 
 /// Rows with capabilities of their own.

@@ -318,7 +318,7 @@ void TestCliUsage::keepsExistingFiles_data()
     QTest::newRow("plot") << "plot in.wv -o out.wv";
     QTest::newRow("create") << "create pm -o out.wv";
     QTest::newRow("resample") << "resample in.wv -o out.wv --samples 8";
-    QTest::newRow("resample, source") << "resample in.wv -o in.wv --samples 8";
+    QTest::newRow("resample, source") << "resample in.wv --samples 8 -o in.wv";
 }
 
 void TestCliUsage::keepsExistingFiles()

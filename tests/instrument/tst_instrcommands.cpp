@@ -101,7 +101,7 @@ void TestInstrCommands::init()
     m_simulator = std::make_unique<SimulatorProcess>();
     QVERIFY(m_simulator->startConfig("[a]\nmodel=TGX-870\nserial=100001\nroot=%ROOT%/a\n"
                                      "gateway=0\ngpib=28\n"
-                                     "[b]\nmodel=PAX-710\nserial=200002\nroot=%ROOT%/b\n"
+                                     "[b]\nmodel=PAX-690\nserial=200002\nroot=%ROOT%/b\n"
                                      "gateway=0\ngpib=5\n",
                                      2));
     QVERIFY(store(local("visa.ini"), QString("[GPIB0]\nhost=127.0.0.1\nport=%1\naddresses=5,28\n")
@@ -175,7 +175,7 @@ void TestInstrCommands::scan()
                                                   {"model", "TGX-870"},
                                                   {"serial", "100001"},
                                                   {"interface", "GPIB0"}}));
-    QVERIFY(run({"scan", "gpib"}).output.contains("GPIB0::5::INSTR\tPAX-710\t200002\tGPIB0\n"));
+    QVERIFY(run({"scan", "gpib"}).output.contains("GPIB0::5::INSTR\tPAX-690\t200002\tGPIB0\n"));
 }
 
 void TestInstrCommands::queryAndSend()
@@ -226,15 +226,15 @@ void TestInstrCommands::foldersAndFiles()
 
 void TestInstrCommands::drives()
 {
-    QCOMPARE(run({"mkdir", "GPIB0::5", "E:\\w"}).exitCode, 0);
+    QCOMPARE(run({"mkdir", "GPIB0::5", "D:\\w"}).exitCode, 0);
     QVERIFY(store(local("x.wv"), "12345"));
-    QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "E:\\w\\"}).exitCode, 0);
-    QCOMPARE(content(m_simulator->root() + "/b/E:/w/x.wv"), "12345");
-    QCOMPARE(run({"mv", "GPIB0::5", "E:\\w\\x.wv", "E:/w/y.wv"}).exitCode, 0);
-    QCOMPARE(run({"get", "GPIB0::5", "E:\\w\\y.wv", m_folder->path()}).exitCode, 0);
+    QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "D:\\w\\"}).exitCode, 0);
+    QCOMPARE(content(m_simulator->root() + "/b/D:/w/x.wv"), "12345");
+    QCOMPARE(run({"mv", "GPIB0::5", "D:\\w\\x.wv", "D:/w/y.wv"}).exitCode, 0);
+    QCOMPARE(run({"get", "GPIB0::5", "D:\\w\\y.wv", m_folder->path()}).exitCode, 0);
     QCOMPARE(content(local("y.wv")), "12345");
-    QCOMPARE(run({"rmdir", "GPIB0::5", "E:\\w", "--recursive"}).exitCode, 0);
-    QVERIFY(!QDir(m_simulator->root() + "/b/E:/w").exists());
+    QCOMPARE(run({"rmdir", "GPIB0::5", "D:\\w", "--recursive"}).exitCode, 0);
+    QVERIFY(!QDir(m_simulator->root() + "/b/D:/w").exists());
 }
 
 void TestInstrCommands::transfers()

@@ -10,6 +10,7 @@ class TestInstrumentModels : public QObject
 private slots:
     void model_data();
     void model();
+    void kinds();
     void rfRange_data();
     void rfRange();
     void baseband_data();
@@ -37,8 +38,10 @@ void TestInstrumentModels::model_data()
                                         << "b" << QStringList{"D:"};
     QTest::newRow("more around it") << "The TGX-870A" << 11 << "1234"
                                     << "" << QStringList{"/var/user/", "/hdd/"};
-    QTest::newRow("analyzer") << "PAX-710" << 27 << "a/b/c"
-                              << "a" << QStringList{"D:", "E:", "F:"};
+    QTest::newRow("analyzer") << "PAX-630" << 20 << "a/b/c"
+                              << "a" << QStringList{"D:"};
+    QTest::newRow("three roots") << "PAX-710" << 27 << "a/b/c"
+                                 << "b" << QStringList{"D:", "E:", "F:"};
     QTest::newRow("analyzer without /") << "PAX-610" << 17 << "a"
                                         << "a" << QStringList{"D:"};
     QTest::newRow("no root") << "TQX-110" << 9 << "a/b"
@@ -59,6 +62,25 @@ void TestInstrumentModels::model()
     QCOMPARE(findModel(field), row);
     QCOMPARE(serialOf(row, serialField), serial);
     QCOMPARE(rootsOf(row, "TGX870-P7,TGX870-P13"), roots);
+}
+
+void TestInstrumentModels::kinds()
+{
+    const auto rowsWith = [](bool InstrumentModel::*flag) {
+        QList<int> rows;
+        for (int row = 0; modelRow(row) != nullptr; ++row) {
+            if (modelRow(row)->*flag) {
+                rows.append(row);
+            }
+        }
+        return rows;
+    };
+    QCOMPARE(rowsWith(&InstrumentModel::unixFileSystem), (QList<int>{3, 7, 8, 11, 12}));
+    QCOMPARE(rowsWith(&InstrumentModel::basebandCoder), (QList<int>{0, 1, 2, 6, 11, 15, 16}));
+    QCOMPARE(rowsWith(&InstrumentModel::reserved), (QList<int>{4, 6, 9, 10, 13, 14, 15, 16, 27}));
+    // All of the PAX series but its last.
+    QCOMPARE(rowsWith(&InstrumentModel::analyzer),
+             (QList<int>{17, 18, 19, 20, 21, 22, 23, 24, 25, 26}));
 }
 
 void TestInstrumentModels::rfRange_data()

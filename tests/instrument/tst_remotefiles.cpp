@@ -160,6 +160,9 @@ void TestRemoteFiles::commands_data()
     QTest::newRow("remove nothing") << "remove" << QStringList{"/", "/"} << noPath;
     // Without a name this would be the folder above.
     QTest::newRow("remove no name") << "remove" << QStringList{"D:\\w", ""} << noPath;
+    // A folder's path may end in a separator.
+    QTest::newRow("remove with separator")
+        << "remove" << QStringList{"D:\\w", "a/"} << ":MMEM:RDIR 'D:\\w\\a\\'; *OPC?";
     QTest::newRow("remove tree, no name") << "tree" << QStringList{"D:\\w", "\\"} << noPath;
     QTest::newRow("rename") << "rename" << QStringList{"D:\\w", "a.wv", "b.wv"}
                             << ":MMEM:MOVE 'D:\\w\\a.wv','D:\\w\\b.wv'; *OPC?";
@@ -234,6 +237,8 @@ void TestRemoteFiles::removeTree()
         {{"D:\\w", ",\"a,BIN,5\",\"s,DIR,0\""}, {"D:\\w/s", ",\"b,BIN,5\""}, {"D:\\w\\s", ""}});
     fake->errors = {"-1,\"Old\""};
     QSignalSpy progress(m_device.get(), &VisaDevice::ProgressUpdate);
+    // A cancel from before neither ends the removal nor is forgotten.
+    m_device->cancel();
     QVERIFY(m_device->removeTree("D:", "w"));
     QCOMPARE(
         fake.takeMessages(),
@@ -242,6 +247,8 @@ void TestRemoteFiles::removeTree()
                      ":MMEM:RDIR 'D:\\w\\s'; *OPC?", ":MMEM:RDIR 'D:\\w'; *OPC?"}));
     QCOMPARE(progress.size(), 3);
     QCOMPARE(progress.at(1).first().toInt(), 50);
+    QVERIFY(!m_device->waitForArbReady(60));
+    QCOMPARE(takeLog(), QStringList{"4 *** User break."});
 }
 
 void TestRemoteFiles::removeTreeFails_data()

@@ -109,6 +109,12 @@ void TestVisaDevice::libraryIsMissing()
         QCOMPARE(second.takeLastError(), QString());
         QVERIFY(!second.openResource(resource));
         QCOMPARE(takeLog(), QStringList{notLoaded});
+        QVERIFY(!second.setTimeoutMs(1000));
+        QVERIFY(!second.readRemoteFile("/var/user/a.wv", "/nonexistent/a.wv"));
+        QVERIFY(!second.writeRemoteFile("/nonexistent/a.wv", "/var/user/a.wv"));
+        QList<VisaDevice *> found;
+        QVERIFY(!second.scanResources(found, VisaDevice::ScanUsb));
+        QCOMPARE(takeLog(), (QStringList{notLoaded, notLoaded, notLoaded, notLoaded}));
     }
     FakeInstrument fake;
     VisaDevice local(true);

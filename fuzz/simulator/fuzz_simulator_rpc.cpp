@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "simulator/Rpc.h"
+
+#include <algorithm>
+#include <array>
+#include <cstdlib>
+
+using namespace simulator;
+
+namespace {
+
+constexpr std::uint32_t CoreProgram = 0x0607AF;
+constexpr std::size_t LargestReply = 4096;
+
+// Reads arguments of all kinds and echoes them, as the procedures of an instrument do.
+RpcStatus answer(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results)
+{
+    results.number(procedure);
+    const std::uint32_t requested = arguments.number();
+    results.number(arguments.boolean() ? 1 : 0);
+    const std::string_view name = arguments.text();
+    const std::span<const char> data = arguments.opaque();
+    if (!arguments.isGood())
+        return RpcStatus::GarbageArguments;
+    const std::span<char> room = results.openOpaque(std::min<std::size_t>(requested, LargestReply));
+    const std::size_t count = std::min({room.size(), data.size() + name.size()});
+    std::fill_n(room.begin(), count, 'x');
+    std::copy_n(data.begin(), std::min(count, data.size()), room.begin());
+    results.closeOpaque(count);
+    return RpcStatus::Success;
+}
+
+std::uint32_t word(std::span<const char> bytes, std::size_t place)
+{
+    return XdrReader(bytes.subspan(place)).number();
+}
+
+} // namespace
+
+/// One record from a peer; each is answered as a whole record with its number, or not at all.
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
+{
+    const std::span<const char> call(reinterpret_cast<const char *>(data), size);
+    const std::array<RpcProgram, 1> programs{{{CoreProgram, 1, answer}}};
+    XdrWriter reply;
+    if (!answerRpcCall(call, programs, reply))
+        return 0;
+    const std::span<const char> bytes = reply.bytes();
+    constexpr std::size_t SmallestReply = RecordMarkSize + 5 * 4;
+    constexpr std::uint32_t LastFragment = 0x80000000U;
+    if (bytes.size() < SmallestReply || bytes.size() % 4 != 0)
+        std::abort();
+    if (word(bytes, 0) != (LastFragment | (bytes.size() - RecordMarkSize)))
+        std::abort();
+    if (word(bytes, RecordMarkSize) != word(call, 0) || word(bytes, RecordMarkSize + 4) != 1)
+        std::abort();
+    return 0;
+}
