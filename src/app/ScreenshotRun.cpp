@@ -81,6 +81,10 @@ void ScreenshotRun::start()
             finish(1);
         }
     });
+    if (offersInstruments() && !makeTransferFile()) {
+        finish(1);
+        return;
+    }
     const QString shown = m_file.isEmpty() ? QDir::homePath() : m_file;
     const QString folder = QFileInfo(shown).path();
     auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
@@ -131,7 +135,7 @@ void ScreenshotRun::takePictures()
         }
     }
     done = save(m_window, "main-window.png") && done;
-    if (m_window.findChild<QComboBox *>("cb_dev_2")->count() > 1) {
+    if (offersInstruments()) {
         done = saveInstruments() && done;
     }
     std::printf("first paint %lld ms after the start\n",
@@ -161,17 +165,29 @@ bool ScreenshotRun::saveInstruments()
     return save(m_window, "two-instruments.png") && done;
 }
 
-/// Sends a large file of zeros to the instrument in the second pane, for a picture of the progress,
-/// and stops.
-bool ScreenshotRun::saveTransfer()
+bool ScreenshotRun::offersInstruments() const
+{
+    return m_window.findChild<QComboBox *>("cb_dev_2")->count() > 1;
+}
+
+/// A large file of zeros, which takes no room on the disk. Made before the panes are read.
+bool ScreenshotRun::makeTransferFile()
 {
     constexpr qint64 fileSize = 500'000'000;
-    QFile file(QFileInfo(QDir(m_folder).filePath("noise-100-MHz.wv")).absoluteFilePath());
-    if (!file.open(QIODevice::WriteOnly) || !file.resize(fileSize)) {
-        complain(QString("the file '%1' cannot be written").arg(file.fileName()));
+    m_transferFile.setFileName(
+        QFileInfo(QDir(m_folder).filePath("noise-100-MHz.wv")).absoluteFilePath());
+    if (!m_transferFile.open(QIODevice::WriteOnly) || !m_transferFile.resize(fileSize)) {
+        complain(QString("the file '%1' cannot be written").arg(m_transferFile.fileName()));
         return false;
     }
-    file.close();
+    m_transferFile.close();
+    return true;
+}
+
+/// Sends the large file to the instrument in the second pane, for a picture of the progress, and
+/// stops.
+bool ScreenshotRun::saveTransfer()
+{
     bool done = false;
     QTimer poll;
     connect(&poll, &QTimer::timeout, this, [&] {
@@ -194,10 +210,10 @@ bool ScreenshotRun::saveTransfer()
     poll.start(20);
     auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
     const QString shown = first->currentPath();
-    first->updateAndExpandTree(file.fileName());
+    first->updateAndExpandTree(m_transferFile.fileName());
+    QCoreApplication::processEvents();
     first->copyToPeer();
     first->updateAndExpandTree(shown);
-    file.remove();
     return done;
 }
 
@@ -252,6 +268,9 @@ bool ScreenshotRun::savePicture(const QPixmap &picture, const QString &name) con
 void ScreenshotRun::finish(int status)
 {
     m_finished = true;
+    if (!m_transferFile.fileName().isEmpty()) {
+        m_transferFile.remove();
+    }
     m_window.close();
     QCoreApplication::exit(status);
 }

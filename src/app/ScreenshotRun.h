@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <QFile>
 #include <QObject>
 #include <QPair>
 #include <QSet>
@@ -36,6 +37,8 @@ private:
     void folderArrived(const QCustomTreeView *tree, const QString &folder);
     void takePictures();
     [[nodiscard]] bool saveInstruments();
+    [[nodiscard]] bool offersInstruments() const;
+    [[nodiscard]] bool makeTransferFile();
     [[nodiscard]] bool saveTransfer();
     [[nodiscard]] bool saveTool(DlgBase &tool) const;
     [[nodiscard]] bool save(QWidget &window, const QString &name) const;
@@ -47,6 +50,7 @@ private:
     QString m_file;                                          ///< absolute, empty for none
     QSet<QPair<const QCustomTreeView *, QString>> m_arrived; ///< folders that the panes know
     QSet<QPair<const QCustomTreeView *, QString>> m_awaited; ///< folders that the picture needs
+    QFile m_transferFile;
     bool m_started = false;
     bool m_finished = false;
 };

@@ -8,7 +8,6 @@
 
 #include <QApplication>
 #include <QCloseEvent>
-#include <QHBoxLayout>
 #include <QIcon>
 #include <QLabel>
 #include <QPushButton>
@@ -76,15 +75,13 @@ QtProgressDialog::QtProgressDialog(const QString &labelText, QWidget *parent,
     m_cancelButton->setIcon(QIcon(":/icons16/cancel.png"));
     m_cancelButton->setToolTip("Stop this operation");
 
-    auto *bottom = new QHBoxLayout;
-    bottom->addWidget(m_times, 1);
-    bottom->addWidget(m_cancelButton);
     auto *layout = new QVBoxLayout(this);
     layout->setContentsMargins(16, 16, 16, 12);
     layout->setSpacing(10);
     layout->addWidget(m_label);
     layout->addWidget(m_bar);
-    layout->addLayout(bottom);
+    layout->addWidget(m_times);
+    layout->addWidget(m_cancelButton, 0, Qt::AlignRight);
 
     connect(m_cancelButton, &QPushButton::clicked, this, &QtProgressDialog::reject);
     connect(&m_delay, &QTimer::timeout, this, &QtProgressDialog::appear);
