@@ -13,15 +13,30 @@ QString widthKey(int pane, const QString &kind, qsizetype section)
     return QString("tree%1.%2.section%3").arg(pane).arg(kind).arg(section);
 }
 
+QMap<QString, QList<int>> firstWidths()
+{
+    return {{"local", {220, 60, 60, 100}}, {"remote", {220, 60, 60}}};
+}
+
 } // namespace
 
 ColumnWidths::ColumnWidths()
-    : m_widths{{"local", {220, 60, 60, 100}}}
+    : m_widths(firstWidths())
 {
+}
+
+bool ColumnWidths::isUntouched(const QString &kind, const QHeaderView &header, int section)
+{
+    return section < header.count() &&
+           header.sectionSize(section) == firstWidths().value(kind).value(section);
 }
 
 void ColumnWidths::keep(const QString &kind, const QHeaderView &header)
 {
+    // An instrument that isn't open has a single column without a meaning.
+    if (header.count() < m_widths.value(kind).size()) {
+        return;
+    }
     QList<int> widths;
     for (int section = 0; section < header.count(); ++section) {
         widths.append(header.sectionSize(section));

@@ -20,6 +20,10 @@ public:
     /// Gives a header the widths of a kind.
     void apply(const QString &kind, QHeaderView &header) const;
 
+    /// Whether nobody has changed the width that a column has from the start.
+    [[nodiscard]] static bool isUntouched(const QString &kind, const QHeaderView &header,
+                                          int section);
+
     /// Keys are "tree1.local.section0" and so on. A list that can't be read leaves the widths.
     void write(QSettings &settings, int pane) const;
     void read(const QSettings &settings, int pane);

@@ -4,16 +4,12 @@
 #include <QFileInfo>
 #include <QStringList>
 
-namespace {
-
-QIcon picture(const QString &name)
+QIcon FileIcons::picture(const QString &name)
 {
     QIcon icon(":/icons16/" + name + ".png");
     icon.addFile(":/icons32/" + name + ".png");
     return icon;
 }
-
-} // namespace
 
 FileIcons::FileIcons()
     : m_drive(picture("drive"))

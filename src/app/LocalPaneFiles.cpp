@@ -54,6 +54,11 @@ QModelIndex LocalPaneFiles::indexOf(const QString &path) const
     return path.isEmpty() ? QModelIndex() : m_model->index(withoutSlash(path));
 }
 
+qint64 LocalPaneFiles::sizeOf(const QModelIndex &index) const
+{
+    return m_model->size(index);
+}
+
 void LocalPaneFiles::setNameFilters(const QStringList &wildcards)
 {
     m_model->setNameFilters(wildcards);

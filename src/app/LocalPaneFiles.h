@@ -17,6 +17,7 @@ public:
     [[nodiscard]] QString settingsName() const override;
     [[nodiscard]] QString pathOf(const QModelIndex &index) const override;
     [[nodiscard]] QModelIndex indexOf(const QString &path) const override;
+    [[nodiscard]] qint64 sizeOf(const QModelIndex &index) const override;
     void setNameFilters(const QStringList &wildcards) override;
     [[nodiscard]] bool exists(const QString &path) const override;
     [[nodiscard]] bool isRoot(const QString &path) const override;

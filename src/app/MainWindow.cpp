@@ -4,16 +4,22 @@
 #include "AboutBox.h"
 #include "LocalFileModel.h"
 #include "QCustomTreeView.h"
+#include "devicechoice.h"
+#include "instrument/DlgInstrConfig.h"
 #include "mnemonics.h"
 #include "processage.h"
 #include "settingsstores.h"
+#include "splittersettings.h"
+#include "toolframe/QtProgressDialog.h"
 #include "toolframe/pictures.h"
+#include "toolframe/questions.h"
 #include "toolframe/windowplace.h"
 #include "ui_MainWindow.h"
 
 #include <QCloseEvent>
 #include <QFileInfo>
 #include <QMessageBox>
+#include <QPointer>
 #include <QShortcut>
 #include <QSignalBlocker>
 #include <QTimer>
@@ -36,31 +42,16 @@ QIcon levelIcon(int level)
     return QIcon(level & Tracer::Debug ? ":/icons16/debug.png" : ":/icons16/bulb.png");
 }
 
-/// Sizes of a splitter lie under the prefix followed by 0, 1, 2, ...; fewer than two leave the
-/// layout as it was built.
-void readSplitter(const QSettings &settings, const QString &prefix, QSplitter &splitter)
+/// Whether the tops of an instrument's tree could be read.
+bool isReadable(const RemoteDirModel &model)
 {
-    QList<int> sizes;
-    for (;;) {
-        bool isNumber = false;
-        const int size =
-            settings.value(prefix + QString::number(sizes.size()), -1).toInt(&isNumber);
-        if (!isNumber || size < 1) {
-            break;
+    for (int row = 0; row < model.rowCount(); ++row) {
+        const RemoteEntry *root = RemoteDirModel::entryOf(model.index(row, 0));
+        if (root == nullptr || root->hasReadError()) {
+            return false;
         }
-        sizes.append(size);
     }
-    if (sizes.size() >= 2) {
-        splitter.setSizes(sizes);
-    }
-}
-
-void writeSplitter(QSettings &settings, const QString &prefix, const QSplitter &splitter)
-{
-    const QList<int> sizes = splitter.sizes();
-    for (qsizetype i = 0; i < sizes.size(); ++i) {
-        settings.setValue(prefix + QString::number(i), sizes.at(i));
-    }
+    return true;
 }
 
 } // namespace
@@ -71,19 +62,29 @@ MainWindow::MainWindow()
     registerPictures();
     setAttribute(Qt::WA_DeleteOnClose);
     m_ui->setupUi(this);
-    m_panes[0] = {m_ui->cb_dev_1, m_ui->cb_flt_1, m_ui->tb_refresh_1, m_ui->l_win1, m_ui->cb_entry1,
-                  m_ui->tv_dev_1, nullptr};
-    m_panes[1] = {m_ui->cb_dev_2, m_ui->cb_flt_2, m_ui->tb_refresh_2, m_ui->l_win2, m_ui->cb_entry2,
-                  m_ui->tv_dev_2, nullptr};
+    m_panes[0] = {m_ui->cb_dev_1, m_ui->tb_instruments_1,
+                  m_ui->cb_flt_1, m_ui->tb_refresh_1,
+                  m_ui->l_win1,   m_ui->cb_entry1,
+                  m_ui->tv_dev_1, nullptr,
+                  nullptr,        nullptr};
+    m_panes[1] = {m_ui->cb_dev_2, m_ui->tb_instruments_2,
+                  m_ui->cb_flt_2, m_ui->tb_refresh_2,
+                  m_ui->l_win2,   m_ui->cb_entry2,
+                  m_ui->tv_dev_2, nullptr,
+                  nullptr,        nullptr};
     buildMenus();
     for (Pane &pane : m_panes) {
         pane.tree->setModules(&m_modules);
+        pane.tree->setPeer(otherPane(pane).tree);
     }
+    const QStringList arguments = QCoreApplication::arguments();
+    m_noVisa = arguments.contains("--no-visa");
+    m_instrConfig = std::make_unique<DlgInstrConfig>(m_noVisa, this);
 
-    Tracer::setMask(QCoreApplication::arguments().contains("--debug") ? Tracer::DebugMask
-                                                                      : Tracer::DefaultMask);
+    Tracer::setMask(arguments.contains("--debug") ? Tracer::DebugMask : Tracer::DefaultMask);
     connect(&m_tracer, &Tracer::TraceDataAvailable, this, &MainWindow::TraceDataAvailable);
 
+    createDevices();
     for (Pane &pane : m_panes) {
         pane.filter->addItems({"*.*", "*.wv"});
         connectPane(pane);
@@ -91,6 +92,15 @@ MainWindow::MainWindow()
     }
     Tracer::Trace(Tracer::Debug,
                   "System root path is " + m_panes[0].localModel->rootDirectory().path());
+    for (Pane &pane : m_panes) {
+        pane.remoteModel = std::make_unique<RemoteDirModel>();
+        pane.remoteModel->setDevice(pane.instrument.get());
+        pane.remoteModel->setIconProvider(
+            [](const QString &name) { return FileIcons::picture(name); });
+        fillDeviceChoice(*pane.device, {});
+    }
+    connect(m_instrConfig.get(), &DlgInstrConfig::updateInstruments, this,
+            &MainWindow::instrListUpdated);
 
     Tracer::Trace(Tracer::Information, "Loading program settings...");
     loadSettings();
@@ -113,6 +123,28 @@ MainWindow::~MainWindow()
     for (Pane &pane : m_panes) {
         pane.tree->setModel(nullptr);
         pane.localModel.reset();
+        pane.remoteModel.reset();
+        pane.instrument.reset();
+    }
+}
+
+void MainWindow::createDevices()
+{
+    QString failures;
+    bool failed = false;
+    for (std::size_t i = 0; i < m_panes.size(); ++i) {
+        auto device = std::make_unique<VisaDevice>(m_noVisa);
+        device->setQuestion([this](const QString &title, const QString &text) {
+            return askYesNo(this, title, text);
+        });
+        const QString failure = device->takeLastError();
+        failures += QString("  Device %1 : %2\n").arg(i + 1).arg(failure);
+        failed = failed || !failure.isEmpty();
+        m_panes.at(i).instrument = std::move(device);
+    }
+    if (failed) {
+        QMessageBox::critical(this, windowTitle(),
+                              "The VISA interfaces failed to initialize:\n" + failures);
     }
 }
 
@@ -124,6 +156,7 @@ void MainWindow::buildMenus()
         file->addSeparator();
     }
     file->addAction(m_ui->actionExit);
+    menuBar()->addMenu("Instrument")->addAction(m_ui->actionInstrConfigure);
     menuBar()->addMenu("Help")->addAction(m_ui->actionAbout);
 
     assignMnemonics(menuBar()->actions());
@@ -132,6 +165,8 @@ void MainWindow::buildMenus()
         assignMnemonics(menu->menu()->actions());
     }
     connect(m_ui->actionExit, &QAction::triggered, this, &MainWindow::close);
+    connect(m_ui->actionInstrConfigure, &QAction::triggered, this,
+            &MainWindow::menu_showinstrconfig);
     connect(m_ui->actionAbout, &QAction::triggered, this, &MainWindow::menu_about);
     auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
     connect(refreshKey, &QShortcut::activated, this,
@@ -140,12 +175,15 @@ void MainWindow::buildMenus()
 
 void MainWindow::connectPane(Pane &pane)
 {
+    connect(pane.instruments, &QToolButton::clicked, this, &MainWindow::menu_showinstrconfig);
     connect(pane.refresh, &QToolButton::clicked, this, &MainWindow::slot_refresh);
     connect(pane.tree, &QCustomTreeView::errMsg, this, &MainWindow::errMsg);
     connect(pane.tree, &QCustomTreeView::infoTextAvailable, this,
             &MainWindow::slot_infoTextAvailable);
     connect(pane.tree, &QCustomTreeView::localDefaultFolderSet, this,
             &MainWindow::slot_localDefaultFolderSet);
+    connect(pane.tree, &QCustomTreeView::remoteDefaultFolderSet, this,
+            &MainWindow::slot_remoteDefaultFolderSet);
     connect(pane.tree, &QCustomTreeView::itemSelected, this, &MainWindow::slot_itemSelected);
     connect(pane.tree, &QCustomTreeView::otherPaneRequested, this,
             [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
@@ -180,6 +218,13 @@ void MainWindow::menu_about()
     AboutBox(this).exec();
 }
 
+void MainWindow::menu_showinstrconfig()
+{
+    m_instrConfig->show();
+    m_instrConfig->raise();
+    m_instrConfig->activateWindow();
+}
+
 void MainWindow::slot_infoTextAvailable(const QString &sInfoText)
 {
     QMessageBox box(QMessageBox::Information, windowTitle(), sInfoText, QMessageBox::Ok, this);
@@ -199,9 +244,25 @@ void MainWindow::slot_refresh()
     refresh(paneOf(sender()));
 }
 
+void MainWindow::slot_remoteDefaultFolderSet(VisaDevice *pcVisaDevice,
+                                             const QString &sDefaultFolder)
+{
+    Tracer::Trace(Tracer::Information,
+                  QString("Set default folder '%1', Instrument %2, %3")
+                      .arg(sDefaultFolder, pcVisaDevice->model(), pcVisaDevice->serial()));
+    m_instrConfig->setDefaultFolder(pcVisaDevice->model(), pcVisaDevice->serial(), sDefaultFolder);
+}
+
 void MainWindow::refresh(Pane &pane)
 {
-    pane.tree->updateAndExpandTree(m_locPath);
+    if (pane.tree->isLocal()) {
+        pane.tree->updateAndExpandTree(m_locPath);
+        return;
+    }
+    pane.tree->updateAndExpandTree(defaultFolder(pane));
+    if (!isReadable(*pane.remoteModel) && openInstrument(pane)) {
+        pane.tree->updateAndExpandTree(defaultFolder(pane));
+    }
 }
 
 void MainWindow::newDeviceSelection(int /*iIndex*/)
@@ -211,9 +272,92 @@ void MainWindow::newDeviceSelection(int /*iIndex*/)
 
 void MainWindow::selectDevice(Pane &pane)
 {
+    if (isSameInstrument(pane.device->currentText(), otherPane(pane).device->currentText())) {
+        Tracer::Trace(Tracer::Warning, "Warning: The same device cannot be selected twice.");
+        const QSignalBlocker blocker(pane.device);
+        pane.device->setCurrentIndex(0);
+    }
     pane.tree->clearSelection();
+    {
+        // Paths of another device lead nowhere.
+        const QSignalBlocker blocker(pane.history);
+        pane.history->clear();
+    }
+    if (pane.device->currentData().toString().isEmpty()) {
+        showLocal(pane);
+    } else {
+        showInstrument(pane);
+    }
+}
+
+void MainWindow::showLocal(Pane &pane)
+{
     pane.tree->setModel(pane.localModel.get());
+    (void)pane.instrument->closeResource();
+    pane.remoteModel->refresh();
+    pane.tree->filterChanged(pane.filter->currentText());
     pane.tree->updateAndExpandTree(m_locPath);
+}
+
+void MainWindow::showInstrument(Pane &pane)
+{
+    // The folders that were open on another instrument are of no meaning here.
+    (void)pane.instrument->closeResource();
+    pane.remoteModel->refresh();
+    pane.tree->setModel(pane.remoteModel.get());
+    pane.tree->filterChanged(pane.filter->currentText());
+    if (openInstrument(pane)) {
+        Tracer::Trace(Tracer::Information,
+                      QString("Device is '%1' , Serial is '%2'")
+                          .arg(pane.instrument->model(), pane.instrument->serial()));
+    }
+    pane.tree->updateAndExpandTree(defaultFolder(pane));
+}
+
+bool MainWindow::openInstrument(Pane &pane)
+{
+    QGuiApplication::setOverrideCursor(Qt::WaitCursor);
+    (void)pane.instrument->closeResource();
+    const bool opened = pane.instrument->openResource(pane.device->currentData().toString());
+    QGuiApplication::restoreOverrideCursor();
+    const QString reported = pane.instrument->takeLastError().trimmed();
+    if (!opened && !reported.isEmpty()) {
+        Tracer::Trace(Tracer::Error, reported);
+    }
+    return opened;
+}
+
+QString MainWindow::defaultFolder(const Pane &pane) const
+{
+    const QString resource = pane.device->currentData().toString();
+    const QList<InstrConfigEntry> instruments = m_instrConfig->instruments();
+    const auto found =
+        std::find_if(instruments.cbegin(), instruments.cend(),
+                     [&](const InstrConfigEntry &entry) { return entry.resource == resource; });
+    return found == instruments.cend() ? QString() : found->folder;
+}
+
+void MainWindow::instrListUpdated()
+{
+    Tracer::Trace(Tracer::Information, "Instruments updated");
+    const QList<InstrConfigEntry> instruments =
+        m_noVisa ? QList<InstrConfigEntry>() : m_instrConfig->instruments();
+    for (Pane &pane : m_panes) {
+        const QString resource = pane.device->currentData().toString();
+        int index = 0;
+        {
+            const QSignalBlocker blocker(pane.device);
+            fillDeviceChoice(*pane.device, instruments);
+            index = pane.device->findData(resource);
+            pane.device->setCurrentIndex(std::max(index, 0));
+        }
+        if (index < 0) {
+            Tracer::Trace(Tracer::Information,
+                          "The previously selected instrument is not available anymore.");
+            selectDevice(pane);
+        }
+    }
+    m_modules.updateInstruments(instruments);
 }
 
 void MainWindow::slot_itemSelected(const QString &sItem)
@@ -274,6 +418,7 @@ void MainWindow::loadSettings()
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->readSettings(*settings, pane + 1);
     }
+    m_instrConfig->readSettings(*settings);
     m_modules.readAllSettings(*settings);
 }
 
@@ -287,6 +432,7 @@ void MainWindow::saveSettings()
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->writeSettings(*settings, pane + 1);
     }
+    m_instrConfig->writeSettings(*settings);
     m_modules.writeAllSettings(*settings);
     settings->sync();
     if (settings->status() != QSettings::NoError) {
@@ -315,14 +461,42 @@ void MainWindow::noteFirstPaint()
 
 void MainWindow::closeEvent(QCloseEvent *event)
 {
+    if (!mayClose()) {
+        event->ignore();
+        return;
+    }
     hide();
     saveSettings();
+    m_instrConfig->close();
     m_modules.closeAll();
     event->accept();
 }
 
+bool MainWindow::mayClose()
+{
+    QPointer<QtProgressDialog> running = findChild<QtProgressDialog *>();
+    if (!running) {
+        return true;
+    }
+    running->suspend();
+    const bool agreed =
+        askYesNo(this, windowTitle(),
+                 "An operation is still running.\nDo you want to stop it and close the program?");
+    if (!running) {
+        return agreed;
+    }
+    running->resume();
+    if (agreed) {
+        // The operation ends at its next tick; the window can't go before.
+        connect(running, &QObject::destroyed, this, &MainWindow::close, Qt::QueuedConnection);
+        running->reject();
+    }
+    return false;
+}
+
 void MainWindow::hideEvent(QHideEvent *event)
 {
+    m_instrConfig->hide();
     m_modules.hideAll();
     QMainWindow::hideEvent(event);
 }

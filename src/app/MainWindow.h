@@ -3,6 +3,8 @@
 
 #include "FileIcons.h"
 #include "ModulesDb.h"
+#include "instrument/RemoteDirModel.h"
+#include "instrument/VisaDevice.h"
 #include "log/Tracer.h"
 
 #include <QMainWindow>
@@ -11,6 +13,7 @@
 #include <array>
 #include <memory>
 
+class DlgInstrConfig;
 class LocalFileModel;
 class QComboBox;
 class QCustomTreeView;
@@ -53,10 +56,13 @@ private slots:
     void TraceDataAvailable();
     void errMsg(const QString &sTxt);
     void menu_about();
+    void menu_showinstrconfig();
     void slot_refresh();
+    void instrListUpdated();
     void newDeviceSelection(int iIndex);
     void slot_infoTextAvailable(const QString &sInfoText);
     void slot_localDefaultFolderSet(const QString &sDefaultFolder);
+    void slot_remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
     void slot_itemSelected(const QString &sItem);
     void slot_set_item(const QString &sItem);
 
@@ -65,17 +71,26 @@ private:
     struct Pane
     {
         QComboBox *device = nullptr;
+        QToolButton *instruments = nullptr;
         QComboBox *filter = nullptr;
         QToolButton *refresh = nullptr;
         QLabel *activeMark = nullptr;
         QComboBox *history = nullptr;
         QCustomTreeView *tree = nullptr;
         std::unique_ptr<LocalFileModel> localModel;
+        std::unique_ptr<VisaDevice> instrument;
+        std::unique_ptr<RemoteDirModel> remoteModel; ///< the files of the instrument
     };
 
     void buildMenus();
     void connectPane(Pane &pane);
+    void createDevices();
     void selectDevice(Pane &pane);
+    void showLocal(Pane &pane);
+    void showInstrument(Pane &pane);
+    [[nodiscard]] bool openInstrument(Pane &pane);
+    [[nodiscard]] QString defaultFolder(const Pane &pane) const;
+    [[nodiscard]] bool mayClose();
     void markActive(const Pane &active);
     void refresh(Pane &pane);
     [[nodiscard]] Pane &paneOf(const QObject *widget);
@@ -88,9 +103,11 @@ private:
     Tracer m_tracer;
     std::unique_ptr<Ui::AppMainWindow> m_ui;
     FileIcons m_fileIcons;
+    std::unique_ptr<DlgInstrConfig> m_instrConfig;
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;
     qint64 m_firstPaintMs = -1;
     bool m_paintSeen = false;
+    bool m_noVisa = false;
 };

@@ -9,7 +9,9 @@
 #include <memory>
 
 class QAbstractItemModel;
+class QTreeView;
 class QWidget;
+class VisaDevice;
 
 /// The entries that a pane shows and the operations on them: the one place where the sides differ
 /// on which a pane can stand. The view asks and confirms, this does.
@@ -28,6 +30,9 @@ public:
     /// Whether the entries lie on the local file system.
     [[nodiscard]] virtual bool isLocal() const = 0;
 
+    /// The instrument that holds the entries; null for the local file system.
+    [[nodiscard]] virtual VisaDevice *device() const { return nullptr; }
+
     /// Name of this side in the keys of the settings, one of those that ColumnWidths knows.
     [[nodiscard]] virtual QString settingsName() const = 0;
 
@@ -36,6 +41,16 @@ public:
 
     /// The entry of a path, with or without a slash at its end; invalid if there is none.
     [[nodiscard]] virtual QModelIndex indexOf(const QString &path) const = 0;
+
+    /// Size of a file in bytes as the model knows it.
+    [[nodiscard]] virtual qint64 sizeOf(const QModelIndex &index) const = 0;
+
+    /// Tells a model that keeps it which folders are open in a view, from now on.
+    virtual void follow(const QTreeView &view);
+
+    /// Reads a model anew that doesn't follow its side by itself: the folders that were open and
+    /// those on the way to `path`. Gives the paths of those that a view is to open again.
+    virtual QStringList reload(const QString &path);
 
     /// Shows only the files whose names match one of these wildcards; an empty list shows all.
     virtual void setNameFilters(const QStringList &wildcards) = 0;
@@ -74,6 +89,9 @@ signals:
 
     /// A failed operation, with its reason, for the status bar.
     void failed(const QString &text);
+
+    /// A text that the user must acknowledge.
+    void infoTextAvailable(const QString &text);
 
 protected:
     using QObject::QObject;

@@ -2,19 +2,20 @@
 #include "QCustomTreeView.h"
 
 #include "PaneFiles.h"
+#include "deviceactions.h"
 #include "entryname.h"
+#include "instrument/VisaDevice.h"
 #include "mnemonics.h"
 #include "toolframe/questions.h"
 
 #include <QAction>
 #include <QContextMenuEvent>
-#include <QDrag>
 #include <QHeaderView>
 #include <QIcon>
 #include <QMenu>
-#include <QMimeData>
 #include <QRegularExpression>
 #include <QScrollBar>
+#include <QShortcut>
 
 QCustomTreeView::QCustomTreeView(QWidget *parent)
     : QTreeView(parent)
@@ -31,10 +32,14 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     sortByColumn(0, Qt::AscendingOrder);
 
     addOperation("Set As Default Folder", "home", {}, &QCustomTreeView::slot_default);
+    m_runAction = addOperation("Run!", "run", Qt::Key_F9, &QCustomTreeView::slot_runwaveform);
     addOperation("Create Folder", "folder_new", Qt::Key_F7, &QCustomTreeView::slot_create);
     addOperation("Rename", "rename", Qt::Key_F2, &QCustomTreeView::slot_rename);
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
     m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
+    addKeys(Qt::Key_F5, &QCustomTreeView::copyToPeer);
+    addKeys(QKeySequence::Copy, &QCustomTreeView::copyToClipboard);
+    addKeys(QKeySequence::Paste, &QCustomTreeView::pasteFromClipboard);
 
     // The model delivers and sorts folders later, which moves the revealed entry out of sight.
     m_revealTimer.setSingleShot(true);
@@ -46,8 +51,8 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
 
 QCustomTreeView::~QCustomTreeView() = default;
 
-void QCustomTreeView::addOperation(const QString &text, const QString &picture,
-                                   const QKeySequence &key, void (QCustomTreeView::*slot)())
+QAction *QCustomTreeView::addOperation(const QString &text, const QString &picture,
+                                       const QKeySequence &key, Slot slot)
 {
     QAction *action = m_contextMenu->addAction(QIcon(":/icons16/" + picture + ".png"), text);
     action->setShortcut(key);
@@ -55,6 +60,14 @@ void QCustomTreeView::addOperation(const QString &text, const QString &picture,
     action->setShortcutVisibleInContextMenu(true);
     addAction(action);
     connect(action, &QAction::triggered, this, slot);
+    return action;
+}
+
+void QCustomTreeView::addKeys(const QKeySequence &key, Slot slot)
+{
+    auto *shortcut = new QShortcut(key, this);
+    shortcut->setContext(Qt::WidgetShortcut);
+    connect(shortcut, &QShortcut::activated, this, slot);
 }
 
 void QCustomTreeView::setModules(ModulesDb *modules)
@@ -82,10 +95,15 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
     if (this->model()) {
         this->model()->disconnect(&m_revealTimer);
     }
+    m_files.reset();
     QTreeView::setModel(model);
     m_files = PaneFiles::create(model);
     if (m_files) {
+        m_files->follow(*this);
+        connect(this, &QTreeView::expanded, m_files.get(), [this] { fitSizeColumn(); });
         connect(m_files.get(), &PaneFiles::failed, this, &QCustomTreeView::errMsg);
+        connect(m_files.get(), &PaneFiles::infoTextAvailable, this,
+                &QCustomTreeView::infoTextAvailable);
         const auto reveal = qOverload<>(&QTimer::start);
         connect(model, &QAbstractItemModel::rowsInserted, &m_revealTimer, reveal);
         connect(model, &QAbstractItemModel::layoutChanged, &m_revealTimer, reveal);
@@ -97,6 +115,11 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
 bool QCustomTreeView::isLocal() const
 {
     return !m_files || m_files->isLocal();
+}
+
+VisaDevice *QCustomTreeView::device() const
+{
+    return m_files ? m_files->device() : nullptr;
 }
 
 QString QCustomTreeView::currentPath() const
@@ -127,20 +150,68 @@ void QCustomTreeView::keepColumnWidths()
 
 void QCustomTreeView::updateAndExpandTree(const QString &sDir)
 {
-    if (!m_files || sDir.isEmpty()) {
+    if (!m_files || (sDir.isEmpty() && isLocal())) {
         return;
     }
-    const QModelIndex target = m_files->indexOf(sDir);
+    const QModelIndex target = isLocal() ? m_files->indexOf(sDir) : openAnew(sDir);
     if (!target.isValid()) {
         emit errMsg(QString("There is no entry '%1' any more.").arg(sDir));
         return;
     }
     for (QModelIndex level = target; level.isValid(); level = level.parent()) {
-        setExpanded(level, true);
+        open(level);
     }
     setCurrentIndex(target);
     m_revealedPath = m_files->pathOf(target);
     revealCurrent();
+    fitSizeColumn();
+}
+
+void QCustomTreeView::fitSizeColumn()
+{
+    constexpr int sizeColumn = 1;
+    // The sizes of an instrument's files are longer than those of local ones.
+    if (!isLocal() && ColumnWidths::isUntouched(m_files->settingsName(), *header(), sizeColumn) &&
+        sizeHintForColumn(sizeColumn) > columnWidth(sizeColumn)) {
+        resizeColumnToContents(sizeColumn);
+    }
+}
+
+QModelIndex QCustomTreeView::openAnew(const QString &path)
+{
+    const int sortColumn = header()->sortIndicatorSection();
+    const Qt::SortOrder sortOrder = header()->sortIndicatorOrder();
+    keepColumnWidths();
+    const QStringList folders = m_files->reload(path);
+    // The columns had vanished with the tree.
+    m_columnWidths.apply(m_files->settingsName(), *header());
+    header()->setSortIndicator(sortColumn, sortOrder);
+    for (const QString &folder : folders) {
+        open(m_files->indexOf(folder));
+    }
+    const QModelIndex target = m_files->indexOf(path);
+    if (target.isValid()) {
+        return target;
+    }
+    // A default folder that was never set leads nowhere.
+    return model()->index(0, 0);
+}
+
+void QCustomTreeView::open(const QModelIndex &folder)
+{
+    if (folder.isValid()) {
+        readBeforeOpening(folder);
+        setExpanded(folder, true);
+    }
+}
+
+void QCustomTreeView::readBeforeOpening(const QModelIndex &folder)
+{
+    // A folder of an instrument that was read in the middle of the view's layout would spoil it:
+    // the layout walks over rows that have gone meanwhile, and may never end.
+    if (!isLocal() && folder.isValid() && model()->canFetchMore(folder)) {
+        model()->fetchMore(folder);
+    }
 }
 
 void QCustomTreeView::updateAndExpandTree()
@@ -170,6 +241,9 @@ void QCustomTreeView::filterChanged(const QString &sNewFilter)
     if (m_files) {
         m_files->setNameFilters(wildcards);
     }
+    if (!isLocal() && currentIndex().isValid()) {
+        updateAndExpandTree();
+    }
 }
 
 void QCustomTreeView::currentChanged(const QModelIndex &current, const QModelIndex &previous)
@@ -194,6 +268,10 @@ void QCustomTreeView::contextMenuEvent(QContextMenuEvent *event)
     }
     setCurrentIndex(index);
     const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    m_runAction->setVisible(isRunnable(path, device()));
     for (const auto &[action, tool] : std::as_const(m_toolActions)) {
         action->setVisible(ModulesDb::isAllowed(*tool, path, isLocal()));
     }
@@ -201,8 +279,19 @@ void QCustomTreeView::contextMenuEvent(QContextMenuEvent *event)
     m_contextMenu->popup(viewport()->mapToGlobal(position));
 }
 
+void QCustomTreeView::mousePressEvent(QMouseEvent *event)
+{
+    const QPoint position = event->position().toPoint();
+    const QModelIndex index = indexAt(position);
+    if (index.column() == 0 && position.x() < visualRect(index).left()) {
+        readBeforeOpening(index); // its branch mark is pressed
+    }
+    QTreeView::mousePressEvent(event);
+}
+
 void QCustomTreeView::mouseDoubleClickEvent(QMouseEvent *event)
 {
+    readBeforeOpening(indexAt(event->position().toPoint()).siblingAtColumn(0));
     QTreeView::mouseDoubleClickEvent(event);
     if (event->button() == Qt::LeftButton && indexAt(event->position().toPoint()).isValid() &&
         !isFolderPath(currentPath())) {
@@ -216,6 +305,7 @@ void QCustomTreeView::keyPressEvent(QKeyEvent *event)
     case Qt::Key_Return:
     case Qt::Key_Enter:
         if (isFolderPath(currentPath())) {
+            readBeforeOpening(currentIndex());
             setExpanded(currentIndex(), !isExpanded(currentIndex()));
         } else {
             startFirstTool();
@@ -227,7 +317,16 @@ void QCustomTreeView::keyPressEvent(QKeyEvent *event)
             scrollTo(currentIndex());
         }
         return;
+    case Qt::Key_Asterisk:
+        // Whole trees are not opened at one press: an instrument would be read to its last folder.
+        if (isLocal()) {
+            QTreeView::keyPressEvent(event);
+        }
+        return;
     default:
+        if (event->key() == Qt::Key_Right || event->key() == Qt::Key_Plus) {
+            readBeforeOpening(currentIndex());
+        }
         QTreeView::keyPressEvent(event);
     }
 }
@@ -255,7 +354,9 @@ void QCustomTreeView::startFirstTool()
     if (DlgBase *tool = m_modules ? m_modules->firstAllowed(path, isLocal()) : nullptr) {
         m_modules->start(*tool, path);
     } else if (!path.isEmpty()) {
-        emit errMsg(QString("No tool works on '%1'.").arg(entryName(path)));
+        const QString words = isLocal() ? "No tool works on '%1'."
+                                        : "Tools work on local files: copy '%1' to a local folder.";
+        emit errMsg(words.arg(entryName(path)));
     }
 }
 
@@ -274,8 +375,21 @@ void QCustomTreeView::slot_module(int iModIndex)
 void QCustomTreeView::slot_default()
 {
     const QString folder = folderOf(currentPath());
-    if (!folder.isEmpty()) {
+    if (folder.isEmpty()) {
+        return;
+    }
+    if (VisaDevice *instrument = device()) {
+        emit remoteDefaultFolderSet(instrument, folder);
+    } else {
         emit localDefaultFolderSet(folder);
+    }
+}
+
+void QCustomTreeView::slot_runwaveform()
+{
+    const QString path = currentPath();
+    if (!isBusy() && isRunnable(path, device())) {
+        runWaveform(this, *device(), path);
     }
 }
 
@@ -357,73 +471,4 @@ void QCustomTreeView::slot_remove()
     }
     // Also after a failure: what could be removed is gone.
     updateAndExpandTree(parentFolder(path));
-}
-
-void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
-{
-    const QString path = currentPath();
-    if (path.isEmpty()) {
-        return;
-    }
-    auto *mime = new QMimeData;
-    mime->setText(path);
-    auto *drag = new QDrag(this);
-    drag->setMimeData(mime);
-    drag->setPixmap(QIcon(":/icons32/file_waveform.png").pixmap(32, 32));
-    drag->exec(Qt::CopyAction);
-}
-
-void QCustomTreeView::dragEnterEvent(QDragEnterEvent *event)
-{
-    dragMoveEvent(event);
-}
-
-void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
-{
-    if (!comesFromOtherPane(*event)) {
-        event->ignore();
-        return;
-    }
-    const QModelIndex target = indexAt(event->position().toPoint());
-    if (target.isValid()) {
-        selectionModel()->setCurrentIndex(target, QItemSelectionModel::ClearAndSelect |
-                                                      QItemSelectionModel::Rows);
-    }
-    event->acceptProposedAction();
-}
-
-void QCustomTreeView::dropEvent(QDropEvent *event)
-{
-    if (!comesFromOtherPane(*event)) {
-        event->ignore();
-        return;
-    }
-    event->acceptProposedAction();
-    offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
-              event->position().toPoint());
-}
-
-void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QString &path,
-                                const QPoint &position)
-{
-    const QModelIndex target = indexAt(position);
-    m_dropSource = path;
-    m_dropSourceLocal = source.isLocal();
-    m_dropTarget = m_files ? folderOf(m_files->pathOf(target)) : QString();
-    m_copyMenu->popup(viewport()->mapToGlobal(position));
-}
-
-bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const
-{
-    const auto *source = qobject_cast<const QCustomTreeView *>(event.source());
-    return source && source != this && !event.mimeData()->text().isEmpty();
-}
-
-void QCustomTreeView::slot_copy()
-{
-    if (!isFolderPath(m_dropTarget)) {
-        emit infoTextAvailable("The target location for the copy operation must be a folder.");
-    } else if (m_dropSourceLocal && isLocal()) {
-        emit infoTextAvailable("Copy operations between local file systems are not supported.");
-    }
 }

@@ -12,6 +12,7 @@
 class PaneFiles;
 class QMenu;
 class QSettings;
+class VisaDevice;
 
 /// The tree of one pane: shows the entries of its model, and turns menus, keys and drops into the
 /// operations of PaneFiles and into starts of tools.
@@ -28,12 +29,18 @@ public:
     /// Hands over the tools, which must live longer; adds them to the context menu. Once.
     void setModules(ModulesDb *modules);
 
+    /// The other pane, from which entries can be copied to this one.
+    void setPeer(QCustomTreeView *peer) { m_peer = peer; }
+
     /// Takes over a model of one of the kinds that PaneFiles knows, or null. Each kind has column
     /// widths of its own.
     void setModel(QAbstractItemModel *model) override;
 
     /// Whether the pane shows the local file system; also without a model.
     [[nodiscard]] bool isLocal() const;
+
+    /// The instrument that the pane shows; null for the local file system.
+    [[nodiscard]] VisaDevice *device() const;
 
     /// Path of the current entry, empty if there is none.
     [[nodiscard]] QString currentPath() const;
@@ -47,7 +54,7 @@ public:
     void readSettings(const QSettings &settings, int pane);
 
 public slots:
-    /// Opens all folders on the way to a path and makes it current.
+    /// Opens all folders on the way to a path and makes it current. An instrument is read anew.
     void updateAndExpandTree(const QString &sDir);
 
     /// As above with the current path.
@@ -57,11 +64,15 @@ public slots:
     /// dot. Several patterns are separated by blanks, commas or semicolons.
     void filterChanged(const QString &sNewFilter);
 
+    /// Copies the current entry to the folder of the current entry of the other pane.
+    void copyToPeer();
+
     void slot_default();
     void slot_copy();
     void slot_create();
     void slot_rename();
     void slot_remove();
+    void slot_runwaveform();
     void slot_module(int iModIndex);
 
 signals:
@@ -72,6 +83,7 @@ signals:
     void infoTextAvailable(const QString &sInfoText);
 
     void localDefaultFolderSet(const QString &sDefaultFolder);
+    void remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
 
     /// An entry has become current, or the pane has come into use again with this one.
     void itemSelected(const QString &sItem);
@@ -85,6 +97,7 @@ signals:
 protected:
     void currentChanged(const QModelIndex &current, const QModelIndex &previous) override;
     void contextMenuEvent(QContextMenuEvent *event) override;
+    void mousePressEvent(QMouseEvent *event) override;
     void mouseDoubleClickEvent(QMouseEvent *event) override;
     void keyPressEvent(QKeyEvent *event) override;
     void focusInEvent(QFocusEvent *event) override;
@@ -95,10 +108,20 @@ protected:
     void dropEvent(QDropEvent *event) override;
 
 private:
-    void addOperation(const QString &text, const QString &picture, const QKeySequence &key,
-                      void (QCustomTreeView::*slot)());
+    using Slot = void (QCustomTreeView::*)();
+    QAction *addOperation(const QString &text, const QString &picture, const QKeySequence &key,
+                          Slot slot);
+    void addKeys(const QKeySequence &key, Slot slot);
+    void copyToClipboard();
+    void pasteFromClipboard();
+    void setCopy(const QCustomTreeView &source, const QString &path, const QString &target);
+    [[nodiscard]] bool isBusy() const;
+    void open(const QModelIndex &folder);
+    void readBeforeOpening(const QModelIndex &folder);
+    [[nodiscard]] QModelIndex openAnew(const QString &path);
     void keepColumnWidths();
     void revealCurrent();
+    void fitSizeColumn();
     void startFirstTool();
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
     [[nodiscard]] bool acceptsName(const QString &parent, const QString &name,
@@ -106,13 +129,16 @@ private:
 
     std::unique_ptr<PaneFiles> m_files; ///< null without a model
     ModulesDb *m_modules = nullptr;
+    QCustomTreeView *m_peer = nullptr;
     QMenu *m_contextMenu;
     QMenu *m_copyMenu;
+    QAction *m_runAction = nullptr;
     QList<ModulesDb::ToolAction> m_toolActions;
     ColumnWidths m_columnWidths;
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
     QString m_dropSource;
     QString m_dropTarget;
-    bool m_dropSourceLocal = true;
+    VisaDevice *m_dropSourceDevice = nullptr; ///< null for local
+    qint64 m_dropSourceBytes = 0;
 };

@@ -3,18 +3,25 @@
 
 #include "MainWindow.h"
 #include "QCustomTreeView.h"
+#include "settingsstores.h"
 #include "toolframe/DlgBase.h"
+#include "toolframe/QtProgressDialog.h"
 
 #include <QApplication>
+#include <QComboBox>
 #include <QDir>
 #include <QFileInfo>
+#include <QPainter>
 #include <QPixmap>
 #include <QPushButton>
 #include <QSettings>
 #include <QStackedWidget>
 #include <QTemporaryDir>
 #include <QTimer>
+#include <QToolButton>
+#include <QTreeWidget>
 
+#include <algorithm>
 #include <cstdio>
 
 namespace {
@@ -43,8 +50,16 @@ ScreenshotRun::ScreenshotRun(MainWindow &window, QString folder, const QString &
 
 void ScreenshotRun::detachSettings()
 {
-    static const QTemporaryDir store;
-    QSettings::setPath(QSettings::IniFormat, QSettings::UserScope, store.path());
+    static const QTemporaryDir folder;
+    const auto users = openMainStore();
+    QSettings::setPath(QSettings::IniFormat, QSettings::UserScope, folder.path());
+    const auto detached = openMainStore();
+    users->beginGroup("InstrConfig");
+    detached->beginGroup("InstrConfig");
+    const QStringList keys = users->childKeys();
+    for (const QString &key : keys) {
+        detached->setValue(key, users->value(key));
+    }
 }
 
 void ScreenshotRun::start()
@@ -61,8 +76,10 @@ void ScreenshotRun::start()
     }
     m_window.resize(PictureSize);
     QTimer::singleShot(TimeOutMs, this, [this] {
-        complain("the panes were not loaded in time");
-        finish(1);
+        if (m_started) {
+            complain("the panes were not loaded in time");
+            finish(1);
+        }
     });
     const QString shown = m_file.isEmpty() ? QDir::homePath() : m_file;
     const QString folder = QFileInfo(shown).path();
@@ -114,9 +131,74 @@ void ScreenshotRun::takePictures()
         }
     }
     done = save(m_window, "main-window.png") && done;
+    if (m_window.findChild<QComboBox *>("cb_dev_2")->count() > 1) {
+        done = saveInstruments() && done;
+    }
     std::printf("first paint %lld ms after the start\n",
                 static_cast<long long>(m_window.firstPaintMs()));
     finish(done ? 0 : 1);
+}
+
+bool ScreenshotRun::saveInstruments()
+{
+    auto *dialog = m_window.findChild<QDialog *>("DlgInstrConfig");
+    m_window.findChild<QToolButton *>("tb_instruments_1")->click();
+    // One by one, so that the columns follow; they are laid out in the event loop.
+    const auto *tree = dialog->findChild<QTreeWidget *>();
+    for (int row = 0; row < tree->topLevelItemCount(); ++row) {
+        tree->topLevelItem(row)->setExpanded(true);
+    }
+    QCoreApplication::processEvents();
+    bool done = save(*dialog, "instruments.png");
+    dialog->close();
+
+    auto *first = m_window.findChild<QComboBox *>("cb_dev_1");
+    auto *second = m_window.findChild<QComboBox *>("cb_dev_2");
+    second->setCurrentIndex(1);
+    done = saveTransfer() && done;
+    first->setCurrentIndex(std::min(2, first->count() - 1));
+    QCoreApplication::processEvents();
+    return save(m_window, "two-instruments.png") && done;
+}
+
+/// Sends a large file of zeros to the instrument in the second pane, for a picture of the progress,
+/// and stops.
+bool ScreenshotRun::saveTransfer()
+{
+    constexpr qint64 fileSize = 500'000'000;
+    QFile file(QFileInfo(QDir(m_folder).filePath("noise-100-MHz.wv")).absoluteFilePath());
+    if (!file.open(QIODevice::WriteOnly) || !file.resize(fileSize)) {
+        complain(QString("the file '%1' cannot be written").arg(file.fileName()));
+        return false;
+    }
+    file.close();
+    bool done = false;
+    QTimer poll;
+    connect(&poll, &QTimer::timeout, this, [&] {
+        auto *progress = m_window.findChild<QtProgressDialog *>();
+        if (!done && progress && progress->isVisible() && progress->value() >= 20) {
+            QPixmap picture = m_window.grab();
+            const QPixmap inner = progress->grab();
+            QPainter painter(&picture);
+            const QRect frame(QPoint((m_window.width() - inner.width()) / 2,
+                                     (m_window.height() - inner.height()) / 2),
+                              inner.size());
+            painter.drawPixmap(frame.topLeft(), inner);
+            painter.setPen(Qt::darkGray);
+            painter.drawRect(frame.adjusted(-1, -1, 0, 0));
+            painter.end();
+            done = savePicture(picture, "transfer.png");
+            progress->reject();
+        }
+    });
+    poll.start(20);
+    auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
+    const QString shown = first->currentPath();
+    first->updateAndExpandTree(file.fileName());
+    first->copyToPeer();
+    first->updateAndExpandTree(shown);
+    file.remove();
+    return done;
 }
 
 /// A picture of the tool, or of each of its pages: first those on the way that "Next" leads, as a
@@ -154,8 +236,13 @@ bool ScreenshotRun::saveTool(DlgBase &tool) const
 
 bool ScreenshotRun::save(QWidget &window, const QString &name) const
 {
+    return savePicture(window.grab(), name);
+}
+
+bool ScreenshotRun::savePicture(const QPixmap &picture, const QString &name) const
+{
     const QString path = QDir(m_folder).filePath(name);
-    if (!window.grab().save(path)) {
+    if (!picture.save(path)) {
         complain(QString("the picture '%1' cannot be written").arg(path));
         return false;
     }

@@ -9,6 +9,7 @@
 class DlgBase;
 class MainWindow;
 class QCustomTreeView;
+class QPixmap;
 
 /// Shows a file in the main window, leaves pictures of the window and of the tools in a folder and
 /// ends the program, for documentation and for machines without a display.
@@ -18,12 +19,13 @@ class ScreenshotRun : public QObject
 
 public:
     /// Writes "main-window.png" and, if `file` isn't empty, pictures of all tools that take it,
-    /// such as "waveform-info.png", into `folder`,
-    /// which is made when missing. The window must live longer than the run.
+    /// such as "waveform-info.png", into `folder`, which is made when missing. With instruments in
+    /// the list also "instruments.png", "two-instruments.png" and "transfer.png". The window must
+    /// live longer than the run.
     ScreenshotRun(MainWindow &window, QString folder, const QString &file);
 
-    /// Makes the windows use settings of no user and keep none, so that pictures look the same
-    /// everywhere. To be called before the main window exists.
+    /// Makes the windows use settings of no user but the instrument list, and keep none, so that
+    /// pictures look the same everywhere. To be called before the main window exists.
     static void detachSettings();
 
     /// Starts, once the event loop runs; ends it with 0, or with 1 and a line on standard error.
@@ -33,8 +35,11 @@ private:
     void awaitFolders(const QCustomTreeView &tree, const QString &path);
     void folderArrived(const QCustomTreeView *tree, const QString &folder);
     void takePictures();
+    [[nodiscard]] bool saveInstruments();
+    [[nodiscard]] bool saveTransfer();
     [[nodiscard]] bool saveTool(DlgBase &tool) const;
     [[nodiscard]] bool save(QWidget &window, const QString &name) const;
+    [[nodiscard]] bool savePicture(const QPixmap &picture, const QString &name) const;
     void finish(int status);
 
     MainWindow &m_window;

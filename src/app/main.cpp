@@ -15,13 +15,14 @@
 namespace {
 
 constexpr const char *HelpText =
-    "Usage: corvane [--debug] [--help] [--version]\n"
+    "Usage: corvane [--debug] [--no-visa] [--help] [--version]\n"
     "\n"
     "The desktop workbench for arbitrary-waveform signal generators.\n"
     "\n"
     "  --debug                   show debug messages in the message log\n"
-    "  --screenshot DIR [FILE]   save pictures of the main window and of the report on a\n"
-    "                            waveform file into a folder, and quit\n"
+    "  --no-visa                 work with local files alone\n"
+    "  --screenshot DIR [FILE]   save pictures of the windows, with FILE of all tools that\n"
+    "                            take it, into a folder, and quit\n"
     "  --help                    show this text\n"
     "  --version                 show the version\n";
 

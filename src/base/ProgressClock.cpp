@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ProgressClock.h"
 
+#include "vectorstate.h"
+
 #include <QCoreApplication>
 
 #include <utility>
@@ -29,5 +31,6 @@ bool ProgressClock::shouldStop(int percent)
     m_timer.restart();
     m_report(percent);
     QCoreApplication::processEvents();
+    clearVectorState();
     return m_cancelled.load(std::memory_order_relaxed);
 }

@@ -91,7 +91,6 @@ public:
     }
 
     /// A number of which only whole values make sense.
-    /// A number of which only whole values make sense.
     KindCommand &count(const std::string &name, const CreateField &field)
     {
         addInteger(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));

@@ -4,15 +4,13 @@
 #include "RangeArguments.h"
 #include "commands.h"
 
-#include "base/EngineeringNumber.h"
+#include "base/OutputFile.h"
 #include "jobs/DumpJob.h"
 #include "jobs/InfoReport.h"
 #include "jobs/MeasureJob.h"
 #include "jobs/ReportText.h"
 #include "wvfile/HvFileIO.h"
 
-#include <QFile>
-#include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
 
@@ -64,29 +62,29 @@ int runDump(DumpArguments &arguments)
         return exitCode;
     }
     DumpJob::Sink sink = [&console](const QByteArray &bytes) { return console.print(bytes); };
-    QFile file(arguments.output);
+    // Nothing in a dump tells a cut one from a whole one.
+    OutputFile file(arguments.output, OutputFile::Unfinished::Vanishes);
+    const auto cannotWrite = [&](const char *what) {
+        return Tracer::fail(
+            QString("Cannot %1 '%2': %3").arg(what, arguments.output, file.errorString()));
+    };
     if (!arguments.output.isEmpty()) {
         if (!mayWrite(console, arguments.output, arguments.force)) {
             return console.failed();
         }
-        // Opened with the first bytes, so that a source that can't be read leaves nothing behind.
-        sink = [&file](const QByteArray &bytes) {
-            if (!file.isOpen() && !file.open(QIODevice::WriteOnly)) {
-                return Tracer::fail("Cannot open '" + file.fileName() + "': " + file.errorString());
+        // Opened with the first bytes, so that a source that can't be read touches nothing.
+        sink = [&](const QByteArray &bytes) {
+            if (!file.isOpen() && !file.open()) {
+                return cannotWrite("open");
             }
-            return file.write(bytes) == bytes.size() ||
-                   Tracer::fail("Cannot write '" + file.fileName() + "': " + file.errorString());
+            return file.write(bytes) || cannotWrite("write");
         };
     }
     DumpJob job(arguments.range, static_cast<DumpFormat>(arguments.format), sink);
     exitCode = console.run(job);
-    if (exitCode == ExitDone && file.isOpen() && !file.flush()) {
-        console.error("Cannot write '" + file.fileName() + "': " + file.errorString());
+    if (exitCode == ExitDone && file.isOpen() && !file.commit()) {
+        static_cast<void>(cannotWrite("write"));
         exitCode = console.failed();
-    }
-    // Nothing in a dump tells a cut one from a whole one.
-    if (exitCode != ExitDone && file.isOpen() && QFileInfo(file).isFile()) {
-        file.remove();
     }
     return exitCode;
 }

@@ -4,11 +4,12 @@
 #include "RangeArguments.h"
 #include "commands.h"
 
+#include "base/OutputFile.h"
 #include "base/ProgressClock.h"
 #include "display/renderplot.h"
 #include "jobs/SampleReadJob.h"
 
-#include <QImageWriter>
+#include <QBuffer>
 #include <QRegularExpression>
 
 #include <atomic>
@@ -85,9 +86,13 @@ protected:
         if (picture.isNull()) {
             return false;
         }
-        QImageWriter writer(m_arguments.output, "png");
-        return writer.write(picture) ||
-               Tracer::fail("Cannot write '" + m_arguments.output + "': " + writer.errorString());
+        QBuffer png;
+        if (!picture.save(&png, "PNG")) {
+            return Tracer::fail("Cannot make the picture for '" + m_arguments.output + "'.");
+        }
+        OutputFile file(m_arguments.output, OutputFile::Unfinished::Vanishes);
+        return (file.open() && file.write(png.data()) && file.commit()) ||
+               Tracer::fail("Cannot write '" + m_arguments.output + "': " + file.errorString());
     }
 
 private:
@@ -140,8 +145,6 @@ void addPlotCommand(CommandSet &commands)
     addChoice(command, "--view", plot->view, plotViewNames(), "What to show (default: iq)");
     addSize(command, plot->size);
     command.add_flag("--markers", plot->markers, "Show the marker rows, in the views over time");
-    addText(command, "-o,--output", plot->output, "Picture to write, PNG")
-        ->type_name("FILE")
-        ->required();
+    addOutputFile(command, plot->output, "Picture to write, PNG")->required();
     command.add_flag("--force", plot->force, "Overwrite an existing file");
 }

@@ -46,6 +46,25 @@ QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
         .arg(QString::fromLocal8Bit(unknown.front()));
 }
 
+/// The arguments, last one first, as the parser takes them. Where several files may stand it takes
+/// a name in brackets for a list of names.
+std::vector<std::string> argumentsOf(int argc, char **argv)
+{
+    std::vector<std::string> arguments(argv + std::min(argc, 1), argv + argc);
+    const auto command =
+        std::find_if(arguments.begin(), arguments.end(),
+                     [](const std::string &argument) { return !argument.starts_with('-'); });
+    if (command != arguments.end() && *command == "info") {
+        std::for_each(command, arguments.end(), [](std::string &argument) {
+            if (argument.starts_with('[')) {
+                argument.insert(0, "./");
+            }
+        });
+    }
+    std::reverse(arguments.begin(), arguments.end());
+    return arguments;
+}
+
 int run(int argc, char **argv)
 {
     Console::reserveStandardStreams();
@@ -76,7 +95,7 @@ int run(int argc, char **argv)
     addImportCommands(commands);
     addInstrumentCommands(commands);
     try {
-        app.parse(argc, argv);
+        app.parse(argumentsOf(argc, argv));
     } catch (const CLI::ParseError &problem) {
         // The library's own codes tell only help and version, which are no errors, from the rest.
         if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {

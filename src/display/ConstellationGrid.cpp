@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ConstellationGrid.h"
 
-#include "vectorstate.h"
+#include "base/vectorstate.h"
 
 #include <algorithm>
 #include <cmath>

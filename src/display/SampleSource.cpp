@@ -7,16 +7,6 @@
 #include <algorithm>
 #include <utility>
 
-namespace {
-
-bool fail(const char *message)
-{
-    Tracer::Trace(Tracer::Error, message);
-    return false;
-}
-
-} // namespace
-
 MemorySource::MemorySource(std::span<const IqSample> samples, std::span<const quint8> markers,
                            qint64 first)
     : m_samples(samples)
@@ -34,7 +24,7 @@ bool MemorySource::restart()
 bool MemorySource::next(std::span<IqSample> samples, std::span<quint8> markers)
 {
     if (samples.size() > m_samples.size() - m_done) {
-        return fail("Internal error. Invalid buffer length.");
+        return Tracer::fail("Internal error. Invalid buffer length.");
     }
     std::copy_n(m_samples.begin() + static_cast<std::ptrdiff_t>(m_done), samples.size(),
                 samples.begin());
@@ -58,10 +48,10 @@ StreamSource::StreamSource(BufferedIO &data, BufferedIO &markers, qint64 first, 
 bool StreamSource::restart()
 {
     if (!m_data.restartAtPosition(BufferedIO::HeaderSize + BufferedIO::RecordSize * m_first)) {
-        return fail("Cannot read I/Q data from temporary file.");
+        return Tracer::fail("Cannot read I/Q data from temporary file.");
     }
     if (!m_markers.restartAtPosition(m_first)) {
-        return fail("Cannot read marker data from temporary file.");
+        return Tracer::fail("Cannot read marker data from temporary file.");
     }
     m_done = 0;
     return true;
@@ -74,14 +64,14 @@ bool StreamSource::next(std::span<IqSample> samples, std::span<quint8> markers)
     }
     m_block.resize(2 * samples.size());
     if (readSamples(m_data, m_block) != static_cast<int>(samples.size())) {
-        return fail("Cannot read I/Q data from temporary file.");
+        return Tracer::fail("Cannot read I/Q data from temporary file.");
     }
     for (std::size_t k = 0; k < samples.size(); ++k) {
         samples[k] = {m_block[2 * k], m_block[2 * k + 1]};
     }
     const int markerCount = static_cast<int>(markers.size());
     if (m_markers.readBlock(markerCount, markers.data()) != markerCount) {
-        return fail("Cannot read marker data from temporary file.");
+        return Tracer::fail("Cannot read marker data from temporary file.");
     }
     m_done += static_cast<qint64>(samples.size());
     return true;

@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "SpectrumLines.h"
 
-#include "vectorstate.h"
-
 #include "base/parallel.h"
+#include "base/vectorstate.h"
 #include "dsp/fft.h"
 #include "dsp/windows.h"
 #include "plotscale.h"

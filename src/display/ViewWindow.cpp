@@ -8,16 +8,6 @@
 #include <algorithm>
 #include <new>
 
-namespace {
-
-bool fail(const char *message)
-{
-    Tracer::Trace(Tracer::Error, message);
-    return false;
-}
-
-} // namespace
-
 void ViewWindow::setSource(BufferedIO *data, BufferedIO *markers, qint64 sampleCount)
 {
     m_data = data;
@@ -38,13 +28,13 @@ void ViewWindow::invalidate()
 bool ViewWindow::isShowable(qint64 first) const
 {
     if (m_data == nullptr || m_markerStream == nullptr) {
-        return fail("Internal errors: Buffers not available.");
+        return Tracer::fail("Internal errors: Buffers not available.");
     }
     if (m_points == 0) {
-        return fail("No number of display points.");
+        return Tracer::fail("No number of display points.");
     }
     if (first < 0 || first >= m_sampleCount) {
-        return fail("Invalid start sample.");
+        return Tracer::fail("Invalid start sample.");
     }
     return first + m_points <= m_sampleCount;
 }
@@ -98,7 +88,7 @@ bool ViewWindow::slide(qint64 first)
     }
     m_heldFirst = first;
     if (m_samples.size() != m_points || m_markers.size() != m_points) {
-        return fail("Internal error. Invalid buffer length.");
+        return Tracer::fail("Internal error. Invalid buffer length.");
     }
     return true;
 }
@@ -113,7 +103,7 @@ bool ViewWindow::read(const Range &range, IqList &samples, QList<quint8> &marker
             return false;
         }
     } catch (const std::bad_alloc &) {
-        return fail("Cannot create memory buffer.");
+        return Tracer::fail("Cannot create memory buffer.");
     }
     const auto offset = static_cast<std::size_t>(range.from - m_page.from);
     for (qint64 k = 0; k < range.count; ++k) {
@@ -142,7 +132,7 @@ bool ViewWindow::loadPage(const Range &range)
     const qint64 dataCount = m_data->restartAtPosition(start) ? readSamples(*m_data, m_page.iq) : 0;
     if (dataCount < wanted) {
         m_page = {};
-        return fail("Cannot read I/Q data from temporary file.");
+        return Tracer::fail("Cannot read I/Q data from temporary file.");
     }
     const qint64 markerCount =
         m_markerStream->restartAtPosition(m_page.from)
@@ -150,7 +140,7 @@ bool ViewWindow::loadPage(const Range &range)
             : 0;
     if (markerCount < wanted) {
         m_page = {};
-        return fail("Cannot read marker data from temporary file.");
+        return Tracer::fail("Cannot read marker data from temporary file.");
     }
     m_page.markers.resize(static_cast<std::size_t>(std::min(dataCount, markerCount)));
     return true;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "plotdraw.h"
 
-#include "vectorstate.h"
+#include "base/vectorstate.h"
 
 #include <QFontMetricsF>
 #include <QPaintDevice>

@@ -2,13 +2,13 @@
 #include "plotexport.h"
 
 #include "SpectrumPainter.h"
+#include "base/OutputFile.h"
 #include "log/Tracer.h"
 
 #include <QBuffer>
 #include <QFileInfo>
 #include <QImage>
 #include <QPainter>
-#include <QSaveFile>
 #include <QSvgGenerator>
 #include <QTextStream>
 
@@ -18,9 +18,8 @@ constexpr int SampleDigits = 9; ///< a 32-bit float comes back unchanged
 
 bool writeFile(const QString &fileName, const QByteArray &bytes)
 {
-    // Replaces the file only when all bytes are there.
-    QSaveFile file(fileName);
-    if (file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size() && file.commit()) {
+    OutputFile file(fileName, OutputFile::Unfinished::Vanishes);
+    if (file.open() && file.write(bytes) && file.commit()) {
         return true;
     }
     Tracer::Trace(Tracer::Error,

@@ -5,8 +5,8 @@
 #include "SpectrumPainter.h"
 #include "TracePainter.h"
 #include "base/parallel.h"
+#include "base/vectorstate.h"
 #include "plotdraw.h"
-#include "vectorstate.h"
 #include "waterfall.h"
 
 #include <QPainter>

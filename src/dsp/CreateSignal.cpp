@@ -22,12 +22,6 @@ namespace {
 /// Shorter periods are repeated up to the smallest memory block of an instrument.
 constexpr int MinStreamSamples = 512;
 
-[[nodiscard]] bool fail(const char *text)
-{
-    Tracer::Trace(Tracer::Error, text);
-    return false;
-}
-
 /// Converts to the records of a stream and takes the level, sample by sample: the order of a sum is
 /// a part of its result.
 CORVANE_VECTOR_CLONES void packSamples(const double *inPhase, const double *quadrature,
@@ -81,7 +75,7 @@ public:
         m_owner.m_rms = level.sum;
         m_owner.m_samplesWritten += count;
         return writeSamples(*m_owner.m_output, std::span(m_packed).first(2 * used)) ||
-               fail("*** Cannot write to output file.");
+               Tracer::fail("*** Cannot write to output file.");
     }
 
 private:
@@ -236,14 +230,14 @@ bool CreateSignal::generate()
 {
     m_cancelled = false;
     if (m_output == nullptr) {
-        return fail("*** No output device set.");
+        return Tracer::fail("*** No output device set.");
     }
     if (!m_configured) {
-        return fail("*** Waveform not yet configured.");
+        return Tracer::fail("*** Waveform not yet configured.");
     }
     m_generated = false;
     if (!m_output->writeHeader("IQF")) {
-        return fail("*** Cannot write to output file.");
+        return Tracer::fail("*** Cannot write to output file.");
     }
     if (m_seed) {
         std::srand(*m_seed);
@@ -270,7 +264,7 @@ bool CreateSignal::writeSignal(SignalGenerator &generator)
             const int count = std::min(samples - first, generator.blockSize());
             const double done = static_cast<double>(pass) * MinStreamSamples + first;
             if (clock.shouldStop(static_cast<int>(done * 100.0 / total)) || m_cancelled) {
-                return fail("*** User break.");
+                return Tracer::fail("*** User break.");
             }
             if (!writer.write(first, count)) {
                 return false;
@@ -287,7 +281,7 @@ bool CreateSignal::limitBand()
 {
     TempStream filtered;
     if (!filtered.open()) {
-        return fail("*** Cannot create temporary data buffer.");
+        return Tracer::fail("*** Cannot create temporary data buffer.");
     }
     const int samples = m_fit.samples;
     m_bandLimit->setFilterFrequency(m_fit.clock, m_noise.bandwidth * 0.5);
@@ -300,20 +294,20 @@ bool CreateSignal::limitBand()
     m_peak = 1 / std::pow(10.0, m_bandLimit->peakOffset() / 20);
     m_rms = 1 / std::pow(10.0, m_bandLimit->rmsOffset() / 20);
     if (!m_output->writeHeader("IQF")) {
-        return fail("*** Cannot write to output file.");
+        return Tracer::fail("*** Cannot write to output file.");
     }
     if (!filtered->checkHeader("IQF")) {
-        return fail("*** Cannot read the filtered noise.");
+        return Tracer::fail("*** Cannot read the filtered noise.");
     }
     std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
     for (int done = 0; done < samples; done += StreamBlockSamples) {
         const int count = std::min(samples - done, StreamBlockSamples);
         const std::span<float> iq = std::span(block).first(floatsOf(count));
         if (readSamples(*filtered.stream(), iq) < count) {
-            return fail("*** Cannot read the filtered noise.");
+            return Tracer::fail("*** Cannot read the filtered noise.");
         }
         if (!writeSamples(*m_output, iq)) {
-            return fail("*** Cannot write to output file.");
+            return Tracer::fail("*** Cannot write to output file.");
         }
     }
     return true;

@@ -13,15 +13,9 @@ namespace {
 /// Block of the sliding window that error messages speak of.
 constexpr qint64 NominalBlock = 5000;
 
-[[nodiscard]] bool fail(const QString &text)
-{
-    Tracer::Trace(Tracer::Error, text);
-    return false;
-}
-
 [[nodiscard]] bool failAt(qint64 sample)
 {
-    return fail(QString("*** Reading failed for sample %1.").arg(sample));
+    return Tracer::fail(QString("*** Reading failed for sample %1.").arg(sample));
 }
 
 } // namespace
@@ -47,7 +41,7 @@ bool LoopedInput::open()
     const int tailCount =
         positioned ? readSamples(m_stream, std::span(m_tail).last(floatsOf(filled))) : 0;
     if (!m_stream.checkHeader("IQF")) {
-        return fail("*** Cannot reset read buffer.");
+        return Tracer::fail("*** Cannot reset read buffer.");
     }
     Tracer::Trace(Tracer::Information, "Buffering waveform head...");
     const int headCount = readSamples(m_stream, std::span(m_head).first(floatsOf(filled)));
@@ -56,7 +50,7 @@ bool LoopedInput::open()
     }
     Tracer::Trace(Tracer::Information, "Buffering waveform tail...");
     if (!positioned) {
-        return fail("*** Cannot set read buffer position.");
+        return Tracer::fail("*** Cannot set read buffer position.");
     }
     return tailCount == filled || failAt(tailStart + tailCount);
 }
@@ -65,10 +59,10 @@ bool LoopedInput::failReading(qint64 sample) const
 {
     const qint64 stride = NominalBlock - m_filterLength;
     const qint64 moves = sample < NominalBlock ? 0 : (sample - NominalBlock) / stride + 1;
-    return fail(QString("*** Reading data failed for sample %1 (block %2-%3)")
-                    .arg(sample)
-                    .arg(moves * stride)
-                    .arg(sample));
+    return Tracer::fail(QString("*** Reading data failed for sample %1 (block %2-%3)")
+                            .arg(sample)
+                            .arg(moves * stride)
+                            .arg(sample));
 }
 
 void LoopedInput::copyWrapped(Window &window, qint64 index) const

@@ -32,12 +32,6 @@ constexpr qint64 PartsPerBlock = 24;
 /// Samples of the input window that a block may need.
 constexpr qint64 MaxBlockInput = 512LL * 1024;
 
-[[nodiscard]] bool fail(const QString &text)
-{
-    Tracer::Trace(Tracer::Error, text);
-    return false;
-}
-
 double offsetOf(double level)
 {
     return 20 * std::log10(1 / (level + 1e-12));
@@ -60,9 +54,9 @@ public:
             return true;
         }
         if (!m_input->restartAtBegining()) {
-            return fail("*** Cannot read marker data.");
+            return Tracer::fail("*** Cannot read marker data.");
         }
-        return m_output->restartAtBegining() || fail("*** Cannot write marker output.");
+        return m_output->restartAtBegining() || Tracer::fail("*** Cannot write marker output.");
     }
 
     [[nodiscard]] bool copy(qint64 begin, qint64 end)
@@ -75,7 +69,7 @@ public:
         m_bytes.resize(static_cast<std::size_t>(missing) + 1);
         m_bytes[0] = m_kept;
         if (missing > 0 && m_input->readBlock(missing, m_bytes.data() + 1) != missing) {
-            return fail("*** Cannot read marker data.");
+            return Tracer::fail("*** Cannot read marker data.");
         }
         m_result.resize(static_cast<std::size_t>(end - begin));
         for (qint64 n = begin; n < end; ++n) {
@@ -86,7 +80,7 @@ public:
         m_kept = m_bytes.back();
         m_position = last;
         return m_output->writeBytes(static_cast<int>(m_result.size()), m_result.data()) ||
-               fail("*** Cannot write marker output.");
+               Tracer::fail("*** Cannot write marker output.");
     }
 
 private:
@@ -142,7 +136,7 @@ public:
             return false;
         }
         if (!m_owner.m_output->writeHeader("IQF")) {
-            return fail("*** Cannot write header.");
+            return Tracer::fail("*** Cannot write header.");
         }
         Tracer::Trace(Tracer::Information, "Resampling...");
         if (!m_markers.open()) {
@@ -158,7 +152,7 @@ public:
         }
         while (!current.isEmpty()) {
             if (clock.shouldStop(percentOf(current.begin, m_outputCount))) {
-                return fail("*** Action aborted by user.");
+                return Tracer::fail("*** Action aborted by user.");
             }
             current.result.resize(2 * current.count());
             current.levels.resize(current.partCount());
@@ -227,7 +221,7 @@ private:
             return true;
         }
         if (missesInput(block.begin, block.end)) {
-            return fail("*** Missed input sample.");
+            return Tracer::fail("*** Missed input sample.");
         }
         const TapRange last = m_geometry.taps(block.end - 1);
         if (!m_input.advance(m_geometry.taps(block.begin).first, last.first + last.count,
@@ -260,7 +254,7 @@ private:
             m_level.sum += level.sum;
         }
         if (!writeSamples(*m_owner.m_output, block.result)) {
-            return fail("*** Cannot write output data.");
+            return Tracer::fail("*** Cannot write output data.");
         }
         return m_markers.copy(block.begin, block.end);
     }
@@ -340,15 +334,15 @@ bool Resample::run()
     const auto inputCount = static_cast<std::int32_t>(m_inputSamples);
     const auto outputCount = static_cast<std::int32_t>(m_outputSamples);
     if (inputCount < 1 || outputCount < 1) {
-        return fail("*** Invalid input or output data length.");
+        return Tracer::fail("*** Invalid input or output data length.");
     }
     if (m_input == nullptr || m_output == nullptr || m_input == m_output) {
-        return fail("*** Invalid data buffer.");
+        return Tracer::fail("*** Invalid data buffer.");
     }
     if (m_tableSettings != m_settings) {
         m_tableSettings.reset();
         if (!buildFilterTable(m_settings, m_table)) {
-            return fail("*** Cannot create filter function.");
+            return Tracer::fail("*** Cannot create filter function.");
         }
         m_tableSettings = m_settings;
     }

@@ -19,15 +19,10 @@ namespace {
 
 constexpr double Circle = 2 * std::numbers::pi;
 
-[[nodiscard]] bool fail(const QString &text)
-{
-    Tracer::Trace(Tracer::Error, text);
-    return false;
-}
-
 [[nodiscard]] bool failAtSample(const char *what, qint64 sample)
 {
-    return fail(QString("*** %1 failed for sample %2.").arg(QLatin1String(what)).arg(sample));
+    return Tracer::fail(
+        QString("*** %1 failed for sample %2.").arg(QLatin1String(what)).arg(sample));
 }
 
 /// The first sample of a block from `first` on that a failed write has lost: blocks reach the
@@ -92,7 +87,7 @@ template <typename Work>
     std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
     for (int done = 0; done < samples;) {
         if (clock.shouldStop(percentOf(done, samples))) {
-            return fail("*** Action aborted by user.");
+            return Tracer::fail("*** Action aborted by user.");
         }
         const int count = std::min(samples - done, StreamBlockSamples);
         const int got = readSamples(stream, std::span(block).first(floatsOf(count)));
@@ -113,16 +108,16 @@ bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork
 {
     m_cancelled = false;
     if (samples < 1) {
-        return fail("*** Invalid input data length.");
+        return Tracer::fail("*** Invalid input data length.");
     }
     if (stream == nullptr) {
-        return fail("*** Invalid data buffer.");
+        return Tracer::fail("*** Invalid data buffer.");
     }
     if (!stream->checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
+        return Tracer::fail("*** Cannot validate data stream header.");
     }
     if (!stream->writeBytes(BufferedIO::HeaderSize, "IQF")) {
-        return fail("*** Cannot write to data buffer.");
+        return Tracer::fail("*** Cannot write to data buffer.");
     }
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
     return forEachBlock(*stream, samples, clock, [&](std::span<float> iq, qint64 first) {
@@ -135,7 +130,7 @@ bool Resample::rescale(int samples, double factor, BufferedIO *stream)
 {
     const auto gain = static_cast<float>(factor);
     if (!std::isfinite(gain)) {
-        return fail(QString("*** Invalid scaling factor %1.").arg(factor));
+        return Tracer::fail(QString("*** Invalid scaling factor %1.").arg(factor));
     }
     return transformInPlace(samples, stream, [gain](std::span<float> iq) { scale(iq, gain); });
 }
@@ -146,9 +141,9 @@ bool Resample::frequencyShift(int samples, double frequency, double clock, Buffe
     // An angle that large has no fraction of a circle left.
     constexpr double MaxAngle = 1e15;
     if (!(std::abs(step) * std::max(samples, 1) <= MaxAngle)) {
-        return fail(QString("*** Invalid frequency shift of %1 Hz at a clock of %2 Hz.")
-                        .arg(frequency)
-                        .arg(clock));
+        return Tracer::fail(QString("*** Invalid frequency shift of %1 Hz at a clock of %2 Hz.")
+                                .arg(frequency)
+                                .arg(clock));
     }
     double angle = 0.0;
     std::vector<double> angles(StreamBlockSamples);
@@ -173,7 +168,7 @@ bool Resample::frequencyShift(int samples, double frequency, double clock, Buffe
     if (!transformInPlace(samples, stream, turn)) {
         return false;
     }
-    return stream->restartAtBegining() || fail("*** Cannot write to data buffer.");
+    return stream->restartAtBegining() || Tracer::fail("*** Cannot write to data buffer.");
 }
 
 bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, BufferedIO *amplitude,
@@ -181,28 +176,29 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
 {
     m_cancelled = false;
     if (samples < 1) {
-        return fail("*** Invalid input data length.");
+        return Tracer::fail("*** Invalid input data length.");
     }
     if (source == nullptr || phase == nullptr || amplitude == nullptr) {
-        return fail("*** Invalid data buffer.");
+        return Tracer::fail("*** Invalid data buffer.");
     }
     if (!std::isfinite(offset) || !std::isfinite(gain)) {
-        return fail(QString("*** Invalid amplitude offset %1 or gain %2.").arg(offset).arg(gain));
+        return Tracer::fail(
+            QString("*** Invalid amplitude offset %1 or gain %2.").arg(offset).arg(gain));
     }
     if (!source->checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
+        return Tracer::fail("*** Cannot validate data stream header.");
     }
     if (!phase->restartAtBegining()) {
-        return fail("*** Cannot setup phase output buffer.");
+        return Tracer::fail("*** Cannot setup phase output buffer.");
     }
     if (!amplitude->restartAtBegining()) {
-        return fail("*** Cannot setup amplitude output buffer.");
+        return Tracer::fail("*** Cannot setup amplitude output buffer.");
     }
     if (!phase->writeBytes(BufferedIO::HeaderSize, "IQF")) {
-        return fail("*** Cannot write to phase data buffer.");
+        return Tracer::fail("*** Cannot write to phase data buffer.");
     }
     if (!amplitude->writeBytes(BufferedIO::HeaderSize, "IQF")) {
-        return fail("*** Cannot write to amplitude data buffer.");
+        return Tracer::fail("*** Cannot write to amplitude data buffer.");
     }
     std::vector<float> phaseBlock(floatsOf(StreamBlockSamples));
     std::vector<float> amplitudeBlock(floatsOf(StreamBlockSamples));
@@ -223,13 +219,13 @@ bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double 
 {
     m_cancelled = false;
     if (stream == nullptr || peak == nullptr || rms == nullptr) {
-        return fail("*** Invalid input arguments.");
+        return Tracer::fail("*** Invalid input arguments.");
     }
     if (samples < 1) {
-        return fail("*** Invalid input data length.");
+        return Tracer::fail("*** Invalid input data length.");
     }
     if (!stream->checkHeader("IQF")) {
-        return fail("*** Cannot validate data stream header.");
+        return Tracer::fail("*** Cannot validate data stream header.");
     }
     SquareLevel level;
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);

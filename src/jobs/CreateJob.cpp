@@ -108,8 +108,8 @@ bool CreateJob::save(TempStream &data)
     job.peakOffset = offsetDb(facts().peak);
     job.rmsOffset = request().zeroCrest ? job.peakOffset : offsetDb(facts().rms);
     job.levelsValid = true;
-    job.comment = stripBraces(request().output.comment.value_or(QString()));
-    job.copyright = stripBraces(request().output.copyright.value_or(QString()));
+    job.comment = tagText("comment", request().output.comment.value_or(QString()));
+    job.copyright = tagText("copyright", request().output.copyright.value_or(QString()));
 
     emit report(stepLine("Signal statistics"));
     QStringList lines =

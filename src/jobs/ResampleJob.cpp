@@ -131,8 +131,9 @@ bool ResampleJob::rescale()
     m_result.clock = m_request.target.clockHz;
     m_result.markerClock = m_result.clock;
     m_result.rmsOffset = m_runRmsOffset - change;
-    m_result.comment = stripBraces(m_request.output.comment.value_or(m_result.comment));
-    m_result.copyright = stripBraces(m_request.output.copyright.value_or(m_result.copyright));
+    m_result.comment = tagText("comment", m_request.output.comment.value_or(m_result.comment));
+    m_result.copyright =
+        tagText("copyright", m_request.output.copyright.value_or(m_result.copyright));
     return true;
 }
 

@@ -4,6 +4,8 @@
 #include "QtProgressWidget.h"
 #include "pictures.h"
 
+#include "base/vectorstate.h"
+
 #include <QApplication>
 #include <QCloseEvent>
 #include <QHBoxLayout>
@@ -122,6 +124,7 @@ void QtProgressDialog::setValue(int percent)
         appear();
     }
     QCoreApplication::processEvents();
+    clearVectorState();
     m_sinceTick.start();
     m_inTick = false;
 }

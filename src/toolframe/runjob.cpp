@@ -2,6 +2,7 @@
 #include "runjob.h"
 
 #include "QtProgressDialog.h"
+#include "base/vectorstate.h"
 #include "jobs/ToolJob.h"
 
 #include <QScrollBar>
@@ -17,6 +18,7 @@ JobOutcome runJob(ToolJob &job, QWidget *parent, QTextEdit *report)
         QObject::connect(&job, &ToolJob::report, report,
                          [report](const QString &html) { appendReport(*report, html); });
     }
+    clearVectorState();
     const bool done = job.run();
     if (report) {
         QObject::disconnect(&job, &ToolJob::report, report, nullptr);

@@ -19,8 +19,6 @@
 
 namespace {
 
-constexpr int playIntervalMs = 50;
-
 QString noValue()
 {
     return "---";
@@ -38,7 +36,6 @@ DlgView::DlgView(QWidget *parent)
                                  "Lin Mag Average", "Phase", "Frequency"});
     m_ui->cb_SpectrumMode->addItems({"Spectrum", "Waterfall"});
     m_ui->w_iqtrace->setShowMarkers(true);
-    m_playTimer.setInterval(playIntervalMs);
     connect(&m_playTimer, &QTimer::timeout, this, &DlgView::slot_playstep);
     connect(m_ui->cb_ViewMode, &QComboBox::currentIndexChanged, this, &DlgView::slot_view_mode);
     connect(m_ui->cb_SpectrumMode, &QComboBox::currentIndexChanged, this,
@@ -82,12 +79,13 @@ void DlgView::connectButtons()
 
 bool DlgView::startModule(const QString &path)
 {
-    unload();
+    slot_stop();
     auto source = std::make_unique<SourceWaveform>();
     LoadJob job(path, *source);
     if (runJob(job, this, nullptr) != JobOutcome::Finished) {
         return false;
     }
+    unload();
     m_source = std::move(source);
     const WvFileInfo &info = m_source->info();
     m_clockHz = info.clock;
@@ -97,7 +95,6 @@ bool DlgView::startModule(const QString &path)
     m_ui->w_timeline->setWaveform(info.samples, m_clockHz);
     setWindowTitle(tr("View Waveform") + " - " + QFileInfo(path).fileName());
     showFile();
-    m_playTimer.setInterval(playIntervalMs);
     if (!m_window.show(0)) {
         unload();
         return false;
@@ -159,6 +156,8 @@ void DlgView::unload()
     m_ui->w_spectrum->clear();
     m_ui->w_constellation->clear();
     m_ui->w_timeline->setWaveform(0, 0);
+    m_ui->w_timeline->setCursor(1, m_cursor);
+    m_ui->w_timeline->setCursor(2, m_reference);
 }
 
 void DlgView::moveTo(qint64 first)
@@ -216,7 +215,8 @@ void DlgView::slot_move_end()
 void DlgView::slot_play()
 {
     if (m_source) {
-        m_playTimer.start();
+        m_playInterval.reset();
+        m_playTimer.start(m_playInterval.milliseconds());
     }
 }
 
@@ -229,17 +229,14 @@ void DlgView::slot_playstep()
 {
     QElapsedTimer timer;
     timer.start();
-    const qint64 next = m_window.first() + m_window.playStep();
-    if (next > m_window.end() || !m_window.show(next)) {
+    const qint64 next = m_window.playTarget();
+    if (next == m_window.first() || !m_window.show(next)) {
         slot_stop();
         return;
     }
     refresh();
-    // A tick that takes longer than the interval would leave no time for the user's clicks.
-    const int spent = static_cast<int>(timer.elapsed());
-    if (spent > m_playTimer.interval()) {
-        m_playTimer.setInterval(2 * spent);
-        Tracer::Trace(Tracer::Information, "Play interval adjusted.");
+    if (m_playInterval.fit(timer.elapsed())) {
+        m_playTimer.setInterval(m_playInterval.milliseconds());
     }
 }
 

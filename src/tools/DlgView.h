@@ -3,6 +3,7 @@
 
 #include "toolframe/DlgBase.h"
 
+#include "display/PlayInterval.h"
 #include "display/ViewWindow.h"
 
 #include <QTimer>
@@ -82,6 +83,7 @@ private:
     std::unique_ptr<SourceWaveform> m_source;
     ViewWindow m_window;
     QTimer m_playTimer;
+    PlayInterval m_playInterval;
     double m_clockHz = 0;
     qint64 m_cursor = -1;    ///< measuring cursor, sample of the file, -1 for none
     qint64 m_reference = -1; ///< reference cursor

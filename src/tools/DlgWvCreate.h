@@ -5,12 +5,9 @@
 
 #include "jobs/CreateRequest.h"
 
-#include <map>
 #include <memory>
 
-class QCheckBox;
-class QComboBox;
-class QFormLayout;
+class CreateTypePages;
 class QtNumericEdit;
 
 namespace Ui {
@@ -53,10 +50,6 @@ private slots:
     void slot_prev();
 
 private:
-    void makeTypePages();
-    QFormLayout *pageLayout(QWidget *page, const QString &title);
-    QtNumericEdit *addField(QFormLayout *layout, const QString &label, const CreateField &field);
-    void setUpField(QtNumericEdit &edit, const CreateField &field);
     void setUpResult(QtNumericEdit &edit, const QString &name, const QString &unit, double max);
     [[nodiscard]] CreateKind kind() const;
     [[nodiscard]] int typePage() const;
@@ -65,9 +58,5 @@ private:
     void showPage(int page);
 
     std::unique_ptr<Ui::DlgWvCreate> m_ui;
-    std::map<const CreateField *, QtNumericEdit *> m_fields;
-    QCheckBox *m_oversampling = nullptr;
-    QCheckBox *m_randomPhase = nullptr;
-    QComboBox *m_pulseRamp = nullptr;
-    QComboBox *m_chirpRamp = nullptr;
+    std::unique_ptr<CreateTypePages> m_pages;
 };

@@ -6,7 +6,9 @@
 #include "WvScanner.h"
 #include "WvWriter.h"
 
+#include "base/OutputFile.h"
 #include "base/ProgressClock.h"
+#include "base/vectorstate.h"
 #include "log/Tracer.h"
 
 #include <QCoreApplication>
@@ -79,6 +81,7 @@ bool HvFileIO::readWaveform(WvFileInfo *info)
     }
     emit ProgressUpdate(100);
     QCoreApplication::processEvents();
+    clearVectorState();
     if (!info->dataStream->restartAtBegining() || !info->markerStream->restartAtBegining()) {
         return Tracer::fail("Writing to temporary data storage failed.");
     }
@@ -120,11 +123,19 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
     WvWriter writer(job, {.data = dataStream, .markers = markerStream, .tags = tagsStream},
                     progress, report);
     writer.prepareLevels();
-    QFile file(fileName);
-    if (!file.open(QIODevice::WriteOnly | QIODevice::Truncate | QIODevice::Unbuffered)) {
+    OutputFile file(fileName, OutputFile::Unfinished::Stays);
+    if (!file.open()) {
         return Tracer::fail("Error opening output file.");
     }
-    return writer.write(file);
+    if (!writer.write(file)) {
+        return false;
+    }
+    if (!file.commit()) {
+        return Tracer::fail("Error writing output file: " + file.errorString());
+    }
+    emit ProgressUpdate(100);
+    Tracer::Trace(Tracer::Information, "Waveform file generated.");
+    return true;
 }
 
 bool HvFileIO::readWaveformInfo(const QString &fileName, WvFileSummary *summary)

@@ -4,11 +4,11 @@
 #include "BufferedIO.h"
 #include "SampleCoding.h"
 
+#include "base/OutputFile.h"
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
 
 #include <QDateTime>
-#include <QIODevice>
 
 #include <algorithm>
 #include <array>
@@ -116,38 +116,24 @@ void WvWriter::prepareLevels()
     info("=======================================");
 }
 
-bool WvWriter::put(QIODevice &device, std::span<const char> bytes)
+bool WvWriter::put(OutputFile &file, std::span<const char> bytes)
 {
-    // On a full disk the part that still fits is written without an error; the next write tells the
-    // reason.
-    while (!bytes.empty()) {
-        const qint64 written = device.write(bytes.data(), static_cast<qint64>(bytes.size()));
-        if (written <= 0) {
-            return Tracer::fail("Error writing output file: " + device.errorString());
-        }
-        bytes = bytes.subspan(static_cast<size_t>(written));
-    }
-    return true;
+    return file.write(bytes) || Tracer::fail("Error writing output file: " + file.errorString());
 }
 
-bool WvWriter::write(QIODevice &device)
+bool WvWriter::write(OutputFile &file)
 {
     m_report(10);
-    if (!writeTags(device) || !copyTagsStream(device) || !writeMarkers(device)) {
+    if (!writeTags(file) || !copyTagsStream(file) || !writeMarkers(file)) {
         return false;
     }
     m_report(50);
     const auto blockBytes = 4 * static_cast<qint64>(m_job.samples) + 1;
-    if (!put(device, "{WAVEFORM-" + QByteArray::number(blockBytes) + ": #") ||
-        !writeSamples(device) || !put(device, QByteArray("}"))) {
-        return false;
-    }
-    m_report(100);
-    Tracer::Trace(Tracer::Information, "Waveform file generated.");
-    return true;
+    return put(file, "{WAVEFORM-" + QByteArray::number(blockBytes) + ": #") && writeSamples(file) &&
+           put(file, QByteArray("}"));
 }
 
-bool WvWriter::writeTags(QIODevice &device)
+bool WvWriter::writeTags(OutputFile &file)
 {
     QString text = QString("{TYPE: %1,0}").arg(typeName(m_job.type));
     if (!m_job.comment.isEmpty()) {
@@ -161,10 +147,10 @@ bool WvWriter::writeTags(QIODevice &device)
     text += QString::asprintf("{CLOCK MARKER:%f}", m_job.markerClock);
     text += QString::asprintf("{LEVEL OFFS:%f,%f}", m_job.rmsOffset, m_job.peakOffset);
     text += QString("{SAMPLES:%1}").arg(m_job.samples);
-    return put(device, text.toLatin1());
+    return put(file, text.toLatin1());
 }
 
-bool WvWriter::copyTagsStream(QIODevice &device)
+bool WvWriter::copyTagsStream(OutputFile &file)
 {
     if (m_streams.tags == nullptr) {
         return true;
@@ -183,13 +169,13 @@ bool WvWriter::copyTagsStream(QIODevice &device)
         if (got <= 0) {
             return got == 0 || warn();
         }
-        if (!put(device, std::span(block).first(static_cast<size_t>(got)))) {
+        if (!put(file, std::span(block).first(static_cast<size_t>(got)))) {
             return false;
         }
     }
 }
 
-bool WvWriter::writeMarkers(QIODevice &device)
+bool WvWriter::writeMarkers(OutputFile &file)
 {
     if (!m_markersFromMemory && !m_markersFromStream) {
         return true;
@@ -198,18 +184,18 @@ bool WvWriter::writeMarkers(QIODevice &device)
                   m_markersFromMemory ? "Creating marker trace from memory buffer..."
                                       : "Creating marker trace from temporary marker file ...");
     const QString format = m_markersFromMemory ? "{CONTROL LENGTH:%1}" : "{CONTROL LENGTH: %1}";
-    if (!put(device, format.arg(m_job.samples).toLatin1())) {
+    if (!put(file, format.arg(m_job.samples).toLatin1())) {
         return false;
     }
     for (int marker = 1; marker <= MarkerCount; ++marker) {
-        if (!writeMarkerList(device, marker)) {
+        if (!writeMarkerList(file, marker)) {
             return false;
         }
     }
     return true;
 }
 
-bool WvWriter::writeMarkerList(QIODevice &device, int marker)
+bool WvWriter::writeMarkerList(OutputFile &file, int marker)
 {
     if (m_markersFromStream && marker > 1 && !m_streams.markers->restartAtBegining()) {
         return Tracer::fail("Error resetting buffer for temporary marker data.");
@@ -234,7 +220,7 @@ bool WvWriter::writeMarkerList(QIODevice &device, int marker)
         }
         begin += count;
         if (text.size() > blockSamples) {
-            if (!put(device, text)) {
+            if (!put(file, text)) {
                 return false;
             }
             text.resize(0); // keeps the memory
@@ -243,7 +229,7 @@ bool WvWriter::writeMarkerList(QIODevice &device, int marker)
             return Tracer::fail("Action aborted by user.");
         }
     }
-    return put(device, text + '}');
+    return put(file, text + '}');
 }
 
 bool WvWriter::fetchMarkers(int begin, std::span<quint8> bytes)
@@ -273,7 +259,7 @@ int WvWriter::fetchSamples(int begin, std::span<float> values)
     return static_cast<int>(values.size() / 2);
 }
 
-bool WvWriter::writeSamples(QIODevice &device)
+bool WvWriter::writeSamples(OutputFile &file)
 {
     std::vector<float> values(2 * static_cast<size_t>(std::min(m_job.samples, blockSamples)));
     std::vector<std::byte> words(2 * values.size());
@@ -286,7 +272,7 @@ bool WvWriter::writeSamples(QIODevice &device)
             fetchSamples(done, std::span(values).first(2 * static_cast<size_t>(wanted)));
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));
         encodeWords(std::span(values).first(2 * static_cast<size_t>(got)), bytes);
-        if (!put(device, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
+        if (!put(file, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
             return false;
         }
         if (got < wanted) {

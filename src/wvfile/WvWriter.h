@@ -10,8 +10,8 @@
 #include <span>
 
 class BufferedIO;
+class OutputFile;
 class ProgressClock;
-class QIODevice;
 
 /// Sources of a waveform to be written; each may be null. None is owned.
 struct WvStreams
@@ -33,17 +33,18 @@ public:
     /// Computes the level offsets of samples in memory, if wanted, and logs the statistics.
     void prepareLevels();
 
-    /// Writes the whole file. Logs the reason and returns false on a failure.
-    [[nodiscard]] bool write(QIODevice &device);
+    /// Writes the whole file, without its last progress. Logs the reason and returns false on a
+    /// failure.
+    [[nodiscard]] bool write(OutputFile &file);
 
 private:
-    [[nodiscard]] static bool put(QIODevice &device, std::span<const char> bytes);
-    [[nodiscard]] bool writeTags(QIODevice &device);
-    [[nodiscard]] bool copyTagsStream(QIODevice &device);
-    [[nodiscard]] bool writeMarkers(QIODevice &device);
-    [[nodiscard]] bool writeMarkerList(QIODevice &device, int marker);
+    [[nodiscard]] static bool put(OutputFile &file, std::span<const char> bytes);
+    [[nodiscard]] bool writeTags(OutputFile &file);
+    [[nodiscard]] bool copyTagsStream(OutputFile &file);
+    [[nodiscard]] bool writeMarkers(OutputFile &file);
+    [[nodiscard]] bool writeMarkerList(OutputFile &file, int marker);
     [[nodiscard]] bool fetchMarkers(int begin, std::span<quint8> bytes);
-    [[nodiscard]] bool writeSamples(QIODevice &device);
+    [[nodiscard]] bool writeSamples(OutputFile &file);
     [[nodiscard]] int fetchSamples(int begin, std::span<float> values);
 
     WvWriteJob &m_job;

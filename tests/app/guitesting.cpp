@@ -2,16 +2,23 @@
 #include "guitesting.h"
 
 #include "app/QCustomTreeView.h"
+#include "toolframe/QtProgressDialog.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QAbstractButton>
 #include <QApplication>
+#include <QContextMenuEvent>
 #include <QDir>
 #include <QFile>
+#include <QInputDialog>
+#include <QLineEdit>
 #include <QListWidget>
+#include <QMenu>
+#include <QMessageBox>
 #include <QSettings>
 #include <QTest>
 #include <QTimer>
+#include <QWindow>
 
 #include <algorithm>
 
@@ -100,12 +107,14 @@ bool withModals(const std::function<void()> &action, const QList<Answer> &answer
     QTimer poll;
     QObject::connect(&poll, &QTimer::timeout, [&] {
         QWidget *modal = QApplication::activeModalWidget();
-        if (!modal || !modal->isVisible()) {
+        if (!modal || !modal->isVisible() || qobject_cast<QtProgressDialog *>(modal)) {
             return;
         }
         if (count < answers.size()) {
             answers.at(count)(*modal);
         } else {
+            const auto *box = qobject_cast<QMessageBox *>(modal);
+            qWarning("unexpected window: %s", qPrintable(box ? box->text() : modal->windowTitle()));
             modal->close();
         }
         ++count;
@@ -136,4 +145,92 @@ Answer press(const QString &button)
         }
         QTest::mouseClick(*found, Qt::LeftButton);
     };
+}
+
+Answer typeName(const QString &name, Seen &seen)
+{
+    return [name, &seen](QWidget &box) {
+        auto &dialog = dynamic_cast<QInputDialog &>(box);
+        seen = {dialog.windowTitle(), dialog.labelText()};
+        auto *edit = dialog.findChild<QLineEdit *>();
+        edit->selectAll();
+        QTest::keyClick(edit, Qt::Key_Delete);
+        QTest::keyClicks(edit, name);
+        QTest::keyClick(edit, Qt::Key_Return);
+    };
+}
+
+Answer answer(const QString &button, Seen &seen)
+{
+    return [button, &seen](QWidget &box) {
+        const auto &message = dynamic_cast<QMessageBox &>(box);
+        seen = {message.windowTitle(), message.text()};
+        press(button)(box);
+    };
+}
+
+void pressKey(QWidget *widget, const QKeySequence &key)
+{
+    // Nobody manages the windows here: a closed box leaves none of them active.
+    widget->activateWindow();
+    QVERIFY(QTest::qWaitForWindowActive(widget));
+    QTest::keySequence(widget, key);
+}
+
+QMenu *openMenu()
+{
+    return qobject_cast<QMenu *>(QApplication::activePopupWidget());
+}
+
+QStringList visibleEntries(const QMenu &menu)
+{
+    QStringList texts;
+    const QList<QAction *> actions = menu.actions();
+    for (const QAction *action : actions) {
+        if (action->isVisible()) {
+            texts.append(action->isSeparator() ? "-" : QString(action->text()).remove('&'));
+        }
+    }
+    return texts;
+}
+
+void rightClick(QCustomTreeView *tree, const QString &name)
+{
+    const QModelIndex folder = tree->currentIndex().parent();
+    const QModelIndexList found = tree->model()->match(tree->model()->index(0, 0, folder),
+                                                       Qt::DisplayRole, name, 1, Qt::MatchExactly);
+    QVERIFY(!found.isEmpty());
+    tree->scrollTo(found.first());
+    const QPoint position = tree->visualRect(found.first()).center();
+    QTest::mouseClick(tree->viewport(), Qt::RightButton, {}, position);
+    QContextMenuEvent event(QContextMenuEvent::Mouse, position,
+                            tree->viewport()->mapToGlobal(position));
+    QApplication::sendEvent(tree->viewport(), &event);
+}
+
+void dragBetween(QWidget &top, QCustomTreeView &from, QCustomTreeView &to)
+{
+    if (QGuiApplication::platformName() == "offscreen") {
+        // This platform has no drags: only what follows the drop can be driven.
+        to.offerCopy(from, from.currentPath(), to.visualRect(to.currentIndex()).center());
+        return;
+    }
+    QWindow *window = top.windowHandle();
+    const auto inWindow = [&](QCustomTreeView &tree) {
+        return tree.viewport()->mapTo(&top, tree.visualRect(tree.currentIndex()).center());
+    };
+    const QPoint start = inWindow(from);
+    const QPoint end = inWindow(to);
+    // The drag runs an event loop of its own, in which the mouse goes on.
+    QTimer mouse;
+    QObject::connect(&mouse, &QTimer::timeout, [&] {
+        mouse.stop();
+        QTest::mouseMove(window, end - QPoint(2, 2));
+        QTest::mouseMove(window, end);
+        QTest::mouseRelease(window, Qt::LeftButton, {}, end);
+    });
+    mouse.start(50);
+    QTest::mousePress(window, Qt::LeftButton, {}, start);
+    QTest::mouseMove(window, start + QPoint(3, 0));
+    QTest::mouseMove(window, start + QPoint(40, 5));
 }

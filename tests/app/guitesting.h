@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <QKeySequence>
 #include <QPointer>
 #include <QString>
 #include <QStringList>
@@ -10,6 +11,7 @@
 
 class MainWindow;
 class QCustomTreeView;
+class QMenu;
 class QWidget;
 
 /// What the tests of the window share: a home and settings of their own, a main window on them,
@@ -64,6 +66,32 @@ bool withModal(const std::function<void()> &action, const Answer &answer);
 
 /// An answer to a question or a box: presses the button with this text, mnemonics left out.
 [[nodiscard]] Answer press(const QString &button);
+
+/// What a modal box said.
+struct Seen
+{
+    QString title;
+    QString text;
+};
+
+/// As press(), noting what the box said.
+[[nodiscard]] Answer answer(const QString &button, Seen &seen);
+
+/// Answers a request for a name by typing it and Enter.
+[[nodiscard]] Answer typeName(const QString &name, Seen &seen);
+
+void pressKey(QWidget *widget, const QKeySequence &key);
+
+/// The menu that is open, or null.
+[[nodiscard]] QMenu *openMenu();
+
+[[nodiscard]] QStringList visibleEntries(const QMenu &menu);
+
+/// A click with the right button on a neighbour of the current entry.
+void rightClick(QCustomTreeView *tree, const QString &name);
+
+/// Drags the current entry of one pane to that of the other and waits for the copy menu.
+void dragBetween(QWidget &top, QCustomTreeView &from, QCustomTreeView &to);
 
 #include "app/MainWindow.h"
 

@@ -40,6 +40,7 @@ class TestProgram : public QObject
 
 private slots:
     void startsAndQuits();
+    void offersNoInstrumentWithoutVisa();
     void complainsAboutAMissingFile();
     void answersWithoutADisplay_data();
     void answersWithoutADisplay();
@@ -61,6 +62,19 @@ void TestProgram::startsAndQuits()
     QVERIFY(run.output.startsWith("first paint "));
     // Nothing of the user's is touched.
     QVERIFY(!QFileInfo::exists(m_home.filePath("config/Halvorn")));
+}
+
+void TestProgram::offersNoInstrumentWithoutVisa()
+{
+    QVERIFY(QDir(m_home.path()).mkpath("config/Halvorn"));
+    QVERIFY(writeText(m_home.filePath("config/Halvorn/Corvane.ini"),
+                      "[InstrConfig]\nen0=true\nmodel0=TGX-870\nserial0=100001\n"
+                      "instr0=GPIB0::28::INSTR\nintf0=GPIB0\ninstr1=\n"));
+    const QDir pictures(m_home.filePath("no-visa"));
+    const Run run({"--no-visa", "--screenshot", pictures.path()}, m_home.path());
+    QVERIFY2(run.finished && run.status == 0, qPrintable(run.errors));
+    // The instruments are pictured when the panes offer one.
+    QCOMPARE(pictures.entryList(QDir::Files), QStringList("main-window.png"));
 }
 
 void TestProgram::complainsAboutAMissingFile()

@@ -143,6 +143,26 @@ void TestCliUsage::refusesWrongUsage_data()
     row("dump in.wv -o out --count 5", "--count: 5 leads outside the file; permitted: 1 to 4");
     row("dump in.wv -o out --from 3 --count 2",
         "--count: 2 leads outside the file; permitted: 1 to 1");
+    row("plot in.wv -o out --from 4", "--from: 4 lies outside the file; permitted: 0 to 3");
+    row("plot in.wv --output=", ".*--output.*");
+    row("plot in.wv -o out --view x", "--view: 'x' is unknown; permitted: iq, .*, constellation");
+    row("plot in.wv -o out --size 63x64", "--size: 63x64 is not permitted; permitted: 64x64 .*");
+    row("create", ".*[Ss]ubcommand.*");
+    row("create function", ".*--output.*");
+    row("create function -o out --freq 99",
+        "--freq: '99' is out of range; permitted: 100 Hz to 20 MHz");
+    row("create function -o out --amp-i nan", "--amp-i: 'nan' is not a number; .*0 to 1");
+    row("create function -o out --oversampling 4.5",
+        "--oversampling: '4.5' is not a whole number; permitted: 4 to 100000");
+    row("create noise -o out --seed -1",
+        "--seed: '-1' is out of range; permitted: 0 to 4294967295");
+    row("create am -o out --mode x", "--mode: 'x' is unknown; permitted: regular, .*, 2-tone-nc");
+    row("create pm -o out --clock inf", "--clock: 'inf' is not a number; .*1 kHz to 600 MHz");
+    row("resample in.wv -o out", ".*--clock and --samples.*");
+    row("resample in.wv -o out --samples 4 --clock 1M", ".*--clock.*--samples.*");
+    row("resample in.wv -o out --samples 2147483647",
+        "--samples: '2147483647' is out of range; permitted: 1 to 268435456");
+    row("resample in.wv -o out --clock 601M", "--clock: '601M' is out of range; .*");
     row("measure in.wv --from 4", "--from: 4 lies outside the file; permitted: 0 to 3");
     row("measure in.wv --from 1 --count 4", "--count: 4 leads outside the file; permitted: 1 to 3");
 }
@@ -294,6 +314,11 @@ void TestCliUsage::keepsExistingFiles_data()
     QTest::newRow("level, source") << "level in.wv -o in.wv";
     QTest::newRow("import wav") << "import wav in.wav -o out.wv";
     QTest::newRow("dump") << "dump in.wv -o out.wv";
+    QTest::newRow("dump, source") << "dump in.wv -o in.wv";
+    QTest::newRow("plot") << "plot in.wv -o out.wv";
+    QTest::newRow("create") << "create pm -o out.wv";
+    QTest::newRow("resample") << "resample in.wv -o out.wv --samples 8";
+    QTest::newRow("resample, source") << "resample in.wv --samples 8 -o in.wv";
 }
 
 void TestCliUsage::keepsExistingFiles()
@@ -411,7 +436,7 @@ void TestCliUsage::takesNamesAndTextsAsTheyAre_data()
     row("braces", "{a}.wv", "a{bc}d{SAMPLES:9}", "{COMMENT:acAMPLES:9}}", true);
     row("like an option", "./-x", "--force", "{COMMENT:--force}", false);
     row("like a command", "info", "info", "{COMMENT:info}", false);
-    row("like a list", "./[a,b]", "[a,b]", "{COMMENT:[a,b]}", false);
+    row("like a list", "[a,b]", "[a,b]", "{COMMENT:[a,b]}", false);
     row("empty text", "e.wv", "", "WV,0}{DATE:", false);
 }
 
@@ -438,23 +463,33 @@ void TestCliUsage::interruptCancels_data()
 {
     QTest::addColumn<QString>("arguments");
     QTest::addColumn<QString>("sign"); // printed when the long step runs
+    QTest::addColumn<qint64>("bytes"); // of samples
+    // Sparse files, so long that a step lasts for seconds; saving needs room for the samples.
+    constexpr qint64 huge = 2'000'000'000;
+    constexpr qint64 large = 400'000'000;
     QTest::newRow("import") << "import wav long.wav -o out.wv"
-                            << "Reading WAV-file data";
+                            << "Reading WAV-file data" << huge;
     QTest::newRow("level") << "--verbose level long.wv -o out.wv"
-                           << "samples @ 16 bit";
+                           << "samples @ 16 bit" << huge;
+    QTest::newRow("measure") << "--verbose measure long.wv"
+                             << "samples @ 16 bit" << huge;
+    QTest::newRow("level, saving over the source")
+        << "--verbose level long.wv -o long.wv --force --peak 0 --pkrms 0"
+        << "Creating waveform file" << large;
 }
 
 void TestCliUsage::interruptCancels()
 {
     QFETCH(QString, arguments);
     QFETCH(QString, sign);
-    // Sparse files of 2 GB, so that a step lasts for seconds.
-    constexpr qint64 bytes = 2'000'000'000;
+    QFETCH(qint64, bytes);
+    const QByteArray head =
+        "{TYPE: TGX-WV,0}{CLOCK:1e6}{WAVEFORM-" + QByteArray::number(bytes + 1) + ": #";
     QVERIFY(store(path("long.wav"), wavFile(formatChunk() + chunk("data", {}, bytes))));
-    QVERIFY(store(path("long.wv"),
-                  "{TYPE: TGX-WV,0}{CLOCK:1e6}{WAVEFORM-" + QByteArray::number(bytes + 1) + ": #"));
+    QVERIFY(store(path("long.wv"), head));
     QVERIFY(QFile::resize(path("long.wav"), bytes + 44));
     QVERIFY(QFile::resize(path("long.wv"), bytes + 1000));
+    const QStringList files = QDir(m_folder.path()).entryList(QDir::Files);
 
     QProcess process;
     process.setWorkingDirectory(m_folder.path());
@@ -469,8 +504,11 @@ void TestCliUsage::interruptCancels()
     QCOMPARE(process.exitCode(), 130);
     QVERIFY2(read().contains("Action aborted by user."), errors);
     QVERIFY(process.readAllStandardOutput().isEmpty());
-    QVERIFY(!QFile::exists(path("out.wv")));
-    QVERIFY(QDir(m_temporary.path()).isEmpty());
+    QCOMPARE(QDir(m_folder.path()).entryList(QDir::Files), files);
+    QFile source(path("long.wv"));
+    QCOMPARE(source.size(), bytes + 1000);
+    QVERIFY(source.open(QIODevice::ReadOnly) && source.read(head.size()) == head);
+    QVERIFY(QDir(m_temporary.path()).isEmpty(QDir::Files));
 }
 
 QTEST_GUILESS_MAIN(TestCliUsage)

@@ -1,4 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "toolwindow.h"
+
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
 #include "tools/DlgWvCreate.h"
@@ -9,12 +11,8 @@
 #include "wvfile/HvFileIO.h"
 #include "wvfile/TempStream.h"
 
-#include <QApplication>
 #include <QComboBox>
-#include <QFocusEvent>
 #include <QLabel>
-#include <QLineEdit>
-#include <QMessageBox>
 #include <QPushButton>
 #include <QRadioButton>
 #include <QSettings>
@@ -22,10 +20,11 @@
 #include <QTemporaryDir>
 #include <QTest>
 #include <QTextEdit>
-#include <QTimer>
 
 #include <cmath>
 #include <numbers>
+
+using namespace toolwindow;
 
 namespace {
 
@@ -56,42 +55,6 @@ QStringList errors()
         }
     }
     return lines;
-}
-
-template <typename Widget>
-Widget *child(QWidget &dialog, const char *name)
-{
-    return dialog.findChild<Widget *>(name);
-}
-
-void click(QWidget &dialog, const char *button)
-{
-    QTest::mouseClick(child<QAbstractButton>(dialog, button), Qt::LeftButton);
-}
-
-void type(QLineEdit *edit, const QString &text)
-{
-    edit->setFocus();
-    edit->selectAll();
-    QTest::keyClicks(edit, text);
-    // Leaving the field takes the text; Return would go on to the next page as well.
-    QFocusEvent leave(QEvent::FocusOut);
-    QApplication::sendEvent(edit, &leave);
-}
-
-/// Answers the next message box with Yes or No; `text` gets what it asked.
-void answerNextQuestion(QMessageBox::StandardButton answer, QString *text)
-{
-    auto *timer = new QTimer(qApp);
-    timer->setInterval(20);
-    QObject::connect(timer, &QTimer::timeout, timer, [timer, answer, text] {
-        if (auto *box = qobject_cast<QMessageBox *>(QApplication::activeModalWidget())) {
-            *text = box->text();
-            timer->deleteLater();
-            QTest::mouseClick(box->button(answer), Qt::LeftButton);
-        }
-    });
-    timer->start();
 }
 
 } // namespace

@@ -122,16 +122,25 @@ void TestDiskFull::cleanupTestCase()
 void TestDiskFull::writingAFile_data()
 {
     QTest::addColumn<qint64>("freeBytes");
-    QTest::newRow("not a page left") << qint64(0);
-    QTest::newRow("some samples fit") << mebibyte;
+    QTest::addColumn<QByteArray>("before");
+    QTest::newRow("not a page left") << qint64(0) << QByteArray();
+    QTest::newRow("some samples fit") << mebibyte << QByteArray();
+    QTest::newRow("over a file") << mebibyte << QByteArray("what stood there");
 }
 
 void TestDiskFull::writingAFile()
 {
     QFETCH(qint64, freeBytes);
+    QFETCH(QByteArray, before);
+    const QString path = m_disk + "/out.wv";
+    QFile target(path);
+    QVERIFY(before.isEmpty() ||
+            (target.open(QIODevice::WriteOnly) && target.write(before) == before.size()));
+    target.close();
+    const qint64 taken = m_freeAtStart - this->freeBytes();
     QFile filler(m_disk + "/filler");
     QVERIFY(filler.open(QIODevice::WriteOnly | QIODevice::Unbuffered));
-    const QByteArray zeros(m_freeAtStart - freeBytes, '\0');
+    const QByteArray zeros(m_freeAtStart - taken - freeBytes, '\0');
     QCOMPARE(filler.write(zeros), qint64(zeros.size()));
     filler.close();
     WvWriteJob job;
@@ -139,14 +148,18 @@ void TestDiskFull::writingAFile()
     job.samples = 1000 * 1000;
     job.iSamples = job.qSamples = QList<float>(job.samples, 0.5F);
     job.markers = QList<int>(job.samples, 1);
-    const QString path = m_disk + "/out.wv";
     CapturedLog log;
     QVERIFY(!HvFileIO().writeWaveform(job, path, nullptr, nullptr, nullptr));
     QCOMPARE(log.take(Tracer::Error),
              QStringList("4|Error writing output file: No space left on device"));
-    QVERIFY2(QFileInfo(path).size() <= freeBytes, "what fitted stays");
-    QVERIFY(QFile::remove(path));
-    QVERIFY(filler.remove());
+    if (before.isEmpty()) {
+        QVERIFY2(QFileInfo(path).size() <= freeBytes, "what fitted stays");
+    } else {
+        QVERIFY(target.open(QIODevice::ReadOnly));
+        QCOMPARE(target.readAll(), before);
+    }
+    QVERIFY(target.remove());
+    QVERIFY2(filler.remove(), "and nothing else");
 }
 
 void TestDiskFull::readingIntoStreams_data()

@@ -62,7 +62,8 @@ private slots:
     void readWriteReadIdentity();
     void longMarkerLists();
     void progress();
-    void cancelLeavesACutFile();
+    void cancelSparesWhatStoodThere_data();
+    void cancelSparesWhatStoodThere();
 };
 
 void TestWvWriter::bytes_data()
@@ -420,8 +421,16 @@ void TestWvWriter::progress()
     QCOMPARE(values, QList<int>({0, 10, 50, 100}));
 }
 
-void TestWvWriter::cancelLeavesACutFile()
+void TestWvWriter::cancelSparesWhatStoodThere_data()
 {
+    QTest::addColumn<QByteArray>("before");
+    QTest::newRow("no file") << QByteArray();
+    QTest::newRow("a file") << QByteArray("what stood there");
+}
+
+void TestWvWriter::cancelSparesWhatStoodThere()
+{
+    QFETCH(QByteArray, before);
     /// Lets a tick of the clock pass with each read.
     class SlowDevice : public TestDevice
     {
@@ -450,13 +459,21 @@ void TestWvWriter::cancelLeavesACutFile()
         }
     });
     const QTemporaryDir folder;
-    const QString path = folder.filePath("out.wv");
+    QFile file(folder.filePath("out.wv"));
+    if (!before.isEmpty()) {
+        QVERIFY(file.open(QIODevice::WriteOnly) && file.write(before) == before.size());
+        file.close();
+    }
     CapturedLog log;
-    QVERIFY(!io.writeWaveform(job, path, &data, nullptr, nullptr));
+    QVERIFY(!io.writeWaveform(job, file.fileName(), &data, nullptr, nullptr));
     QCOMPARE(log.take().last(), QString("4|Action aborted by user."));
-    QFile file(path);
+    QCOMPARE(QDir(folder.path()).entryList(QDir::Files | QDir::Hidden), QStringList("out.wv"));
     QVERIFY(file.open(QIODevice::ReadOnly));
-    QVERIFY(file.size() > 0 && file.size() < 4 * samples);
+    if (before.isEmpty()) {
+        QVERIFY(file.size() > 0 && file.size() < 4 * samples); // the part so far
+    } else {
+        QCOMPARE(file.readAll(), before);
+    }
 }
 
 QTEST_GUILESS_MAIN(TestWvWriter)

@@ -4,7 +4,8 @@
 /// Clears the upper halves of the vector registers. Fills of the toolkit can leave them in use, and
 /// on many processors all arithmetic compiled for the plain instruction set then waits for them at
 /// every step: measured up to thirty times slower, until this is called. It costs a few cycles.
-/// To be called in the painting thread before numeric work, and after fills within it.
+/// To be called in the painting thread before numeric work, after the event loop has run within it,
+/// and after fills.
 inline void clearVectorState()
 {
 #if defined(__x86_64__) && defined(__GNUC__)

@@ -1,0 +1,156 @@
+// SPDX-License-Identifier: Apache-2.0
+// Copies between the panes: by drag and drop, by the clipboard, by a key.
+#include "QCustomTreeView.h"
+
+#include "PaneFiles.h"
+#include "deviceactions.h"
+#include "entryname.h"
+#include "instrument/VisaDevice.h"
+#include "jobs/CopyJob.h"
+#include "toolframe/QtProgressDialog.h"
+
+#include <QClipboard>
+#include <QDrag>
+#include <QDragEnterEvent>
+#include <QGuiApplication>
+#include <QIcon>
+#include <QMenu>
+#include <QMimeData>
+
+namespace {
+
+/// Marks a path in the clipboard as copied from a pane of this process.
+const QString clipboardFormat = "application/x-corvane-pane";
+
+QByteArray clipboardTag(const QCustomTreeView &pane)
+{
+    return QByteArray::number(QCoreApplication::applicationPid()) + ' ' +
+           pane.objectName().toUtf8() + ' ' +
+           (pane.device() ? pane.device()->resource().toUtf8() : QByteArray());
+}
+
+} // namespace
+
+void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
+{
+    const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    auto *mime = new QMimeData;
+    mime->setText(path);
+    auto *drag = new QDrag(this);
+    drag->setMimeData(mime);
+    drag->setPixmap(QIcon(":/icons32/file_waveform.png").pixmap(32, 32));
+    drag->exec(Qt::CopyAction);
+}
+
+void QCustomTreeView::dragEnterEvent(QDragEnterEvent *event)
+{
+    dragMoveEvent(event);
+}
+
+void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
+{
+    if (!comesFromOtherPane(*event)) {
+        event->ignore();
+        return;
+    }
+    const QModelIndex target = indexAt(event->position().toPoint());
+    if (target.isValid()) {
+        selectionModel()->setCurrentIndex(target, QItemSelectionModel::ClearAndSelect |
+                                                      QItemSelectionModel::Rows);
+    }
+    event->acceptProposedAction();
+}
+
+void QCustomTreeView::dropEvent(QDropEvent *event)
+{
+    if (!comesFromOtherPane(*event)) {
+        event->ignore();
+        return;
+    }
+    event->acceptProposedAction();
+    offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
+              event->position().toPoint());
+}
+
+void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QString &path,
+                                const QPoint &position)
+{
+    setCopy(source, path, m_files ? m_files->pathOf(indexAt(position)) : QString());
+    m_copyMenu->popup(viewport()->mapToGlobal(position));
+}
+
+void QCustomTreeView::setCopy(const QCustomTreeView &source, const QString &path,
+                              const QString &target)
+{
+    m_dropSource = path;
+    m_dropSourceDevice = source.device();
+    m_dropSourceBytes = source.m_files ? source.m_files->sizeOf(source.m_files->indexOf(path)) : 0;
+    m_dropTarget = folderOf(target);
+}
+
+void QCustomTreeView::copyToPeer()
+{
+    const QString path = currentPath();
+    if (m_peer && !path.isEmpty()) {
+        m_peer->setCopy(*this, path, m_peer->currentPath());
+        m_peer->slot_copy();
+    }
+}
+
+void QCustomTreeView::copyToClipboard()
+{
+    const QString path = currentPath();
+    if (path.isEmpty()) {
+        return;
+    }
+    auto *mime = new QMimeData;
+    mime->setText(path);
+    mime->setData(clipboardFormat, clipboardTag(*this));
+    QGuiApplication::clipboard()->setMimeData(mime);
+    emit errMsg(QString("'%1' can be pasted in the other pane.").arg(entryName(path)));
+}
+
+void QCustomTreeView::pasteFromClipboard()
+{
+    const QMimeData *mime = QGuiApplication::clipboard()->mimeData();
+    if (!m_peer || !mime || mime->data(clipboardFormat) != clipboardTag(*m_peer)) {
+        emit errMsg("Nothing was copied in the other pane.");
+        return;
+    }
+    setCopy(*m_peer, mime->text(), currentPath());
+    slot_copy();
+}
+
+bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const
+{
+    const auto *source = qobject_cast<const QCustomTreeView *>(event.source());
+    return source && source != this && !event.mimeData()->text().isEmpty();
+}
+
+void QCustomTreeView::slot_copy()
+{
+    if (isBusy()) {
+        return;
+    }
+    if (!isFolderPath(m_dropTarget)) {
+        emit infoTextAvailable("The target location for the copy operation must be a folder.");
+    } else if (!m_dropSourceDevice && isLocal()) {
+        emit infoTextAvailable("Copy operations between local file systems are not supported.");
+    } else {
+        copyEntry(this, {.sourceDevice = m_dropSourceDevice,
+                         .source = m_dropSource,
+                         .sourceBytes = m_dropSourceBytes,
+                         .targetDevice = device(),
+                         .targetFolder = m_dropTarget});
+        updateAndExpandTree(m_dropTarget);
+    }
+}
+
+bool QCustomTreeView::isBusy() const
+{
+    // It lives as long as its operation, hidden or not.
+    return window()->findChild<QtProgressDialog *>() != nullptr;
+}

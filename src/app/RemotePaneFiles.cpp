@@ -1,0 +1,179 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "RemotePaneFiles.h"
+
+#include "entryname.h"
+#include "instrument/RemoteDirModel.h"
+#include "instrument/VisaDevice.h"
+#include "log/Tracer.h"
+#include "toolframe/QtProgressDialog.h"
+
+#include <QTreeView>
+
+#include <algorithm>
+
+namespace {
+
+void logStep(const QString &what, const QString &path)
+{
+    Tracer::Trace(Tracer::Information, QString("%1 '%2'...").arg(what, entryName(path)));
+}
+
+} // namespace
+
+RemotePaneFiles::RemotePaneFiles(RemoteDirModel *model)
+    : m_model(model)
+{
+}
+
+VisaDevice *RemotePaneFiles::device() const
+{
+    return m_model->device();
+}
+
+QString RemotePaneFiles::settingsName() const
+{
+    return "remote";
+}
+
+QString RemotePaneFiles::pathOf(const QModelIndex &index) const
+{
+    const RemoteEntry *entry = RemoteDirModel::entryOf(index);
+    return entry == nullptr || entry->isPlaceholder() ? QString() : entry->fullPath();
+}
+
+QModelIndex RemotePaneFiles::indexOf(const QString &path) const
+{
+    return m_model->indexOfPath(path);
+}
+
+qint64 RemotePaneFiles::sizeOf(const QModelIndex &index) const
+{
+    const RemoteEntry *entry = RemoteDirModel::entryOf(index);
+    return entry == nullptr ? 0 : entry->info().size;
+}
+
+void RemotePaneFiles::follow(const QTreeView &view)
+{
+    // Ends with this object, for the view's indexes are of another model from then on.
+    connect(&view, &QTreeView::expanded, this,
+            [this](const QModelIndex &index) { m_model->slotExpanded(index); });
+    connect(&view, &QTreeView::collapsed, this,
+            [this](const QModelIndex &index) { m_model->slotCollapsed(index); });
+}
+
+QStringList RemotePaneFiles::reload(const QString &path)
+{
+    QStringList open = m_model->expandedPaths();
+    m_model->refresh();
+    if (!m_model->expandPaths(open)) {
+        Tracer::Trace(Tracer::Information, "Not all paths could be reloaded.");
+    }
+    const QString folder = folderOf(path);
+    if (!open.contains(folder) && m_model->expandPath(folder)) {
+        open.append(folder);
+    }
+    emit folderLoaded(folder);
+    return open;
+}
+
+void RemotePaneFiles::setNameFilters(const QStringList &wildcards)
+{
+    m_model->setNameFilters(wildcards);
+}
+
+bool RemotePaneFiles::exists(const QString &path) const
+{
+    const QString name = entryName(path);
+    const auto sameCase = device()->isUnixFileSystem() ? Qt::CaseSensitive : Qt::CaseInsensitive;
+    QList<RemoteFileEntry> entries;
+    // The model may hide the entry behind its filter, so the instrument is asked.
+    return device()->listDirectory(entries, native(parentFolder(path))) &&
+           std::any_of(entries.cbegin(), entries.cend(), [&](const RemoteFileEntry &entry) {
+               return entry.name.compare(name, sameCase) == 0;
+           });
+}
+
+bool RemotePaneFiles::isRoot(const QString &path) const
+{
+    const RemoteEntry *entry = RemoteDirModel::entryOf(indexOf(path));
+    return entry != nullptr && entry->parent() == nullptr;
+}
+
+bool RemotePaneFiles::isRealFolder(const QString &path) const
+{
+    return isFolderPath(path);
+}
+
+bool RemotePaneFiles::isEmptyFolder(const QString &path) const
+{
+    QList<RemoteFileEntry> entries;
+    return device()->listDirectory(entries, native(path)) && entries.isEmpty();
+}
+
+QString RemotePaneFiles::removeTreeQuestion(const QString &path) const
+{
+    return QString("Do you want to delete the folder '%1'\nand all its content?")
+        .arg(withoutSlash(path));
+}
+
+bool RemotePaneFiles::createFolder(const QString &parent, const QString &name)
+{
+    return report(device()->makeDirectory(native(parent), name),
+                  "Creation of the new folder failed.");
+}
+
+bool RemotePaneFiles::rename(const QString &path, const QString &newName)
+{
+    const bool folder = isFolderPath(path);
+    logStep(folder ? "Renaming folder" : "Renaming file", path);
+    return report(device()->renameEntry(native(parentFolder(path)), entryName(path), newName),
+                  folder ? "Renaming folder failed." : "Renaming file failed.");
+}
+
+bool RemotePaneFiles::removeFile(const QString &path)
+{
+    logStep("Deleting file", path);
+    // The view has asked already.
+    return report(device()->deleteRemoteFile(native(path), false), "Deleting file failed.");
+}
+
+bool RemotePaneFiles::removeEmptyFolder(const QString &path)
+{
+    logStep("Deleting folder", path);
+    return report(device()->removeDirectory(native(parentFolder(path)), entryName(path)),
+                  "Deleting folder failed.");
+}
+
+bool RemotePaneFiles::removeTree(const QString &path, QWidget *parent)
+{
+    bool done = false;
+    bool canceled = false;
+    {
+        QtProgressDialog progress("Deleting Files...", parent);
+        connect(device(), &VisaDevice::ProgressUpdate, &progress, &QtProgressDialog::setValue);
+        connect(&progress, &QtProgressDialog::canceled, device(), &VisaDevice::cancel);
+        done = device()->removeTree(native(parentFolder(path)), entryName(path));
+        canceled = progress.wasCanceled();
+    }
+    if (!done && !canceled) {
+        emit infoTextAvailable("An error occured while trying to delete a folder.\n"
+                               "Please see the message log for details.");
+    }
+    return done;
+}
+
+QString RemotePaneFiles::native(const QString &path) const
+{
+    return QString(path).replace('/', device()->pathSeparator());
+}
+
+bool RemotePaneFiles::report(bool done, const QString &words)
+{
+    // A command that the instrument refuses is answered as done; only the queue tells.
+    if (done && device()->checkErrorQueue()) {
+        return true;
+    }
+    const QString reason = device()->takeLastError();
+    emit failed(QString("%1 %2").arg(words, reason).simplified());
+    return Tracer::fail(words);
+}

@@ -1,0 +1,100 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "deviceactions.h"
+
+#include "instrument/VisaDevice.h"
+#include "jobs/CopyJob.h"
+#include "log/Tracer.h"
+#include "toolframe/QtProgressDialog.h"
+#include "toolframe/questions.h"
+
+namespace {
+
+/// Lets one window at a time ask for the user: the question, then the progress again.
+template <typename Question>
+bool askBetween(QtProgressDialog &progress, const Question &question)
+{
+    progress.suspend();
+    const bool answer = question();
+    progress.resume();
+    return answer;
+}
+
+QString proceedText(qsizetype files, qint64 bytes)
+{
+    constexpr double megabyte = 1024.0 * 1024.0;
+    const QString size = QString("%1 MB").arg(static_cast<double>(bytes) / megabyte, 0, 'f', 2);
+    return QString("%1 files found.\nThe total file size is %2.\nDo you really want to proceed?")
+        .arg(files)
+        .arg(size);
+}
+
+QString replaceText(const QStringList &paths)
+{
+    return paths.size() == 1
+               ? QString("The file '%1' already exists.\nDo you want to overwrite this file?")
+                     .arg(paths.first())
+               : QString("%1 of the target files already exist.\n"
+                         "Do you want to overwrite these files?")
+                     .arg(paths.size());
+}
+
+} // namespace
+
+void copyEntry(QWidget *parent, const CopyRequest &request)
+{
+    QtProgressDialog progress({}, parent);
+    const CopyQuestions questions{
+        .proceed =
+            [&](qsizetype files, qint64 bytes) {
+                return askBetween(progress, [&] {
+                    return askYesNo(parent, "Copy Folder", proceedText(files, bytes));
+                });
+            },
+        .replace =
+            [&](const QStringList &paths) {
+                return askBetween(progress, [&] {
+                    return askYesNo(parent, "Overwrite File", replaceText(paths));
+                });
+            },
+        .goOn =
+            [&] {
+                return askBetween(progress, [&] {
+                    return askYesNo(parent, "Copy Folder",
+                                    "An error occured during copying. Do you want to proceed with "
+                                    "the next file?");
+                });
+            }};
+    CopyJob job(request, questions);
+    QObject::connect(&job, &ToolJob::stepStarted, &progress, &QtProgressDialog::setLabelText);
+    QObject::connect(&job, &CopyJob::bytesCopied, &progress, &QtProgressDialog::setBytes);
+    QObject::connect(&job, &ToolJob::ProgressUpdate, &progress, &QtProgressDialog::setValue);
+    QObject::connect(&progress, &QtProgressDialog::canceled, &job, &ToolJob::cancel);
+    // The reason of a failure is in the log; a pane that is read anew shows what came over.
+    (void)job.run();
+}
+
+bool isRunnable(const QString &path, const VisaDevice *device)
+{
+    return device != nullptr && path.endsWith(".WV", Qt::CaseInsensitive);
+}
+
+void runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
+{
+    constexpr quint32 answerTimeoutMs = 5000;
+    const quint32 savedTimeoutMs = device.timeoutMs();
+    (void)device.setTimeoutMs(answerTimeoutMs);
+    bool started = false;
+    {
+        QtProgressDialog progress("Starting ARB...", parent);
+        QObject::connect(&progress, &QtProgressDialog::canceled, &device, &VisaDevice::cancel);
+        QObject::connect(&device, &VisaDevice::ProgressUpdate, &progress,
+                         &QtProgressDialog::setValue);
+        started = device.startArb(QString(path).replace('/', device.pathSeparator()));
+    }
+    if (started) {
+        device.checkErrorQueue();
+    } else {
+        Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
+    }
+    (void)device.setTimeoutMs(savedTimeoutMs);
+}

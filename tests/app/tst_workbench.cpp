@@ -1,0 +1,573 @@
+// SPDX-License-Identifier: Apache-2.0
+// The main job in the window: a waveform goes to an instrument, plays there, and comes back. The
+// instruments are simulated ones behind a gateway, over real sockets.
+#include "app/QCustomTreeView.h"
+#include "app/settingsstores.h"
+#include "guitesting.h"
+#include "simulator/SimulatorProcess.h"
+#include "toolframe/QtProgressDialog.h"
+
+#include <QAbstractButton>
+#include <QAbstractItemView>
+#include <QApplication>
+#include <QCloseEvent>
+#include <QComboBox>
+#include <QDir>
+#include <QElapsedTimer>
+#include <QFileInfo>
+#include <QLabel>
+#include <QMenu>
+#include <QRandomGenerator>
+#include <QTest>
+#include <QTimer>
+
+#include <csignal>
+
+namespace {
+
+const QString onUnix = "TGX-870, 100001, GPIB0";
+const QString onDrives = "TGX-810, 200002, GPIB0";
+
+QByteArray content(const QString &path)
+{
+    QFile file(path);
+    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray("not readable");
+}
+
+QByteArray noise(qsizetype size)
+{
+    QByteArray bytes(size, '\0');
+    QRandomGenerator generator(1);
+    for (char &byte : bytes) {
+        byte = static_cast<char>(generator.generate());
+    }
+    return bytes;
+}
+
+/// Presses cancel in the progress dialog as soon as a transfer shows some progress.
+template <typename Action>
+void onProgress(const Action &action)
+{
+    auto *poll = new QTimer(qApp);
+    QObject::connect(poll, &QTimer::timeout, qApp, [poll, action] {
+        const QList<QWidget *> windows = QApplication::topLevelWidgets();
+        for (QWidget *window : windows) {
+            auto *progress = qobject_cast<QtProgressDialog *>(window);
+            if (progress && progress->value() > 0) {
+                poll->stop();
+                poll->deleteLater();
+                action(*progress);
+                return;
+            }
+        }
+    });
+    poll->start(5);
+}
+
+/// What the end of the desktop session sends; a click on the window's close button doesn't get
+/// through to a window behind a modal one.
+void askToClose(QWidget *window)
+{
+    QCloseEvent event;
+    QApplication::sendEvent(window, &event);
+}
+
+} // namespace
+
+class TestWorkbench : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void init();
+    void cleanup();
+    void choosesInstruments();
+    void opensFoldersByKeys();
+    void sameInstrumentOnlyOnce();
+    void removedInstrumentFallsBack();
+    void copiesBothWays();
+    void copiesByKeysAndClipboard();
+    void copiesFolders();
+    void asksAfterAFailedFile();
+    void copiesFromInstrumentToInstrument();
+    void runsAWaveform();
+    void fileOperations();
+    void cancelledCopyLeavesNoFile_data();
+    void cancelledCopyLeavesNoFile();
+    void plugPulledAndPutBack();
+    void answersDuringATransfer();
+    void asksBeforeClosing();
+    void keepsDefaultFolderAndWidths();
+
+private:
+    void startSimulator(quint16 port);
+    void choose(int pane, const QString &text);
+    /// Makes an entry of an instrument current.
+    void selectRemote(int pane, const QString &path);
+    void copyByDrag(int from, const QList<Answer> &answers = {});
+    [[nodiscard]] QString unixFile(const QString &name) const
+    {
+        return m_simulator->root() + "/a/var/user/" + name;
+    }
+    [[nodiscard]] QString driveFile(const QString &name) const
+    {
+        return m_simulator->root() + "/b/D:/" + name;
+    }
+
+    std::unique_ptr<Desk> m_desk;
+    std::unique_ptr<SimulatorProcess> m_simulator;
+    quint16 m_port = 0;
+};
+
+void TestWorkbench::startSimulator(quint16 port)
+{
+    m_simulator = std::make_unique<SimulatorProcess>();
+    const QString config = QString("[a]\nmodel=TGX-870\nserial=100001\nroot=%ROOT%/a\n"
+                                   "gateway=%1\ngpib=28\n"
+                                   "[b]\nmodel=TGX-810\nserial=200002\nroot=%ROOT%/b\n"
+                                   "gateway=%1\ngpib=5\n")
+                               .arg(port);
+    QVERIFY2(m_simulator->startConfig(config, 2), qPrintable(m_simulator->errorOutput()));
+    m_port = m_simulator->gatewayPort();
+}
+
+void TestWorkbench::init()
+{
+    startSimulator(0);
+    qputenv("CORVANE_VISA_CONFIG", m_simulator->path("visa.ini").toLocal8Bit());
+    QVERIFY(writeText(
+        m_simulator->path("visa.ini"),
+        QString("[GPIB0]\nhost=127.0.0.1\nport=%1\naddresses=5,28\n").arg(m_port).toLatin1()));
+    m_desk = std::make_unique<Desk>();
+    const auto store = openMainStore();
+    store->beginGroup("InstrConfig");
+    const QList<QStringList> entries{{"TGX-870", "100001", "GPIB0::28::INSTR"},
+                                     {"TGX-810", "200002", "GPIB0::5::INSTR"}};
+    for (int i = 0; i < entries.size(); ++i) {
+        store->setValue(QString("en%1").arg(i), true);
+        store->setValue(QString("model%1").arg(i), entries.at(i).at(0));
+        store->setValue(QString("serial%1").arg(i), entries.at(i).at(1));
+        store->setValue(QString("instr%1").arg(i), entries.at(i).at(2));
+        store->setValue(QString("intf%1").arg(i), "GPIB0");
+        store->setValue(QString("folder%1").arg(i), "Manually Added");
+    }
+    store->setValue("instr2", "");
+    store->endGroup();
+    store->sync();
+    m_desk->open();
+}
+
+void TestWorkbench::cleanup()
+{
+    m_desk.reset();
+    m_simulator.reset();
+}
+
+void TestWorkbench::choose(int pane, const QString &text)
+{
+    auto *choice = m_desk->find<QComboBox>(QString("cb_dev_%1").arg(pane));
+    const int wanted = choice->findText(text);
+    QVERIFY(wanted >= 0);
+    // By the list: the arrows would choose all on the way.
+    choice->showPopup();
+    choice->view()->setCurrentIndex(choice->model()->index(wanted, 0));
+    QTest::keyClick(choice->view(), Qt::Key_Return);
+    QCOMPARE(choice->currentText(), text);
+}
+
+void TestWorkbench::selectRemote(int pane, const QString &path)
+{
+    m_desk->tree(pane)->updateAndExpandTree(path);
+    QCOMPARE(m_desk->tree(pane)->currentPath(), path);
+}
+
+void TestWorkbench::copyByDrag(int from, const QList<Answer> &answers)
+{
+    QCustomTreeView *source = m_desk->tree(from);
+    QCustomTreeView *target = m_desk->tree(3 - from);
+    dragBetween(*m_desk->window(), *source, *target);
+    QTRY_VERIFY(openMenu());
+    const auto copy = [] {
+        QTest::keyClick(openMenu(), Qt::Key_Down);
+        QTest::keyClick(openMenu(), Qt::Key_Return);
+    };
+    QVERIFY(withModals(copy, answers));
+}
+
+void TestWorkbench::choosesInstruments()
+{
+    const auto *choice = m_desk->find<QComboBox>("cb_dev_2");
+    QCOMPARE(choice->count(), 3);
+    QCOMPARE(choice->itemText(0), "Local");
+    QCOMPARE(choice->itemData(0).toString(), QString());
+    QCOMPARE(choice->itemData(1).toString(), "GPIB0::28::INSTR");
+    choose(2, onUnix);
+    QVERIFY(m_desk->log().contains("Device is 'TGX-870' , Serial is '100001'"));
+    QCOMPARE(m_desk->tree(2)->currentPath(), "/var/user/");
+    QVERIFY(!m_desk->tree(2)->isLocal());
+    QCOMPARE(m_desk->tree(2)->model()->headerData(2, Qt::Horizontal).toString(), "Type");
+    choose(2, onDrives);
+    QCOMPARE(m_desk->tree(2)->currentPath(), "D:/");
+    choose(1, onUnix);
+    QCOMPARE(m_desk->tree(1)->currentPath(), "/var/user/");
+    choose(2, "Local");
+    QTRY_COMPARE(m_desk->tree(2)->currentPath(), m_desk->path("") + '/');
+}
+
+void TestWorkbench::opensFoldersByKeys()
+{
+    QVERIFY(QDir().mkpath(unixFile("deep/deeper")));
+    QVERIFY(writeText(unixFile("deep/deeper/last.wv"), "1"));
+    choose(2, onUnix);
+    QCustomTreeView *tree = m_desk->tree(2);
+    for (const QString name : {"deep", "deeper", "last.wv"}) {
+        QTest::keyClick(tree, Qt::Key_Down);
+        QCOMPARE(tree->currentIndex().data().toString(), name);
+        QVERIFY(tree->visualRect(tree->currentIndex()).height() > 0);
+        QTest::keyClick(tree, Qt::Key_Right);
+    }
+    // The same by the mouse, on the marks of branches that were not read yet.
+    QVERIFY(QDir().mkpath(driveFile("one/two/three")));
+    choose(2, onDrives);
+    for (const QString name : {"one", "two"}) {
+        QTest::keyClick(tree, Qt::Key_Down);
+        QCOMPARE(tree->currentIndex().data().toString(), name);
+        const QRect row = tree->visualRect(tree->currentIndex());
+        QTest::mouseClick(tree->viewport(), Qt::LeftButton, {},
+                          QPoint(row.left() - 8, row.center().y()));
+        QVERIFY(tree->isExpanded(tree->currentIndex()));
+    }
+    choose(2, onUnix);
+    selectRemote(2, "/var/user/deep/deeper/last.wv");
+    QVERIFY(!m_desk->log().contains("Not all paths could be reloaded."));
+    // What was open stays open.
+    QTest::mouseClick(m_desk->find<QAbstractButton>("tb_refresh_2"), Qt::LeftButton);
+    QCOMPARE(tree->currentPath(), "/var/user/");
+    selectRemote(2, "/var/user/deep/deeper/last.wv");
+    QVERIFY(tree->isExpanded(tree->currentIndex().parent().parent()));
+}
+
+void TestWorkbench::sameInstrumentOnlyOnce()
+{
+    choose(1, onUnix);
+    auto *choice = m_desk->find<QComboBox>("cb_dev_2");
+    QTest::keyClick(choice, Qt::Key_Down);
+    QCOMPARE(choice->currentIndex(), 0);
+    QVERIFY(m_desk->tree(2)->isLocal());
+    QVERIFY(m_desk->log().contains("Warning: The same device cannot be selected twice."));
+    QCOMPARE(m_desk->tree(1)->currentPath(), "/var/user/");
+}
+
+void TestWorkbench::removedInstrumentFallsBack()
+{
+    choose(2, onUnix);
+    auto *dialog = m_desk->find<QDialog>("DlgInstrConfig");
+    QVERIFY(dialog);
+    QTest::mouseClick(m_desk->find<QAbstractButton>("tb_instruments_2"), Qt::LeftButton);
+    QTRY_VERIFY(dialog->isVisible());
+    QVERIFY(QMetaObject::invokeMethod(dialog, "instr_clearlist"));
+    QVERIFY(m_desk->tree(2)->isLocal());
+    QCOMPARE(m_desk->find<QComboBox>("cb_dev_2")->count(), 1);
+    QVERIFY(m_desk->log().contains("The previously selected instrument is not available anymore."));
+    dialog->close();
+}
+
+void TestWorkbench::copiesBothWays()
+{
+    QVERIFY(writeText(m_desk->path("noise.wv"), noise(1'500'001)));
+    choose(2, onUnix);
+    m_desk->select(1, "noise.wv");
+    copyByDrag(1);
+    QCOMPARE(content(unixFile("noise.wv")), content(m_desk->path("noise.wv")));
+    QVERIFY(m_desk->log().contains("Sending file noise.wv to instrument TGX-870, 100001"));
+
+    selectRemote(2, "/var/user/noise.wv");
+    m_desk->select(1, "sub");
+    copyByDrag(2);
+    QCOMPARE(content(m_desk->path("sub/noise.wv")), content(m_desk->path("noise.wv")));
+    QTRY_COMPARE(m_desk->tree(1)->currentPath(), m_desk->path("sub/"));
+
+    // A file that is there already goes only with the user's consent.
+    QVERIFY(writeText(m_desk->path("sub/noise.wv"), "mine"));
+    Seen seen;
+    copyByDrag(2, {answer("No", seen)});
+    QCOMPARE(content(m_desk->path("sub/noise.wv")), "mine");
+    copyByDrag(2, {answer("Yes", seen)});
+    QCOMPARE(content(m_desk->path("sub/noise.wv")).size(), 1'500'001);
+    QCOMPARE(seen.title, "Overwrite File");
+}
+
+void TestWorkbench::copiesByKeysAndClipboard()
+{
+    choose(2, onDrives);
+    m_desk->select(1, "tone.wv");
+    m_desk->tree(1)->setFocus();
+    pressKey(m_desk->tree(1), Qt::Key_F5);
+    QCOMPARE(content(driveFile("tone.wv")), content(m_desk->path("tone.wv")));
+
+    m_desk->select(1, "data.txt");
+    pressKey(m_desk->tree(1), QKeySequence::Copy);
+    pressKey(m_desk->tree(1), QKeySequence::Paste); // into itself: nothing
+    QVERIFY(!QFileInfo::exists(driveFile("data.txt")));
+    m_desk->tree(2)->setFocus();
+    pressKey(m_desk->tree(2), QKeySequence::Paste);
+    QCOMPARE(content(driveFile("data.txt")), content(m_desk->path("data.txt")));
+}
+
+void TestWorkbench::copiesFolders()
+{
+    QVERIFY(QDir().mkpath(m_desk->path("sub/deep/empty")));
+    QVERIFY(writeText(m_desk->path("sub/one.wv"), noise(1000)));
+    QVERIFY(writeText(m_desk->path("sub/deep/two.wv"), noise(2000)));
+    choose(2, onDrives);
+    m_desk->select(1, "sub");
+    Seen seen;
+    copyByDrag(1, {answer("No", seen)});
+    QCOMPARE(seen.text, "2 files found.\nThe total file size is 0.00 MB.\n"
+                        "Do you really want to proceed?");
+    QVERIFY(!QFileInfo::exists(driveFile("one.wv")));
+    copyByDrag(1, {answer("Yes", seen)});
+    QCOMPARE(content(driveFile("one.wv")), noise(1000));
+    QCOMPARE(content(driveFile("deep/two.wv")), noise(2000));
+    QVERIFY(m_desk->log().contains(
+        QString("Copying %1 to D:/deep/two.wv").arg(m_desk->path("sub/deep/two.wv"))));
+
+    QVERIFY(QDir().mkpath(m_desk->path("back")));
+    m_desk->select(1, "back");
+    selectRemote(2, "D:/");
+    copyByDrag(2, {answer("Yes", seen)});
+    QCOMPARE(content(m_desk->path("back/one.wv")), noise(1000));
+    QCOMPARE(content(m_desk->path("back/deep/two.wv")), noise(2000));
+    QVERIFY(m_desk->log().contains("Building remote source files list..."));
+}
+
+void TestWorkbench::asksAfterAFailedFile()
+{
+    // An instrument takes no file without bytes.
+    QVERIFY(writeText(m_desk->path("sub/a.wv"), ""));
+    QVERIFY(writeText(m_desk->path("sub/b.wv"), "bytes"));
+    choose(2, onUnix);
+    m_desk->select(1, "sub");
+    Seen seen;
+    copyByDrag(1, {press("Yes"), answer("No", seen)});
+    QCOMPARE(seen.text,
+             "An error occured during copying. Do you want to proceed with the next file?");
+    QVERIFY(!QFileInfo::exists(unixFile("b.wv")));
+    QVERIFY(m_desk->log().contains("Sending file to instrument failed."));
+    copyByDrag(1, {press("Yes"), press("Yes")});
+    QCOMPARE(content(unixFile("b.wv")), "bytes");
+}
+
+void TestWorkbench::copiesFromInstrumentToInstrument()
+{
+    QVERIFY(writeText(unixFile("wave.wv"), noise(70'000)));
+    choose(1, onUnix);
+    choose(2, onDrives);
+    selectRemote(1, "/var/user/wave.wv");
+    copyByDrag(1);
+    QCOMPARE(content(driveFile("wave.wv")), noise(70'000));
+    QVERIFY(!QFileInfo::exists(QDir::temp().filePath("HvCorvane.tmp")));
+    QCOMPARE(m_desk->tree(2)->currentPath(), "D:/");
+}
+
+void TestWorkbench::runsAWaveform()
+{
+    QVERIFY(QFile::copy(m_desk->path("tone.wv"), unixFile("TONE.WV")));
+    QVERIFY(writeText(unixFile("notes.txt"), "text"));
+    choose(2, onUnix);
+    selectRemote(2, "/var/user/TONE.WV");
+    rightClick(m_desk->tree(2), "notes.txt");
+    QTRY_VERIFY(openMenu());
+    QVERIFY(!visibleEntries(*openMenu()).contains("Run!"));
+    openMenu()->close();
+    rightClick(m_desk->tree(2), "TONE.WV");
+    QTRY_VERIFY(openMenu());
+    QCOMPARE(visibleEntries(*openMenu()), QStringList({"Set As Default Folder", "Run!",
+                                                       "Create Folder", "Rename", "Delete", "-"}));
+    QTest::keyClick(openMenu(), Qt::Key_R);
+    const QStringList log = m_desk->log();
+    const qsizetype selected = log.indexOf("VISA >> 'SOUR:BB:ARB:WAV:SEL '/var/user/TONE.WV''");
+    const qsizetype ready = log.indexOf("VISA >> 'STAT:OPER:COND?'");
+    const qsizetype started = log.indexOf("VISA >> 'SOUR:BB:ARB:STAT ON; *OPC?'");
+    QVERIFY(selected >= 0 && selected < ready && ready < started);
+    QVERIFY(!log.contains("Cannot select ARB waveform."));
+
+    m_desk->select(1, "tone.wv");
+    rightClick(m_desk->tree(1), "tone.wv");
+    QTRY_VERIFY(openMenu());
+    QVERIFY(!visibleEntries(*openMenu()).contains("Run!"));
+    openMenu()->close();
+}
+
+void TestWorkbench::fileOperations()
+{
+    choose(2, onUnix);
+    QCustomTreeView *tree = m_desk->tree(2);
+    tree->setFocus();
+    Seen seen;
+    QVERIFY(withModal([&] { pressKey(tree, Qt::Key_F7); }, typeName("waves", seen)));
+    QCOMPARE(seen.text, "\nCreate new folder in\n'/var/user/'");
+    QVERIFY(QFileInfo(unixFile("waves")).isDir());
+    QCOMPARE(tree->currentPath(), "/var/user/waves/");
+    QVERIFY(withModals([&] { pressKey(tree, Qt::Key_F2); }, {typeName("tones", seen)}));
+    QCOMPARE(tree->currentPath(), "/var/user/tones/");
+    QVERIFY(QFileInfo(unixFile("tones")).isDir());
+
+    QVERIFY(QDir().mkpath(unixFile("tones/deep")));
+    QVERIFY(writeText(unixFile("tones/deep/a.wv"), "1"));
+    QVERIFY(writeText(unixFile("tones/b.wv"), "2"));
+    selectRemote(2, "/var/user/tones/b.wv");
+    QVERIFY(withModals([&] { pressKey(tree, Qt::Key_F2); },
+                       {typeName("50%.wv", seen), answer("OK", seen)}));
+    QCOMPARE(seen.text, "The new entry name contains invalid characters.");
+    QVERIFY(withModals([&] { pressKey(tree, Qt::Key_F2); }, {typeName("c.wv", seen)}));
+    QVERIFY(QFileInfo::exists(unixFile("tones/c.wv")));
+    QVERIFY(withModal([&] { pressKey(tree, Qt::Key_Delete); }, answer("Yes", seen)));
+    QCOMPARE(seen.text, "Do you really want to delete the file\n/var/user/tones/c.wv ?");
+    QVERIFY(!QFileInfo::exists(unixFile("tones/c.wv")));
+
+    selectRemote(2, "/var/user/tones/");
+    QVERIFY(withModal([&] { pressKey(tree, Qt::Key_Delete); }, answer("Yes", seen)));
+    QCOMPARE(seen.text, "Do you want to delete the folder '/var/user/tones'\nand all its content?");
+    QVERIFY(!QFileInfo::exists(unixFile("tones")));
+    QCOMPARE(tree->currentPath(), "/var/user/");
+    QVERIFY(withModal([&] { pressKey(tree, Qt::Key_Delete); }, answer("OK", seen)));
+    QCOMPARE(seen.text, "Cannot delete root node.");
+    QVERIFY(QFileInfo(unixFile("")).isDir());
+}
+
+void TestWorkbench::cancelledCopyLeavesNoFile_data()
+{
+    QTest::addColumn<int>("from");
+    QTest::newRow("to the instrument") << 1;
+    QTest::newRow("from the instrument") << 2;
+}
+
+void TestWorkbench::cancelledCopyLeavesNoFile()
+{
+    QFETCH(int, from);
+    const QString source = from == 1 ? m_desk->path("big.wv") : unixFile("big.wv");
+    QFile file(source);
+    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
+    file.close();
+    choose(2, onUnix);
+    m_desk->select(1, from == 1 ? "big.wv" : "sub");
+    selectRemote(2, from == 1 ? "/var/user/" : "/var/user/big.wv");
+    onProgress([](QtProgressDialog &progress) { progress.reject(); });
+    copyByDrag(from);
+    QVERIFY(m_desk->log().contains("*** Transfer aborted by user."));
+    const QString target = from == 1 ? unixFile("") : m_desk->path("sub");
+    QCOMPARE(QDir(target).entryList(QDir::Files), QStringList());
+    QVERIFY(!m_desk->log().contains("Sending file to instrument failed."));
+    // The session goes on.
+    m_desk->select(1, "tone.wv");
+    selectRemote(2, "/var/user/");
+    copyByDrag(1);
+    QCOMPARE(content(unixFile("tone.wv")), content(m_desk->path("tone.wv")));
+}
+
+void TestWorkbench::plugPulledAndPutBack()
+{
+    QFile file(m_desk->path("big.wv"));
+    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
+    file.close();
+    choose(2, onUnix);
+    m_desk->select(1, "big.wv");
+    onProgress([this](QtProgressDialog &) { m_simulator->stop(SIGKILL); });
+    copyByDrag(1);
+    QVERIFY(m_desk->log().contains("Sending file to instrument failed."));
+    QVERIFY(m_desk->window()->isEnabled());
+    m_desk->select(1, "tone.wv"); // the other pane goes on
+    QTest::mouseClick(m_desk->find<QAbstractButton>("tb_refresh_2"), Qt::LeftButton);
+    QVERIFY(m_desk->log().contains("viOpen(): Cannot open instrument connection."));
+
+    startSimulator(m_port);
+    QVERIFY(writeText(unixFile("again.wv"), "x"));
+    QTest::mouseClick(m_desk->find<QAbstractButton>("tb_refresh_2"), Qt::LeftButton);
+    QCOMPARE(m_desk->tree(2)->currentPath(), "/var/user/");
+    copyByDrag(1);
+    QCOMPARE(content(unixFile("tone.wv")), content(m_desk->path("tone.wv")));
+    selectRemote(2, "/var/user/again.wv");
+}
+
+void TestWorkbench::answersDuringATransfer()
+{
+    QFile file(m_desk->path("big.wv"));
+    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(100'000'000));
+    file.close();
+    choose(2, onUnix);
+    m_desk->select(1, "big.wv");
+    QTimer tick;
+    QElapsedTimer sinceTick;
+    qint64 longest = 0;
+    int ticks = 0;
+    QString shownTimes;
+    connect(&tick, &QTimer::timeout, [&] {
+        longest = std::max(longest, sinceTick.restart());
+        ++ticks;
+        const QList<QWidget *> windows = QApplication::topLevelWidgets();
+        for (const QWidget *window : windows) {
+            if (window->isVisible() && qobject_cast<const QtProgressDialog *>(window)) {
+                shownTimes = window->findChild<QLabel *>("l_times")->text();
+            }
+        }
+    });
+    sinceTick.start();
+    tick.start(10);
+    copyByDrag(1);
+    tick.stop();
+    QCOMPARE(QFileInfo(unixFile("big.wv")).size(), 100'000'000);
+    qInfo("longest wait of the window: %lld ms", static_cast<long long>(longest));
+    QVERIFY2(longest < 200, qPrintable(QString("%1 ms").arg(longest)));
+    QVERIFY(ticks > 3);
+    QVERIFY2(shownTimes.contains("of 95.4 MB at "), qPrintable(shownTimes));
+}
+
+void TestWorkbench::asksBeforeClosing()
+{
+    QFile file(m_desk->path("big.wv"));
+    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
+    file.close();
+    choose(2, onUnix);
+    m_desk->select(1, "big.wv");
+    bool stayed = false;
+    onProgress([&](QtProgressDialog &) {
+        QTimer::singleShot(0, m_desk->window(), [&] {
+            Seen seen;
+            QVERIFY(withModal([&] { askToClose(m_desk->window()); }, answer("No", seen)));
+            QVERIFY(seen.text.startsWith("An operation is still running."));
+            stayed = m_desk->window()->isVisible();
+            QVERIFY(withModal([&] { askToClose(m_desk->window()); }, press("Yes")));
+        });
+    });
+    m_desk->tree(2)->offerCopy(
+        *m_desk->tree(1), m_desk->path("big.wv"),
+        m_desk->tree(2)->visualRect(m_desk->tree(2)->currentIndex()).center());
+    QTRY_VERIFY(openMenu());
+    QTest::keyClick(openMenu(), Qt::Key_Down);
+    QTest::keyClick(openMenu(), Qt::Key_Return);
+    QTRY_VERIFY(!m_desk->window());
+    QVERIFY(stayed);
+    QTRY_COMPARE(QDir(unixFile("")).entryList(QDir::Files), QStringList());
+}
+
+void TestWorkbench::keepsDefaultFolderAndWidths()
+{
+    QVERIFY(QDir().mkpath(unixFile("mine")));
+    choose(2, onUnix);
+    selectRemote(2, "/var/user/mine/");
+    rightClick(m_desk->tree(2), "mine");
+    QTRY_VERIFY(openMenu());
+    QTest::keyClick(openMenu(), Qt::Key_S);
+    QTRY_VERIFY(m_desk->log().last().startsWith("Set default folder '/var/user/mine/'"));
+    m_desk->close();
+    const auto store = openMainStore();
+    QCOMPARE(store->value("InstrConfig/folder0").toString(), "/var/user/mine/");
+    QCOMPARE(store->value("tree2.remote.section0").toInt(), 220);
+    m_desk->open();
+    choose(2, onUnix);
+    QCOMPARE(m_desk->tree(2)->currentPath(), "/var/user/mine/");
+}
+
+QTEST_MAIN(TestWorkbench)
+#include "tst_workbench.moc"
