@@ -57,13 +57,13 @@ public:
             m_console.error(problem);
         }
         const bool isReady = m_resource.isEmpty() || device.openResource(m_resource);
-        if (!isReady && m_console.lastReason().isEmpty()) {
-            m_console.error("The instrument '" + m_resource + "' cannot be reached.");
-        }
         // A SIGINT from while the instrument was being opened.
         QCoreApplication::processEvents();
         if (isCancelled()) {
             return false;
+        }
+        if (!isReady && m_console.lastReason().isEmpty()) {
+            m_console.error("The instrument '" + m_resource + "' cannot be reached.");
         }
         const bool done = isReady && m_work(device);
         if (!done && !isCancelled()) {
