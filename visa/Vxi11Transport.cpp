@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Vxi11Transport.h"
 
+#include "ReadReply.h"
 #include "portMapper.h"
 
 #include <unistd.h>
@@ -51,26 +52,6 @@ ViStatus statusOf(Device_ErrorCode error)
     default:
         return VI_ERROR_IO;
     }
-}
-
-/// Device_ReadResp, with the data decoded straight into the reader's memory.
-struct ReadReply
-{
-    Device_ErrorCode error = DEVICE_ERROR_NONE;
-    int reason = 0;
-    std::span<std::uint8_t> target{};
-    unsigned size = 0; ///< beyond that of the target, nothing is stored
-};
-
-bool_t decodeReadReply(XDR *stream, ReadReply *reply)
-{
-    if (stream->x_op == XDR_FREE)
-        return TRUE;
-    if (!xdr_Device_ErrorCode(stream, &reply->error) || !xdr_int(stream, &reply->reason) ||
-        !xdr_u_int(stream, &reply->size))
-        return FALSE;
-    return reply->size > reply->target.size() ||
-           xdr_opaque(stream, reinterpret_cast<char *>(reply->target.data()), reply->size);
 }
 
 constexpr RpcProcedure coreProcedure(std::uint32_t number)

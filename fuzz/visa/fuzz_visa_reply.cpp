@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "visa/MessageTracker.h"
+#include "visa/ReadReply.h"
 #include "visa/RpcRecord.h"
 #include "visa/XdrValue.h"
 
@@ -7,21 +8,13 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <vector>
 
 using namespace visa;
 
 namespace {
 
 constexpr std::size_t LargestRecord = 4096;
-
-// Touches each byte, so that the sanitizer sees a length without its bytes.
-unsigned sum(const char *data, unsigned size)
-{
-    unsigned total = 0;
-    for (unsigned i = 0; i < size; ++i)
-        total += static_cast<unsigned char>(data[i]);
-    return total;
-}
 
 template <typename T>
 bool decodes(XdrCode<T> *code, std::span<const std::uint8_t> results)
@@ -43,11 +36,18 @@ void decodeRecord(std::span<const std::uint8_t> record)
     if (reply.kind != RpcReplyKind::Accepted)
         return;
 
-    XdrValue<Device_ReadResp> read(xdr_Device_ReadResp);
-    const bool isRead = read.decode(reply.results);
-    if (!isRead && read->data.data_len != 0)
+    // Exactly as large as the target, so that the sanitizer sees a byte behind it.
+    std::vector<std::uint8_t> target(reply.results.size() / 2);
+    XdrValue<ReadReply> read(decodeReadReply, {.target = target});
+    if (!read.decode(reply.results) && read->size != 0)
         std::abort();
-    if (sum(read->data.data_val, read->data.data_len) > 0xFFU * reply.results.size())
+    if (read->size <= target.size() && read->size > reply.results.size())
+        std::abort();
+    XdrValue<Device_ReadResp> generated(xdr_Device_ReadResp);
+    if (generated.decode(reply.results) && generated->data.data_len <= target.size() &&
+        (read->size != generated->data.data_len ||
+         !std::equal(target.begin(), target.begin() + read->size,
+                     reinterpret_cast<const std::uint8_t *>(generated->data.data_val))))
         std::abort();
     (void)decodes(xdr_Device_WriteResp, reply.results);
     (void)decodes(xdr_Create_LinkResp, reply.results);

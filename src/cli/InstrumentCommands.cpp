@@ -62,6 +62,9 @@ public:
         if (isCancelled()) {
             return false;
         }
+        if (!isReady && m_console.lastReason().isEmpty()) {
+            m_console.error("The instrument '" + m_resource + "' cannot be reached.");
+        }
         const bool done = isReady && m_work(device);
         if (!done && !isCancelled()) {
             explain(device);

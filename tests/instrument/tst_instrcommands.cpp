@@ -278,6 +278,9 @@ void TestInstrCommands::failures_data()
     QTest::newRow("no such device") << QStringList{"info", "GPIB0::9"} << "viOpen";
     QTest::newRow("no such host") << QStringList{"info", "nowhere.invalid"}
                                   << "No host address found. ";
+    QTest::newRow("dead host") << QStringList{"info", "127.0.0.99"}
+                               << "error: The instrument 'TCPIP::127.0.0.99::INSTR' cannot be "
+                                  "reached.";
     QTest::newRow("no folder") << QStringList{"ls", device, "/var/user/gone"}
                                << "The instrument reports: -256,";
     QTest::newRow("no local file") << QStringList{"put", device, "/nonexistent.wv", "/var/user/"}
