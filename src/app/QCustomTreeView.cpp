@@ -283,10 +283,13 @@ void QCustomTreeView::mousePressEvent(QMouseEvent *event)
 {
     const QPoint position = event->position().toPoint();
     const QModelIndex index = indexAt(position);
-    if (index.column() == 0 && position.x() < visualRect(index).left()) {
-        readBeforeOpening(index); // its branch mark is pressed
+    const bool onBranchMark = index.column() == 0 && position.x() < visualRect(index).left();
+    if (onBranchMark) {
+        readBeforeOpening(index);
     }
     QTreeView::mousePressEvent(event);
+    m_dragStart = position;
+    m_pressedEntry = event->button() == Qt::LeftButton && !onBranchMark ? index : QModelIndex();
 }
 
 void QCustomTreeView::mouseDoubleClickEvent(QMouseEvent *event)

@@ -4,6 +4,8 @@
 #include "ColumnWidths.h"
 #include "ModulesDb.h"
 
+#include <QPersistentModelIndex>
+#include <QPoint>
 #include <QTimer>
 #include <QTreeView>
 
@@ -98,6 +100,7 @@ protected:
     void currentChanged(const QModelIndex &current, const QModelIndex &previous) override;
     void contextMenuEvent(QContextMenuEvent *event) override;
     void mousePressEvent(QMouseEvent *event) override;
+    void mouseMoveEvent(QMouseEvent *event) override;
     void mouseDoubleClickEvent(QMouseEvent *event) override;
     void keyPressEvent(QKeyEvent *event) override;
     void focusInEvent(QFocusEvent *event) override;
@@ -135,6 +138,8 @@ private:
     QAction *m_runAction = nullptr;
     QList<ModulesDb::ToolAction> m_toolActions;
     ColumnWidths m_columnWidths;
+    QPoint m_dragStart;                   ///< in the viewport
+    QPersistentModelIndex m_pressedEntry; ///< that may be dragged
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
     QString m_dropSource;
