@@ -36,6 +36,13 @@ QString folderName(const QString &path)
     return path.left(path.lastIndexOf('/') + 1);
 }
 
+/// Whether a path below a folder can't lead out of it again.
+bool staysBelow(const QString &relativePath)
+{
+    const QStringList parts = relativePath.split('/');
+    return !parts.contains("..") && !parts.contains(QString());
+}
+
 QString chopSlash(const QString &path)
 {
     return path.size() > 1 && path.endsWith('/') ? path.chopped(1) : path;
@@ -155,6 +162,11 @@ bool CopyJob::collectRemote()
         return false;
     }
     for (const RemoteFileEntry &entry : std::as_const(entries)) {
+        if (!staysBelow(entry.name)) {
+            return Tracer::fail(QString("The instrument lists a file '%1', whose name leads out of "
+                                        "the folder that is copied.")
+                                    .arg(entry.name));
+        }
         if (!entry.isDirectory()) {
             addFile(entry.name, entry.size);
         }
@@ -226,6 +238,11 @@ bool CopyJob::transfer(VisaDevice *device, const QString &label, const char *fai
 
 bool CopyJob::send(const QString &local, const QString &remote)
 {
+    if (remote.contains('\'')) {
+        return Tracer::fail(QString("The name '%1' holds an apostrophe, which ends a name in the "
+                                    "commands of an instrument.")
+                                .arg(remote));
+    }
     VisaDevice *device = m_request.targetDevice;
     const QString label =
         QString("Sending file %1\nto instrument %2").arg(fileName(remote), deviceName(*device));
