@@ -71,6 +71,7 @@ public slots:
 
     void slot_default();
     void slot_copy();
+    void slot_move(); ///< does nothing: nothing is moved between the panes
     void slot_create();
     void slot_rename();
     void slot_remove();
@@ -86,6 +87,13 @@ signals:
 
     void localDefaultFolderSet(const QString &sDefaultFolder);
     void remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
+
+    /// For those who start a tool on an entry by other ways; this view itself gives them never,
+    /// since its menu goes by slot_module().
+    void startFileConversion(const QString &sPathFile);
+    void startResampler(const QString &sPathFile);
+    void startFilter(const QString &sPathFile);
+    void startCreateSignal(const QString &sPathFile);
 
     /// An entry has become current, or the pane has come into use again with this one.
     void itemSelected(const QString &sItem);
@@ -118,7 +126,7 @@ private:
     void copyToClipboard();
     void pasteFromClipboard();
     void setCopy(const QCustomTreeView &source, const QString &path, const QString &target);
-    [[nodiscard]] bool isBusy() const;
+    [[nodiscard]] static bool isBusy();
     void open(const QModelIndex &folder);
     void readBeforeOpening(const QModelIndex &folder);
     [[nodiscard]] QModelIndex openAnew(const QString &path);

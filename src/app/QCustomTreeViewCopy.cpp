@@ -164,17 +164,20 @@ void QCustomTreeView::slot_copy()
     } else if (!m_dropSourceDevice && isLocal()) {
         emit infoTextAvailable("Copy operations between local file systems are not supported.");
     } else {
-        copyEntry(this, {.sourceDevice = m_dropSourceDevice,
-                         .source = m_dropSource,
-                         .sourceBytes = m_dropSourceBytes,
-                         .targetDevice = device(),
-                         .targetFolder = m_dropTarget});
+        const QString outcome = copyEntry(this, {.sourceDevice = m_dropSourceDevice,
+                                                 .source = m_dropSource,
+                                                 .sourceBytes = m_dropSourceBytes,
+                                                 .targetDevice = device(),
+                                                 .targetFolder = m_dropTarget});
         updateAndExpandTree(m_dropTarget);
+        emit errMsg(outcome);
     }
 }
 
-bool QCustomTreeView::isBusy() const
+void QCustomTreeView::slot_move() {}
+
+bool QCustomTreeView::isBusy()
 {
     // It lives as long as its operation, hidden or not.
-    return window()->findChild<QtProgressDialog *>() != nullptr;
+    return QtProgressDialog::running() != nullptr;
 }
