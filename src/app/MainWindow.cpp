@@ -24,7 +24,6 @@
 #include <QSignalBlocker>
 #include <QTimer>
 
-#include <utility>
 
 namespace {
 
@@ -343,7 +342,6 @@ bool MainWindow::mayClose()
 
 void MainWindow::hideEvent(QHideEvent *event)
 {
-    m_hidInstruments = m_instrConfig->isVisible();
     m_instrConfig->hide();
     m_modules.hideAll();
     QMainWindow::hideEvent(event);
@@ -353,7 +351,4 @@ void MainWindow::showEvent(QShowEvent *event)
 {
     QMainWindow::showEvent(event);
     m_modules.showAgain();
-    if (std::exchange(m_hidInstruments, false)) {
-        m_instrConfig->show();
-    }
 }
