@@ -18,6 +18,7 @@
 #include <QLabel>
 #include <QMenu>
 #include <QRandomGenerator>
+#include <QStatusBar>
 #include <QTest>
 #include <QTimer>
 
@@ -329,6 +330,7 @@ void TestWorkbench::copiesFolders()
     copyByDrag(1, {answer("Yes", seen)});
     QCOMPARE(content(driveFile("one.wv")), noise(1000));
     QCOMPARE(content(driveFile("deep/two.wv")), noise(2000));
+    QCOMPARE(m_desk->find<QStatusBar>("statusbar")->currentMessage(), "2 files copied.");
     QVERIFY(m_desk->log().contains(
         QString("Copying %1 to D:/deep/two.wv").arg(m_desk->path("sub/deep/two.wv"))));
 
@@ -476,6 +478,8 @@ void TestWorkbench::plugPulledAndPutBack()
     onProgress([this](QtProgressDialog &) { m_simulator->stop(SIGKILL); });
     copyByDrag(1);
     QVERIFY(m_desk->log().contains("Sending file to instrument failed."));
+    QCOMPARE(m_desk->find<QStatusBar>("statusbar")->currentMessage(),
+             "Nothing was copied; see the log.");
     QVERIFY(m_desk->window()->isEnabled());
     m_desk->select(1, "tone.wv"); // the other pane goes on
     QTest::mouseClick(m_desk->find<QAbstractButton>("tb_refresh_2"), Qt::LeftButton);
