@@ -4,6 +4,7 @@
 #include "AboutBox.h"
 #include "LocalFileModel.h"
 #include "QCustomTreeView.h"
+#include "RemotePaneFiles.h"
 #include "devicechoice.h"
 #include "instrument/DlgInstrConfig.h"
 #include "mnemonics.h"
@@ -11,6 +12,7 @@
 #include "settingsstores.h"
 #include "splittersettings.h"
 #include "toolframe/QtProgressDialog.h"
+#include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"
 #include "toolframe/questions.h"
 #include "toolframe/windowplace.h"
@@ -25,6 +27,7 @@
 #include <QTimer>
 
 #include <algorithm>
+#include <utility>
 
 namespace {
 
@@ -40,18 +43,6 @@ QIcon levelIcon(int level)
         return QIcon(":/icons16/yellowled.png");
     }
     return QIcon(level & Tracer::Debug ? ":/icons16/debug.png" : ":/icons16/bulb.png");
-}
-
-/// Whether the tops of an instrument's tree could be read.
-bool isReadable(const RemoteDirModel &model)
-{
-    for (int row = 0; row < model.rowCount(); ++row) {
-        const RemoteEntry *root = RemoteDirModel::entryOf(model.index(row, 0));
-        if (root == nullptr || root->hasReadError()) {
-            return false;
-        }
-    }
-    return true;
 }
 
 } // namespace
@@ -260,7 +251,7 @@ void MainWindow::refresh(Pane &pane)
         return;
     }
     pane.tree->updateAndExpandTree(defaultFolder(pane));
-    if (!isReadable(*pane.remoteModel) && openInstrument(pane)) {
+    if (!RemotePaneFiles::answers(*pane.remoteModel) && openInstrument(pane)) {
         pane.tree->updateAndExpandTree(defaultFolder(pane));
     }
 }
@@ -316,10 +307,9 @@ void MainWindow::showInstrument(Pane &pane)
 
 bool MainWindow::openInstrument(Pane &pane)
 {
-    QGuiApplication::setOverrideCursor(Qt::WaitCursor);
+    const WaitCursor cursor;
     (void)pane.instrument->closeResource();
     const bool opened = pane.instrument->openResource(pane.device->currentData().toString());
-    QGuiApplication::restoreOverrideCursor();
     const QString reported = pane.instrument->takeLastError().trimmed();
     if (!opened && !reported.isEmpty()) {
         Tracer::Trace(Tracer::Error, reported);
@@ -363,7 +353,7 @@ void MainWindow::instrListUpdated()
 void MainWindow::slot_itemSelected(const QString &sItem)
 {
     const Pane &pane = paneOf(sender());
-    {
+    if (!sItem.isEmpty()) { // as that of a row that says why there are no entries
         const QSignalBlocker blocker(pane.history);
         if (pane.history->findText(sItem, Qt::MatchExactly | Qt::MatchCaseSensitive) < 0) {
             while (pane.history->count() >= MaxHistory) {
@@ -474,7 +464,7 @@ void MainWindow::closeEvent(QCloseEvent *event)
 
 bool MainWindow::mayClose()
 {
-    QPointer<QtProgressDialog> running = findChild<QtProgressDialog *>();
+    QPointer<QtProgressDialog> running = QtProgressDialog::running();
     if (!running) {
         return true;
     }
@@ -496,6 +486,7 @@ bool MainWindow::mayClose()
 
 void MainWindow::hideEvent(QHideEvent *event)
 {
+    m_hidInstruments = m_instrConfig->isVisible();
     m_instrConfig->hide();
     m_modules.hideAll();
     QMainWindow::hideEvent(event);
@@ -505,4 +496,7 @@ void MainWindow::showEvent(QShowEvent *event)
 {
     QMainWindow::showEvent(event);
     m_modules.showAgain();
+    if (std::exchange(m_hidInstruments, false)) {
+        m_instrConfig->show();
+    }
 }

@@ -110,4 +110,5 @@ private:
     qint64 m_firstPaintMs = -1;
     bool m_paintSeen = false;
     bool m_noVisa = false;
+    bool m_hidInstruments = false; ///< with this window, to be shown again with it
 };

@@ -6,6 +6,7 @@
 #include "entryname.h"
 #include "instrument/VisaDevice.h"
 #include "mnemonics.h"
+#include "toolframe/WaitCursor.h"
 #include "toolframe/questions.h"
 
 #include <QAction>
@@ -179,6 +180,7 @@ void QCustomTreeView::fitSizeColumn()
 
 QModelIndex QCustomTreeView::openAnew(const QString &path)
 {
+    const WaitCursor cursor;
     const int sortColumn = header()->sortIndicatorSection();
     const Qt::SortOrder sortOrder = header()->sortIndicatorOrder();
     keepColumnWidths();
@@ -283,10 +285,13 @@ void QCustomTreeView::mousePressEvent(QMouseEvent *event)
 {
     const QPoint position = event->position().toPoint();
     const QModelIndex index = indexAt(position);
-    if (index.column() == 0 && position.x() < visualRect(index).left()) {
-        readBeforeOpening(index); // its branch mark is pressed
+    const bool onBranchMark = index.column() == 0 && position.x() < visualRect(index).left();
+    if (onBranchMark) {
+        readBeforeOpening(index);
     }
     QTreeView::mousePressEvent(event);
+    m_dragStart = position;
+    m_pressedEntry = event->button() == Qt::LeftButton && !onBranchMark ? index : QModelIndex();
 }
 
 void QCustomTreeView::mouseDoubleClickEvent(QMouseEvent *event)
@@ -389,7 +394,7 @@ void QCustomTreeView::slot_runwaveform()
 {
     const QString path = currentPath();
     if (!isBusy() && isRunnable(path, device())) {
-        runWaveform(this, *device(), path);
+        emit errMsg(runWaveform(this, *device(), path));
     }
 }
 
@@ -421,6 +426,7 @@ void QCustomTreeView::slot_create()
     if (name && acceptsName(parent, *name, "The new folder name contains invalid characters.") &&
         m_files->createFolder(parent, *name)) {
         updateAndExpandTree(parent + *name + '/');
+        emit errMsg(QString("Folder '%1' created.").arg(*name));
     }
 }
 
@@ -441,6 +447,7 @@ void QCustomTreeView::slot_rename()
     if (name && acceptsName(parent, *name, "The new entry name contains invalid characters.") &&
         m_files->rename(path, *name)) {
         updateAndExpandTree(parent + *name);
+        emit errMsg(QString("'%1' renamed to '%2'.").arg(entryName(path), *name));
     }
 }
 
@@ -454,21 +461,25 @@ void QCustomTreeView::slot_remove()
         emit infoTextAvailable("Cannot delete root node.");
         return;
     }
+    bool done = false;
     if (!m_files->isRealFolder(path)) {
         if (!askYesNo(
                 this, "Delete File",
                 QString("Do you really want to delete the file\n%1 ?").arg(withoutSlash(path)))) {
             return;
         }
-        (void)m_files->removeFile(path);
+        done = m_files->removeFile(path);
     } else if (m_files->isEmptyFolder(path)) {
-        (void)m_files->removeEmptyFolder(path);
+        done = m_files->removeEmptyFolder(path);
     } else {
         if (!askYesNo(this, "Delete Folder", m_files->removeTreeQuestion(path))) {
             return;
         }
-        (void)m_files->removeTree(path, this);
+        done = m_files->removeTree(path, this);
     }
     // Also after a failure: what could be removed is gone.
     updateAndExpandTree(parentFolder(path));
+    if (done) {
+        emit errMsg(QString("'%1' deleted.").arg(entryName(path)));
+    }
 }

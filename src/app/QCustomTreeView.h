@@ -4,6 +4,8 @@
 #include "ColumnWidths.h"
 #include "ModulesDb.h"
 
+#include <QPersistentModelIndex>
+#include <QPoint>
 #include <QTimer>
 #include <QTreeView>
 
@@ -69,6 +71,7 @@ public slots:
 
     void slot_default();
     void slot_copy();
+    void slot_move(); ///< does nothing: nothing is moved between the panes
     void slot_create();
     void slot_rename();
     void slot_remove();
@@ -85,6 +88,13 @@ signals:
     void localDefaultFolderSet(const QString &sDefaultFolder);
     void remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
 
+    /// For those who start a tool on an entry by other ways; this view itself gives them never,
+    /// since its menu goes by slot_module().
+    void startFileConversion(const QString &sPathFile);
+    void startResampler(const QString &sPathFile);
+    void startFilter(const QString &sPathFile);
+    void startCreateSignal(const QString &sPathFile);
+
     /// An entry has become current, or the pane has come into use again with this one.
     void itemSelected(const QString &sItem);
 
@@ -98,6 +108,7 @@ protected:
     void currentChanged(const QModelIndex &current, const QModelIndex &previous) override;
     void contextMenuEvent(QContextMenuEvent *event) override;
     void mousePressEvent(QMouseEvent *event) override;
+    void mouseMoveEvent(QMouseEvent *event) override;
     void mouseDoubleClickEvent(QMouseEvent *event) override;
     void keyPressEvent(QKeyEvent *event) override;
     void focusInEvent(QFocusEvent *event) override;
@@ -115,7 +126,7 @@ private:
     void copyToClipboard();
     void pasteFromClipboard();
     void setCopy(const QCustomTreeView &source, const QString &path, const QString &target);
-    [[nodiscard]] bool isBusy() const;
+    [[nodiscard]] static bool isBusy();
     void open(const QModelIndex &folder);
     void readBeforeOpening(const QModelIndex &folder);
     [[nodiscard]] QModelIndex openAnew(const QString &path);
@@ -135,6 +146,8 @@ private:
     QAction *m_runAction = nullptr;
     QList<ModulesDb::ToolAction> m_toolActions;
     ColumnWidths m_columnWidths;
+    QPoint m_dragStart;                   ///< in the viewport
+    QPersistentModelIndex m_pressedEntry; ///< that may be dragged
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
     QString m_dropSource;

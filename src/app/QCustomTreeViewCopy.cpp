@@ -9,6 +9,7 @@
 #include "jobs/CopyJob.h"
 #include "toolframe/QtProgressDialog.h"
 
+#include <QApplication>
 #include <QClipboard>
 #include <QDrag>
 #include <QDragEnterEvent>
@@ -16,6 +17,7 @@
 #include <QIcon>
 #include <QMenu>
 #include <QMimeData>
+#include <QMouseEvent>
 
 namespace {
 
@@ -30,6 +32,22 @@ QByteArray clipboardTag(const QCustomTreeView &pane)
 }
 
 } // namespace
+
+void QCustomTreeView::mouseMoveEvent(QMouseEvent *event)
+{
+    if (!event->buttons().testFlag(Qt::LeftButton)) {
+        QTreeView::mouseMoveEvent(event);
+        return;
+    }
+    // Not left to the base class, which drags only what its model offers, and an instrument's
+    // doesn't.
+    const QPoint way = event->position().toPoint() - m_dragStart;
+    if (m_pressedEntry.isValid() && way.manhattanLength() >= QApplication::startDragDistance()) {
+        m_pressedEntry = QModelIndex(); // once
+        startDrag(Qt::CopyAction);
+        setState(NoState);
+    }
+}
 
 void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
 {
@@ -56,7 +74,12 @@ void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
         event->ignore();
         return;
     }
-    const QModelIndex target = indexAt(event->position().toPoint());
+    const QPoint position = event->position().toPoint();
+    const int margin = autoScrollMargin();
+    if (!viewport()->rect().adjusted(0, margin, 0, -margin).contains(position)) {
+        startAutoScroll();
+    }
+    const QModelIndex target = indexAt(position);
     if (target.isValid()) {
         selectionModel()->setCurrentIndex(target, QItemSelectionModel::ClearAndSelect |
                                                       QItemSelectionModel::Rows);
@@ -70,6 +93,7 @@ void QCustomTreeView::dropEvent(QDropEvent *event)
         event->ignore();
         return;
     }
+    stopAutoScroll();
     event->acceptProposedAction();
     offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
               event->position().toPoint());
@@ -140,17 +164,20 @@ void QCustomTreeView::slot_copy()
     } else if (!m_dropSourceDevice && isLocal()) {
         emit infoTextAvailable("Copy operations between local file systems are not supported.");
     } else {
-        copyEntry(this, {.sourceDevice = m_dropSourceDevice,
-                         .source = m_dropSource,
-                         .sourceBytes = m_dropSourceBytes,
-                         .targetDevice = device(),
-                         .targetFolder = m_dropTarget});
+        const QString outcome = copyEntry(this, {.sourceDevice = m_dropSourceDevice,
+                                                 .source = m_dropSource,
+                                                 .sourceBytes = m_dropSourceBytes,
+                                                 .targetDevice = device(),
+                                                 .targetFolder = m_dropTarget});
         updateAndExpandTree(m_dropTarget);
+        emit errMsg(outcome);
     }
 }
 
-bool QCustomTreeView::isBusy() const
+void QCustomTreeView::slot_move() {}
+
+bool QCustomTreeView::isBusy()
 {
     // It lives as long as its operation, hidden or not.
-    return window()->findChild<QtProgressDialog *>() != nullptr;
+    return QtProgressDialog::running() != nullptr;
 }

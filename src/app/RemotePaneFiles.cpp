@@ -61,15 +61,33 @@ void RemotePaneFiles::follow(const QTreeView &view)
             [this](const QModelIndex &index) { m_model->slotCollapsed(index); });
 }
 
+bool RemotePaneFiles::answers(const RemoteDirModel &model)
+{
+    for (int row = 0; row < model.rowCount(); ++row) {
+        const RemoteEntry *root = RemoteDirModel::entryOf(model.index(row, 0));
+        if (root == nullptr || root->hasReadError()) {
+            return false;
+        }
+    }
+    return true;
+}
+
 QStringList RemotePaneFiles::reload(const QString &path)
 {
-    QStringList open = m_model->expandedPaths();
+    const QStringList wanted = m_model->expandedPaths();
     m_model->refresh();
-    if (!m_model->expandPaths(open)) {
+    QStringList open;
+    // One that doesn't answer is not asked for every folder: each would take its time-out.
+    for (qsizetype i = 0; i < wanted.size() && answers(*m_model); ++i) {
+        if (m_model->expandPath(wanted.at(i))) {
+            open.append(wanted.at(i));
+        }
+    }
+    if (open.size() < wanted.size()) {
         Tracer::Trace(Tracer::Information, "Not all paths could be reloaded.");
     }
     const QString folder = folderOf(path);
-    if (!open.contains(folder) && m_model->expandPath(folder)) {
+    if (!open.contains(folder) && answers(*m_model) && m_model->expandPath(folder)) {
         open.append(folder);
     }
     emit folderLoaded(folder);

@@ -14,6 +14,9 @@ class RemotePaneFiles final : public PaneFiles
 public:
     explicit RemotePaneFiles(RemoteDirModel *model);
 
+    /// Whether the tops of the tree are known and, as far as they were read, could be read.
+    [[nodiscard]] static bool answers(const RemoteDirModel &model);
+
     [[nodiscard]] bool isLocal() const override { return false; }
     [[nodiscard]] VisaDevice *device() const override;
     [[nodiscard]] QString settingsName() const override;

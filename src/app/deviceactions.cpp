@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "deviceactions.h"
 
+#include "entryname.h"
 #include "instrument/VisaDevice.h"
 #include "jobs/CopyJob.h"
 #include "log/Tracer.h"
@@ -38,9 +39,24 @@ QString replaceText(const QStringList &paths)
                      .arg(paths.size());
 }
 
+QString outcomeText(const CopyJob &job, bool done)
+{
+    if (!done && job.fileCount() == 0) {
+        return job.isCancelled() ? "The copy was cancelled." : "Nothing was copied; see the log.";
+    }
+    if (!done) {
+        return QString(job.isCancelled() ? "The copy was cancelled after %1 of %2 files."
+                                         : "%1 of %2 files copied; see the log.")
+            .arg(job.copiedCount())
+            .arg(job.fileCount());
+    }
+    return job.fileCount() == 1 ? QString("1 file copied.")
+                                : QString("%1 files copied.").arg(job.fileCount());
+}
+
 } // namespace
 
-void copyEntry(QWidget *parent, const CopyRequest &request)
+QString copyEntry(QWidget *parent, const CopyRequest &request)
 {
     QtProgressDialog progress({}, parent);
     const CopyQuestions questions{
@@ -69,8 +85,7 @@ void copyEntry(QWidget *parent, const CopyRequest &request)
     QObject::connect(&job, &CopyJob::bytesCopied, &progress, &QtProgressDialog::setBytes);
     QObject::connect(&job, &ToolJob::ProgressUpdate, &progress, &QtProgressDialog::setValue);
     QObject::connect(&progress, &QtProgressDialog::canceled, &job, &ToolJob::cancel);
-    // The reason of a failure is in the log; a pane that is read anew shows what came over.
-    (void)job.run();
+    return outcomeText(job, job.run());
 }
 
 bool isRunnable(const QString &path, const VisaDevice *device)
@@ -78,7 +93,7 @@ bool isRunnable(const QString &path, const VisaDevice *device)
     return device != nullptr && path.endsWith(".WV", Qt::CaseInsensitive);
 }
 
-void runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
+QString runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
 {
     constexpr quint32 answerTimeoutMs = 5000;
     const quint32 savedTimeoutMs = device.timeoutMs();
@@ -97,4 +112,7 @@ void runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
         Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
     }
     (void)device.setTimeoutMs(savedTimeoutMs);
+    return QString(started ? "'%1' plays on %2, %3."
+                           : "'%1' was not started on %2, %3; see the log.")
+        .arg(entryName(path), device.model(), device.serial());
 }

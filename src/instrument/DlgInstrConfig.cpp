@@ -6,12 +6,12 @@
 #include "log/Tracer.h"
 #include "remotepaths.h"
 #include "toolframe/QtProgressDialog.h"
+#include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"
 #include "toolframe/windowplace.h"
 #include "ui_DlgInstrConfig.h"
 
 #include <QAction>
-#include <QGuiApplication>
 #include <QHeaderView>
 #include <QInputDialog>
 #include <QLabel>
@@ -36,14 +36,6 @@ QTreeWidgetItem *topItem(QTreeWidgetItem *item)
 {
     return item != nullptr && item->parent() != nullptr ? item->parent() : item;
 }
-
-class WaitCursor
-{
-public:
-    WaitCursor() { QGuiApplication::setOverrideCursor(Qt::WaitCursor); }
-    ~WaitCursor() { QGuiApplication::restoreOverrideCursor(); }
-    Q_DISABLE_COPY_MOVE(WaitCursor)
-};
 
 } // namespace
 

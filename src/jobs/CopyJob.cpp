@@ -15,6 +15,8 @@
 
 namespace {
 
+constexpr const char *sendingFailed = "Sending file to instrument failed.";
+
 /// As the instrument writes its paths.
 QString nativePath(const VisaDevice &device, const QString &path)
 {
@@ -23,7 +25,9 @@ QString nativePath(const VisaDevice &device, const QString &path)
 
 QString deviceName(const VisaDevice &device)
 {
-    return device.model() + ", " + device.serial();
+    // One that could not be opened has told nothing about itself.
+    return device.model().isEmpty() ? QString("that is not open")
+                                    : device.model() + ", " + device.serial();
 }
 
 QString fileName(const QString &path)
@@ -41,6 +45,13 @@ bool staysBelow(const QString &relativePath)
 {
     const QStringList parts = relativePath.split('/');
     return !parts.contains("..") && !parts.contains(QString());
+}
+
+/// Whether a character ends a name, joins two, or stands for others where an instrument expects the
+/// name of a single file.
+bool isCommandCharacter(QChar character)
+{
+    return QStringView(u"'\"*?\\").contains(character);
 }
 
 QString chopSlash(const QString &path)
@@ -85,6 +96,9 @@ bool CopyJob::run()
     for (m_fileIndex = 0; m_fileIndex < m_files.size(); ++m_fileIndex) {
         const File &file = m_files.at(m_fileIndex);
         showProgress(0);
+        if (isCancelled()) {
+            return false; // here, for a transfer forgets what came before it
+        }
         if (isFolderRequest()) {
             Tracer::Trace(Tracer::Information,
                           QString("Copying %1 to %2").arg(file.source, file.target));
@@ -94,6 +108,7 @@ bool CopyJob::run()
             return false;
         }
         m_doneBytes += file.bytes;
+        m_copiedCount += copied ? 1 : 0;
         allCopied = allCopied && copied;
         if (!copied && (!isFolderRequest() || (m_questions.goOn && !m_questions.goOn()))) {
             return false;
@@ -238,15 +253,18 @@ bool CopyJob::transfer(VisaDevice *device, const QString &label, const char *fai
 
 bool CopyJob::send(const QString &local, const QString &remote)
 {
-    if (remote.contains('\'')) {
-        return Tracer::fail(QString("The name '%1' holds an apostrophe, which ends a name in the "
-                                    "commands of an instrument.")
-                                .arg(remote));
+    const QString name = remote.mid(m_request.targetFolder.size());
+    const auto found = std::find_if(name.cbegin(), name.cend(), isCommandCharacter);
+    if (found != name.cend()) {
+        Tracer::Trace(Tracer::Error, QString("The name \"%1\" holds the character %2, which has a "
+                                             "meaning in the commands of an instrument.")
+                                         .arg(name, *found));
+        return Tracer::fail(sendingFailed);
     }
     VisaDevice *device = m_request.targetDevice;
     const QString label =
         QString("Sending file %1\nto instrument %2").arg(fileName(remote), deviceName(*device));
-    return transfer(device, label, "Sending file to instrument failed.", [&] {
+    return transfer(device, label, sendingFailed, [&] {
         return makeRemoteFolder(folderName(remote)) &&
                device->writeRemoteFile(local, nativePath(*device, remote));
     });
@@ -297,7 +315,10 @@ bool CopyJob::makeRemoteFolder(const QString &folder)
 void CopyJob::showProgress(int percentOfFile)
 {
     const int wayPercent = (100 * m_leg + percentOfFile) / m_legCount;
-    const auto count = static_cast<int>(m_files.size());
-    emit ProgressUpdate((100 * static_cast<int>(m_fileIndex) + wayPercent) / count);
-    emit bytesCopied(m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100, m_totalBytes);
+    const qint64 bytes = m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100;
+    // By bytes, for one file may be as long as a thousand others.
+    const qint64 percent =
+        m_totalBytes > 0 ? 100 * bytes / m_totalBytes : 100 * m_fileIndex / m_files.size();
+    emit ProgressUpdate(static_cast<int>(percent));
+    emit bytesCopied(bytes, m_totalBytes);
 }

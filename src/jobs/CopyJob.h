@@ -49,6 +49,10 @@ public:
 
     [[nodiscard]] bool run() override;
 
+    /// Files to copy, and those that were copied; also while and after running.
+    [[nodiscard]] qsizetype fileCount() const { return m_files.size(); }
+    [[nodiscard]] qsizetype copiedCount() const { return m_copiedCount; }
+
 signals:
     /// How much of the whole is copied, in bytes, as exact as the percentages of the transfers.
     void bytesCopied(qint64 done, qint64 total);
@@ -81,8 +85,9 @@ private:
     CopyQuestions m_questions;
     QList<File> m_files;
     qint64 m_totalBytes = 0;
-    qint64 m_doneBytes = 0;      ///< of the files before the one in hand
-    qsizetype m_fileIndex = 0;   ///< of the one in hand
+    qint64 m_doneBytes = 0;    ///< of the files before the one in hand
+    qsizetype m_fileIndex = 0; ///< of the one in hand
+    qsizetype m_copiedCount = 0;
     int m_leg = 0;               ///< of the way of the file in hand from instrument to instrument
     int m_legCount = 1;          ///< 2 for a file that goes by way of the disk
     QStringList m_remoteFolders; ///< known to exist at the target

@@ -100,6 +100,17 @@ QtProgressDialog::~QtProgressDialog()
     stopBlocking();
 }
 
+QtProgressDialog *QtProgressDialog::running()
+{
+    const QList<QWidget *> windows = QApplication::topLevelWidgets();
+    for (QWidget *window : windows) {
+        if (auto *progress = qobject_cast<QtProgressDialog *>(window)) {
+            return progress;
+        }
+    }
+    return nullptr;
+}
+
 QString QtProgressDialog::labelText() const
 {
     return m_label->text();

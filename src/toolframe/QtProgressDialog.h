@@ -28,6 +28,9 @@ public:
                               const QString &cancelText = "Cancel");
     ~QtProgressDialog() override;
 
+    /// The dialog of the job that is running in this program, shown or not; null if none is.
+    [[nodiscard]] static QtProgressDialog *running();
+
     [[nodiscard]] bool wasCanceled() const { return m_canceled; }
     [[nodiscard]] QString labelText() const;
 

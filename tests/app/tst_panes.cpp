@@ -8,8 +8,12 @@
 #include <QDir>
 #include <QFileInfo>
 #include <QMenu>
+#include <QMouseEvent>
 #include <QSignalSpy>
+#include <QStandardItemModel>
 #include <QTest>
+
+#include <utility>
 
 class TestPanes : public QObject
 {
@@ -33,7 +37,24 @@ private slots:
     void doubleClickStartsTheFirstTool();
     void localCopyIsRefused();
     void largeFolderStaysInOrder();
+    void dragsFromAnyModel();
 };
+
+namespace {
+
+/// Counts the drags that the mouse starts.
+class DraggedTree : public QCustomTreeView
+{
+public:
+    using QCustomTreeView::mouseMoveEvent;
+    using QCustomTreeView::mousePressEvent;
+    int drags = 0;
+
+protected:
+    void startDrag(Qt::DropActions /*supportedActions*/) override { ++drags; }
+};
+
+} // namespace
 
 void TestPanes::createsAFolder()
 {
@@ -341,6 +362,41 @@ void TestPanes::largeFolderStaysInOrder()
     QTRY_VERIFY(tree->viewport()->rect().contains(tree->visualRect(tree->currentIndex()).center()));
     pressKey(tree, Qt::Key_Down);
     QCOMPARE(tree->currentPath(), desk.path("many/f00801.wv"));
+}
+
+void TestPanes::dragsFromAnyModel()
+{
+    // As an instrument's: its entries aren't offered for dragging.
+    QStandardItemModel model;
+    auto *folder = new QStandardItem("folder");
+    folder->setFlags(Qt::ItemIsEnabled | Qt::ItemIsSelectable);
+    folder->appendRow(new QStandardItem("file"));
+    model.appendRow(folder);
+    DraggedTree tree;
+    tree.setModel(&model);
+    tree.resize(300, 200);
+    tree.show();
+    const QRect row = tree.visualRect(folder->index());
+    const auto pressAndMove = [&](const QPoint &start, int distance, Qt::MouseButton button) {
+        const auto global = [&](const QPoint &point) {
+            return tree.viewport()->mapToGlobal(point);
+        };
+        QMouseEvent press(QEvent::MouseButtonPress, start, global(start), button, button, {});
+        tree.mousePressEvent(&press);
+        for (int step = 1; step <= 2; ++step) {
+            const QPoint position = start + QPoint(0, distance * step);
+            QMouseEvent move(QEvent::MouseMove, position, global(position), Qt::NoButton, button,
+                             {});
+            tree.mouseMoveEvent(&move);
+        }
+        return std::exchange(tree.drags, 0);
+    };
+    const int far = QApplication::startDragDistance();
+    QCOMPARE(pressAndMove(row.center(), far, Qt::LeftButton), 1);
+    QCOMPARE(pressAndMove(row.center(), far / 2 - 1, Qt::LeftButton), 0);
+    QCOMPARE(pressAndMove(row.center(), far, Qt::RightButton), 0);
+    QCOMPARE(pressAndMove({row.left() - 8, row.center().y()}, far, Qt::LeftButton), 0);
+    QCOMPARE(pressAndMove({100, 150}, far, Qt::LeftButton), 0);
 }
 
 QTEST_MAIN(TestPanes)

@@ -18,7 +18,8 @@ class TestCopyJob : public QObject
 private slots:
     void staysInTheTargetFolder_data();
     void staysInTheTargetFolder();
-    void sendsNoApostrophe();
+    void sendsNoCommandCharacters_data();
+    void sendsNoCommandCharacters();
     void refusesTwoLocalEnds();
 };
 
@@ -52,20 +53,36 @@ void TestCopyJob::staysInTheTargetFolder()
     QVERIFY(fake.takeMessages().filter(":MMEM:DATA").isEmpty());
 }
 
-void TestCopyJob::sendsNoApostrophe()
+void TestCopyJob::sendsNoCommandCharacters_data()
 {
+    QTest::addColumn<QString>("name");
+    QTest::addColumn<QChar>("character");
+    QTest::newRow("end of a name") << "it's.wv" << QChar('\'');
+    QTest::newRow("all files") << "*.wv" << QChar('*');
+    QTest::newRow("any letter") << "what?.wv" << QChar('?');
+    QTest::newRow("folder on a drive") << "a\\b.wv" << QChar('\\');
+    QTest::newRow("end of a catalogue entry") << "5\".wv" << QChar('"');
+}
+
+void TestCopyJob::sendsNoCommandCharacters()
+{
+    QFETCH(const QString, name);
+    QFETCH(const QChar, character);
     const FakeInstrument fake;
     VisaDevice device;
     QVERIFY(device.openResource("GPIB0::28::INSTR"));
     const QTemporaryDir folder;
-    QFile file(folder.filePath("it's.wv"));
+    QFile file(folder.filePath(name));
     QVERIFY(file.open(QIODevice::WriteOnly) && file.write("data") == 4);
     file.close();
     (void)takeLog();
     (void)fake.takeMessages();
     CopyJob job({.source = file.fileName(), .targetDevice = &device, .targetFolder = "/var/user/"});
     QVERIFY(!job.run());
-    QVERIFY(takeLog().last().contains("'/var/user/it's.wv' holds an apostrophe"));
+    QCOMPARE(takeLog(),
+             QStringList({"4 The name \"" + name + "\" holds the character " + character +
+                              ", which has a meaning in the commands of an instrument.",
+                          "4 Sending file to instrument failed."}));
     QVERIFY(fake.takeMessages().isEmpty());
 }
 
