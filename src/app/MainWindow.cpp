@@ -4,7 +4,6 @@
 #include "AboutBox.h"
 #include "LocalFileModel.h"
 #include "QCustomTreeView.h"
-#include "RemotePaneFiles.h"
 #include "devicechoice.h"
 #include "instrument/DlgInstrConfig.h"
 #include "mnemonics.h"
@@ -12,7 +11,6 @@
 #include "settingsstores.h"
 #include "splittersettings.h"
 #include "toolframe/QtProgressDialog.h"
-#include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"
 #include "toolframe/questions.h"
 #include "toolframe/windowplace.h"
@@ -26,7 +24,6 @@
 #include <QSignalBlocker>
 #include <QTimer>
 
-#include <algorithm>
 #include <utility>
 
 namespace {
@@ -119,26 +116,6 @@ MainWindow::~MainWindow()
     }
 }
 
-void MainWindow::createDevices()
-{
-    QString failures;
-    bool failed = false;
-    for (std::size_t i = 0; i < m_panes.size(); ++i) {
-        auto device = std::make_unique<VisaDevice>(m_noVisa);
-        device->setQuestion([this](const QString &title, const QString &text) {
-            return askYesNo(this, title, text);
-        });
-        const QString failure = device->takeLastError();
-        failures += QString("  Device %1 : %2\n").arg(i + 1).arg(failure);
-        failed = failed || !failure.isEmpty();
-        m_panes.at(i).instrument = std::move(device);
-    }
-    if (failed) {
-        QMessageBox::critical(this, windowTitle(),
-                              "The VISA interfaces failed to initialize:\n" + failures);
-    }
-}
-
 void MainWindow::buildMenus()
 {
     QMenu *file = menuBar()->addMenu("File");
@@ -228,126 +205,6 @@ void MainWindow::slot_localDefaultFolderSet(const QString &sDefaultFolder)
     m_locPath = sDefaultFolder;
     Tracer::Trace(Tracer::Information,
                   QString("Set local default folder '%1'").arg(sDefaultFolder));
-}
-
-void MainWindow::slot_refresh()
-{
-    refresh(paneOf(sender()));
-}
-
-void MainWindow::slot_remoteDefaultFolderSet(VisaDevice *pcVisaDevice,
-                                             const QString &sDefaultFolder)
-{
-    Tracer::Trace(Tracer::Information,
-                  QString("Set default folder '%1', Instrument %2, %3")
-                      .arg(sDefaultFolder, pcVisaDevice->model(), pcVisaDevice->serial()));
-    m_instrConfig->setDefaultFolder(pcVisaDevice->model(), pcVisaDevice->serial(), sDefaultFolder);
-}
-
-void MainWindow::refresh(Pane &pane)
-{
-    if (pane.tree->isLocal()) {
-        pane.tree->updateAndExpandTree(m_locPath);
-        return;
-    }
-    pane.tree->updateAndExpandTree(defaultFolder(pane));
-    if (!RemotePaneFiles::answers(*pane.remoteModel) && openInstrument(pane)) {
-        pane.tree->updateAndExpandTree(defaultFolder(pane));
-    }
-}
-
-void MainWindow::newDeviceSelection(int /*iIndex*/)
-{
-    selectDevice(paneOf(sender()));
-}
-
-void MainWindow::selectDevice(Pane &pane)
-{
-    if (isSameInstrument(pane.device->currentText(), otherPane(pane).device->currentText())) {
-        Tracer::Trace(Tracer::Warning, "Warning: The same device cannot be selected twice.");
-        const QSignalBlocker blocker(pane.device);
-        pane.device->setCurrentIndex(0);
-    }
-    pane.tree->clearSelection();
-    {
-        // Paths of another device lead nowhere.
-        const QSignalBlocker blocker(pane.history);
-        pane.history->clear();
-    }
-    if (pane.device->currentData().toString().isEmpty()) {
-        showLocal(pane);
-    } else {
-        showInstrument(pane);
-    }
-}
-
-void MainWindow::showLocal(Pane &pane)
-{
-    pane.tree->setModel(pane.localModel.get());
-    (void)pane.instrument->closeResource();
-    pane.remoteModel->refresh();
-    pane.tree->filterChanged(pane.filter->currentText());
-    pane.tree->updateAndExpandTree(m_locPath);
-}
-
-void MainWindow::showInstrument(Pane &pane)
-{
-    // The folders that were open on another instrument are of no meaning here.
-    (void)pane.instrument->closeResource();
-    pane.remoteModel->refresh();
-    pane.tree->setModel(pane.remoteModel.get());
-    pane.tree->filterChanged(pane.filter->currentText());
-    if (openInstrument(pane)) {
-        Tracer::Trace(Tracer::Information,
-                      QString("Device is '%1' , Serial is '%2'")
-                          .arg(pane.instrument->model(), pane.instrument->serial()));
-    }
-    pane.tree->updateAndExpandTree(defaultFolder(pane));
-}
-
-bool MainWindow::openInstrument(Pane &pane)
-{
-    const WaitCursor cursor;
-    (void)pane.instrument->closeResource();
-    const bool opened = pane.instrument->openResource(pane.device->currentData().toString());
-    const QString reported = pane.instrument->takeLastError().trimmed();
-    if (!opened && !reported.isEmpty()) {
-        Tracer::Trace(Tracer::Error, reported);
-    }
-    return opened;
-}
-
-QString MainWindow::defaultFolder(const Pane &pane) const
-{
-    const QString resource = pane.device->currentData().toString();
-    const QList<InstrConfigEntry> instruments = m_instrConfig->instruments();
-    const auto found =
-        std::find_if(instruments.cbegin(), instruments.cend(),
-                     [&](const InstrConfigEntry &entry) { return entry.resource == resource; });
-    return found == instruments.cend() ? QString() : found->folder;
-}
-
-void MainWindow::instrListUpdated()
-{
-    Tracer::Trace(Tracer::Information, "Instruments updated");
-    const QList<InstrConfigEntry> instruments =
-        m_noVisa ? QList<InstrConfigEntry>() : m_instrConfig->instruments();
-    for (Pane &pane : m_panes) {
-        const QString resource = pane.device->currentData().toString();
-        int index = 0;
-        {
-            const QSignalBlocker blocker(pane.device);
-            fillDeviceChoice(*pane.device, instruments);
-            index = pane.device->findData(resource);
-            pane.device->setCurrentIndex(std::max(index, 0));
-        }
-        if (index < 0) {
-            Tracer::Trace(Tracer::Information,
-                          "The previously selected instrument is not available anymore.");
-            selectDevice(pane);
-        }
-    }
-    m_modules.updateInstruments(instruments);
 }
 
 void MainWindow::slot_itemSelected(const QString &sItem)

@@ -41,7 +41,7 @@ QString replaceText(const QStringList &paths)
 
 QString outcomeText(const CopyJob &job, bool done)
 {
-    if (!done && job.fileCount() == 0) {
+    if (!done && job.fileCount() <= 1) {
         return job.isCancelled() ? "The copy was cancelled." : "Nothing was copied; see the log.";
     }
     if (!done) {

@@ -282,8 +282,12 @@ bool CopyJob::fetch(const QString &remote, const QString &local)
     VisaDevice *device = m_request.sourceDevice;
     const QString label =
         QString("Reading file %1\nfrom instrument %2").arg(fileName(remote), deviceName(*device));
-    return transfer(device, label, "Reading file from instrument failed.",
-                    [&] { return fetchRemoteFile(*device, nativePath(*device, remote), local); });
+    return transfer(device, label, "Reading file from instrument failed.", [&] {
+        const QString source = nativePath(*device, remote);
+        // A file on its way to an instrument replaces nothing here.
+        return m_request.targetDevice ? device->readRemoteFile(source, local)
+                                      : fetchRemoteFile(*device, source, local);
+    });
 }
 
 bool CopyJob::makeRemoteFolder(const QString &folder)
