@@ -159,10 +159,11 @@ bool ScreenshotRun::saveInstruments()
     auto *first = m_window.findChild<QComboBox *>("cb_dev_1");
     auto *second = m_window.findChild<QComboBox *>("cb_dev_2");
     second->setCurrentIndex(1);
-    done = saveTransfer() && done;
     first->setCurrentIndex(std::min(2, first->count() - 1));
     QCoreApplication::processEvents();
-    return save(m_window, "two-instruments.png") && done;
+    done = save(m_window, "two-instruments.png") && done;
+    first->setCurrentIndex(0);
+    return saveTransfer() && done;
 }
 
 bool ScreenshotRun::offersInstruments() const
@@ -209,11 +210,9 @@ bool ScreenshotRun::saveTransfer()
     });
     poll.start(20);
     auto *first = m_window.findChild<QCustomTreeView *>("tv_dev_1");
-    const QString shown = first->currentPath();
     first->updateAndExpandTree(m_transferFile.fileName());
     QCoreApplication::processEvents();
     first->copyToPeer();
-    first->updateAndExpandTree(shown);
     return done;
 }
 

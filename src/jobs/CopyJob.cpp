@@ -319,10 +319,7 @@ bool CopyJob::makeRemoteFolder(const QString &folder)
 void CopyJob::showProgress(int percentOfFile)
 {
     const int wayPercent = (100 * m_leg + percentOfFile) / m_legCount;
-    const qint64 bytes = m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100;
-    // By bytes, for one file may be as long as a thousand others.
-    const qint64 percent =
-        m_totalBytes > 0 ? 100 * bytes / m_totalBytes : 100 * m_fileIndex / m_files.size();
-    emit ProgressUpdate(static_cast<int>(percent));
-    emit bytesCopied(bytes, m_totalBytes);
+    // By files; the bytes beside it tell how long it takes.
+    emit ProgressUpdate(static_cast<int>((100 * m_fileIndex + wayPercent) / m_files.size()));
+    emit bytesCopied(m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100, m_totalBytes);
 }

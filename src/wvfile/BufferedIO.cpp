@@ -94,6 +94,7 @@ bool BufferedIO::initBuf(QIODevice *device, int mode)
         device->close();
     }
     m_readPosition = -1;
+    m_windowEnd = -1;
     const bool opened = device->open(QIODevice::Unbuffered | openMode);
     if (!opened || (m_readBuffer && !firstFill())) {
         m_readBuffer.reset();
@@ -137,6 +138,7 @@ bool BufferedIO::releaseBuf()
     m_bytesInReadBuffer = 0;
     m_readIndex = 0;
     m_readPosition = -1;
+    m_windowEnd = -1;
     m_device->close();
     m_initialised = false;
     return true;
@@ -150,7 +152,33 @@ bool BufferedIO::firstFill()
         return false;
     }
     m_readPosition += count;
+    m_windowEnd = m_readPosition;
     m_bytesInReadBuffer = static_cast<int>(count);
+    return true;
+}
+
+void BufferedIO::noteDirectRead(qint64 count)
+{
+    const qint64 beyond = m_readPosition + count - std::max(m_windowEnd, m_readPosition);
+    if (beyond > 0) {
+        const qint64 windows = (beyond + BufferSize - 1) / BufferSize;
+        m_windowEnd = std::max(m_windowEnd, m_readPosition) + windows * BufferSize;
+    }
+}
+
+bool BufferedIO::completeWindow()
+{
+    if (!m_readBuffer || m_readPosition >= m_windowEnd) {
+        return true;
+    }
+    const qint64 got = m_device->read(m_readBuffer.get(), m_windowEnd - m_readPosition);
+    if (got < 0) {
+        return false;
+    }
+    m_readIndex = 0;
+    m_bytesInReadBuffer = static_cast<int>(got);
+    m_readPosition += got;
+    m_windowEnd = m_readPosition;
     return true;
 }
 
@@ -191,8 +219,10 @@ int BufferedIO::readBlock(int len, void *buffer)
         }
         // Only while nothing is being written: then it doesn't matter how far reads look ahead.
         const bool direct = missing >= directReadSize && m_writePosition == -1 && m_writeFill == 0;
-        const qint64 got = direct ? m_device->read(target, missing)
-                                  : m_device->read(m_readBuffer.get(), BufferSize);
+        const qint64 window =
+            m_readPosition < m_windowEnd ? m_windowEnd - m_readPosition : BufferSize;
+        const qint64 got =
+            direct ? m_device->read(target, missing) : m_device->read(m_readBuffer.get(), window);
         m_readIndex = 0;
         m_bytesInReadBuffer = direct ? 0 : static_cast<int>(std::max<qint64>(got, 0));
         if (got < 0) {
@@ -203,6 +233,11 @@ int BufferedIO::readBlock(int len, void *buffer)
                 debug(Tracer::Debug, "readBytes() : R no more data available");
             }
             break;
+        }
+        if (direct) {
+            noteDirectRead(got);
+        } else {
+            m_windowEnd = m_readPosition + got;
         }
         m_readPosition += got;
         if (direct) {
@@ -227,7 +262,7 @@ bool BufferedIO::seekForWrite()
 
 bool BufferedIO::writeToDevice(const char *bytes, int count)
 {
-    if (!seekForWrite()) {
+    if (!completeWindow() || !seekForWrite()) {
         return false;
     }
     if (m_device->write(bytes, count) != count) {
@@ -300,6 +335,7 @@ bool BufferedIO::restart()
         return false;
     }
     m_readPosition = -1;
+    m_windowEnd = -1;
     m_bytesInReadBuffer = 0;
     m_readIndex = 0;
     m_writeFill = 0;
@@ -317,6 +353,7 @@ bool BufferedIO::restartAtPosition(qint64 position)
         return false;
     }
     m_readPosition = position;
+    m_windowEnd = position;
     return true;
 }
 

@@ -91,6 +91,8 @@ public:
 
 private:
     [[nodiscard]] bool firstFill();
+    void noteDirectRead(qint64 count);
+    [[nodiscard]] bool completeWindow();
     [[nodiscard]] bool restart();
     [[nodiscard]] bool flush();
     [[nodiscard]] bool writeToDevice(const char *bytes, int count);
@@ -106,7 +108,10 @@ private:
     std::unique_ptr<char[]> m_writeBuffer;
     int m_readIndex = 0;
     int m_writeFill = 0;
-    qint64 m_readPosition = -1;  ///< file position behind the bytes in the read buffer, -1 unset
+    qint64 m_readPosition = -1; ///< file position behind the bytes in the read buffer, -1 unset
+    /// Up to here reads see the file as it was before later writes, as if each had taken a whole
+    /// buffer; behind m_readPosition after reads past the buffer.
+    qint64 m_windowEnd = -1;
     qint64 m_writePosition = -1; ///< where the write buffer goes, -1 while nothing was written
     int m_bytesInReadBuffer = 0;
 };
