@@ -24,7 +24,6 @@
 #include <QSignalBlocker>
 #include <QTimer>
 
-
 namespace {
 
 constexpr int MaxLogLines = 256;
