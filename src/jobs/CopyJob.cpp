@@ -92,7 +92,6 @@ bool CopyJob::run()
         cancel();
         return false;
     }
-    bool allCopied = true;
     for (m_fileIndex = 0; m_fileIndex < m_files.size(); ++m_fileIndex) {
         const File &file = m_files.at(m_fileIndex);
         showProgress(0);
@@ -109,12 +108,11 @@ bool CopyJob::run()
         }
         m_doneBytes += file.bytes;
         m_copiedCount += copied ? 1 : 0;
-        allCopied = allCopied && copied;
         if (!copied && (!isFolderRequest() || (m_questions.goOn && !m_questions.goOn()))) {
             return false;
         }
     }
-    return allCopied;
+    return m_copiedCount == m_files.size();
 }
 
 bool CopyJob::collect()

@@ -35,6 +35,13 @@ QByteArray content(const QString &path)
     return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray("not readable");
 }
 
+/// A file of zeros that takes no room on the disk.
+bool makeLarge(const QString &path, qint64 size)
+{
+    QFile file(path);
+    return file.open(QIODevice::WriteOnly) && file.resize(size);
+}
+
 QByteArray noise(qsizetype size)
 {
     QByteArray bytes(size, '\0');
@@ -449,9 +456,7 @@ void TestWorkbench::cancelledCopyLeavesNoFile()
 {
     QFETCH(int, from);
     const QString source = from == 1 ? m_desk->path("big.wv") : unixFile("big.wv");
-    QFile file(source);
-    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
-    file.close();
+    QVERIFY(makeLarge(source, 400'000'000));
     choose(2, onUnix);
     m_desk->select(1, from == 1 ? "big.wv" : "sub");
     selectRemote(2, from == 1 ? "/var/user/" : "/var/user/big.wv");
@@ -470,9 +475,7 @@ void TestWorkbench::cancelledCopyLeavesNoFile()
 
 void TestWorkbench::plugPulledAndPutBack()
 {
-    QFile file(m_desk->path("big.wv"));
-    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
-    file.close();
+    QVERIFY(makeLarge(m_desk->path("big.wv"), 400'000'000));
     choose(2, onUnix);
     m_desk->select(1, "big.wv");
     onProgress([this](QtProgressDialog &) { m_simulator->stop(SIGKILL); });
@@ -496,9 +499,7 @@ void TestWorkbench::plugPulledAndPutBack()
 
 void TestWorkbench::answersDuringATransfer()
 {
-    QFile file(m_desk->path("big.wv"));
-    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(100'000'000));
-    file.close();
+    QVERIFY(makeLarge(m_desk->path("big.wv"), 100'000'000));
     choose(2, onUnix);
     m_desk->select(1, "big.wv");
     QTimer tick;
@@ -538,9 +539,7 @@ void TestWorkbench::answersDuringATransfer()
 
 void TestWorkbench::asksBeforeClosing()
 {
-    QFile file(m_desk->path("big.wv"));
-    QVERIFY(file.open(QIODevice::WriteOnly) && file.resize(400'000'000));
-    file.close();
+    QVERIFY(makeLarge(m_desk->path("big.wv"), 400'000'000));
     choose(2, onUnix);
     m_desk->select(1, "big.wv");
     bool stayed = false;
