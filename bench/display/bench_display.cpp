@@ -6,9 +6,9 @@
 #include "display/CWidgetConstellation.h"
 #include "display/CWidgetIQTrace.h"
 #include "display/CWidgetSpectrum.h"
-#include "display/ViewWindow.h"
 #include "display/renderplot.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
+#include "view/ViewWindow.h"
 
 #include <QApplication>
 #include <QRandomGenerator>

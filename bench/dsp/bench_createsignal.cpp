@@ -4,7 +4,7 @@
 #include "base/parallel.h"
 #include "dsp/CreateSignal.h"
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <benchmark/benchmark.h>
 

@@ -3,7 +3,7 @@
 // of the same length with FFTW on one thread.
 #include "base/parallel.h"
 #include "dsp/Resample.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <benchmark/benchmark.h>
 #include <fftw3.h>

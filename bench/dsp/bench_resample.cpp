@@ -3,7 +3,7 @@
 // of threads for both. The second argument is the number of threads.
 #include "base/parallel.h"
 #include "dsp/Resample.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include <QTemporaryFile>
 #include <benchmark/benchmark.h>

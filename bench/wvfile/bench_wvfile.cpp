@@ -6,9 +6,9 @@
 #include "bareLoops.h"
 
 #include "log/Tracer.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
+#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
-#include "wvfile/TempStream.h"
 #include "wvfile/WvTypes.h"
 
 #include <benchmark/benchmark.h>

@@ -3,7 +3,7 @@
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 #include "wvfile/WvReader.h"
 #include "wvfile/WvTypes.h"
 

@@ -2,7 +2,7 @@
 #include "CWidgetBase.h"
 
 #include "plotexport.h"
-#include "plotscale.h"
+#include "view/plotscale.h"
 
 #include <QApplication>
 #include <QClipboard>

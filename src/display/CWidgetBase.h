@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "IqSample.h"
 #include "PlotStyle.h"
 #include "plotdraw.h"
+#include "view/IqSample.h"
 
 #include <QImage>
 #include <QWidget>

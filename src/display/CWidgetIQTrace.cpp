@@ -2,7 +2,7 @@
 #include "CWidgetIQTrace.h"
 
 #include "plotexport.h"
-#include "plotscale.h"
+#include "view/plotscale.h"
 
 #include <QMouseEvent>
 #include <QWheelEvent>

@@ -2,7 +2,7 @@
 #include "ConstellationPainter.h"
 
 #include "plotdraw.h"
-#include "plotscale.h"
+#include "view/plotscale.h"
 
 #include <QFontMetricsF>
 #include <QPainter>

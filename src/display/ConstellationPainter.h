@@ -2,8 +2,8 @@
 #pragma once
 
 #include "ColorTable.h"
-#include "ConstellationGrid.h"
 #include "PlotStyle.h"
+#include "view/ConstellationGrid.h"
 
 #include <QMargins>
 #include <QPointF>

@@ -3,7 +3,7 @@
 
 #include "ColorTable.h"
 #include "PlotStyle.h"
-#include "SpectrumLines.h"
+#include "view/SpectrumLines.h"
 
 #include <QImage>
 #include <QMargins>

@@ -3,7 +3,7 @@
 
 #include "base/EngineeringNumber.h"
 #include "plotdraw.h"
-#include "plotscale.h"
+#include "view/plotscale.h"
 
 #include <QCoreApplication>
 #include <QFontMetricsF>

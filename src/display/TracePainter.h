@@ -2,7 +2,7 @@
 #pragma once
 
 #include "PlotStyle.h"
-#include "TraceBins.h"
+#include "view/TraceBins.h"
 
 #include <QList>
 #include <QMargins>

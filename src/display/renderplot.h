@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "SampleSource.h"
+#include "view/SampleSource.h"
 
 #include <QImage>
 #include <QRectF>

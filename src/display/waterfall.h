@@ -2,7 +2,7 @@
 #pragma once
 
 #include "ColorTable.h"
-#include "SpectrumLines.h"
+#include "view/SpectrumLines.h"
 
 #include <QImage>
 #include <QSize>

@@ -3,12 +3,14 @@
 
 #include "Resample.h"
 #include "base/ProgressClock.h"
+#include "base/simd.h"
 #include "dotkernels.h"
 #include "log/Tracer.h"
-#include "samplestream.h"
 #include "signalgenerators.h"
-#include "vectorclones.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
+#include "streams/samplestream.h"
+
+#include <QTime>
 
 #include <algorithm>
 #include <array>
@@ -24,8 +26,8 @@ constexpr int MinStreamSamples = 512;
 
 /// Converts to the records of a stream and takes the level, sample by sample: the order of a sum is
 /// a part of its result.
-CORVANE_VECTOR_CLONES void packSamples(const double *inPhase, const double *quadrature,
-                                       std::size_t count, float *iq, SquareLevel &level)
+CORVANE_CLONES void packSamples(const double *inPhase, const double *quadrature, std::size_t count,
+                                float *iq, SquareLevel &level)
 {
     constexpr std::size_t Lanes = 8;
     double highest = level.highest;
@@ -46,6 +48,12 @@ CORVANE_VECTOR_CLONES void packSamples(const double *inPhase, const double *quad
         }
     }
     level = {highest, sum};
+}
+
+[[nodiscard]] unsigned seedOfTheClock()
+{
+    const QTime now = QTime::currentTime();
+    return static_cast<unsigned>(now.second() * 5 + now.minute() + 1);
 }
 
 } // namespace
@@ -236,12 +244,10 @@ bool CreateSignal::generate()
         return Tracer::fail("*** Waveform not yet configured.");
     }
     m_generated = false;
-    if (!m_output->writeHeader("IQF")) {
+    if (!m_output->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to output file.");
     }
-    if (m_seed) {
-        std::srand(*m_seed);
-    }
+    std::srand(m_seed.value_or(seedOfTheClock()));
     const std::unique_ptr<SignalGenerator> generator = makeGenerator();
     m_generated =
         generator && writeSignal(*generator) && (m_type != SignalType::Noise || limitBand());
@@ -293,10 +299,10 @@ bool CreateSignal::limitBand()
     }
     m_peak = 1 / std::pow(10.0, m_bandLimit->peakOffset() / 20);
     m_rms = 1 / std::pow(10.0, m_bandLimit->rmsOffset() / 20);
-    if (!m_output->writeHeader("IQF")) {
+    if (!m_output->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to output file.");
     }
-    if (!filtered->checkHeader("IQF")) {
+    if (!filtered->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot read the filtered noise.");
     }
     std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));

@@ -38,8 +38,7 @@ public:
     /// The stream to write to, not owned; null leaves the old one in place.
     void setOutput(BufferedIO *stream);
 
-    /// Random values start from this seed in every run; nothing leaves them to the clock, from
-    /// which a new BufferedIO seeds them.
+    /// Random values start from this seed in every run; without one the time of day seeds them.
     void setSeed(std::optional<unsigned> seed) { m_seed = seed; }
 
     /// Each takes the settings and fits clock and samples. False if they don't fit.

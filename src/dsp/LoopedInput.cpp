@@ -2,7 +2,7 @@
 #include "LoopedInput.h"
 
 #include "log/Tracer.h"
-#include "samplestream.h"
+#include "streams/samplestream.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -40,7 +40,7 @@ bool LoopedInput::open()
         m_stream.restartAtPosition(BufferedIO::HeaderSize + BufferedIO::RecordSize * tailStart);
     const int tailCount =
         positioned ? readSamples(m_stream, std::span(m_tail).last(floatsOf(filled))) : 0;
-    if (!m_stream.checkHeader("IQF")) {
+    if (!m_stream.checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot reset read buffer.");
     }
     Tracer::Trace(Tracer::Information, "Buffering waveform head...");

@@ -7,7 +7,7 @@
 #include "base/parallel.h"
 #include "interpolator.h"
 #include "log/Tracer.h"
-#include "samplestream.h"
+#include "streams/samplestream.h"
 
 #include <algorithm>
 #include <cmath>
@@ -135,7 +135,7 @@ public:
         if (!m_input.open()) {
             return false;
         }
-        if (!m_owner.m_output->writeHeader("IQF")) {
+        if (!m_owner.m_output->writeHeader(BufferedIO::DataHeader)) {
             return Tracer::fail("*** Cannot write header.");
         }
         Tracer::Trace(Tracer::Information, "Resampling...");

@@ -3,10 +3,10 @@
 
 #include "base/ProgressClock.h"
 #include "base/parallel.h"
+#include "base/simd.h"
 #include "dotkernels.h"
 #include "log/Tracer.h"
-#include "samplestream.h"
-#include "vectorclones.h"
+#include "streams/samplestream.h"
 #include "vectormath.h"
 
 #include <algorithm>
@@ -27,14 +27,14 @@ constexpr double Circle = 2 * std::numbers::pi;
 
 /// The first sample of a block from `first` on that a failed write has lost: blocks reach the
 /// device only when the write buffer, which holds the header too, is full.
-qint64 failedWriteSample(qint64 first)
+qint64 failedWriteSample(const BufferedIO &stream, qint64 first)
 {
     const qint64 start = BufferedIO::HeaderSize + first * BufferedIO::RecordSize;
-    const qint64 boundary = (start / BufferedIO::BufferSize + 1) * BufferedIO::BufferSize;
+    const qint64 boundary = (start / stream.bufferSize() + 1) * stream.bufferSize();
     return (boundary - BufferedIO::HeaderSize) / BufferedIO::RecordSize;
 }
 
-CORVANE_VECTOR_CLONES void scale(std::span<float> iq, float gain)
+CORVANE_CLONES void scale(std::span<float> iq, float gain)
 {
     for (float &value : iq) {
         value *= gain;
@@ -42,7 +42,7 @@ CORVANE_VECTOR_CLONES void scale(std::span<float> iq, float gain)
 }
 
 /// Turns each sample by the angle whose sine and cosine are given.
-CORVANE_VECTOR_CLONES void rotate(std::span<float> iq, const double *sine, const double *cosine)
+CORVANE_CLONES void rotate(std::span<float> iq, const double *sine, const double *cosine)
 {
     for (size_t i = 0; i < iq.size() / 2; ++i) {
         const double re = iq[2 * i];
@@ -57,8 +57,8 @@ CORVANE_VECTOR_CLONES void rotate(std::span<float> iq, const double *sine, const
 
 /// Sine and cosine of the phase of cartesianToPolar are those of the vector itself but for the
 /// imaginary axis, where it is a full circle.
-CORVANE_VECTOR_CLONES void splitPolar(std::span<const float> iq, std::span<float> phase,
-                                      std::span<float> amplitude, double offset, double gain)
+CORVANE_CLONES void splitPolar(std::span<const float> iq, std::span<float> phase,
+                               std::span<float> amplitude, double offset, double gain)
 {
     // The double closest to a full circle misses it by this much.
     constexpr double FullCircleSine = 2.4492935982947064e-16;
@@ -113,16 +113,17 @@ bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork
     if (stream == nullptr) {
         return Tracer::fail("*** Invalid data buffer.");
     }
-    if (!stream->checkHeader("IQF")) {
+    if (!stream->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot validate data stream header.");
     }
-    if (!stream->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+    if (!stream->writeBytes(BufferedIO::HeaderSize, BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to data buffer.");
     }
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
     return forEachBlock(*stream, samples, clock, [&](std::span<float> iq, qint64 first) {
         work(iq);
-        return writeSamples(*stream, iq) || failAtSample("Writing", failedWriteSample(first));
+        return writeSamples(*stream, iq) ||
+               failAtSample("Writing", failedWriteSample(*stream, first));
     });
 }
 
@@ -185,7 +186,7 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
         return Tracer::fail(
             QString("*** Invalid amplitude offset %1 or gain %2.").arg(offset).arg(gain));
     }
-    if (!source->checkHeader("IQF")) {
+    if (!source->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot validate data stream header.");
     }
     if (!phase->restartAtBegining()) {
@@ -194,10 +195,10 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
     if (!amplitude->restartAtBegining()) {
         return Tracer::fail("*** Cannot setup amplitude output buffer.");
     }
-    if (!phase->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+    if (!phase->writeBytes(BufferedIO::HeaderSize, BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to phase data buffer.");
     }
-    if (!amplitude->writeBytes(BufferedIO::HeaderSize, "IQF")) {
+    if (!amplitude->writeBytes(BufferedIO::HeaderSize, BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to amplitude data buffer.");
     }
     std::vector<float> phaseBlock(floatsOf(StreamBlockSamples));
@@ -208,10 +209,10 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
         const std::span<float> amplitudePart = std::span(amplitudeBlock).first(iq.size());
         splitPolar(iq, phasePart, amplitudePart, offset, gain);
         if (!writeSamples(*phase, phasePart)) {
-            return failAtSample("Writing phase data", failedWriteSample(first));
+            return failAtSample("Writing phase data", failedWriteSample(*phase, first));
         }
         return writeSamples(*amplitude, amplitudePart) ||
-               failAtSample("Writing amplitude data", failedWriteSample(first));
+               failAtSample("Writing amplitude data", failedWriteSample(*amplitude, first));
     });
 }
 
@@ -224,7 +225,7 @@ bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double 
     if (samples < 1) {
         return Tracer::fail("*** Invalid input data length.");
     }
-    if (!stream->checkHeader("IQF")) {
+    if (!stream->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot validate data stream header.");
     }
     SquareLevel level;

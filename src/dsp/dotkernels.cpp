@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dotkernels.h"
 
-#include "vectorclones.h"
+#include "base/simd.h"
 
 #include <algorithm>
 #include <array>
@@ -190,7 +190,7 @@ CORVANE_WIDE_KERNEL(dotSlopedRows, const SlopedBlock<double> &, dotSlopedRowsBod
 CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<float> &, filterSamplesBody)
 CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<double> &, filterSamplesBody)
 
-CORVANE_VECTOR_CLONES SquareLevel measureSquares(std::span<const float> iq)
+CORVANE_CLONES SquareLevel measureSquares(std::span<const float> iq)
 {
     constexpr std::size_t Lanes = 8;
     std::array<double, Lanes> highest{};
@@ -214,7 +214,7 @@ CORVANE_VECTOR_CLONES SquareLevel measureSquares(std::span<const float> iq)
     return level;
 }
 
-CORVANE_VECTOR_CLONES void addSquares(std::span<const float> iq, SquareLevel &level)
+CORVANE_CLONES void addSquares(std::span<const float> iq, SquareLevel &level)
 {
     constexpr std::size_t Lanes = 16;
     double highest = level.highest;
@@ -244,8 +244,7 @@ CORVANE_VECTOR_CLONES void addSquares(std::span<const float> iq, SquareLevel &le
     level = {highest, sum};
 }
 
-CORVANE_VECTOR_CLONES void deinterleave(std::span<const float> iq, float *inPhase,
-                                        float *quadrature)
+CORVANE_CLONES void deinterleave(std::span<const float> iq, float *inPhase, float *quadrature)
 {
     const std::size_t count = iq.size() / 2;
     for (std::size_t n = 0; n < count; ++n) {

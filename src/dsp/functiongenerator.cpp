@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "signalgenerators.h"
 
-#include "vectorclones.h"
+#include "base/simd.h"
 #include "vectormath.h"
 
 #include <cstddef>
@@ -11,7 +11,7 @@ namespace {
 
 using SignalConstants::Circle;
 
-CORVANE_VECTOR_CLONES void periodAngles(int first, double samples, std::span<double> angles)
+CORVANE_CLONES void periodAngles(int first, double samples, std::span<double> angles)
 {
     const int count = static_cast<int>(angles.size());
     for (int i = 0; i < count; ++i) {

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "signalgenerators.h"
 
-#include "vectorclones.h"
+#include "base/simd.h"
 #include "vectormath.h"
 
 #include <cmath>
@@ -15,8 +15,7 @@ using SignalConstants::Level;
 using SignalConstants::QuarterCircle;
 
 /// angles[i] = turn (first + i) / divisor.
-CORVANE_VECTOR_CLONES void linearAngles(double turn, int first, double divisor,
-                                        std::span<double> angles)
+CORVANE_CLONES void linearAngles(double turn, int first, double divisor, std::span<double> angles)
 {
     const int count = static_cast<int>(angles.size());
     for (int i = 0; i < count; ++i) {
@@ -24,7 +23,7 @@ CORVANE_VECTOR_CLONES void linearAngles(double turn, int first, double divisor,
     }
 }
 
-CORVANE_VECTOR_CLONES void addToAll(std::span<double> angles, double addend)
+CORVANE_CLONES void addToAll(std::span<double> angles, double addend)
 {
     for (double &angle : angles) {
         angle += addend;

@@ -2,7 +2,7 @@
 #include "signalgenerators.h"
 
 #include "base/parallel.h"
-#include "vectorclones.h"
+#include "base/simd.h"
 #include "vectormath.h"
 
 #include <algorithm>
@@ -59,7 +59,7 @@ struct CarrierSum
 
 /// 32 x less whole half circles. The parts of the half circle have 26 bits each, so that their
 /// products with a count below 2^26 are exact.
-CORVANE_VECTOR_CLONES void reduceAngles(const PartArray &angles, PartArray &reduced)
+CORVANE_CLONES void reduceAngles(const PartArray &angles, PartArray &reduced)
 {
     constexpr double HalfCircle1 = 0x1.921fb5p+1;
     constexpr double HalfCircle2 = 0x1.110b46p-25;
@@ -79,8 +79,8 @@ struct ComplexPart
 };
 
 /// The sum over r = 1 to `count` of exp(j (phase[r] + r x)) by Horner's rule, z being exp(j x).
-CORVANE_VECTOR_CLONES void sumPhases(const CarrierSum &sum, int count, const ComplexPart &z,
-                                     ComplexPart &result)
+CORVANE_CLONES void sumPhases(const CarrierSum &sum, int count, const ComplexPart &z,
+                              ComplexPart &result)
 {
     result.re.fill(0.0);
     result.im.fill(0.0);
@@ -101,9 +101,8 @@ CORVANE_VECTOR_CLONES void sumPhases(const CarrierSum &sum, int count, const Com
 /// where G is the geometric sum over exp(j 64 m x), m = 0 to B - 1. With r being 32 x less whole
 /// half circles, G is exp(j (B - 1) r) sin(B r) / sin(r), which is exact to the last digits also
 /// where both sines vanish.
-CORVANE_VECTOR_CLONES void combineRows(double rows, const ComplexPart &one, const ComplexPart &all,
-                                       const ComplexPart &row, const ComplexPart &rest,
-                                       PartArray &result)
+CORVANE_CLONES void combineRows(double rows, const ComplexPart &one, const ComplexPart &all,
+                                const ComplexPart &row, const ComplexPart &rest, PartArray &result)
 {
     for (std::size_t i = 0; i < PartSize; ++i) {
         const double ratio = one.im[i] == 0 ? rows : all.im[i] / one.im[i];

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "tapplan.h"
 
-#include "vectorclones.h"
+#include "base/simd.h"
 
 #include <array>
 #include <bit>
@@ -101,16 +101,14 @@ CORVANE_INLINE void planTapsBody(const TapGeometry &geometry, const SlopedLayout
 
 } // namespace
 
-CORVANE_VECTOR_CLONES void planTaps(const TapGeometry &geometry, const SlopedLayout &layout,
-                                    qint64 firstOutput, qint64 inputStart,
-                                    const TapPlan<float> &plan)
+CORVANE_CLONES void planTaps(const TapGeometry &geometry, const SlopedLayout &layout,
+                             qint64 firstOutput, qint64 inputStart, const TapPlan<float> &plan)
 {
     planTapsBody(geometry, layout, firstOutput, inputStart, plan);
 }
 
-CORVANE_VECTOR_CLONES void planTaps(const TapGeometry &geometry, const SlopedLayout &layout,
-                                    qint64 firstOutput, qint64 inputStart,
-                                    const TapPlan<double> &plan)
+CORVANE_CLONES void planTaps(const TapGeometry &geometry, const SlopedLayout &layout,
+                             qint64 firstOutput, qint64 inputStart, const TapPlan<double> &plan)
 {
     planTapsBody(geometry, layout, firstOutput, inputStart, plan);
 }

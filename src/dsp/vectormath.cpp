@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "vectormath.h"
 
-#include "vectorclones.h"
+#include "base/simd.h"
 
 #include <algorithm>
 #include <bit>
@@ -97,7 +97,7 @@ CORVANE_INLINE bool areReducible(std::span<const double> angles)
 /// Angles that are checked for their size at a time.
 constexpr std::size_t ChunkSize = 512;
 
-CORVANE_VECTOR_CLONES void sinCosChunk(std::span<const double> angles, double *sine, double *cosine)
+CORVANE_CLONES void sinCosChunk(std::span<const double> angles, double *sine, double *cosine)
 {
     if (!areReducible(angles)) {
         for (std::size_t i = 0; i < angles.size(); ++i) {
@@ -113,7 +113,7 @@ CORVANE_VECTOR_CLONES void sinCosChunk(std::span<const double> angles, double *s
     }
 }
 
-CORVANE_VECTOR_CLONES void sineChunk(std::span<const double> angles, double *sine)
+CORVANE_CLONES void sineChunk(std::span<const double> angles, double *sine)
 {
     if (!areReducible(angles)) {
         for (std::size_t i = 0; i < angles.size(); ++i) {

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "vectorclones.h"
+#include "base/simd.h"
 
 #include <cstddef>
 #include <cstring>
@@ -74,7 +74,7 @@ enum class InstructionSet { Baseline, Avx2, Avx512 };
 /// The best one of this machine.
 [[nodiscard]] inline InstructionSet instructionSet()
 {
-#if CORVANE_HAS_VECTOR_CLONES
+#if CORVANE_HAS_CLONES
     static const InstructionSet best = __builtin_cpu_supports("avx512f") ? InstructionSet::Avx512
                                        : __builtin_cpu_supports("avx2")  ? InstructionSet::Avx2
                                                                          : InstructionSet::Baseline;
@@ -87,7 +87,7 @@ enum class InstructionSet { Baseline, Avx2, Avx512 };
 /// Defines `function(argument)` as the call of `body<bytes>(argument)`, compiled once for each
 /// instruction set with its register size. The body must be CORVANE_INLINE.
 // NOLINTBEGIN(bugprone-macro-parentheses): the names of templates and types take none.
-#if CORVANE_HAS_VECTOR_CLONES
+#if CORVANE_HAS_CLONES
 #define CORVANE_WIDE_KERNEL(function, Argument, body)                                              \
     namespace {                                                                                    \
     [[gnu::target("avx512f")]] void function##Avx512(Argument argument)                            \

@@ -3,7 +3,7 @@
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include <QDataStream>
 #include <QFileInfo>
@@ -163,7 +163,7 @@ bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
     if (!m_file.isOpen()) {
         return Tracer::fail("File is not open.");
     }
-    if (!stream->writeHeader("IQF")) {
+    if (!stream->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot write to temporary file.");
     }
     const qint64 total = limit > 0 ? std::min(limit, m_header.samples()) : m_header.samples();

@@ -5,7 +5,7 @@
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include <QElapsedTimer>
 #include <QFile>
@@ -246,7 +246,8 @@ bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
     if (*length > maximum) {
         return Tracer::fail("Data buffer too small.");
     }
-    if (!stream.restartAtBegining() || !stream.writeBytes(BufferedIO::HeaderSize, "IQF")) {
+    if (!stream.restartAtBegining() ||
+        !stream.writeBytes(BufferedIO::HeaderSize, BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot initialize temporary data buffer.");
     }
     if (Tracer::isEnabled(Tracer::Debug)) {

@@ -6,8 +6,8 @@
 #include "base/EngineeringNumber.h"
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
+#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
-#include "wvfile/TempStream.h"
 
 #include <algorithm>
 #include <cmath>
@@ -56,7 +56,7 @@ bool SignalPreviewJob::run()
     if (!generate(data) || (isScaled() && !scale(data, "Rescaling..."))) {
         return false;
     }
-    if (!data->checkHeader("IQF")) {
+    if (!data->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot read temporary file.");
     }
     const auto count = 2 * static_cast<size_t>(facts().samples);

@@ -5,8 +5,8 @@
 
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
+#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
-#include "wvfile/TempStream.h"
 
 #include <cmath>
 

@@ -3,7 +3,7 @@
 
 #include "RangeMeter.h"
 
-#include "wvfile/levels.h"
+#include "streams/levels.h"
 
 #include <cmath>
 

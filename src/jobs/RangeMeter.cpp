@@ -3,7 +3,7 @@
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include <algorithm>
 #include <vector>

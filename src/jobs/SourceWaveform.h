@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 #include "wvfile/WvTypes.h"
 
 #include <QString>

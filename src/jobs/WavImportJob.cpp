@@ -3,7 +3,7 @@
 
 #include "base/EngineeringNumber.h"
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <algorithm>
 #include <utility>

@@ -3,8 +3,8 @@
 
 #include "toolframe/DlgBase.h"
 
-#include "display/PlayInterval.h"
-#include "display/ViewWindow.h"
+#include "view/PlayInterval.h"
+#include "view/ViewWindow.h"
 
 #include <QTimer>
 

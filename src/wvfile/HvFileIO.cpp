@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "HvFileIO.h"
 
-#include "BufferedIO.h"
 #include "WvReader.h"
 #include "WvScanner.h"
 #include "WvWriter.h"
+#include "streams/BufferedIO.h"
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
@@ -99,7 +99,7 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
     if (fileName.isEmpty()) {
         return Tracer::fail("Waveform file name is empty.");
     }
-    if (dataStream != nullptr && !dataStream->checkHeader("IQF")) {
+    if (dataStream != nullptr && !dataStream->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot read data stream header.");
     }
     if (markerStream != nullptr && !markerStream->restartAtBegining()) {

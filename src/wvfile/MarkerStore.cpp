@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MarkerStore.h"
 
-#include "BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include "base/ProgressClock.h"
 

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MarkerTrace.h"
 
-#include "BufferedIO.h"
 #include "ByteSource.h"
+#include "streams/BufferedIO.h"
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"

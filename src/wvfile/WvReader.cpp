@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvReader.h"
 
-#include "BufferedIO.h"
 #include "FileKind.h"
-#include "levels.h"
+#include "streams/BufferedIO.h"
+#include "streams/levels.h"
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
@@ -289,7 +289,7 @@ bool WvReader::openSampleBlock(const QString &name)
     if (!finalizeMarkers()) {
         return false;
     }
-    if (!m_info.dataStream->writeHeader("IQF")) {
+    if (!m_info.dataStream->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Writing to temporary waveform storage failed.");
     }
     Tracer::Trace(Tracer::Information, QString("Reading %1 samples @ %2 bit from waveform...")

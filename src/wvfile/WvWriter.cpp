@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvWriter.h"
 
-#include "BufferedIO.h"
 #include "SampleCoding.h"
+#include "streams/BufferedIO.h"
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"

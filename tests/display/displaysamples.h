@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "display/IqSample.h"
+#include "view/IqSample.h"
 
 #include <cmath>
 #include <cstddef>

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "display/TraceBins.h"
+#include "view/TraceBins.h"
 
 #include <QRandomGenerator>
 #include <QTest>

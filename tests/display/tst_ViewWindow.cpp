@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "display/PlayInterval.h"
-#include "display/ViewWindow.h"
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
+#include "view/PlayInterval.h"
+#include "view/ViewWindow.h"
 
 #include <QTest>
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "display/plotscale.h"
+#include "view/plotscale.h"
 
 #include <QTest>
 

@@ -4,7 +4,7 @@
 #include "displaysamples.h"
 #include "log/Tracer.h"
 #include "plotpictures.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <QPainter>
 #include <QTest>

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "display/ColorTable.h"
-#include "display/ConstellationGrid.h"
-#include "display/SpectrumLines.h"
 #include "display/waterfall.h"
+#include "view/ConstellationGrid.h"
+#include "view/SpectrumLines.h"
 
 #include <QTest>
 

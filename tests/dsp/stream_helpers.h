@@ -2,7 +2,7 @@
 #pragma once
 
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <QIODevice>
 #include <QStringList>

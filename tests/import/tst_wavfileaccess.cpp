@@ -2,7 +2,7 @@
 #include "import/WavFileAccess.h"
 #include "jobs/filebytes.h"
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <QRegularExpression>
 #include <QTemporaryDir>

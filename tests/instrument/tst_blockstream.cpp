@@ -3,8 +3,8 @@
 #include "LogRecorder.h"
 
 #include "instrument/VisaDevice.h"
+#include "streams/TempStream.h"
 #include "visa/visa.h"
-#include "wvfile/TempStream.h"
 
 #include <QTest>
 

@@ -5,7 +5,7 @@
 #include "instrument/RemoteDirModel.h"
 #include "instrument/VisaDevice.h"
 #include "simulator/SimulatorProcess.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <QAbstractItemModelTester>
 #include <QDir>

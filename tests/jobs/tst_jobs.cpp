@@ -5,7 +5,7 @@
 #include "jobs/MeasureJob.h"
 #include "jobs/WavImportJob.h"
 #include "log/Tracer.h"
-#include "wvfile/TempStream.h"
+#include "streams/TempStream.h"
 
 #include <QDir>
 #include <QRegularExpression>

@@ -8,8 +8,8 @@
 #include "display/CWidgetIQTrace.h"
 #include "display/QtNumericEdit.h"
 #include "log/Tracer.h"
+#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
-#include "wvfile/TempStream.h"
 
 #include <QComboBox>
 #include <QLabel>

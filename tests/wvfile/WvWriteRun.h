@@ -4,7 +4,7 @@
 #include "TestDevice.h"
 
 #include "log/CapturedLog.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 #include "wvfile/HvFileIO.h"
 #include "wvfile/WvTypes.h"
 

@@ -2,7 +2,7 @@
 #include "TestDevice.h"
 
 #include "log/CapturedLog.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 
 #include <QTemporaryFile>
 #include <QTest>

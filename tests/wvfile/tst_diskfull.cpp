@@ -2,9 +2,9 @@
 //
 // A disk that fills up: a small file system in memory, mounted where this process alone sees it.
 #include "log/CapturedLog.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
+#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
-#include "wvfile/TempStream.h"
 
 #include <QCoreApplication>
 #include <QDir>

@@ -6,7 +6,7 @@
 
 #include "base/ProgressClock.h"
 #include "log/CapturedLog.h"
-#include "wvfile/BufferedIO.h"
+#include "streams/BufferedIO.h"
 #include "wvfile/HvFileIO.h"
 #include "wvfile/WvReader.h"
 #include "wvfile/WvScanner.h"

@@ -30,12 +30,14 @@ public:
         ReadWrite = Read | Write,
     };
 
-    static constexpr int BufferSize = 16 * 1024 * 1024;
-    static constexpr int HeaderSize = 3; ///< bytes of "IQF"
+    static constexpr int BufferSize = 16 * 1024 * 1024; ///< bytes of each side's buffer by default
+    static constexpr char DataHeader[] = "IQF";
+    static constexpr int HeaderSize = 3; ///< bytes of DataHeader
     static constexpr int RecordSize = 8; ///< bytes of one sample in a data stream
 
-    /// Also seeds rand() with the time of day, for the signals that draw random values.
-    BufferedIO();
+    /// `bufferSize` in bytes, at least 1, is that of the read buffer and of the write buffer; many
+    /// streams at once take smaller ones to stay within the memory of a job.
+    explicit BufferedIO(int bufferSize = BufferSize);
     ~BufferedIO();
     BufferedIO(const BufferedIO &) = delete;
     BufferedIO &operator=(const BufferedIO &) = delete;
@@ -52,6 +54,7 @@ public:
     bool releaseBuf();
 
     [[nodiscard]] bool isInitialised() const { return m_initialised; }
+    [[nodiscard]] int bufferSize() const { return m_bufferSize; } ///< bytes
 
     /// Copies the next `len` bytes. A read that gets at least one byte succeeds even where it meets
     /// the end of the stream, and leaves the rest of the buffer untouched: the end is told by the
@@ -100,6 +103,7 @@ private:
     [[nodiscard]] bool isUsable() const;
     void debug(int level, const QString &text) const;
 
+    const int m_bufferSize;
     bool m_debug = false;
     bool m_initialised = false;
     QIODevice *m_device = nullptr;

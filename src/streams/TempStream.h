@@ -10,7 +10,11 @@
 class TempStream
 {
 public:
-    TempStream() = default;
+    /// `bufferSize` as for BufferedIO.
+    explicit TempStream(int bufferSize = BufferedIO::BufferSize)
+        : m_stream(bufferSize)
+    {
+    }
 
     /// Creates the file and its buffers for reading and writing. False if either fails, without a
     /// message: the caller says what the stream was meant for.

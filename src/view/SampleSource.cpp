@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "SampleSource.h"
 
-#include "dsp/samplestream.h"
 #include "log/Tracer.h"
+#include "streams/samplestream.h"
 
 #include <algorithm>
 #include <utility>

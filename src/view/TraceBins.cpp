@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "TraceBins.h"
 
-#include "dsp/vectorclones.h"
+#include "base/simd.h"
 
 #include <algorithm>
 #include <cmath>
@@ -230,8 +230,8 @@ void TraceBins::begin(qint64 total)
     }
 }
 
-CORVANE_VECTOR_CLONES void TraceBins::append(std::span<const IqSample> samples,
-                                             std::span<const quint8> markers)
+CORVANE_CLONES void TraceBins::append(std::span<const IqSample> samples,
+                                      std::span<const quint8> markers)
 {
     if (m_total < MinSamples) {
         return;

@@ -4,11 +4,9 @@
 #include "log/Tracer.h"
 
 #include <QIODevice>
-#include <QTime>
 
 #include <algorithm>
 #include <array>
-#include <cstdlib>
 #include <cstring>
 #include <new>
 
@@ -27,10 +25,9 @@ QIODevice::OpenMode openModeOf(int mode)
 
 } // namespace
 
-BufferedIO::BufferedIO()
+BufferedIO::BufferedIO(int bufferSize)
+    : m_bufferSize(std::max(bufferSize, 1))
 {
-    const QTime now = QTime::currentTime();
-    std::srand(static_cast<unsigned>(now.second() * 5 + now.minute() + 1));
 }
 
 BufferedIO::~BufferedIO()
@@ -74,11 +71,12 @@ bool BufferedIO::initBuf(QIODevice *device, int mode)
         // A QTemporaryFile creates its file here; the second open below tells whether it worked.
         device->open(openMode);
     }
+    auto size = static_cast<std::size_t>(m_bufferSize);
     if ((mode & Read) != 0) {
-        m_readBuffer.reset(new (std::nothrow) char[BufferSize]);
+        m_readBuffer.reset(new (std::nothrow) char[size]);
     }
     if ((mode & Write) != 0) {
-        m_writeBuffer.reset(new (std::nothrow) char[BufferSize]);
+        m_writeBuffer.reset(new (std::nothrow) char[size]);
     }
     const bool readMissing = (mode & Read) != 0 && !m_readBuffer;
     if (readMissing || ((mode & Write) != 0 && !m_writeBuffer)) {
@@ -147,7 +145,7 @@ bool BufferedIO::releaseBuf()
 bool BufferedIO::firstFill()
 {
     m_readPosition = 0;
-    const qint64 count = m_device->read(m_readBuffer.get(), BufferSize);
+    const qint64 count = m_device->read(m_readBuffer.get(), m_bufferSize);
     if (count < 0) {
         return false;
     }
@@ -161,8 +159,8 @@ void BufferedIO::noteDirectRead(qint64 count)
 {
     const qint64 beyond = m_readPosition + count - std::max(m_windowEnd, m_readPosition);
     if (beyond > 0) {
-        const qint64 windows = (beyond + BufferSize - 1) / BufferSize;
-        m_windowEnd = std::max(m_windowEnd, m_readPosition) + windows * BufferSize;
+        const qint64 windows = (beyond + m_bufferSize - 1) / m_bufferSize;
+        m_windowEnd = std::max(m_windowEnd, m_readPosition) + windows * m_bufferSize;
     }
 }
 
@@ -220,7 +218,7 @@ int BufferedIO::readBlock(int len, void *buffer)
         // Only while nothing is being written: then it doesn't matter how far reads look ahead.
         const bool direct = missing >= directReadSize && m_writePosition == -1 && m_writeFill == 0;
         const qint64 window =
-            m_readPosition < m_windowEnd ? m_windowEnd - m_readPosition : BufferSize;
+            m_readPosition < m_windowEnd ? m_windowEnd - m_readPosition : m_bufferSize;
         const qint64 got =
             direct ? m_device->read(target, missing) : m_device->read(m_readBuffer.get(), window);
         m_readIndex = 0;
@@ -295,13 +293,13 @@ bool BufferedIO::writeBytes(int len, const void *buffer)
     }
     const char *source = static_cast<const char *>(buffer);
     int missing = len;
-    while (missing > BufferSize - m_writeFill) {
-        const int room = BufferSize - m_writeFill;
+    while (missing > m_bufferSize - m_writeFill) {
+        const int room = m_bufferSize - m_writeFill;
         std::memcpy(m_writeBuffer.get() + m_writeFill, source, static_cast<size_t>(room));
         source += room;
         missing -= room;
-        m_writeFill = BufferSize;
-        if (!writeToDevice(m_writeBuffer.get(), BufferSize)) {
+        m_writeFill = m_bufferSize;
+        if (!writeToDevice(m_writeBuffer.get(), m_bufferSize)) {
             return false;
         }
     }

@@ -2,8 +2,8 @@
 #include "ViewWindow.h"
 
 #include "SpectrumLines.h"
-#include "dsp/samplestream.h"
 #include "log/Tracer.h"
+#include "streams/samplestream.h"
 
 #include <algorithm>
 #include <new>
