@@ -36,11 +36,49 @@ if(CORVANE_SANITIZE)
   target_link_options(corvane_settings INTERFACE -fsanitize=${link_sanitize})
 endif()
 
-# corvane_add_folder(FOLDER): adds the folder's targets if the folder is there.
-function(corvane_add_folder folder)
-  if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
-    add_subdirectory(${folder})
+# A file in the build folder that is there only after a complete configuration, and tells whether it
+# has tests. scripts/build reads it.
+set(configuration_marker "${CMAKE_BINARY_DIR}/configured.txt")
+
+function(corvane_begin_configuration)
+  file(REMOVE "${configuration_marker}")
+  set_property(GLOBAL PROPERTY corvane_notes "")
+endfunction()
+
+# corvane_note(TEXT): a line of the summary.
+function(corvane_note text)
+  set_property(GLOBAL APPEND PROPERTY corvane_notes "${text}")
+endfunction()
+
+# corvane_note_peer(NAME FOUND): says in the summary whether a benchmark's peer is there.
+function(corvane_note_peer name found)
+  if(found)
+    corvane_note("Benchmark peer ${name}: found")
+  else()
+    corvane_note("Benchmark peer ${name}: missing, its benchmarks are left out")
   endif()
+endfunction()
+
+function(corvane_end_configuration)
+  message(STATUS "Corvane ${PROJECT_VERSION} ${CMAKE_BUILD_TYPE}: tests ${CORVANE_TESTS}, "
+    "benchmarks ${CORVANE_BENCH}, fuzz targets ${CORVANE_FUZZ}")
+  get_property(notes GLOBAL PROPERTY corvane_notes)
+  foreach(note IN LISTS notes)
+    message(STATUS "${note}")
+  endforeach()
+  file(WRITE "${configuration_marker}" "tests=${CORVANE_TESTS}\n")
+endfunction()
+
+# corvane_add_folders(TABLE): adds the folders of a table, those that are there, in its order.
+function(corvane_add_folders table)
+  set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS "${table}")
+  file(STRINGS "${table}" lines REGEX "^[^#]")
+  foreach(line IN LISTS lines)
+    string(REGEX REPLACE " .*" "" folder "${line}")
+    if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
+      add_subdirectory(${folder})
+    endif()
+  endforeach()
 endfunction()
 
 # corvane_add_children(FOLDER): adds each child folder that has a CMakeLists.txt.
@@ -88,7 +126,9 @@ endfunction()
 function(corvane_add_bench name)
   cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
   corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} benchmark::benchmark)
-  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bench")
+  target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/bench")
+  set_target_properties(${name} PROPERTIES
+    AUTOMOC OFF AUTOUIC OFF AUTORCC OFF RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bench")
 endfunction()
 
 # corvane_add_fuzzer(NAME SOURCES ... LINK ...): a libFuzzer target; its seeds stand in the folder
@@ -97,6 +137,7 @@ function(corvane_add_fuzzer name)
   cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
   corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK})
   target_link_options(${name} PRIVATE -fsanitize=fuzzer)
-  set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/fuzz")
+  set_target_properties(${name} PROPERTIES
+    AUTOMOC OFF AUTOUIC OFF AUTORCC OFF RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/fuzz")
   add_dependencies(fuzzers ${name})
 endfunction()

@@ -5,6 +5,7 @@
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
 #include "streams/TempStream.h"
+#include "support/samples.h"
 
 #include <benchmark/benchmark.h>
 
@@ -14,29 +15,12 @@
 
 namespace {
 
-using Samples = std::vector<std::complex<float>>;
-
 constexpr int Count = 4000000;
 constexpr int CopyBlock = 32768 * 8; ///< bytes
 
-Samples source()
-{
-    Samples samples(Count);
-    unsigned state = 1;
-    for (std::complex<float> &sample : samples) {
-        const auto draw = [&state] {
-            state = state * 1664525U + 1013904223U;
-            return static_cast<float>(state >> 8) / 8388608.0F - 1.0F;
-        };
-        const float inPhase = draw();
-        sample = {inPhase, draw()};
-    }
-    return samples;
-}
-
 [[nodiscard]] bool fill(BufferedIO &stream)
 {
-    return stream.writeHeader("IQF") && stream.writeBytes(Count * 8, source().data()) &&
+    return stream.writeHeader("IQF") && stream.writeBytes(Count * 8, uniformNoise(Count).data()) &&
            stream.checkHeader("IQF");
 }
 
@@ -102,7 +86,7 @@ void BM_Rescale(benchmark::State &state)
         }
     }
     Samples samples(Count);
-    const Samples expected = source();
+    const Samples expected = uniformNoise(Count);
     const float sign = state.iterations() % 2 == 0 ? 1.0F : -1.0F;
     bool ok = stream->checkHeader("IQF") && stream->readBytes(Count * 8, samples.data());
     for (size_t i = 0; i < samples.size(); ++i) {
@@ -130,7 +114,7 @@ void BM_Statistics(benchmark::State &state)
         }
     }
     double sum = 0;
-    for (const std::complex<float> &sample : source()) {
+    for (const std::complex<float> &sample : uniformNoise(Count)) {
         sum += std::norm(std::complex<double>(sample));
     }
     if (std::abs(rms - std::sqrt(sum / Count)) > 1e-9) {
@@ -160,7 +144,7 @@ void BM_FrequencyShift(benchmark::State &state)
         }
     }
     Samples samples(Count);
-    const Samples expected = source();
+    const Samples expected = uniformNoise(Count);
     bool ok = stream->checkHeader("IQF") && stream->readBytes(Count * 8, samples.data());
     double angle = 0;
     for (size_t i = 0; i < samples.size(); ++i) {
@@ -177,7 +161,7 @@ void BM_FrequencyShift(benchmark::State &state)
 /// The loop as defined, in memory: polar form, one sum, and back.
 void BM_FrequencyShiftLiteral(benchmark::State &state)
 {
-    const Samples original = source();
+    const Samples original = uniformNoise(Count);
     Samples samples = original;
     for (auto _ : state) {
         double angle = 0;

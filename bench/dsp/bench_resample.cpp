@@ -1,28 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
-// Rate conversion of 4 million complex samples against libsoxr's HQ recipe, with the same number
-// of threads for both. The second argument is the number of threads.
+// Rate conversion of 4 million complex samples; peers stand in files of their own. The second
+// argument is the number of threads.
+#include "resamplecase.h"
+
 #include "base/parallel.h"
 #include "dsp/Resample.h"
 #include "streams/BufferedIO.h"
 
 #include <QTemporaryFile>
-#include <benchmark/benchmark.h>
-#include <omp.h>
-#include <soxr.h>
 
 #include <cmath>
-#include <complex>
 #include <numbers>
-#include <vector>
 
-namespace {
-
-constexpr int InputCount = 4000000;
-constexpr double ToneCycles = 333333; // in the whole waveform
-
-using Samples = std::vector<std::complex<float>>;
-
-const Samples &source()
+const Samples &resamplecase::source()
 {
     static const Samples samples = [] {
         Samples made(InputCount);
@@ -35,9 +25,7 @@ const Samples &source()
     return samples;
 }
 
-/// The tone must come out at its place, 60 dB above everything else; the ends are left out, since
-/// the peer doesn't loop.
-bool isTone(const Samples &result, double level)
+bool resamplecase::isTone(const Samples &result, double level)
 {
     for (size_t i = 1000; i + 1000 < result.size(); i += 97) {
         const double cycles = std::fmod(
@@ -49,6 +37,20 @@ bool isTone(const Samples &result, double level)
     }
     return true;
 }
+
+void resamplecase::counts(benchmark::internal::Benchmark *bench)
+{
+    for (const int threads : {1, 2}) {
+        for (const int outputCount : {6000000, 2920000, 4003600, 5000011}) {
+            bench->Args({outputCount, threads});
+        }
+    }
+    bench->UseRealTime()->Unit(benchmark::kMillisecond);
+}
+
+namespace {
+
+using namespace resamplecase;
 
 /// An odd length of the same cost would be checked in place; the tool's even one leads by one
 /// sample, which turns the tone by a fixed angle.
@@ -110,59 +112,7 @@ void BM_Resample201(benchmark::State &state)
     convert(state, 201);
 }
 
-void BM_Soxr(benchmark::State &state)
-{
-    const auto outputCount = static_cast<size_t>(state.range(0));
-    const auto threads = static_cast<unsigned>(state.range(1));
-    // Channels in arrays of their own are what soxr can spread over threads.
-    std::vector<float> inPhase(InputCount);
-    std::vector<float> quadrature(InputCount);
-    for (size_t i = 0; i < inPhase.size(); ++i) {
-        inPhase[i] = source()[i].real();
-        quadrature[i] = source()[i].imag();
-    }
-    std::vector<float> outI(outputCount + 1000);
-    std::vector<float> outQ(outputCount + 1000);
-    const void *in[] = {inPhase.data(), quadrature.data()};
-    void *out[] = {outI.data(), outQ.data()};
-    const soxr_io_spec_t io = soxr_io_spec(SOXR_FLOAT32_S, SOXR_FLOAT32_S);
-    const soxr_quality_spec_t quality = soxr_quality_spec(SOXR_HQ, 0);
-    // With 0 soxr takes as many threads as OpenMP offers, one for each channel; above 1 none more.
-    omp_set_num_threads(static_cast<int>(threads));
-    const soxr_runtime_spec_t runtime = soxr_runtime_spec(threads == 1 ? 1 : 0);
-    size_t done = 0;
-    for (auto _ : state) {
-        const soxr_error_t error =
-            soxr_oneshot(InputCount, static_cast<double>(outputCount), 2, in, InputCount, nullptr,
-                         out, outputCount, &done, &io, &quality, &runtime);
-        if (error != nullptr) {
-            state.SkipWithError(error);
-            return;
-        }
-    }
-    Samples result(outputCount);
-    for (size_t i = 0; i < done; ++i) {
-        result[i] = {outI[i], outQ[i]};
-    }
-    if (done + 2 < outputCount || !isTone(result, 0.5)) {
-        state.SkipWithError("wrong result");
-    }
-    state.SetItemsProcessed(state.iterations() * InputCount);
-}
-
-/// Ratios 1.5, 0.73, 1.0009, and a prime count.
-void counts(benchmark::internal::Benchmark *bench)
-{
-    for (const int threads : {1, 2}) {
-        for (const int outputCount : {6000000, 2920000, 4003600, 5000011}) {
-            bench->Args({outputCount, threads});
-        }
-    }
-    bench->UseRealTime()->Unit(benchmark::kMillisecond);
-}
-
 BENCHMARK(BM_Resample50)->Apply(counts);
-BENCHMARK(BM_Soxr)->Apply(counts);
 BENCHMARK(BM_Resample201)->Apply(counts);
 
 } // namespace
