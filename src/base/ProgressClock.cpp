@@ -4,6 +4,7 @@
 #include "vectorstate.h"
 
 #include <QCoreApplication>
+#include <QThread>
 
 #include <utility>
 
@@ -30,7 +31,10 @@ bool ProgressClock::shouldStop(int percent)
     }
     m_timer.restart();
     m_report(percent);
-    QCoreApplication::processEvents();
-    clearVectorState();
+    const QCoreApplication *application = QCoreApplication::instance();
+    if (application != nullptr && application->thread() == QThread::currentThread()) {
+        QCoreApplication::processEvents();
+        clearVectorState();
+    }
     return m_cancelled.load(std::memory_order_relaxed);
 }

@@ -7,7 +7,8 @@
 #include <functional>
 
 /// The one clock of long loops: not more often than every 100 ms it reports the progress, lets the
-/// event loop of the calling thread run, and says whether the work is to stop.
+/// event loop run if it is called on the application's thread, and says whether the work is to
+/// stop. Worker threads have no events of their own to handle.
 class ProgressClock
 {
 public:

@@ -27,10 +27,10 @@ constexpr int MinStreamSamples = 512;
 /// Converts to the records of a stream and takes the level, sample by sample: the order of a sum is
 /// a part of its result.
 CORVANE_CLONES void packSamples(const double *inPhase, const double *quadrature, std::size_t count,
-                                float *iq, SquareLevel &level)
+                                float *iq, LevelSums &level)
 {
     constexpr std::size_t Lanes = 8;
-    double highest = level.highest;
+    double highest = level.peak;
     double sum = level.sum;
     for (std::size_t first = 0; first < count; first += Lanes) {
         const std::size_t used = std::min(Lanes, count - first);
@@ -47,7 +47,7 @@ CORVANE_CLONES void packSamples(const double *inPhase, const double *quadrature,
             sum += squares[i];
         }
     }
-    level = {highest, sum};
+    level = {sum, highest};
 }
 
 [[nodiscard]] unsigned seedOfTheClock()
@@ -77,9 +77,9 @@ public:
         const std::span<double> inPhase = std::span(m_inPhase).first(used);
         const std::span<double> quadrature = std::span(m_quadrature).first(used);
         m_generator.fill(first, inPhase, quadrature);
-        SquareLevel level{m_owner.m_peak, m_owner.m_rms};
+        LevelSums level{m_owner.m_rms, m_owner.m_peak};
         packSamples(m_inPhase.data(), m_quadrature.data(), used, m_packed.data(), level);
-        m_owner.m_peak = level.highest;
+        m_owner.m_peak = level.peak;
         m_owner.m_rms = level.sum;
         m_owner.m_samplesWritten += count;
         return writeSamples(*m_owner.m_output, std::span(m_packed).first(2 * used)) ||
@@ -297,26 +297,25 @@ bool CreateSignal::limitBand()
     if (!m_bandLimit->run()) {
         return false;
     }
-    m_peak = 1 / std::pow(10.0, m_bandLimit->peakOffset() / 20);
-    m_rms = 1 / std::pow(10.0, m_bandLimit->rmsOffset() / 20);
+    m_peak = levelOfOffset(m_bandLimit->peakOffset());
+    m_rms = levelOfOffset(m_bandLimit->rmsOffset());
     if (!m_output->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot write to output file.");
     }
     if (!filtered->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot read the filtered noise.");
     }
-    std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
-    for (int done = 0; done < samples; done += StreamBlockSamples) {
-        const int count = std::min(samples - done, StreamBlockSamples);
-        const std::span<float> iq = std::span(block).first(floatsOf(count));
-        if (readSamples(*filtered.stream(), iq) < count) {
-            return Tracer::fail("*** Cannot read the filtered noise.");
-        }
-        if (!writeSamples(*m_output, iq)) {
-            return Tracer::fail("*** Cannot write to output file.");
-        }
+    bool written = true;
+    const BlockLoop copied = forEachBlock(
+        *filtered.stream(), samples, [](qint64) { return false; },
+        [&](std::span<const float> iq, qint64) {
+            written = writeSamples(*m_output, iq);
+            return written;
+        });
+    if (!written) {
+        return Tracer::fail("*** Cannot write to output file.");
     }
-    return true;
+    return copied.end == BlockLoop::Done || Tracer::fail("*** Cannot read the filtered noise.");
 }
 
 bool CreateSignal::statistics(int *samplesWritten, double *rms, double *peak) const

@@ -32,10 +32,8 @@ constexpr qint64 PartsPerBlock = 24;
 /// Samples of the input window that a block may need.
 constexpr qint64 MaxBlockInput = 512LL * 1024;
 
-double offsetOf(double level)
-{
-    return 20 * std::log10(1 / (level + 1e-12));
-}
+/// Keeps the offset of silence finite, at 240 dB.
+constexpr double OffsetFloor = 1e-12;
 
 /// Carries markers to the outputs. The positions of outputs never fall.
 class MarkerCopy
@@ -104,7 +102,7 @@ struct OutputBlock
     qint64 inputStart = 0; ///< sample at index 0 of the input
     std::size_t partSize = 1;
     std::vector<float> result;
-    std::vector<SquareLevel> levels; ///< of the parts
+    std::vector<LevelSums> levels; ///< of the parts
 
     [[nodiscard]] bool isEmpty() const { return begin >= end; }
     [[nodiscard]] std::size_t count() const { return static_cast<std::size_t>(end - begin); }
@@ -177,11 +175,8 @@ public:
         return store(done);
     }
 
-    [[nodiscard]] double peak() const { return std::sqrt(m_level.highest); }
-    [[nodiscard]] double rms() const
-    {
-        return std::sqrt(m_level.sum / static_cast<double>(m_outputCount));
-    }
+    [[nodiscard]] double peak() const { return m_level.peakLevel(); }
+    [[nodiscard]] double rms() const { return m_level.rmsLevel(m_outputCount); }
 
 private:
     [[nodiscard]] qint64 blockSize() const
@@ -241,7 +236,7 @@ private:
                 .subspan(2 * from, 2 * std::min(block.partSize, block.count() - from));
         m_interpolator->compute(block.begin + static_cast<qint64>(from), block.input,
                                 block.inputStart, result);
-        block.levels[part] = measureSquares(result);
+        block.levels[part] = measureByLanes(result);
     }
 
     [[nodiscard]] bool store(const OutputBlock &block)
@@ -249,8 +244,8 @@ private:
         if (block.isEmpty()) {
             return true;
         }
-        for (const SquareLevel &level : block.levels) {
-            m_level.highest = std::max(m_level.highest, level.highest);
+        for (const LevelSums &level : block.levels) {
+            m_level.peak = std::max(m_level.peak, level.peak);
             m_level.sum += level.sum;
         }
         if (!writeSamples(*m_owner.m_output, block.result)) {
@@ -267,7 +262,7 @@ private:
     std::unique_ptr<Interpolator> m_interpolator;
     LoopedInput m_input;
     MarkerCopy m_markers;
-    SquareLevel m_level; ///< of all outputs so far
+    LevelSums m_level; ///< of all outputs so far
 };
 
 Resample::Resample(QObject *parent)
@@ -350,7 +345,7 @@ bool Resample::run()
     if (!conversion.run()) {
         return false;
     }
-    m_peakOffset = offsetOf(conversion.peak());
-    m_rmsOffset = offsetOf(conversion.rms());
+    m_peakOffset = levelOffset(conversion.peak(), OffsetFloor);
+    m_rmsOffset = levelOffset(conversion.rms(), OffsetFloor);
     return true;
 }

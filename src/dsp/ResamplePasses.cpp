@@ -82,24 +82,21 @@ CORVANE_CLONES void splitPolar(std::span<const float> iq, std::span<float> phase
 /// The passes' common loop over a stream whose first sample is next to be read. `work` takes a
 /// block of samples and its first index, and gives false if it has failed and said why.
 template <typename Work>
-[[nodiscard]] bool forEachBlock(BufferedIO &stream, int samples, ProgressClock &clock, Work work)
+[[nodiscard]] bool passOver(BufferedIO &stream, int samples, ProgressClock &clock, Work work)
 {
-    std::vector<float> block(floatsOf(std::min(samples, StreamBlockSamples)));
-    for (int done = 0; done < samples;) {
-        if (clock.shouldStop(percentOf(done, samples))) {
-            return Tracer::fail("*** Action aborted by user.");
-        }
-        const int count = std::min(samples - done, StreamBlockSamples);
-        const int got = readSamples(stream, std::span(block).first(floatsOf(count)));
-        if (got > 0 && !work(std::span(block).first(floatsOf(got)), done)) {
-            return false;
-        }
-        if (got < count) {
-            return failAtSample("Reading", done + got);
-        }
-        done += count;
+    const BlockLoop loop = forEachBlock(
+        stream, samples, [&](qint64 done) { return clock.shouldStop(percentOf(done, samples)); },
+        work);
+    switch (loop.end) {
+    case BlockLoop::Stopped:
+        return Tracer::fail("*** Action aborted by user.");
+    case BlockLoop::ReadFailed:
+        return failAtSample("Reading", loop.position);
+    case BlockLoop::WorkFailed:
+    case BlockLoop::Done:
+        break;
     }
-    return true;
+    return loop.end == BlockLoop::Done;
 }
 
 } // namespace
@@ -120,7 +117,7 @@ bool Resample::transformInPlace(int samples, BufferedIO *stream, const BlockWork
         return Tracer::fail("*** Cannot write to data buffer.");
     }
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    return forEachBlock(*stream, samples, clock, [&](std::span<float> iq, qint64 first) {
+    return passOver(*stream, samples, clock, [&](std::span<float> iq, qint64 first) {
         work(iq);
         return writeSamples(*stream, iq) ||
                failAtSample("Writing", failedWriteSample(*stream, first));
@@ -204,7 +201,7 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
     std::vector<float> phaseBlock(floatsOf(StreamBlockSamples));
     std::vector<float> amplitudeBlock(floatsOf(StreamBlockSamples));
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    return forEachBlock(*source, samples, clock, [&](std::span<float> iq, qint64 first) {
+    return passOver(*source, samples, clock, [&](std::span<float> iq, qint64 first) {
         const std::span<float> phasePart = std::span(phaseBlock).first(iq.size());
         const std::span<float> amplitudePart = std::span(amplitudeBlock).first(iq.size());
         splitPolar(iq, phasePart, amplitudePart, offset, gain);
@@ -228,15 +225,15 @@ bool Resample::statistics(int samples, BufferedIO *stream, double *peak, double 
     if (!stream->checkHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("*** Cannot validate data stream header.");
     }
-    SquareLevel level;
+    LevelSums level;
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    const bool done = forEachBlock(*stream, samples, clock, [&](std::span<const float> iq, qint64) {
-        addSquares(iq, level);
+    const bool done = passOver(*stream, samples, clock, [&](std::span<const float> iq, qint64) {
+        addLevels(iq, level);
         return true;
     });
     if (done) {
-        *rms = std::sqrt(level.sum / samples);
-        *peak = std::sqrt(level.highest);
+        *rms = level.rmsLevel(samples);
+        *peak = level.peakLevel();
     }
     return done;
 }

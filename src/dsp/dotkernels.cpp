@@ -190,7 +190,7 @@ CORVANE_WIDE_KERNEL(dotSlopedRows, const SlopedBlock<double> &, dotSlopedRowsBod
 CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<float> &, filterSamplesBody)
 CORVANE_WIDE_KERNEL(filterSamples, const FilterBlock<double> &, filterSamplesBody)
 
-CORVANE_CLONES SquareLevel measureSquares(std::span<const float> iq)
+CORVANE_CLONES LevelSums measureByLanes(std::span<const float> iq)
 {
     constexpr std::size_t Lanes = 8;
     std::array<double, Lanes> highest{};
@@ -206,42 +206,12 @@ CORVANE_CLONES SquareLevel measureSquares(std::span<const float> iq)
             sum[i] += square;
         }
     }
-    SquareLevel level;
+    LevelSums level;
     for (std::size_t i = 0; i < Lanes; ++i) {
-        level.highest = std::max(level.highest, highest[i]);
+        level.peak = std::max(level.peak, highest[i]);
         level.sum += sum[i];
     }
     return level;
-}
-
-CORVANE_CLONES void addSquares(std::span<const float> iq, SquareLevel &level)
-{
-    constexpr std::size_t Lanes = 16;
-    double highest = level.highest;
-    double sum = level.sum;
-    const float *samples = iq.data();
-    const std::size_t count = iq.size() / 2;
-    std::size_t n = 0;
-    std::array<double, Lanes> squares;
-    for (; n + Lanes <= count; n += Lanes) {
-        for (std::size_t i = 0; i < Lanes; ++i) {
-            const double inPhase = samples[2 * (n + i)];
-            const double quadrature = samples[2 * (n + i) + 1];
-            squares[i] = inPhase * inPhase + quadrature * quadrature;
-        }
-        for (const double square : squares) {
-            highest = square > highest ? square : highest;
-            sum += square;
-        }
-    }
-    for (; n < count; ++n) {
-        const double inPhase = samples[2 * n];
-        const double quadrature = samples[2 * n + 1];
-        const double square = inPhase * inPhase + quadrature * quadrature;
-        highest = square > highest ? square : highest;
-        sum += square;
-    }
-    level = {highest, sum};
 }
 
 CORVANE_CLONES void deinterleave(std::span<const float> iq, float *inPhase, float *quadrature)

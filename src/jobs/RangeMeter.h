@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "wvfile/SampleCoding.h"
+#include "streams/levels.h"
 
 #include <QObject>
 

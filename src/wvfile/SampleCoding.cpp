@@ -60,34 +60,6 @@ CORVANE_CLONES void encodeA(const float *values, qint16 *words, size_t count)
     }
 }
 
-constexpr size_t powerBlock = 256;
-
-CORVANE_CLONES void powersOf(const float *values, double *powers, size_t count)
-{
-    for (size_t i = 0; i < count; ++i) {
-        const double inPhase = values[2 * i];
-        const double quadrature = values[2 * i + 1];
-        powers[i] = inPhase * inPhase + quadrature * quadrature;
-    }
-}
-
-CORVANE_CLONES double largestOf(const double *powers, size_t count, double peak)
-{
-    // Eight independent maxima let the compiler vectorise; the order doesn't matter to a maximum.
-    std::array<double, 8> lanes{};
-    lanes.fill(peak);
-    size_t i = 0;
-    for (; i + lanes.size() <= count; i += lanes.size()) {
-        for (size_t lane = 0; lane < lanes.size(); ++lane) {
-            lanes[lane] = powers[i + lane] > lanes[lane] ? powers[i + lane] : lanes[lane];
-        }
-    }
-    for (; i < count; ++i) {
-        lanes[0] = powers[i] > lanes[0] ? powers[i] : lanes[0];
-    }
-    return *std::max_element(lanes.begin(), lanes.end());
-}
-
 } // namespace
 
 void decodeWords(SampleCoding coding, std::span<const std::byte> words, float gain,
@@ -131,18 +103,4 @@ void encodeWords(std::span<const float> values, std::span<std::byte> words)
 qint16 encodeWord(float value)
 {
     return static_cast<qint16>(static_cast<int>(scaledToWord(value)));
-}
-
-void addLevels(std::span<const float> values, LevelSums &sums)
-{
-    std::array<double, powerBlock> powers;
-    const size_t samples = values.size() / 2;
-    for (size_t done = 0; done < samples; done += powerBlock) {
-        const size_t count = std::min(powerBlock, samples - done);
-        powersOf(values.data() + 2 * done, powers.data(), count);
-        for (size_t i = 0; i < count; ++i) {
-            sums.sum += powers[i];
-        }
-        sums.peak = largestOf(powers.data(), count, sums.peak);
-    }
 }

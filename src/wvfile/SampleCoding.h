@@ -14,13 +14,6 @@ enum class SampleCoding {
     D, ///< offset binary, 14 bit in the upper bits of the word, of the WV kinds
 };
 
-/// Power sums over samples, gathered in the order of the samples.
-struct LevelSums
-{
-    double sum = 0;  ///< sum of I² + Q²
-    double peak = 0; ///< largest I² + Q²
-};
-
 /// Decodes words, I and Q in turn, least significant byte first, and multiplies each by `gain`.
 /// `words` holds two bytes for each float of `values`.
 void decodeWords(SampleCoding coding, std::span<const std::byte> words, float gain,
@@ -33,6 +26,3 @@ void encodeWords(std::span<const float> values, std::span<std::byte> words);
 
 /// Encodes one value by coding A.
 [[nodiscard]] qint16 encodeWord(float value);
-
-/// Adds I² + Q² of each sample, in double precision; `values` holds I and Q in turn.
-void addLevels(std::span<const float> values, LevelSums &sums);

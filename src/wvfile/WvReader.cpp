@@ -40,8 +40,8 @@ bool WvReader::read()
     if (round == Round::Failed || !openSampleBlock(name) || !readSamples()) {
         return false;
     }
-    m_info.rmsOffset = measuredOffset(std::sqrt(m_levels.sum / m_info.samples));
-    m_info.peakOffset = measuredOffset(std::sqrt(m_levels.peak));
+    m_info.rmsOffset = measuredOffset(m_levels.rmsLevel(m_info.samples));
+    m_info.peakOffset = measuredOffset(m_levels.peakLevel());
     return true;
 }
 

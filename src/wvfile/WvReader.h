@@ -7,6 +7,7 @@
 #include "WvTypes.h"
 
 #include "base/SideWorker.h"
+#include "streams/levels.h"
 
 #include <QString>
 

@@ -3,6 +3,7 @@
 
 #include "SampleCoding.h"
 #include "streams/BufferedIO.h"
+#include "streams/levels.h"
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
@@ -32,11 +33,6 @@ const char *typeName(int type)
     default:
         return "TGX-WV";
     }
-}
-
-double offsetOf(double level)
-{
-    return 20 * std::log10(1 / level);
 }
 
 /// Index of the first byte whose masked state differs from `state`, or the size.
@@ -102,8 +98,8 @@ void WvWriter::prepareLevels()
         rms = std::sqrt(sum / m_job.samples);
         rms = rms == 0 ? silence : rms;
         peak = peak == 0 ? silence : peak;
-        m_job.rmsOffset = offsetOf(rms);
-        m_job.peakOffset = offsetOf(peak);
+        m_job.rmsOffset = levelOffset(rms);
+        m_job.peakOffset = levelOffset(peak);
     }
     const auto info = [](const QString &line) { Tracer::Trace(Tracer::Information, line); };
     info("========== Signal Statistics ==========");

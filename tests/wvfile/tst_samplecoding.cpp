@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "streams/levels.h"
 #include "wvfile/SampleCoding.h"
 
 #include <QTest>
