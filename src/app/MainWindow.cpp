@@ -5,7 +5,7 @@
 #include "LocalFileModel.h"
 #include "QCustomTreeView.h"
 #include "devicechoice.h"
-#include "instrument/DlgInstrConfig.h"
+#include "instrument/ui/DlgInstrConfig.h"
 #include "mnemonics.h"
 #include "processage.h"
 #include "settingsstores.h"

@@ -6,7 +6,7 @@
 #include "QCustomTreeView.h"
 #include "RemotePaneFiles.h"
 #include "devicechoice.h"
-#include "instrument/DlgInstrConfig.h"
+#include "instrument/ui/DlgInstrConfig.h"
 #include "toolframe/WaitCursor.h"
 #include "toolframe/questions.h"
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "instrument/DlgInstrConfig.h"
+#include "instrument/ui/DlgInstrConfig.h"
 #include "simulator/SimulatorProcess.h"
 
 #include <QLabel>

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgInstrConfig.h"
 
-#include "InstrumentSummary.h"
-#include "VisaDevice.h"
+#include "instrument/InstrumentSummary.h"
+#include "instrument/VisaDevice.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
-#include "remotepaths.h"
 #include "toolframe/QtProgressDialog.h"
 #include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"

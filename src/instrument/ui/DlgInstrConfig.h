@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "InstrumentList.h"
+#include "instrument/InstrumentList.h"
 
 #include <QDialog>
 
