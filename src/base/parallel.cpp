@@ -1,18 +1,30 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "parallel.h"
 
+#include <QSemaphore>
+#include <QThreadPool>
+
 #include <algorithm>
 #include <atomic>
 #include <thread>
-#include <vector>
 
 namespace {
+
 std::atomic<unsigned> threadLimit{0};
+
+/// Loops come block by block, and a new thread for each would cost more than a small block.
+QThreadPool &keptThreads()
+{
+    static QThreadPool pool;
+    return pool;
 }
+
+} // namespace
 
 void setThreadLimit(unsigned count)
 {
     threadLimit = count;
+    keptThreads().setMaxThreadCount(static_cast<int>(threadCount()));
 }
 
 unsigned threadCount()
@@ -30,9 +42,14 @@ void parallelFor(std::size_t count, const std::function<void(std::size_t)> &work
             work(index);
         }
     };
-    std::vector<std::jthread> threads;
-    for (std::size_t i = 1; i < workers; ++i) {
-        threads.emplace_back(drain);
+    QSemaphore ended;
+    int started = 0;
+    while (static_cast<std::size_t>(started) + 1 < workers && keptThreads().tryStart([&] {
+        drain();
+        ended.release();
+    })) {
+        ++started;
     }
     drain();
+    ended.acquire(started);
 }

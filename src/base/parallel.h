@@ -12,5 +12,6 @@ void setThreadLimit(unsigned count);
 
 /// Calls `work(index)` for each index from 0 to count - 1, spread over the processors, and returns
 /// when all are done. The calls must be independent of each other, so that the result doesn't
-/// depend on the number of threads. Runs on the calling thread alone for a single item.
+/// depend on the number of threads. Runs on the calling thread alone for a single item, and with
+/// fewer threads while other callers hold those that are kept for it.
 void parallelFor(std::size_t count, const std::function<void(std::size_t)> &work);
