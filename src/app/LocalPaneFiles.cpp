@@ -2,7 +2,7 @@
 #include "LocalPaneFiles.h"
 
 #include "LocalTreeRemover.h"
-#include "entryname.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 #include "toolframe/QtProgressDialog.h"
 
@@ -51,7 +51,7 @@ QString LocalPaneFiles::pathOf(const QModelIndex &index) const
 
 QModelIndex LocalPaneFiles::indexOf(const QString &path) const
 {
-    return path.isEmpty() ? QModelIndex() : m_model->index(withoutSlash(path));
+    return path.isEmpty() ? QModelIndex() : m_model->index(withoutEndSlash(path));
 }
 
 qint64 LocalPaneFiles::sizeOf(const QModelIndex &index) const
@@ -67,7 +67,7 @@ void LocalPaneFiles::setNameFilters(const QStringList &wildcards)
 
 bool LocalPaneFiles::exists(const QString &path) const
 {
-    const QFileInfo info(withoutSlash(path));
+    const QFileInfo info(withoutEndSlash(path));
     return info.exists() || info.isSymLink();
 }
 
@@ -78,7 +78,7 @@ bool LocalPaneFiles::isRoot(const QString &path) const
 
 bool LocalPaneFiles::isRealFolder(const QString &path) const
 {
-    const QFileInfo info(withoutSlash(path));
+    const QFileInfo info(withoutEndSlash(path));
     return info.isDir() && !info.isSymLink();
 }
 
@@ -91,7 +91,7 @@ QString LocalPaneFiles::removeTreeQuestion(const QString &path) const
 {
     return QString("The selected folder %1 is not empty.\n"
                    "Do you really want to delete this folder and all its contents?")
-        .arg(withoutSlash(path));
+        .arg(withoutEndSlash(path));
 }
 
 bool LocalPaneFiles::createFolder(const QString &parent, const QString &name)
@@ -111,14 +111,14 @@ bool LocalPaneFiles::rename(const QString &path, const QString &newName)
     if (exists(target)) {
         return fail(words, target, "The name is taken.");
     }
-    QFile file(withoutSlash(path));
+    QFile file(withoutEndSlash(path));
     return file.rename(target) || fail(words, path, file.errorString());
 }
 
 bool LocalPaneFiles::removeFile(const QString &path)
 {
     logStep("Deleting file", path);
-    QFile file(withoutSlash(path));
+    QFile file(withoutEndSlash(path));
     return file.remove() || fail("Deleting file failed.", path, file.errorString());
 }
 
@@ -126,7 +126,7 @@ bool LocalPaneFiles::removeEmptyFolder(const QString &path)
 {
     logStep("Deleting folder", path);
     errno = 0;
-    return QDir().rmdir(withoutSlash(path)) ||
+    return QDir().rmdir(withoutEndSlash(path)) ||
            fail("Deleting folder failed.", path, systemReason(errno));
 }
 
@@ -137,12 +137,12 @@ bool LocalPaneFiles::removeTree(const QString &path, QWidget *parent)
     LocalTreeRemover remover;
     connect(&remover, &LocalTreeRemover::ProgressUpdate, &progress, &QtProgressDialog::setValue);
     connect(&progress, &QtProgressDialog::canceled, &remover, &LocalTreeRemover::cancel);
-    return remover.remove(withoutSlash(path)) ||
+    return remover.remove(withoutEndSlash(path)) ||
            fail("Deleting folder structure failed.", remover.failedPath(), remover.reason());
 }
 
 bool LocalPaneFiles::fail(const QString &words, const QString &path, const QString &reason)
 {
-    emit failed(QString("%1 %2: %3").arg(words, withoutSlash(path), reason).simplified());
+    emit failed(QString("%1 %2: %3").arg(words, withoutEndSlash(path), reason).simplified());
     return Tracer::fail(words);
 }

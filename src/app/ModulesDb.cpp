@@ -2,7 +2,7 @@
 #include "ModulesDb.h"
 
 #include "DlgInfo.h"
-#include "entryname.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"

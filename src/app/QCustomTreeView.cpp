@@ -3,7 +3,7 @@
 
 #include "PaneFiles.h"
 #include "deviceactions.h"
-#include "entryname.h"
+#include "instrument/remotepaths.h"
 #include "mnemonics.h"
 #include "toolframe/WaitCursor.h"
 

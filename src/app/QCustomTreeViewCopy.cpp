@@ -4,7 +4,7 @@
 
 #include "PaneFiles.h"
 #include "deviceactions.h"
-#include "entryname.h"
+#include "instrument/remotepaths.h"
 #include "instrument/VisaDevice.h"
 #include "jobs/CopyJob.h"
 #include "toolframe/QtProgressDialog.h"

@@ -4,7 +4,7 @@
 
 #include "PaneFiles.h"
 #include "deviceactions.h"
-#include "entryname.h"
+#include "instrument/remotepaths.h"
 #include "instrument/VisaDevice.h"
 #include "toolframe/questions.h"
 
@@ -96,7 +96,7 @@ void QCustomTreeView::slot_remove()
     if (!m_files->isRealFolder(path)) {
         if (!askYesNo(
                 this, "Delete File",
-                QString("Do you really want to delete the file\n%1 ?").arg(withoutSlash(path)))) {
+                QString("Do you really want to delete the file\n%1 ?").arg(withoutEndSlash(path)))) {
             return;
         }
         done = m_files->removeFile(path);

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "RemotePaneFiles.h"
 
-#include "entryname.h"
 #include "instrument/RemoteDirModel.h"
 #include "instrument/VisaDevice.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 #include "toolframe/QtProgressDialog.h"
 
@@ -131,7 +131,7 @@ bool RemotePaneFiles::isEmptyFolder(const QString &path) const
 QString RemotePaneFiles::removeTreeQuestion(const QString &path) const
 {
     return QString("Do you want to delete the folder '%1'\nand all its content?")
-        .arg(withoutSlash(path));
+        .arg(withoutEndSlash(path));
 }
 
 bool RemotePaneFiles::createFolder(const QString &parent, const QString &name)
@@ -182,7 +182,7 @@ bool RemotePaneFiles::removeTree(const QString &path, QWidget *parent)
 
 QString RemotePaneFiles::native(const QString &path) const
 {
-    return QString(path).replace('/', device()->pathSeparator());
+    return nativePath(path, device()->pathSeparator());
 }
 
 bool RemotePaneFiles::report(bool done, const QString &words)

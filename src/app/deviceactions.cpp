@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "deviceactions.h"
 
-#include "entryname.h"
 #include "instrument/VisaDevice.h"
+#include "instrument/remotepaths.h"
 #include "jobs/CopyJob.h"
 #include "log/Tracer.h"
 #include "toolframe/QtProgressDialog.h"
@@ -104,7 +104,7 @@ QString runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
         QObject::connect(&progress, &QtProgressDialog::canceled, &device, &VisaDevice::cancel);
         QObject::connect(&device, &VisaDevice::ProgressUpdate, &progress,
                          &QtProgressDialog::setValue);
-        started = device.startArb(QString(path).replace('/', device.pathSeparator()));
+        started = device.startArb(nativePath(path, device.pathSeparator()));
     }
     if (started) {
         device.checkErrorQueue();

@@ -5,7 +5,6 @@
 
 #include "instrument/InstrumentSummary.h"
 #include "instrument/VisaDevice.h"
-#include "instrument/fetchfile.h"
 #include "instrument/remotepaths.h"
 #include "jobs/ToolJob.h"
 
@@ -118,38 +117,6 @@ int runSession(const InstrumentArguments &arguments, const QString &label, const
 int printed(Console &console, int exitCode, const QByteArray &text)
 {
     return exitCode != ExitDone || console.print(text) ? exitCode : console.failed();
-}
-
-/// Why a path can't be sent to an instrument; empty if it can.
-QString pathProblem(const QString &path)
-{
-    if (path.isEmpty()) {
-        return "the path on the instrument is empty";
-    }
-    if (path.contains('\'')) {
-        return "'" + path +
-               "' holds an apostrophe, which ends the path in the instrument's command";
-    }
-    return {};
-}
-
-/// As above, for a path that is taken apart into a folder and a name in it.
-QString fullPathProblem(const QString &path)
-{
-    const RemotePath parts = splitPath(path);
-    const bool isName =
-        !parts.fileName.isEmpty() && parts.fileName != "." && parts.fileName != "..";
-    const bool isFull = isName && parts.directory != parts.drive;
-    return !pathProblem(path).isEmpty() || isFull ? pathProblem(path)
-                                                  : "'" + path + "' is no full path";
-}
-
-QString withoutEndSeparators(QString path)
-{
-    while (path.size() > 1 && (path.endsWith('/') || path.endsWith('\\'))) {
-        path.chop(1);
-    }
-    return path;
 }
 
 /// What an instrument refuses without an answer of its own stands in its error queue.
@@ -280,7 +247,7 @@ int runList(InstrumentArguments &arguments)
     QList<RemoteFileEntry> entries;
     const int exitCode = runSession(arguments, "Reading...", [&](VisaDevice &device) {
         return arguments.recursive
-                   ? device.listTreeEntries(entries, withoutEndSeparators(arguments.first))
+                   ? device.listTreeEntries(entries, withoutEndSlash(arguments.first))
                    : device.listDirectory(entries, arguments.first);
     });
     QJsonArray objects;
@@ -299,7 +266,7 @@ int runList(InstrumentArguments &arguments)
 int runOnFolder(InstrumentArguments &arguments, const QString &label,
                 bool (VisaDevice::*operation)(const QString &, const QString &))
 {
-    const QString path = withoutEndSeparators(arguments.first);
+    const QString path = withoutEndSlash(arguments.first);
     if (const QString problem = fullPathProblem(path); !problem.isEmpty()) {
         return arguments.console.wrongUsage("PATH: " + problem);
     }
@@ -323,8 +290,8 @@ int runRemoveFolder(InstrumentArguments &arguments)
 
 int runMove(InstrumentArguments &arguments)
 {
-    const QString oldPath = withoutEndSeparators(arguments.first);
-    const QString newPath = withoutEndSeparators(arguments.second);
+    const QString oldPath = withoutEndSlash(arguments.first);
+    const QString newPath = withoutEndSlash(arguments.second);
     if (const QString problem = fullPathProblem(oldPath); !problem.isEmpty()) {
         return arguments.console.wrongUsage("OLD: " + problem);
     }
@@ -333,8 +300,8 @@ int runMove(InstrumentArguments &arguments)
     }
     const RemotePath oldParts = splitPath(oldPath);
     const RemotePath newParts = splitPath(newPath);
-    const auto isSameFolder = [](QString a, QString b) {
-        return a.replace('\\', '/') == b.replace('\\', '/');
+    const auto isSameFolder = [](const QString &a, const QString &b) {
+        return slashPath(a, '\\') == slashPath(b, '\\');
     };
     if (newParts.fileName.isEmpty() ||
         (!newParts.directory.isEmpty() && !isSameFolder(oldParts.directory, newParts.directory))) {
@@ -373,8 +340,9 @@ int runGet(InstrumentArguments &arguments)
     if (!mayWrite(arguments.console, local, arguments.force)) {
         return arguments.console.failed();
     }
-    return runSession(arguments, "Reading file...",
-                      [&](VisaDevice &device) { return fetchRemoteFile(device, remote, local); });
+    return runSession(arguments, "Reading file...", [&](VisaDevice &device) {
+        return device.readRemoteFile(remote, local, OutputFile::Unfinished::Vanishes);
+    });
 }
 
 int runPut(InstrumentArguments &arguments)

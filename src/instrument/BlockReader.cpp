@@ -1,14 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "BlockReader.h"
 
-#include "VisaDevice.h"
-
+#include "base/OutputFile.h"
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
 #include "streams/BufferedIO.h"
 
 #include <QElapsedTimer>
-#include <QFile>
 
 #include <algorithm>
 #include <array>
@@ -46,11 +44,9 @@ quint32 digitValue(char character)
 
 } // namespace
 
-BlockReader::BlockReader(VisaDevice &device, const VisaSession &session,
-                         const std::atomic<bool> &cancelled)
-    : m_device(device)
-    , m_session(session)
-    , m_cancelled(cancelled)
+BlockReader::BlockReader(VisaSession &session, OperationControl &control)
+    : m_session(session)
+    , m_control(control)
 {
 }
 
@@ -64,27 +60,26 @@ bool BlockReader::fail(const char *text) const
 bool BlockReader::fail(const char *text, ViStatus status) const
 {
     (void)fail(text);
-    m_device.reportStatus(status);
+    m_session.reportStatus(status);
     return false;
 }
 
-bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
+bool BlockReader::readFile(const QString &remotePath, const QString &localPath, OutputFile &file)
 {
     note("Copying file from instrument to local file system.");
     note("Source   \t: " + remotePath);
     note("Destination \t: " + localPath);
-    note(QString("R/W Timeout \t: %1 ms").arg(m_device.timeoutMs()));
+    note(QString("R/W Timeout \t: %1 ms").arg(m_session.timeoutMs().value_or(0)));
     // Before the local file is touched.
-    if (!m_device.isOpen()) {
-        Tracer::Trace(Tracer::Error, "Device is not open.");
+    if (!m_session.isOpen()) {
+        (void)VisaSession::failNotOpen();
         return Tracer::fail(queryFailed);
     }
-    QFile file(localPath);
-    if (!file.open(QIODevice::WriteOnly | QIODevice::Unbuffered)) {
+    if (!file.open()) {
         return Tracer::fail("Cannot open local file for writing.");
     }
-    emit m_device.ProgressUpdate(0);
-    if (!m_device.sendCommand(":MMEM:DATA? '" + remotePath + "'")) {
+    m_control.report(0);
+    if (!m_session.send(":MMEM:DATA? '" + remotePath + "'")) {
         return fail(queryFailed);
     }
     // The data may hold any byte.
@@ -113,9 +108,12 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath)
         (void)fail("No terminating character received.", status);
     }
     const qint64 elapsedMs = rateTimer.elapsed();
-    emit m_device.ProgressUpdate(100);
-    if (!m_device.checkErrorQueue()) {
+    m_control.report(100);
+    if (!m_session.checkErrorQueue()) {
         return false;
+    }
+    if (!file.commit()) {
+        return Tracer::fail(localWriteFailed);
     }
     if (elapsedMs > 0) {
         const double rate =
@@ -159,13 +157,12 @@ std::optional<qint64> BlockReader::readFileLength() const
     return length;
 }
 
-bool BlockReader::receiveFile(QFile &file, qint64 length)
+bool BlockReader::receiveFile(OutputFile &file, qint64 length)
 {
     note(QString("Read block size is %1 bytes.").arg(fileBlockBytes));
     m_buffer.resize(blocksPerWrite * fileBlockBytes);
     m_pending = 0;
-    ProgressClock progress([this](int percent) { emit m_device.ProgressUpdate(percent); },
-                           m_cancelled);
+    ProgressClock progress(m_control.report, m_control.cancelled);
     int retries = 0;
     for (qint64 remaining = length; remaining > 0;) {
         const auto wanted = static_cast<quint32>(std::min(remaining, fileBlockBytes));
@@ -176,7 +173,7 @@ bool BlockReader::receiveFile(QFile &file, qint64 length)
             Tracer::Trace(Tracer::Error,
                           QString("%1 bytes already received.").arg(length - remaining));
             Tracer::Trace(Tracer::Error, QString("%1 bytes remaining.").arg(remaining));
-            m_device.reportStatus(status);
+            m_session.reportStatus(status);
             return false;
         }
         if (count != wanted) {
@@ -202,10 +199,10 @@ bool BlockReader::receiveFile(QFile &file, qint64 length)
     return true;
 }
 
-bool BlockReader::writePending(QFile &file)
+bool BlockReader::writePending(OutputFile &file)
 {
     const qint64 count = std::exchange(m_pending, 0);
-    return file.write(m_buffer.constData(), count) == count;
+    return file.write({m_buffer.constData(), static_cast<size_t>(count)});
 }
 
 bool BlockReader::failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
@@ -224,15 +221,15 @@ bool BlockReader::failIncomplete(qint64 total, qint64 length, const QByteArray &
         }
         Tracer::Trace(Tracer::Error, text);
     }
-    m_device.reportStatus(status);
+    m_session.reportStatus(status);
     return false;
 }
 
-bool BlockReader::abandon() const
+bool BlockReader::abandon()
 {
     m_session.clear();
-    m_device.checkErrorQueue();
-    (void)m_device.sendCommand("*CLS");
+    (void)m_session.checkErrorQueue();
+    (void)m_session.send("*CLS");
     note("*** Transfer aborted by user.");
     return false;
 }
@@ -260,7 +257,7 @@ bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
         status = m_session.setAttribute(VI_ATTR_TERMCHAR_EN, VI_FALSE);
     }
     if (status != VI_SUCCESS) {
-        m_device.reportStatus(status);
+        m_session.reportStatus(status);
         return false;
     }
     const std::optional<qint64> received = receiveStream(stream, *length, maximum);
@@ -269,7 +266,7 @@ bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
     }
     status = m_session.setAttribute(VI_ATTR_TERMCHAR_EN, usesTerminator);
     if (status != VI_SUCCESS) {
-        m_device.reportStatus(status);
+        m_session.reportStatus(status);
         return false;
     }
     char terminator = 0;
@@ -277,7 +274,7 @@ bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
     if (!VisaSession::isGoodRead(m_session.read(&terminator, 1, count))) {
         return Tracer::fail("Cannot read terminating character.");
     }
-    emit m_device.ProgressUpdate(100);
+    m_control.report(100);
     note(QString("Reading of %1 bytes completed.").arg(*received));
     return true;
 }
@@ -286,7 +283,7 @@ std::optional<qint64> BlockReader::readStreamLength() const
 {
     const auto failed = [this](const char *text, ViStatus status) {
         Tracer::Trace(Tracer::Error, text);
-        m_device.reportStatus(status);
+        m_session.reportStatus(status);
         return std::nullopt;
     };
     char character = 0;
@@ -324,7 +321,7 @@ std::optional<qint64> BlockReader::readStreamLength() const
 std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 length, qint64 maximum)
 {
     m_buffer.resize(streamBlockBytes);
-    emit m_device.ProgressUpdate(0);
+    m_control.report(0);
     QElapsedTimer progress;
     progress.start();
     qint64 received = 0;
@@ -341,7 +338,7 @@ std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 leng
         }
         received += count;
         if (progress.elapsed() > ProgressClock::IntervalMs) {
-            emit m_device.ProgressUpdate(static_cast<int>(100 * received / maximum));
+            m_control.report(static_cast<int>(100 * received / maximum));
             progress.restart();
         }
         if (count < wanted) {

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "BlockWriter.h"
 
-#include "VisaDevice.h"
+#include "InstrumentFiles.h"
 #include "instrumenttext.h"
 #include "remotepaths.h"
 
@@ -31,11 +31,10 @@ void note(const QString &text)
 
 } // namespace
 
-BlockWriter::BlockWriter(VisaDevice &device, const VisaSession &session,
-                         const std::atomic<bool> &cancelled)
-    : m_device(device)
-    , m_session(session)
-    , m_cancelled(cancelled)
+BlockWriter::BlockWriter(VisaSession &session, InstrumentFiles &files, OperationControl &control)
+    : m_session(session)
+    , m_files(files)
+    , m_control(control)
     , m_buffer(blockBytes, '\0')
 {
 }
@@ -66,7 +65,7 @@ bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
     if (!headBytes || !removeOldFile(remotePath)) {
         return false;
     }
-    emit m_device.ProgressUpdate(0);
+    m_control.report(0);
     QFile file(localPath);
     if (!file.open(QIODevice::ReadOnly)) {
         return Tracer::fail("Error opening local input file.");
@@ -78,8 +77,8 @@ bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
     note("VISA >> '" + head + "...'");
     quint32 count = 0;
     if (const ViStatus status = m_session.write(*headBytes, count); status != VI_SUCCESS) {
-        m_device.reportStatus(status);
-        m_device.recoverAfterTransferError(m_previousEnd, m_interface);
+        m_session.reportStatus(status);
+        recover(m_session, m_previousEnd, m_interface);
         return false;
     }
     Tracer::Trace(Tracer::Debug, "VISA >> Sending data");
@@ -94,11 +93,11 @@ bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
     if (!setSendEnd(m_previousEnd)) {
         return false;
     }
-    emit m_device.ProgressUpdate(100);
-    if (m_interface == VI_INTF_GPIB && !m_device.sendCommand(":SYST:COMM:GPIB:LTER STAN; *OPC?")) {
+    m_control.report(100);
+    if (m_interface == VI_INTF_GPIB && !m_session.send(":SYST:COMM:GPIB:LTER STAN; *OPC?")) {
         return false;
     }
-    if (!m_device.checkErrorQueue()) {
+    if (!m_session.checkErrorQueue()) {
         return false;
     }
     note(QString("Transfer rate was %1 bytes/s.").arg(size * 1000 / elapsedMs));
@@ -109,28 +108,30 @@ bool BlockWriter::removeOldFile(const QString &remotePath)
 {
     const RemotePath parts = splitPath(remotePath);
     QList<RemoteFileEntry> entries;
-    if (!m_device.listDirectory(entries, parts.directory)) {
+    if (!m_files.listDirectory(entries, parts.directory)) {
         return false;
     }
     return std::all_of(entries.cbegin(), entries.cend(), [&](const RemoteFileEntry &entry) {
         return entry.isDirectory() || entry.name != parts.fileName ||
-               m_device.sendCommand(":MMEM:DEL '" + remotePath + "'; *OPC?");
+               m_session.send(":MMEM:DEL '" + remotePath + "'; *OPC?");
     });
 }
 
 bool BlockWriter::prepareSession()
 {
-    if (!m_device.interfaceType(m_interface)) {
+    const std::optional<quint16> interfaceKind = m_session.interfaceType();
+    if (!interfaceKind) {
         return false;
     }
+    m_interface = *interfaceKind;
     // The instrument then takes only EOI for the end of a message, so that a line feed among the
     // data can't end it.
-    if (m_interface == VI_INTF_GPIB && !m_device.sendCommand(":SYST:COMM:GPIB:LTER EOI; *OPC?")) {
+    if (m_interface == VI_INTF_GPIB && !m_session.send(":SYST:COMM:GPIB:LTER EOI; *OPC?")) {
         return Tracer::fail("Cannot set instrument EOI mode.");
     }
     const ViStatus status = m_session.getAttribute(VI_ATTR_SEND_END_EN, m_previousEnd);
     if (status != VI_SUCCESS) {
-        m_device.reportStatus(status);
+        m_session.reportStatus(status);
         return false;
     }
     return setSendEnd(VI_FALSE);
@@ -140,15 +141,14 @@ bool BlockWriter::setSendEnd(ViAttrState value) const
 {
     const ViStatus status = m_session.setAttribute(VI_ATTR_SEND_END_EN, value);
     if (status != VI_SUCCESS) {
-        m_device.reportStatus(status);
+        m_session.reportStatus(status);
     }
     return status == VI_SUCCESS;
 }
 
 bool BlockWriter::sendFile(QFile &file, qint64 size)
 {
-    ProgressClock progress([this](int percent) { emit m_device.ProgressUpdate(percent); },
-                           m_cancelled);
+    ProgressClock progress(m_control.report, m_control.cancelled);
     for (qint64 remaining = size; remaining > 0;) {
         const qint64 wanted = std::min(remaining, blockBytes);
         if (remaining <= blockBytes) {
@@ -165,7 +165,7 @@ bool BlockWriter::sendFile(QFile &file, qint64 size)
         const ViStatus status =
             m_session.write(m_buffer.constData(), static_cast<quint32>(wanted), count);
         if (status != VI_SUCCESS) {
-            m_device.reportStatus(status);
+            m_session.reportStatus(status);
             return false;
         }
         if (count != wanted) {
@@ -189,11 +189,25 @@ bool BlockWriter::failOnSource(qint64 wanted, qint64 count, qint64 remaining) co
     return false;
 }
 
+void BlockWriter::recover(VisaSession &session, ViBoolean previousEnd, quint16 interfaceKind)
+{
+    session.setAttribute(VI_ATTR_SEND_END_EN, VI_TRUE);
+    quint32 count = 0;
+    (void)session.write(" ", 1, count);
+    session.clear();
+    (void)session.checkErrorQueue();
+    (void)session.send("*CLS");
+    session.setAttribute(VI_ATTR_SEND_END_EN, previousEnd);
+    if (interfaceKind == VI_INTF_GPIB) {
+        (void)session.send(":SYST:COMM:GPIB:LTER STAN; *OPC?");
+    }
+}
+
 /// Leaves no partial file on the instrument.
 void BlockWriter::abandon(const QString &remotePath)
 {
-    m_device.recoverAfterTransferError(m_previousEnd, m_interface);
-    (void)m_device.deleteRemoteFile(remotePath, false);
+    recover(m_session, m_previousEnd, m_interface);
+    (void)m_files.deleteRemoteFile(remotePath);
     if (m_wasCancelled) {
         note("*** Transfer aborted by user.");
     }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "InstrumentSummary.h"
 
+#include "InstrumentIdentity.h"
 #include "VisaDevice.h"
 
 InstrumentSummary summaryOf(const VisaDevice &device)
@@ -19,16 +20,11 @@ InstrumentSummary summaryOf(const VisaDevice &device)
     if (summary.options.isEmpty()) {
         return summary;
     }
+    const InstrumentIdentity &identity = device.identity();
     for (int number = 1; number <= 2; ++number) {
         const auto place = static_cast<size_t>(number - 1);
-        FrequencyRange range;
-        if (device.rfFrequencyRange(number, range.lower, range.upper)) {
-            summary.rf[place] = range;
-        }
-        BasebandLimits limits;
-        if (device.basebandCapabilities(number, limits.size, limits.clock, limits.bandwidth)) {
-            summary.baseband[place] = limits;
-        }
+        summary.rf[place] = identity.rfRange(number);
+        summary.baseband[place] = identity.baseband(number);
     }
     return summary;
 }

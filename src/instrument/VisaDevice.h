@@ -3,18 +3,22 @@
 
 #include "RemoteFileEntry.h"
 
+#include "base/OutputFile.h"
+
 #include <QList>
 #include <QObject>
 #include <QString>
 #include <QStringList>
 
-#include <atomic>
 #include <functional>
-#include <utility>
+#include <memory>
 
 class BufferedIO;
+struct ArbIntervals;
+struct InstrumentIdentity;
 
-/// One instrument: its VISA session, its identity, and all that is asked of it.
+/// One instrument: the one face of its VISA session, its identity, its files, the block transfers
+/// and the start of waveforms, each of which is a class of its own.
 ///
 /// Every operation that returns bool is true on success; the reason of a failure is in the log.
 /// What the instrument itself reported gathers until takeLastError(). A closed device fails with
@@ -49,7 +53,7 @@ public:
     [[nodiscard]] bool openResource(const QString &resource);
     /// Also true when nothing is open. The identity stays.
     bool closeResource();
-    [[nodiscard]] bool isOpen() const { return m_isOpen; }
+    [[nodiscard]] bool isOpen() const;
     /// Sends a command; if it holds "*OPC?", waits for the answer 1.
     [[nodiscard]] bool sendCommand(const QString &command);
     /// Sends a query (nothing when empty) and reads the answer, its white space collapsed. Also
@@ -69,15 +73,16 @@ public:
     /// Whether another device has a session with this instrument.
     [[nodiscard]] bool isOpenElsewhere(const QString &model, const QString &serial) const;
 
-    // Identity and capabilities; the texts stay after closing
+    // Identity and capabilities; they stay after closing
 
-    [[nodiscard]] QString vendor() const { return m_vendor; }
-    [[nodiscard]] QString model() const { return m_model; }
-    [[nodiscard]] QString serial() const { return m_serial; }
-    [[nodiscard]] QString firmware() const { return m_firmware; }
-    [[nodiscard]] QString resource() const { return m_resource; }
+    [[nodiscard]] const InstrumentIdentity &identity() const;
+    [[nodiscard]] QString vendor() const;
+    [[nodiscard]] QString model() const;
+    [[nodiscard]] QString serial() const;
+    [[nodiscard]] QString firmware() const;
+    [[nodiscard]] QString resource() const;
     /// The answer to "*OPT?".
-    [[nodiscard]] QString options() const { return m_opt; }
+    [[nodiscard]] QString options() const;
     /// "TCPIP", "GPIB0" and so on.
     [[nodiscard]] QString interfaceName() const;
     [[nodiscard]] bool isUnixFileSystem() const;
@@ -96,8 +101,11 @@ public:
 
     // Transfers
 
-    /// Instrument to local file. After a failure the file stays as far as it came.
-    [[nodiscard]] bool readRemoteFile(const QString &remotePath, const QString &localPath);
+    /// Instrument to local file. After a failure a file with content is as it was before, and a new
+    /// one stays as far as it came or vanishes.
+    [[nodiscard]] bool
+    readRemoteFile(const QString &remotePath, const QString &localPath,
+                   OutputFile::Unfinished unfinished = OutputFile::Unfinished::Stays);
     /// Local file to instrument; replaces a file there. After a failure there is none.
     [[nodiscard]] bool writeRemoteFile(const QString &localPath, const QString &remotePath);
     /// Reads the block that a command sent before has asked for, of at most `maximum` bytes; the
@@ -120,7 +128,7 @@ public:
     /// True also when there is no such file, or the user was asked and said no.
     [[nodiscard]] bool deleteRemoteFile(const QString &path, bool ask);
     /// Asks for deleteRemoteFile; without one the answer is no.
-    void setQuestion(Question question) { m_question = std::move(question); }
+    void setQuestion(Question question);
     [[nodiscard]] bool makeDirectory(const QString &parent, const QString &name);
     [[nodiscard]] bool renameEntry(const QString &directory, const QString &oldName,
                                    const QString &newName);
@@ -137,6 +145,8 @@ public:
     /// Polls the instrument once a second. A cancel() from before the call ends it at once.
     [[nodiscard]] bool waitForArbReady(int seconds);
     static constexpr int DefaultArbSeconds = 100;
+    /// Other times than those of real instruments.
+    void setArbIntervals(const ArbIntervals &intervals);
 
 public slots:
     /// Ends the running operation at its next tick.
@@ -146,25 +156,6 @@ signals:
     void ProgressUpdate(int iPercentage);
 
 private:
-    void reset();
-    [[nodiscard]] bool configure();
-    [[nodiscard]] bool identify();
-    [[nodiscard]] bool queryCatalogue(QList<RemoteFileEntry> &entries, const QString &path);
-    [[nodiscard]] bool collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
-                                   const QString &prefix, int depth);
-    [[nodiscard]] bool removeFolders(const QString &parent, const QString &name, int depth);
-
-    quint32 m_session = 0; ///< 0 when closed
-    bool m_isOpen = false;
-    int m_modelIndex = 0; ///< row of the model table
-    QString m_resource;
-    QString m_idn;
-    QString m_opt;
-    QString m_vendor;
-    QString m_model;
-    QString m_serial;
-    QString m_firmware;
-    QString m_errorText;
-    std::atomic<bool> m_cancelRequested{false};
-    Question m_question;
+    struct Parts;
+    std::unique_ptr<Parts> m_parts;
 };

@@ -92,6 +92,33 @@ bool VisaLibrary::load()
     return false;
 }
 
+QString VisaLibrary::openManager()
+{
+    manager = VI_NULL;
+    if (!load()) {
+        return "The VISA library cannot be loaded.";
+    }
+    if (m_functions.viOpenDefaultRM == nullptr || m_functions.viStatusDesc == nullptr) {
+        return "Cannot resolve functions in VISA Library.";
+    }
+    const ViStatus status = m_functions.viOpenDefaultRM(&manager);
+    if (status >= VI_SUCCESS) {
+        return {};
+    }
+    manager = VI_NULL;
+    return "The viOpenDefaultRM() failed: " + statusText(VI_NULL, status);
+}
+
+void VisaLibrary::closeManager()
+{
+    if (m_isLoaded && manager != VI_NULL && m_functions.viClose != nullptr) {
+        m_functions.viClose(manager);
+    }
+    if (m_isLoaded) {
+        manager = VI_NULL;
+    }
+}
+
 const VisaFunctions *VisaLibrary::checked(bool allResolved) const
 {
     if (!m_isLoaded) {

@@ -56,10 +56,20 @@ public:
     /// The library's functions as they are, for callers with words of their own.
     [[nodiscard]] const VisaFunctions &all() const { return m_functions; }
 
+    /// The same, to be exchanged; for tests.
+    [[nodiscard]] VisaFunctions &editFunctions() { return m_functions; }
+
     /// The library's text for a status; empty, with the reason logged, if it can't give one.
     [[nodiscard]] QString statusText(ViObject object, ViStatus status) const;
 
-    /// Guards the three members below and the calls viOpen and viFindRsrc.
+    /// Loads the library and opens its resource manager. Returns why that failed; empty if it
+    /// didn't. The caller holds the mutex.
+    [[nodiscard]] QString openManager();
+
+    /// Closes the resource manager if there is one. The caller holds the mutex.
+    void closeManager();
+
+    /// Guards the two members below and the calls viOpen and viFindRsrc.
     QMutex mutex;
     ViSession manager = VI_NULL; ///< of viOpenDefaultRM, 0 while there is none
     QList<VisaDevice *> devices; ///< all that live, in order of their making

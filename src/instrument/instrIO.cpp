@@ -2,6 +2,7 @@
 #include "instrIO.h"
 
 #include "VisaDevice.h"
+#include "remotepaths.h"
 
 #include <QMetaMethod>
 #include <QRegularExpression>
@@ -96,10 +97,7 @@ void instrIO::read(RemoteEntry *entry)
         return;
     }
     entry->setReading(true);
-    QString path = entry->fullPath();
-    if (!m_device->isUnixFileSystem()) {
-        path.replace('/', '\\');
-    }
+    const QString path = nativePath(entry->fullPath(), m_device->pathSeparator());
     QList<RemoteFileEntry> entries;
     if (!m_device->listDirectory(entries, path)) {
         fail(entry);

@@ -3,11 +3,104 @@
 
 #include <QStringList>
 
+#include <algorithm>
+
 namespace {
 
 constexpr QChar Backslash('\\');
 
+bool isSeparator(QChar character)
+{
+    return character == '/' || character == Backslash;
+}
+
 } // namespace
+
+bool isFolderPath(QStringView path)
+{
+    return path.endsWith('/');
+}
+
+QString withoutEndSlash(const QString &path)
+{
+    qsizetype length = path.size();
+    while (length > 1 && isSeparator(path.at(length - 1))) {
+        --length;
+    }
+    return path.left(length);
+}
+
+QString entryName(const QString &path)
+{
+    return withoutEndSlash(path).section('/', -1);
+}
+
+QString parentFolder(const QString &path)
+{
+    const QString entry = withoutEndSlash(path);
+    return entry == "/" ? entry : entry.left(entry.lastIndexOf('/') + 1);
+}
+
+QString folderOf(const QString &path)
+{
+    return path.left(path.lastIndexOf('/') + 1);
+}
+
+bool staysBelow(const QString &relativePath)
+{
+    const QStringList parts = relativePath.split('/');
+    return !parts.contains("..") && !parts.contains(QString());
+}
+
+bool hasForbiddenCharacter(QStringView name)
+{
+    return std::any_of(name.begin(), name.end(), [](QChar character) {
+        return QStringView(u"*#+/\\&'\"?%").contains(character);
+    });
+}
+
+QString sendingProblem(const QString &name)
+{
+    const auto found = std::find_if(name.cbegin(), name.cend(), [](QChar character) {
+        return QStringView(u"'\"*?\\").contains(character);
+    });
+    return found == name.cend() ? QString()
+                                : QString("The name \"%1\" holds the character %2, which has a "
+                                          "meaning in the commands of an instrument.")
+                                      .arg(name, *found);
+}
+
+QString pathProblem(const QString &path)
+{
+    if (path.isEmpty()) {
+        return "the path on the instrument is empty";
+    }
+    if (path.contains('\'')) {
+        return "'" + path +
+               "' holds an apostrophe, which ends the path in the instrument's command";
+    }
+    return {};
+}
+
+QString fullPathProblem(const QString &path)
+{
+    const RemotePath parts = splitPath(path);
+    const bool isName =
+        !parts.fileName.isEmpty() && parts.fileName != "." && parts.fileName != "..";
+    const bool isFull = isName && parts.directory != parts.drive;
+    return !pathProblem(path).isEmpty() || isFull ? pathProblem(path)
+                                                  : "'" + path + "' is no full path";
+}
+
+QString nativePath(const QString &path, QChar separator)
+{
+    return QString(path).replace('/', separator);
+}
+
+QString slashPath(const QString &path, QChar separator)
+{
+    return QString(path).replace(separator, '/');
+}
 
 RemotePath splitPath(const QString &path)
 {

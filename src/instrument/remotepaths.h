@@ -5,6 +5,51 @@
 
 #include <QList>
 #include <QString>
+#include <QStringView>
+
+// What a path and a name are, in one place for the panes, the jobs and the command line.
+//
+// Inside the program paths of entries use "/" on the disk and on any instrument, and a folder's
+// path ends in it; nativePath() turns them into what the instrument writes.
+
+// Paths with "/"
+
+/// Whether a path names a folder.
+[[nodiscard]] bool isFolderPath(QStringView path);
+
+/// The path without the separators at its end; a root stays as it is.
+[[nodiscard]] QString withoutEndSlash(const QString &path);
+
+/// The last part of a path, without a slash.
+[[nodiscard]] QString entryName(const QString &path);
+
+/// The folder that holds an entry, with its slash; for the path of a root the root itself.
+[[nodiscard]] QString parentFolder(const QString &path);
+
+/// The path itself if it names a folder, else the folder of the file.
+[[nodiscard]] QString folderOf(const QString &path);
+
+/// Whether a path below a folder can't lead out of it again.
+[[nodiscard]] bool staysBelow(const QString &relativePath);
+
+// What a name may hold
+
+/// Whether a name holds one of the characters that no new name may have, on any side, since
+/// instruments give them a meaning: * # + / \ & ' " ? %
+[[nodiscard]] bool hasForbiddenCharacter(QStringView name);
+
+/// Why a file of that name can't be sent to an instrument: a character ends the name in its
+/// command, joins two, or stands for others. Empty if it can.
+[[nodiscard]] QString sendingProblem(const QString &name);
+
+/// Why a path can't stand in a command: it is empty, or an apostrophe would end it there. Empty if
+/// it can.
+[[nodiscard]] QString pathProblem(const QString &path);
+
+/// As above, for a path that is taken apart into a folder and a name in it.
+[[nodiscard]] QString fullPathProblem(const QString &path);
+
+// Paths as an instrument writes them
 
 /// The parts of an instrument's path.
 struct RemotePath
@@ -20,6 +65,12 @@ struct RemotePath
 
 /// Cuts a path at its last "/", or where it has none at its last backslash.
 [[nodiscard]] RemotePath splitPath(const QString &path);
+
+/// A path with "/" as an instrument with this separator writes it.
+[[nodiscard]] QString nativePath(const QString &path, QChar separator);
+
+/// The reverse: what a user or an instrument with this separator has written, with "/".
+[[nodiscard]] QString slashPath(const QString &path, QChar separator);
 
 /// Joins a folder and a name below it with the instrument's separator, which replaces both kinds in
 /// the two. Apostrophes go, as they would end the string of the command.

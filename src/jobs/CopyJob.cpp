@@ -3,7 +3,7 @@
 
 #include "base/ProgressClock.h"
 #include "instrument/VisaDevice.h"
-#include "instrument/fetchfile.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 
 #include <QDir>
@@ -17,10 +17,9 @@ namespace {
 
 constexpr const char *sendingFailed = "Sending file to instrument failed.";
 
-/// As the instrument writes its paths.
-QString nativePath(const VisaDevice &device, const QString &path)
+QString nativePathOn(const VisaDevice &device, const QString &path)
 {
-    return QString(path).replace('/', device.pathSeparator());
+    return nativePath(path, device.pathSeparator());
 }
 
 QString deviceName(const VisaDevice &device)
@@ -28,35 +27,6 @@ QString deviceName(const VisaDevice &device)
     // One that could not be opened has told nothing about itself.
     return device.model().isEmpty() ? QString("that is not open")
                                     : device.model() + ", " + device.serial();
-}
-
-QString fileName(const QString &path)
-{
-    return path.section('/', -1);
-}
-
-QString folderName(const QString &path)
-{
-    return path.left(path.lastIndexOf('/') + 1);
-}
-
-/// Whether a path below a folder can't lead out of it again.
-bool staysBelow(const QString &relativePath)
-{
-    const QStringList parts = relativePath.split('/');
-    return !parts.contains("..") && !parts.contains(QString());
-}
-
-/// Whether a character ends a name, joins two, or stands for others where an instrument expects the
-/// name of a single file.
-bool isCommandCharacter(QChar character)
-{
-    return QStringView(u"'\"*?\\").contains(character);
-}
-
-QString chopSlash(const QString &path)
-{
-    return path.size() > 1 && path.endsWith('/') ? path.chopped(1) : path;
 }
 
 } // namespace
@@ -70,7 +40,7 @@ CopyJob::CopyJob(CopyRequest request, CopyQuestions questions, QObject *parent)
 
 bool CopyJob::isFolderRequest() const
 {
-    return m_request.source.endsWith('/');
+    return isFolderPath(m_request.source);
 }
 
 bool CopyJob::run()
@@ -120,7 +90,7 @@ bool CopyJob::collect()
     if (!isFolderRequest()) {
         const qint64 bytes =
             m_request.sourceDevice ? m_request.sourceBytes : QFileInfo(m_request.source).size();
-        const QString name = fileName(m_request.source);
+        const QString name = entryName(m_request.source);
         m_files = {{m_request.source, m_request.targetFolder + name, bytes}};
         m_totalBytes = bytes;
         return true;
@@ -171,7 +141,7 @@ bool CopyJob::collectRemote()
 {
     VisaDevice &device = *m_request.sourceDevice;
     QList<RemoteFileEntry> entries;
-    if (!device.listTreeEntries(entries, nativePath(device, chopSlash(m_request.source)))) {
+    if (!device.listTreeEntries(entries, nativePathOn(device, withoutEndSlash(m_request.source)))) {
         return false;
     }
     for (const RemoteFileEntry &entry : std::as_const(entries)) {
@@ -252,25 +222,22 @@ bool CopyJob::transfer(VisaDevice *device, const QString &label, const char *fai
 bool CopyJob::send(const QString &local, const QString &remote)
 {
     const QString name = remote.mid(m_request.targetFolder.size());
-    const auto found = std::find_if(name.cbegin(), name.cend(), isCommandCharacter);
-    if (found != name.cend()) {
-        Tracer::Trace(Tracer::Error, QString("The name \"%1\" holds the character %2, which has a "
-                                             "meaning in the commands of an instrument.")
-                                         .arg(name, *found));
+    if (const QString problem = sendingProblem(name); !problem.isEmpty()) {
+        Tracer::Trace(Tracer::Error, problem);
         return Tracer::fail(sendingFailed);
     }
     VisaDevice *device = m_request.targetDevice;
     const QString label =
-        QString("Sending file %1\nto instrument %2").arg(fileName(remote), deviceName(*device));
+        QString("Sending file %1\nto instrument %2").arg(entryName(remote), deviceName(*device));
     return transfer(device, label, sendingFailed, [&] {
-        return makeRemoteFolder(folderName(remote)) &&
-               device->writeRemoteFile(local, nativePath(*device, remote));
+        return makeRemoteFolder(folderOf(remote)) &&
+               device->writeRemoteFile(local, nativePathOn(*device, remote));
     });
 }
 
 bool CopyJob::fetch(const QString &remote, const QString &local)
 {
-    const QString folder = folderName(local);
+    const QString folder = folderOf(local);
     if (!QFileInfo(folder).isDir()) {
         Tracer::Trace(Tracer::Information, QString("Creating path '%1'...").arg(folder));
         if (!QDir().mkpath(folder)) {
@@ -279,12 +246,13 @@ bool CopyJob::fetch(const QString &remote, const QString &local)
     }
     VisaDevice *device = m_request.sourceDevice;
     const QString label =
-        QString("Reading file %1\nfrom instrument %2").arg(fileName(remote), deviceName(*device));
+        QString("Reading file %1\nfrom instrument %2").arg(entryName(remote), deviceName(*device));
     return transfer(device, label, "Reading file from instrument failed.", [&] {
-        const QString source = nativePath(*device, remote);
+        const QString source = nativePathOn(*device, remote);
         // A file on its way to an instrument replaces nothing here.
-        return m_request.targetDevice ? device->readRemoteFile(source, local)
-                                      : fetchRemoteFile(*device, source, local);
+        return device->readRemoteFile(source, local,
+                                      m_request.targetDevice ? OutputFile::Unfinished::Stays
+                                                             : OutputFile::Unfinished::Vanishes);
     });
 }
 
@@ -294,20 +262,20 @@ bool CopyJob::makeRemoteFolder(const QString &folder)
     if (folder.size() <= m_request.targetFolder.size() || m_remoteFolders.contains(folder)) {
         return true;
     }
-    const QString parent = folderName(chopSlash(folder));
-    const QString name = fileName(chopSlash(folder));
+    const QString parent = folderOf(withoutEndSlash(folder));
+    const QString name = entryName(withoutEndSlash(folder));
     if (!makeRemoteFolder(parent)) {
         return false;
     }
     VisaDevice &device = *m_request.targetDevice;
     QList<RemoteFileEntry> entries;
-    if (!device.listDirectory(entries, nativePath(device, parent))) {
+    if (!device.listDirectory(entries, nativePathOn(device, parent))) {
         return false;
     }
     const bool exists = std::any_of(entries.cbegin(), entries.cend(), [&](const auto &entry) {
         return entry.isDirectory() && entry.name == name;
     });
-    if (!exists && !device.makeDirectory(nativePath(device, parent), name)) {
+    if (!exists && !device.makeDirectory(nativePathOn(device, parent), name)) {
         return false;
     }
     m_remoteFolders.append(folder);

@@ -3,7 +3,7 @@
 #include "app/LocalFileModel.h"
 #include "app/LocalTreeRemover.h"
 #include "app/PaneFiles.h"
-#include "app/entryname.h"
+#include "instrument/remotepaths.h"
 #include "guitesting.h"
 #include "log/Tracer.h"
 

@@ -18,9 +18,9 @@ QStringList toStrings(const std::vector<std::string> &texts)
 
 } // namespace
 
-FakeInstrument::FakeInstrument(const QString &missingFunction)
+FakeInstrument::FakeInstrument()
 {
-    const QString name = libraryName(missingFunction);
+    const QString name = libraryName();
     qputenv("CORVANE_VISA_LIBRARY", name.toLocal8Bit());
     QLibrary library(name);
     const auto access = reinterpret_cast<decltype(&fakeVisa)>(library.resolve("fakeVisa"));
@@ -37,10 +37,9 @@ FakeInstrument::~FakeInstrument()
     m_fake->status = nullptr;
 }
 
-QString FakeInstrument::libraryName(const QString &missingFunction)
+QString FakeInstrument::libraryName()
 {
-    const QString name = FAKE_VISA_FOLDER "/fakevisa";
-    return missingFunction.isEmpty() ? name + ".so" : name + "_without_" + missingFunction + ".so";
+    return FAKE_VISA_FOLDER "/fakevisa.so";
 }
 
 QStringList FakeInstrument::takeCalls() const

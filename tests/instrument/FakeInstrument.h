@@ -16,12 +16,11 @@ struct Fault
 };
 Q_DECLARE_METATYPE(Fault)
 
-/// Makes the next first VisaDevice load the fake library, or the one without the named function,
-/// and gives access to its script. The fake of one function's absence has a script of its own.
+/// Makes the next first VisaDevice load the fake library and gives access to its script.
 class FakeInstrument
 {
 public:
-    explicit FakeInstrument(const QString &missingFunction = {});
+    FakeInstrument();
 
     /// Forgets the script, which may know things of the test that end with it.
     ~FakeInstrument();
@@ -39,7 +38,7 @@ public:
     void failCall(const QString &beginning, qint32 status, int skipped = 0) const;
     void fail(const Fault &fault) const;
 
-    [[nodiscard]] static QString libraryName(const QString &missingFunction);
+    [[nodiscard]] static QString libraryName();
 
 private:
     FakeVisa *m_fake = nullptr;

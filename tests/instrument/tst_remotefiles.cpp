@@ -102,7 +102,7 @@ void TestRemoteFiles::listDirectoryFails()
     // One from long ago doesn't make a failure of today an empty folder.
     fake->errors = {"-150469,\"Directory empty\""};
     QVERIFY(!m_device->checkErrorQueue());
-    fake.failCall("viPrintf :MMEM:CAT?", VI_ERROR_CONN_LOST);
+    fake.failCall("viWrite", VI_ERROR_CONN_LOST);
     QVERIFY(!m_device->listDirectory(entries, "D:\\w"));
     QCOMPARE(takeLog().last(), "4 Cannot read files list from instrument.");
     fake->status = nullptr;
@@ -221,7 +221,7 @@ void TestRemoteFiles::deleteFileFails()
 {
     FakeInstrument &fake = *m_fake;
     answerCatalogues({{"D:\\*.wv", ",\"x.wv,BIN,1\""}});
-    fake.failCall("viWrite", VI_ERROR_TMO);
+    fake.failCall("viWrite", VI_ERROR_TMO, 1);
     QVERIFY(!m_device->deleteRemoteFile("D:\\x.wv", false));
     QCOMPARE(takeLog(),
              (QStringList{"4 ERROR: status BFFF0015", "4 *** Error deleting file on instrument."}));

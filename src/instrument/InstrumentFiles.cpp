@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-// Files and folders of the instrument.
-#include "VisaDevice.h"
+#include "InstrumentFiles.h"
 
-#include "CancelScope.h"
-#include "VisaLibrary.h"
+#include "InstrumentIdentity.h"
+#include "VisaSession.h"
 #include "remotepaths.h"
 
 #include "log/Tracer.h"
@@ -15,14 +14,14 @@
 namespace {
 
 /// No real folder lies deeper; an instrument that lists a folder in itself ends here.
-constexpr int maxDepth = 64;
+constexpr int MaxDepth = 64;
 
 bool tooDeep(const QString &directory)
 {
     return Tracer::fail(QString("The directory '%1' is nested deeper than the %2 levels that are "
                                 "walked.")
                             .arg(directory)
-                            .arg(maxDepth));
+                            .arg(MaxDepth));
 }
 
 /// A path must name more than a root, and with an empty name a folder would turn into its parent.
@@ -34,36 +33,42 @@ bool isUsable(const QString &path, const QString &name, const char *reason)
     return (isNamed && path.size() >= 2) || Tracer::fail(reason);
 }
 
-const char *const emptyDirectory = "Directory path cannot be empty.";
+const char *const EmptyDirectory = "Directory path cannot be empty.";
 
 } // namespace
 
-bool VisaDevice::queryCatalogue(QList<RemoteFileEntry> &entries, const QString &path)
+InstrumentFiles::InstrumentFiles(VisaSession &session, const InstrumentIdentity &identity,
+                                 OperationControl &control)
+    : m_session(session)
+    , m_identity(identity)
+    , m_control(control)
+{
+}
+
+QString InstrumentFiles::joined(const QString &parent, const QString &name) const
+{
+    return joinRemotePath(parent, name, m_identity.pathSeparator());
+}
+
+bool InstrumentFiles::listDirectory(QList<RemoteFileEntry> &entries, const QString &path)
 {
     entries.clear();
     // Only what this query is answered counts below.
-    const QString earlierErrors = takeLastError();
+    const QString earlierErrors = m_session.takeErrors();
     QString answer;
-    const bool answered = queryText(":MMEM:CAT? '" + path + "'", answer);
+    const bool answered(m_session.query(":MMEM:CAT? '" + path + "'", answer));
+    const QString errors = m_session.takeErrors();
     // An error number that ends so tells of an empty or missing directory.
-    const bool isEmpty = !answered && m_errorText.contains("469");
-    m_errorText = isEmpty ? earlierErrors : earlierErrors + m_errorText;
+    const bool isEmpty = !answered && errors.contains("469");
+    m_session.setErrors(isEmpty ? earlierErrors : earlierErrors + errors);
     if (!answered && !isEmpty) {
         return Tracer::fail("Cannot read files list from instrument.");
     }
-    if (isEmpty) {
-        answer.clear();
-    }
-    entries = parseCatalogue(answer);
+    entries = parseCatalogue(isEmpty ? QString() : answer);
     return true;
 }
 
-bool VisaDevice::listDirectory(QList<RemoteFileEntry> &entries, const QString &path)
-{
-    return queryCatalogue(entries, path);
-}
-
-bool VisaDevice::listTree(QStringList &files, qint64 &totalSize, const QString &directory)
+bool InstrumentFiles::listTree(QStringList &files, qint64 &totalSize, const QString &directory)
 {
     files.clear();
     totalSize = 0;
@@ -80,17 +85,17 @@ bool VisaDevice::listTree(QStringList &files, qint64 &totalSize, const QString &
     return true;
 }
 
-bool VisaDevice::listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory)
+bool InstrumentFiles::listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory)
 {
     entries.clear();
     return collectTree(entries, directory, QString(), 0);
 }
 
-bool VisaDevice::collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
-                             const QString &prefix, int depth)
+bool InstrumentFiles::collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
+                                  const QString &prefix, int depth)
 {
     const QString path = prefix.isEmpty() ? directory : directory + '/' + prefix;
-    if (depth > maxDepth) {
+    if (depth > MaxDepth) {
         return tooDeep(path);
     }
     QList<RemoteFileEntry> level;
@@ -109,14 +114,14 @@ bool VisaDevice::collectTree(QList<RemoteFileEntry> &entries, const QString &dir
     return true;
 }
 
-bool VisaDevice::deleteRemoteFile(const QString &path, bool ask)
+bool InstrumentFiles::deleteRemoteFile(const QString &path, const std::function<bool()> &agreed)
 {
     Tracer::Trace(Tracer::Information, "Deleting file '" + path + "'");
     const RemotePath parts = splitPath(path);
     // The instrument itself cuts the list down to files of the same kind.
     const QString pattern = parts.suffix.isEmpty() ? QString("*.*") : "*." + parts.suffix;
     QList<RemoteFileEntry> entries;
-    if (!queryCatalogue(entries, parts.directory + pattern)) {
+    if (!listDirectory(entries, parts.directory + pattern)) {
         return false;
     }
     const bool exists =
@@ -127,60 +132,60 @@ bool VisaDevice::deleteRemoteFile(const QString &path, bool ask)
         Tracer::Trace(Tracer::Warning, "*** File does not exist on instrument.");
         return true;
     }
-    if (ask && (!m_question || !m_question("WARNING", "File exists on instrument. Delete ?"))) {
+    if (agreed && !agreed()) {
         return true;
     }
-    if (!sendCommand("MMEM:DEL '" + path + "'; *OPC?")) {
+    if (!m_session.send("MMEM:DEL '" + path + "'; *OPC?")) {
         return Tracer::fail("*** Error deleting file on instrument.");
     }
-    return checkErrorQueue();
+    return bool(m_session.checkErrorQueue());
 }
 
-bool VisaDevice::makeDirectory(const QString &parent, const QString &name)
+bool InstrumentFiles::makeDirectory(const QString &parent, const QString &name)
 {
-    const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, name, emptyDirectory)) {
+    const QString path = joined(parent, name);
+    if (!isUsable(path, name, EmptyDirectory)) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Creating directory '" + path + "'");
-    return sendCommand(":MMEM:MDIR '" + path + "'; *OPC?");
+    return bool(m_session.send(":MMEM:MDIR '" + path + "'; *OPC?"));
 }
 
-bool VisaDevice::renameEntry(const QString &directory, const QString &oldName,
-                             const QString &newName)
+bool InstrumentFiles::renameEntry(const QString &directory, const QString &oldName,
+                                  const QString &newName)
 {
-    const QString oldPath = joinRemotePath(directory, oldName, pathSeparator());
-    const QString newPath = joinRemotePath(directory, newName, pathSeparator());
+    const QString oldPath = joined(directory, oldName);
+    const QString newPath = joined(directory, newName);
     if (!isUsable(oldPath, oldName, "Entry name cannot be empty.") ||
         !isUsable(newPath, newName, "Entry name cannot be empty.")) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Renaming '" + oldPath + "'");
-    return sendCommand(":MMEM:MOVE '" + oldPath + "','" + newPath + "'; *OPC?");
+    return bool(m_session.send(":MMEM:MOVE '" + oldPath + "','" + newPath + "'; *OPC?"));
 }
 
-bool VisaDevice::removeDirectory(const QString &parent, const QString &name)
+bool InstrumentFiles::removeDirectory(const QString &parent, const QString &name)
 {
-    const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, name, emptyDirectory)) {
+    const QString path = joined(parent, name);
+    if (!isUsable(path, name, EmptyDirectory)) {
         return false;
     }
     Tracer::Trace(Tracer::Information, "Removing directory '" + path + "'");
-    return sendCommand(":MMEM:RDIR '" + path + "'; *OPC?");
+    return bool(m_session.send(":MMEM:RDIR '" + path + "'; *OPC?"));
 }
 
-bool VisaDevice::removeEmptyTree(const QString &parent, const QString &name)
+bool InstrumentFiles::removeEmptyTree(const QString &parent, const QString &name)
 {
     return removeFolders(parent, name, 0);
 }
 
-bool VisaDevice::removeFolders(const QString &parent, const QString &name, int depth)
+bool InstrumentFiles::removeFolders(const QString &parent, const QString &name, int depth)
 {
-    const QString path = joinRemotePath(parent, name, pathSeparator());
-    if (!isUsable(path, name, emptyDirectory)) {
+    const QString path = joined(parent, name);
+    if (!isUsable(path, name, EmptyDirectory)) {
         return false;
     }
-    if (depth > maxDepth) {
+    if (depth > MaxDepth) {
         return tooDeep(path);
     }
     QList<RemoteFileEntry> entries;
@@ -191,40 +196,39 @@ bool VisaDevice::removeFolders(const QString &parent, const QString &name, int d
         if (!entry.isDirectory()) {
             continue;
         }
-        Tracer::Trace(Tracer::Information, "Descending into '" +
-                                               joinRemotePath(path, entry.name, pathSeparator()) +
-                                               "'");
+        Tracer::Trace(Tracer::Information, "Descending into '" + joined(path, entry.name) + "'");
         if (!removeFolders(path, entry.name, depth + 1)) {
             return false;
         }
     }
-    return sendCommand(":MMEM:RDIR '" + path + "'; *OPC?");
+    return bool(m_session.send(":MMEM:RDIR '" + path + "'; *OPC?"));
 }
 
-bool VisaDevice::removeTree(const QString &parent, const QString &name)
+bool InstrumentFiles::removeTree(const QString &parent, const QString &name)
 {
-    const CancelScope cancelScope(m_cancelRequested);
-    const QString path = joinRemotePath(parent, name, pathSeparator());
+    const CancelScope cancelScope(m_control.cancelled);
+    const QString path = joined(parent, name);
     Tracer::Trace(Tracer::Information, "Removing tree '" + path + "'");
     QCoreApplication::processEvents();
-    if (!isUsable(path, name, emptyDirectory)) {
+    if (!isUsable(path, name, EmptyDirectory)) {
         return false;
     }
     // Old errors would be taken for errors of the removal.
-    checkErrorQueue();
-    emit ProgressUpdate(0);
+    (void)m_session.checkErrorQueue();
+    m_control.report(0);
     QStringList files;
     qint64 totalSize = 0;
     if (!listTree(files, totalSize, path)) {
         return false;
     }
     for (qsizetype i = 0; i < files.size(); ++i) {
-        if (!sendCommand(":MMEM:DEL '" + files.at(i) + "'; *OPC?") || !checkErrorQueue()) {
+        if (!m_session.send(":MMEM:DEL '" + files.at(i) + "'; *OPC?") ||
+            !m_session.checkErrorQueue()) {
             return false;
         }
-        emit ProgressUpdate(static_cast<int>(100 * (i + 1) / files.size()));
+        m_control.report(static_cast<int>(100 * (i + 1) / files.size()));
         QCoreApplication::processEvents();
-        if (m_cancelRequested) {
+        if (m_control.cancelled) {
             return Tracer::fail("*** User break.");
         }
     }
