@@ -85,7 +85,7 @@ QString copyEntry(QWidget *parent, const CopyRequest &request)
     QObject::connect(&job, &CopyJob::bytesCopied, &progress, &QtProgressDialog::setBytes);
     QObject::connect(&job, &ToolJob::ProgressUpdate, &progress, &QtProgressDialog::setValue);
     QObject::connect(&progress, &QtProgressDialog::canceled, &job, &ToolJob::cancel);
-    return outcomeText(job, job.run());
+    return outcomeText(job, job.run() == JobOutcome::Finished);
 }
 
 bool isRunnable(const QString &path, const VisaDevice *device)

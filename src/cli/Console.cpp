@@ -108,11 +108,13 @@ void Console::printLine(const QString &line)
     std::fprintf(stderr, "%s\n", line.toLocal8Bit().constData());
 }
 
-void Console::printReport(const QString &html)
+void Console::printReport(const ReportLine &line)
 {
-    const QString line = plainLine(html);
-    if (!m_quiet && !line.isEmpty()) {
-        printLine(line);
+    const QString text = plainLine(line);
+    if (line.kind == ReportLine::Kind::Warning) {
+        printLine("warning: " + text);
+    } else if (!m_quiet && !text.isEmpty()) {
+        printLine(text);
     }
 }
 
@@ -157,16 +159,18 @@ int Console::run(ToolJob &job)
     m_jobTime.start();
     interruptedAt = 0;
     jobRuns = 1;
-    const bool done = job.run();
+    const JobOutcome outcome = job.run();
     jobRuns = 0;
     clearProgress();
-    if (done) {
+    switch (outcome) {
+    case JobOutcome::Finished:
         return ExitDone;
-    }
-    if (job.isCancelled()) {
+    case JobOutcome::Cancelled:
         return ExitCancelled;
+    case JobOutcome::Failed:
+        break;
     }
-    // What was seen first is the cause; errors behind it tell what came of it.
+    // What was seen first is the cause; errors after it tell what came of it.
     return failedWith(m_jobReason);
 }
 

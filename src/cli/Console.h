@@ -8,6 +8,7 @@
 #include <QString>
 
 class ToolJob;
+struct ReportLine;
 
 /// Exit status of the program.
 enum ExitCode {
@@ -57,7 +58,7 @@ public:
 private:
     [[nodiscard]] int failedWith(const QString &text);
     void printLog();
-    void printReport(const QString &html);
+    void printReport(const ReportLine &line);
     void printLine(const QString &line);
     void drawProgress(int percent);
     void clearProgress();

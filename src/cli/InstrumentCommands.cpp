@@ -48,7 +48,11 @@ public:
     {
     }
 
-    [[nodiscard]] bool run() override
+    /// The instrument's own words on a failure that has another reason besides.
+    [[nodiscard]] const QString &instrumentWords() const { return m_instrumentWords; }
+
+private:
+    [[nodiscard]] bool work() override
     {
         VisaDevice device;
         const JobStep step(*this, m_label, device);
@@ -71,10 +75,6 @@ public:
         return done;
     }
 
-    /// The instrument's own words on a failure that has another reason besides.
-    [[nodiscard]] const QString &instrumentWords() const { return m_instrumentWords; }
-
-private:
     void explain(VisaDevice &device)
     {
         if (device.isOpen()) {

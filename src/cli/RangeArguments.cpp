@@ -10,6 +10,8 @@
 
 void addRange(CLI::App &command, SampleRange &range)
 {
+    range.fromName = "--from";
+    range.countName = "--count";
     addText(command, "file", range.fileName, "Waveform file to read")->required();
     addInteger(command, "--from", range.from, {"", 0, MaxSamples - 1.0},
                "First sample, counted from 0");

@@ -43,7 +43,7 @@ bool CopyJob::isFolderRequest() const
     return isFolderPath(m_request.source);
 }
 
-bool CopyJob::run()
+bool CopyJob::work()
 {
     if (m_request.sourceDevice == nullptr && m_request.targetDevice == nullptr) {
         return Tracer::fail("Copy operations between local file systems are not supported.");

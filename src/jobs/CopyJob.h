@@ -38,7 +38,7 @@ struct CopyQuestions
 /// Copies a file, or all files below a folder, between the disk and an instrument or between two
 /// instruments. Folders that lack at the target are made; empty ones are not copied.
 ///
-/// run() is true when all files were copied. What was copied before a failure or a cancel stays,
+/// Finishes when all files were copied. What was copied before a failure or a cancel stays,
 /// the file in hand is removed on either side.
 class CopyJob : public ToolJob
 {
@@ -46,8 +46,6 @@ class CopyJob : public ToolJob
 
 public:
     explicit CopyJob(CopyRequest request, CopyQuestions questions = {}, QObject *parent = nullptr);
-
-    [[nodiscard]] bool run() override;
 
     /// Files to copy, and those that were copied; also while and after running.
     [[nodiscard]] qsizetype fileCount() const { return m_files.size(); }
@@ -65,6 +63,7 @@ private:
         qint64 bytes = 0;
     };
 
+    [[nodiscard]] bool work() override;
     [[nodiscard]] bool collect();
     [[nodiscard]] bool collectLocal(const QString &folder, ProgressClock &clock);
     [[nodiscard]] bool collectRemote();

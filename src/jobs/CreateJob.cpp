@@ -50,7 +50,7 @@ bool SignalJob::scale(TempStream &data, const QString &label)
     return true;
 }
 
-bool SignalPreviewJob::run()
+bool SignalPreviewJob::work()
 {
     TempStream data;
     if (!generate(data) || (isScaled() && !scale(data, "Rescaling..."))) {
@@ -72,26 +72,25 @@ bool SignalPreviewJob::run()
     return true;
 }
 
-bool CreateJob::run()
+CreateJob::CreateJob(const CreateRequest &request, QObject *parent)
+    : SignalJob(request, parent)
+    , m_output(*this, request.output)
 {
-    if (request().output.fileName.isEmpty()) {
-        return Tracer::fail("Output file name is empty.");
-    }
-    const bool created = create();
-    emit report(created ? successLine("Signal creation completed")
-                        : failureLine("Creation failed"));
-    return created;
+    setEnding({"Signal creation completed", "Creation failed"});
 }
 
-bool CreateJob::create()
+bool CreateJob::work()
 {
-    emit report(stepLine("Creating signal"));
+    if (m_output.fileName().isEmpty()) {
+        return refuse(emptyFileNameText());
+    }
+    emit report(ReportLine::heading("Creating signal"));
     TempStream data;
     if (!generate(data)) {
         return false;
     }
     if (isScaled()) {
-        emit report(stepLine("Level scaling"));
+        emit report(ReportLine::heading("Level scaling"));
         if (!scale(data, "Scaling...")) {
             return false;
         }
@@ -101,26 +100,16 @@ bool CreateJob::create()
 
 bool CreateJob::save(TempStream &data)
 {
-    WvWriteJob job;
-    job.clock = request().clockHz.value_or(facts().clockHz);
-    job.markerClock = job.clock;
-    job.samples = facts().samples;
-    job.peakOffset = offsetDb(facts().peak);
-    job.rmsOffset = request().zeroCrest ? job.peakOffset : offsetDb(facts().rms);
-    job.levelsValid = true;
-    job.comment = tagText("comment", request().output.comment.value_or(QString()));
-    job.copyright = tagText("copyright", request().output.copyright.value_or(QString()));
-
-    emit report(stepLine("Signal statistics"));
-    QStringList lines =
-        levelLines({static_cast<double>(job.samples), job.peakOffset, job.rmsOffset});
-    lines.insert(1, " Clock:      \t" + engineeringText(job.clock, "Hz"));
-    for (const QString &line : std::as_const(lines)) {
-        emit report(line);
+    m_output.setLength(request().clockHz.value_or(facts().clockHz), facts().samples);
+    m_output.setLevels(facts().peak, facts().rms);
+    WvWriteJob &record = m_output.record();
+    if (request().zeroCrest) {
+        record.rmsOffset = record.peakOffset;
     }
-    emit report(stepLine("Saving file"));
-    HvFileIO file;
-    const JobStep step(*this, "Saving file...", file);
-    return file.writeWaveform(job, request().output.fileName, data.stream(), nullptr, nullptr) ||
-           Tracer::fail("Waveform generation failed.");
+    emit report(ReportLine::heading("Signal statistics"));
+    ReportLines rows = levelRows(record);
+    rows.insert(1, ReportLine::row("Clock", engineeringText(record.clock, "Hz")));
+    reportAll(rows);
+    emit report(ReportLine::heading("Saving file"));
+    return m_output.save({.data = data.stream()}, "Saving file...");
 }

@@ -3,6 +3,7 @@
 
 #include "CreateRequest.h"
 #include "ToolJob.h"
+#include "WaveformOutput.h"
 
 #include "dsp/CreateSignal.h"
 
@@ -27,7 +28,7 @@ class SignalJob : public ToolJob
 public:
     explicit SignalJob(CreateRequest request, QObject *parent = nullptr);
 
-    /// Valid after run() has succeeded.
+    /// Valid after the job has finished.
     [[nodiscard]] const SignalFacts &facts() const { return m_facts; }
 
 protected:
@@ -51,12 +52,12 @@ class SignalPreviewJob : public SignalJob
 public:
     using SignalJob::SignalJob;
 
-    [[nodiscard]] bool run() override;
-
     /// I and Q in turn.
     [[nodiscard]] const std::vector<double> &samples() const { return m_samples; }
 
 private:
+    [[nodiscard]] bool work() override;
+
     std::vector<double> m_samples;
 };
 
@@ -66,11 +67,11 @@ class CreateJob : public SignalJob
     Q_OBJECT
 
 public:
-    using SignalJob::SignalJob;
-
-    [[nodiscard]] bool run() override;
+    explicit CreateJob(const CreateRequest &request, QObject *parent = nullptr);
 
 private:
-    [[nodiscard]] bool create();
+    [[nodiscard]] bool work() override;
     [[nodiscard]] bool save(TempStream &data);
+
+    WaveformOutput m_output;
 };

@@ -1,31 +1,24 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ImportJob.h"
 
-#include "ReportText.h"
-
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
 #include "streams/TempStream.h"
-#include "wvfile/HvFileIO.h"
 
 #include <cmath>
+#include <utility>
 
-ImportJob::ImportJob(QObject *parent)
+ImportJob::ImportJob(ImportTarget target, QObject *parent)
     : ToolJob(parent)
+    , m_target(std::move(target))
+    , m_output(*this, m_target.output)
 {
+    setEnding({"Import completed", "Import failed"});
 }
 
-bool ImportJob::run()
+bool ImportJob::scale(TempStream &data, int samples, double &peak, double &rms)
 {
-    const bool done = import();
-    emit report(done ? successLine("Import completed") : failureLine("Import failed"));
-    return done;
-}
-
-bool ImportJob::scale(TempStream &data, int samples, ImportScaling scaling, double &peak,
-                      double &rms)
-{
-    emit report("<b>Scaling</b>\n");
+    emit report(ReportLine::heading("Scaling"));
     Resample levels;
     {
         const JobStep step(*this, "Analyzing Levels...", levels);
@@ -36,8 +29,8 @@ bool ImportJob::scale(TempStream &data, int samples, ImportScaling scaling, doub
     if (!std::isfinite(peak) || !std::isfinite(rms)) {
         return Tracer::fail("Invalid peak and RMS values.");
     }
-    const bool tooHigh = scaling == ImportScaling::Down && peak > 1;
-    const bool offScale = scaling == ImportScaling::Auto && peak != 1;
+    const bool tooHigh = m_target.scaling == ImportScaling::Down && peak > 1;
+    const bool offScale = m_target.scaling == ImportScaling::Auto && peak != 1;
     if (!mayProceed()) {
         return false;
     }
@@ -53,31 +46,17 @@ bool ImportJob::scale(TempStream &data, int samples, ImportScaling scaling, doub
     return true;
 }
 
-bool ImportJob::scaleAndSave(TempStream &data, qint64 samples, const ImportTarget &target)
+bool ImportJob::scaleAndSave(TempStream &data, qint64 samples, double clockHz)
 {
     double peak = 0;
     double rms = 0;
-    if (!mayProceed() || !scale(data, static_cast<int>(samples), target.scaling, peak, rms) ||
-        !mayProceed()) {
+    if (!mayProceed() || !scale(data, static_cast<int>(samples), peak, rms) || !mayProceed()) {
         return false;
     }
-    WvWriteJob job;
-    job.clock = target.clockHz;
-    job.markerClock = target.clockHz;
-    job.samples = static_cast<int>(samples);
-    job.peakOffset = offsetDb(peak);
-    job.rmsOffset = offsetDb(rms);
-    job.levelsValid = true;
-    job.comment = tagText("comment", target.output.comment.value_or(QString()));
-    job.copyright = tagText("copyright", target.output.copyright.value_or(QString()));
-    for (const QString &line :
-         levelLines({static_cast<double>(samples), job.peakOffset, job.rmsOffset})) {
-        emit report(line);
-    }
-    emit report(stepLine("Saving"));
-    emit report(fileLine(target.output.fileName));
-    HvFileIO file;
-    const JobStep step(*this, "Creating Waveform File...", file);
-    return file.writeWaveform(job, target.output.fileName, data.stream(), nullptr, nullptr) ||
-           Tracer::fail("Waveform generation failed.");
+    m_output.setLength(clockHz, samples);
+    m_output.setLevels(peak, rms);
+    m_output.reportLevels();
+    emit report(ReportLine::heading("Saving"));
+    m_output.reportFile();
+    return m_output.save({.data = data.stream()}, "Creating Waveform File...");
 }

@@ -3,6 +3,7 @@
 
 #include "OutputOptions.h"
 #include "ToolJob.h"
+#include "WaveformOutput.h"
 
 class TempStream;
 
@@ -30,19 +31,18 @@ class ImportJob : public ToolJob
     Q_OBJECT
 
 public:
-    explicit ImportJob(QObject *parent = nullptr);
-
-    /// Reports the failure of run() as a line of its own.
-    [[nodiscard]] bool run() final;
+    explicit ImportJob(ImportTarget target, QObject *parent = nullptr);
 
 protected:
-    /// The import itself.
-    [[nodiscard]] virtual bool import() = 0;
+    [[nodiscard]] const ImportTarget &target() const { return m_target; }
 
-    /// Scales `samples` samples of the stream and writes the waveform, with the report lines.
-    [[nodiscard]] bool scaleAndSave(TempStream &data, qint64 samples, const ImportTarget &target);
+    /// Scales `samples` samples of the stream and writes the waveform with this clock, with the
+    /// report lines.
+    [[nodiscard]] bool scaleAndSave(TempStream &data, qint64 samples, double clockHz);
 
 private:
-    [[nodiscard]] bool scale(TempStream &data, int samples, ImportScaling scaling, double &peak,
-                             double &rms);
+    [[nodiscard]] bool scale(TempStream &data, int samples, double &peak, double &rms);
+
+    ImportTarget m_target;
+    WaveformOutput m_output;
 };

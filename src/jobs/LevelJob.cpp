@@ -5,7 +5,6 @@
 #include "ReportText.h"
 
 #include "log/Tracer.h"
-#include "wvfile/HvFileIO.h"
 
 #include <algorithm>
 #include <cmath>
@@ -21,20 +20,14 @@ double clampedLevel(double levelDb)
 } // namespace
 
 LevelJob::LevelJob(LevelRequest request, QObject *parent)
-    : ToolJob(parent)
+    : EditJob(request.inputFile, request.output, Reading::Quiet, parent)
     , m_request(std::move(request))
 {
 }
 
-bool LevelJob::run()
+bool LevelJob::edit()
 {
-    if (m_request.output.fileName.isEmpty()) {
-        return Tracer::fail("Output file name is empty.");
-    }
-    if (!m_source.read(*this, m_request.inputFile) || !mayProceed()) {
-        return false;
-    }
-    const double peakDb = m_request.peakDb.value_or(clampedLevel(-m_source.info().peakOffsetTag));
+    const double peakDb = m_request.peakDb.value_or(clampedLevel(-source().info().peakOffsetTag));
     double peakToRmsDb = m_request.peakToRmsDb.value_or(0);
     if (!m_request.peakToRmsDb && !defaultPeakToRms(peakToRmsDb)) {
         return false;
@@ -45,39 +38,32 @@ bool LevelJob::run()
 /// What the samples measure over the whole file, seen from the RMS offset of the tag.
 bool LevelJob::defaultPeakToRms(double &peakToRmsDb)
 {
-    const qint64 samples = m_source.info().samples;
+    const qint64 samples = source().info().samples;
     Tracer::Trace(Tracer::Information,
                   QString("Rescaling from pos. %1 to pos %2.").arg(1).arg(samples));
     RangeMeter meter;
     const JobStep step(*this, "Calculating...", meter);
-    const std::optional<LevelSums> sums = meter.measure(*m_source.data(), 0, samples);
+    const std::optional<LevelSums> sums = meter.measure(*source().data(), 0, samples);
     if (!sums) {
         return false;
     }
     const double measured =
         20 * std::log10(1 / std::sqrt(sums->sum / static_cast<double>(samples)));
-    peakToRmsDb = clampedLevel(-(m_source.info().rmsOffsetTag - measured));
+    peakToRmsDb = clampedLevel(-(source().info().rmsOffsetTag - measured));
     return true;
 }
 
 bool LevelJob::write(double peakDb, double peakToRmsDb)
 {
     Tracer::Trace(Tracer::Information, "Creating rescaled waveform...");
-    WvWriteJob job = m_source.writeJob();
-    job.peakOffset = writtenDb(-peakDb);
-    job.rmsOffset = writtenDb(peakToRmsDb - peakDb);
-    job.comment = tagText("comment", m_request.output.comment.value_or(job.comment));
-    job.copyright = tagText("copyright", m_request.output.copyright.value_or(job.copyright));
-    HvFileIO file;
-    const JobStep step(*this, "Saving waveform...", file);
-    if (!file.writeWaveform(job, m_request.output.fileName, m_source.data(), m_source.markers(),
-                            m_source.tags())) {
-        return Tracer::fail("Waveform generation failed.");
+    WvWriteJob &record = output().record();
+    record.peakOffset = writtenDb(-peakDb);
+    record.rmsOffset = writtenDb(peakToRmsDb - peakDb);
+    const WvStreams streams{source().data(), source().markers(), source().tags()};
+    if (!output().save(streams, "Saving waveform...")) {
+        return false;
     }
-    emit report(fileLine(m_request.output.fileName));
-    for (const QString &line :
-         levelLines({static_cast<double>(job.samples), job.peakOffset, job.rmsOffset})) {
-        emit report(line);
-    }
+    output().reportFile();
+    output().reportLevels();
     return true;
 }

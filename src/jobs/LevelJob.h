@@ -1,9 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "OutputOptions.h"
-#include "SourceWaveform.h"
-#include "ToolJob.h"
+#include "EditJob.h"
 
 #include <optional>
 
@@ -21,19 +19,17 @@ struct LevelRequest
 
 /// Copies a waveform with new level tags; its samples stay as they are. The samples keep their
 /// length and clock, so unknown tags come along.
-class LevelJob : public ToolJob
+class LevelJob : public EditJob
 {
     Q_OBJECT
 
 public:
     explicit LevelJob(LevelRequest request, QObject *parent = nullptr);
 
-    [[nodiscard]] bool run() override;
-
 private:
+    [[nodiscard]] bool edit() override;
     [[nodiscard]] bool defaultPeakToRms(double &peakToRmsDb);
     [[nodiscard]] bool write(double peakDb, double peakToRmsDb);
 
     LevelRequest m_request;
-    SourceWaveform m_source;
 };

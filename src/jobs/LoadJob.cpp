@@ -10,7 +10,7 @@ LoadJob::LoadJob(QString fileName, SourceWaveform &target, QObject *parent)
 {
 }
 
-bool LoadJob::run()
+bool LoadJob::work()
 {
     return m_target.read(*this, m_fileName) && !isCancelled();
 }

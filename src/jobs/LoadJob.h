@@ -13,9 +13,9 @@ public:
     /// `target` outlives the job.
     LoadJob(QString fileName, SourceWaveform &target, QObject *parent = nullptr);
 
-    [[nodiscard]] bool run() override;
-
 private:
+    [[nodiscard]] bool work() override;
+
     QString m_fileName;
     SourceWaveform &m_target;
 };

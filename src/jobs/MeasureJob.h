@@ -21,7 +21,7 @@ class MeasureJob : public SampleReadJob
 public:
     using SampleReadJob::SampleReadJob;
 
-    /// Valid after run() has succeeded.
+    /// Valid after the job has finished.
     [[nodiscard]] const LevelMeasurement &result() const { return m_result; }
 
 protected:

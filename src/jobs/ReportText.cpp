@@ -3,6 +3,7 @@
 
 #include "base/EngineeringNumber.h"
 #include "log/Tracer.h"
+#include "wvfile/WvTypes.h"
 
 #include <QRegularExpression>
 
@@ -20,54 +21,36 @@ QString decibelText(double value)
 
 } // namespace
 
-QString stepLine(const QString &text)
+ReportLine fileRow(const QString &fileName)
 {
-    return "\n<b>" + text + "</b>";
+    return ReportLine::row("File", fileName);
 }
 
-QString successLine(const QString &text)
-{
-    return "\n<font color=\"#00C000\"><b>" + text + "</b></font>";
-}
-
-QString failureLine(const QString &text)
-{
-    return "\n<font color=\"#C00000\"><b>" + text + "</b></font>";
-}
-
-QString fileLine(const QString &fileName)
-{
-    return " File:       \t" + fileName.toHtmlEscaped();
-}
-
-QStringList levelLines(const LevelReport &levels)
+ReportLines levelRows(const WvWriteJob &waveform)
 {
     return {
-        QString(" Samples:    \t%1").arg(levels.samples, 0, 'f', 0),
-        " Peak Offset:\t" + decibelText(levels.peakOffset),
-        " Peak/RMS:   \t" + decibelText(levels.rmsOffset - levels.peakOffset),
+        ReportLine::row("Samples", QString::number(waveform.samples)),
+        ReportLine::row("Peak Offset", decibelText(waveform.peakOffset)),
+        ReportLine::row("Peak/RMS", decibelText(waveform.rmsOffset - waveform.peakOffset)),
     };
 }
 
-QStringList sourceLines(const QString &fileName, double clockHz, const LevelReport &levels)
+ReportLines waveformRows(const QString &fileName, const WvWriteJob &waveform)
 {
-    return QStringList{fileLine(fileName), " Clock Rate: \t" + engineeringText(clockHz, "Hz")} +
-           levelLines(levels);
+    return ReportLines{fileRow(fileName),
+                       ReportLine::row("Clock Rate", engineeringText(waveform.clock, "Hz"))} +
+           levelRows(waveform);
 }
 
-QString plainLine(const QString &html)
+QString plainLine(const ReportLine &line)
 {
-    static const QRegularExpression markup("<[^>]*>");
-    QString text = html;
-    text.remove(markup);
-    text.replace("&lt;", "<").replace("&gt;", ">").replace("&quot;", "\"").replace("&nbsp;", " ");
-    text.replace("&amp;", "&");
+    QString text = line.kind == ReportLine::Kind::Row ? line.text + ' ' + line.value : line.text;
     return text.replace('\t', ' ').remove('\n').trimmed();
 }
 
 QString stripBraces(const QString &text)
 {
-    // The character behind may be the line break of a text of several lines.
+    // The character after it may be the line break of a text of several lines.
     static const QRegularExpression braces("[\\{\\}].",
                                            QRegularExpression::DotMatchesEverythingOption);
     return QString(text).remove(braces);

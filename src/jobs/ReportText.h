@@ -1,42 +1,27 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "ReportLine.h"
+
 #include <QString>
-#include <QStringList>
+
+struct WvWriteJob;
 
 /// The lines that the tools' reports share, and the arithmetic behind them.
 
-/// Level facts of one file, as a report shows them.
-struct LevelReport
-{
-    double samples = 0;
-    double peakOffset = 0; ///< dB
-    double rmsOffset = 0;  ///< dB
-};
+/// The name of a file as a row.
+[[nodiscard]] ReportLine fileRow(const QString &fileName);
 
-/// A headline of a step, such as "\n<b>Saving</b>".
-[[nodiscard]] QString stepLine(const QString &text);
+/// Rows on samples, peak offset and peak/RMS of a waveform.
+[[nodiscard]] ReportLines levelRows(const WvWriteJob &waveform);
 
-/// The green line of a tool that has done its work.
-[[nodiscard]] QString successLine(const QString &text);
+/// File, clock, and the rows of levelRows: what a tool says of a file that it reads or writes.
+[[nodiscard]] ReportLines waveformRows(const QString &fileName, const WvWriteJob &waveform);
 
-/// The red line of a tool that has stopped.
-[[nodiscard]] QString failureLine(const QString &text);
+/// A report line for a terminal.
+[[nodiscard]] QString plainLine(const ReportLine &line);
 
-/// " File:       \t" and the name, escaped.
-[[nodiscard]] QString fileLine(const QString &fileName);
-
-/// Samples, peak offset and peak/RMS, a line each.
-[[nodiscard]] QStringList levelLines(const LevelReport &levels);
-
-/// File, clock, and the lines of levelLines: what a tool says of the file that it has read.
-[[nodiscard]] QStringList sourceLines(const QString &fileName, double clockHz,
-                                      const LevelReport &levels);
-
-/// A report line without its markup, for a terminal.
-[[nodiscard]] QString plainLine(const QString &html);
-
-/// Removes each brace with the character behind it, so that a text can't break a file's tags.
+/// Removes each brace with the character after it, so that a text can't break a file's tags.
 [[nodiscard]] QString stripBraces(const QString &text);
 
 /// The text for a comment or copyright tag, without braces. Warns, naming the tag, of characters

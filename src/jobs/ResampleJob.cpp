@@ -1,12 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ResampleJob.h"
 
-#include "ReportText.h"
-
 #include "base/EngineeringNumber.h"
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
-#include "wvfile/HvFileIO.h"
 
 #include <cmath>
 #include <utility>
@@ -36,58 +33,33 @@ QString ResampleTarget::problem() const
 }
 
 ResampleJob::ResampleJob(ResampleRequest request, QObject *parent)
-    : ToolJob(parent)
+    : EditJob(request.inputFile, request.output, Reading::Reported, parent)
     , m_request(std::move(request))
 {
+    setEnding({"Resampling completed", "Resampling failed"});
 }
 
-bool ResampleJob::stopWith(const QString &reportText, const QString &logText)
+bool ResampleJob::edit()
 {
-    emit report(failureLine(reportText));
-    return Tracer::fail(logText);
-}
-
-bool ResampleJob::run()
-{
-    if (m_request.output.fileName.isEmpty()) {
-        return Tracer::fail("Output file name is empty.");
-    }
-    return read() && convert() && rescale() && save();
-}
-
-void ResampleJob::reportFile(const QString &fileName, double clockHz, const WvWriteJob &job)
-{
-    const QStringList lines = sourceLines(
-        fileName, clockHz, {static_cast<double>(job.samples), job.peakOffset, job.rmsOffset});
-    for (const QString &line : lines) {
-        emit report(line);
-    }
-}
-
-bool ResampleJob::read()
-{
-    emit report("<b>Reading waveform</b>");
-    if (!m_source.read(*this, m_request.inputFile) || isCancelled()) {
-        return stopWith("Resampling failed", "Reading failed.");
-    }
-    const WvFileInfo &info = m_source.info();
+    const WvFileInfo &info = source().info();
     m_request.target.follow(info.clock, info.samples);
     const QString problem = m_request.target.problem();
     if (!problem.isEmpty()) {
-        return stopWith("Resampling failed", problem);
+        return Tracer::fail(problem);
     }
-    reportFile(m_request.inputFile, info.clock, m_source.writeJob());
-    m_source.dropTags();
-    return true;
+    reportSource();
+    source().dropTags();
+    return convert() && rescale() && save();
 }
 
 bool ResampleJob::convert()
 {
-    const qint64 sourceSamples = m_source.info().samples;
+    const qint64 sourceSamples = source().info().samples;
     const qint64 targetSamples = m_request.target.samples;
-    emit report(stepLine("Resampling"));
-    emit report(QString(" IN-samples:  \t%1").arg(sourceSamples));
-    emit report(QString(" OUT-samples: \t%1").arg(targetSamples));
+    emit report(ReportLine::heading("Resampling"));
+    constexpr qsizetype labelWidth = 13;
+    emit report(ReportLine::row("IN-samples", QString::number(sourceSamples), labelWidth));
+    emit report(ReportLine::row("OUT-samples", QString::number(targetSamples), labelWidth));
     if (!m_data.open()) {
         return Tracer::fail("Cannot create temporary data buffer for resampled data.");
     }
@@ -103,12 +75,12 @@ bool ResampleJob::convert()
     if (!resampler.setFilterType(0, 0.5) || !resampler.setWindowType(1)) {
         return false;
     }
-    resampler.setInput(m_source.data(), sourceSamples);
+    resampler.setInput(source().data(), sourceSamples);
     resampler.setOutput(m_data.stream(), targetSamples);
-    resampler.setMarkers(m_source.markers(), m_markers.stream());
+    resampler.setMarkers(source().markers(), m_markers.stream());
     const JobStep step(*this, "Resampling...", resampler);
     if (!resampler.run() || isCancelled()) {
-        return stopWith("Resampling failed", "Resampling of the waveform failed.");
+        return Tracer::fail("Resampling of the waveform failed.");
     }
     m_runPeakOffset = resampler.peakOffset();
     m_runRmsOffset = resampler.rmsOffset();
@@ -117,9 +89,9 @@ bool ResampleJob::convert()
 
 bool ResampleJob::rescale()
 {
-    emit report(stepLine("Rescaling to same peak level"));
-    m_result = m_source.writeJob();
-    const double change = m_runPeakOffset - m_result.peakOffset;
+    emit report(ReportLine::heading("Rescaling to same peak level"));
+    WvWriteJob &record = output().record();
+    const double change = m_runPeakOffset - record.peakOffset;
     Resample scaler;
     const JobStep step(*this, "Rescaling...", scaler);
     if (!scaler.rescale(static_cast<int>(m_request.target.samples), std::pow(10.0, change / 20),
@@ -127,27 +99,15 @@ bool ResampleJob::rescale()
         isCancelled()) {
         return stopWith("Rescaling failed", "Rescaling of the waveform failed.");
     }
-    m_result.samples = static_cast<int>(m_request.target.samples);
-    m_result.clock = m_request.target.clockHz;
-    m_result.markerClock = m_result.clock;
-    m_result.rmsOffset = m_runRmsOffset - change;
-    m_result.comment = tagText("comment", m_request.output.comment.value_or(m_result.comment));
-    m_result.copyright =
-        tagText("copyright", m_request.output.copyright.value_or(m_result.copyright));
+    output().setLength(m_request.target.clockHz, m_request.target.samples);
+    record.rmsOffset = m_runRmsOffset - change;
     return true;
 }
 
 bool ResampleJob::save()
 {
-    reportFile(m_request.output.fileName, m_result.clock, m_result);
-    emit report(stepLine("Saving"));
-    emit report(fileLine(m_request.output.fileName));
-    HvFileIO file;
-    const JobStep step(*this, "Saving...", file);
-    if (!file.writeWaveform(m_result, m_request.output.fileName, m_data.stream(),
-                            m_markers.stream(), nullptr)) {
-        return stopWith("Resampling failed", "Waveform generation failed.");
-    }
-    emit report(successLine("Resampling completed"));
-    return true;
+    output().reportWaveform();
+    emit report(ReportLine::heading("Saving"));
+    output().reportFile();
+    return output().save({.data = m_data.stream(), .markers = m_markers.stream()}, "Saving...");
 }

@@ -1,11 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "OutputOptions.h"
-#include "SourceWaveform.h"
-#include "ToolJob.h"
-
-class Resample;
+#include "EditJob.h"
 
 /// Where a resampled waveform is to end up: one of the two decides, the other follows.
 struct ResampleTarget
@@ -34,28 +30,22 @@ struct ResampleRequest
 
 /// Converts a waveform to another clock or number of samples, at the same peak level. The waveform
 /// counts as a loop, and its markers follow. Unknown tags don't come along.
-class ResampleJob : public ToolJob
+class ResampleJob : public EditJob
 {
     Q_OBJECT
 
 public:
     explicit ResampleJob(ResampleRequest request, QObject *parent = nullptr);
 
-    [[nodiscard]] bool run() override;
-
 private:
-    [[nodiscard]] bool read();
+    [[nodiscard]] bool edit() override;
     [[nodiscard]] bool convert();
     [[nodiscard]] bool rescale();
     [[nodiscard]] bool save();
-    bool stopWith(const QString &reportText, const QString &logText);
-    void reportFile(const QString &fileName, double clockHz, const WvWriteJob &job);
 
     ResampleRequest m_request;
-    SourceWaveform m_source;
     TempStream m_data;
     TempStream m_markers;
     double m_runPeakOffset = 0; ///< dB, of the converted samples before they are rescaled
     double m_runRmsOffset = 0;  ///< dB
-    WvWriteJob m_result;
 };

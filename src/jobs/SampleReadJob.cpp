@@ -9,13 +9,15 @@ QString rangeProblem(const SampleRange &range, qint64 samples)
 {
     const qint64 from = range.from.value_or(0);
     if (from < 0 || from >= samples) {
-        return QString("--from: %1 lies outside the file; permitted: 0 to %2")
+        return QString("%1: %2 lies outside the file; permitted: 0 to %3")
+            .arg(range.fromName)
             .arg(from)
             .arg(samples - 1);
     }
     const qint64 count = range.count.value_or(samples - from);
     if (count < 1 || count > samples - from) {
-        return QString("--count: %1 leads outside the file; permitted: 1 to %2")
+        return QString("%1: %2 leads outside the file; permitted: 1 to %3")
+            .arg(range.countName)
             .arg(count)
             .arg(samples - from);
     }
@@ -28,7 +30,7 @@ SampleReadJob::SampleReadJob(SampleRange range, QObject *parent)
 {
 }
 
-bool SampleReadJob::run()
+bool SampleReadJob::work()
 {
     if (!m_source.read(*this, m_range.fileName)) {
         return false;

@@ -14,6 +14,10 @@ struct SampleRange
     QString fileName;
     std::optional<qint64> from;  ///< nothing: the first sample
     std::optional<qint64> count; ///< nothing: up to the end
+
+    /// What the user knows the two numbers by, for a refusal.
+    QString fromName = "First sample";
+    QString countName = "Sample count";
 };
 
 /// Why the range doesn't lie in a file of so many samples; empty if it does.
@@ -27,13 +31,13 @@ class SampleReadJob : public ToolJob
 public:
     explicit SampleReadJob(SampleRange range, QObject *parent = nullptr);
 
-    [[nodiscard]] bool run() override;
-
 protected:
     /// Works on `count` samples from sample `begin`, which lie in the source.
     [[nodiscard]] virtual bool process(SourceWaveform &source, qint64 begin, qint64 count) = 0;
 
 private:
+    [[nodiscard]] bool work() final;
+
     SampleRange m_range;
     SourceWaveform m_source;
 };

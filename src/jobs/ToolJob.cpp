@@ -8,6 +8,20 @@ ToolJob::ToolJob(QObject *parent)
 {
 }
 
+JobOutcome ToolJob::run()
+{
+    if (work()) {
+        if (!m_ending.success.isEmpty()) {
+            emit report(ReportLine::success(m_ending.success));
+        }
+        return JobOutcome::Finished;
+    }
+    if (!m_ending.failure.isEmpty()) {
+        emit report(ReportLine::failure(m_ending.failure));
+    }
+    return m_cancelled ? JobOutcome::Cancelled : JobOutcome::Failed;
+}
+
 bool ToolJob::mayProceed() const
 {
     return !m_cancelled || Tracer::fail("Action aborted by user.");
@@ -17,4 +31,27 @@ void ToolJob::cancel()
 {
     m_cancelled = true;
     emit cancelRequested();
+}
+
+void ToolJob::setEnding(JobEnding ending)
+{
+    m_ending = std::move(ending);
+}
+
+void ToolJob::setFailureText(const QString &text)
+{
+    m_ending.failure = text;
+}
+
+bool ToolJob::refuse(const QString &reason)
+{
+    m_ending.failure.clear();
+    return Tracer::fail(reason);
+}
+
+void ToolJob::reportAll(const ReportLines &lines)
+{
+    for (const ReportLine &line : lines) {
+        emit report(line);
+    }
 }

@@ -1,16 +1,27 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "ReportLine.h"
+
 #include <QObject>
 #include <QString>
 
 #include <atomic>
 
+/// How a job ended: done; not done, with the reason in the log; ended by the user.
+enum class JobOutcome { Finished, Failed, Cancelled };
+
+/// The last lines of a job's report; an empty one is left out.
+struct JobEnding
+{
+    QString success;
+    QString failure; ///< also of a job that was cancelled
+};
+
 /// One run of a tool: takes a request (a plain struct) in its constructor, does the work in steps,
 /// and tells about it by signals, so that a dialog and the command line can run the very same job.
 ///
-/// run() works in the calling thread and lets the event loop run every 100 ms. It ends in one of
-/// three ways: true; false with isCancelled(); false with the reason in the log.
+/// Works in the calling thread and lets the event loop run every 100 ms. A job runs once.
 class ToolJob : public QObject
 {
     Q_OBJECT
@@ -18,8 +29,9 @@ class ToolJob : public QObject
 public:
     explicit ToolJob(QObject *parent = nullptr);
 
-    /// Does the whole work. A failure has been logged where it was seen.
-    [[nodiscard]] virtual bool run() = 0;
+    /// Does the whole work and closes the report. The reason of a failure has been logged where it
+    /// was seen.
+    [[nodiscard]] JobOutcome run();
 
     [[nodiscard]] bool isCancelled() const { return m_cancelled; }
 
@@ -37,18 +49,33 @@ signals:
     /// Progress of the running step, 0 to 100.
     void ProgressUpdate(int iPercentage);
 
-    /// A line for the tool's report, HTML.
-    void report(const QString &html);
+    void report(const ReportLine &line);
 
     /// To the worker of the running step.
     void cancelRequested();
 
 protected:
+    /// The work of this job; false, with the reason logged, if it failed or was cancelled.
+    [[nodiscard]] virtual bool work() = 0;
+
+    /// The lines that close the report; by default none.
+    void setEnding(JobEnding ending);
+
+    /// For a part of the work whose failure has words of its own.
+    void setFailureText(const QString &text);
+
+    /// Logs why the job doesn't even begin, and leaves the report without a last line.
+    [[nodiscard]] bool refuse(const QString &reason);
+
+    /// Reports several lines in turn.
+    void reportAll(const ReportLines &lines);
+
     /// The flag behind isCancelled(), for a loop of the job itself.
     [[nodiscard]] const std::atomic<bool> &cancelFlag() const { return m_cancelled; }
 
 private:
     std::atomic<bool> m_cancelled{false};
+    JobEnding m_ending;
 };
 
 /// The scope of one step: announces its label, wires a worker with the signal ProgressUpdate(int)

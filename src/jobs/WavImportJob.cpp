@@ -9,7 +9,7 @@
 #include <utility>
 
 WavImportJob::WavImportJob(WavImportRequest request, QObject *parent)
-    : ImportJob(parent)
+    : ImportJob(request.target, parent)
     , m_request(std::move(request))
 {
 }
@@ -46,13 +46,13 @@ double WavImportJob::clockFor(const WavHeader &header) const
     return clock;
 }
 
-bool WavImportJob::import()
+bool WavImportJob::work()
 {
-    if (m_request.target.output.fileName.isEmpty()) {
-        return Tracer::fail("Output file name is empty.");
+    if (target().output.fileName.isEmpty()) {
+        return Tracer::fail(emptyFileNameText());
     }
-    emit report("<b>Reading directory entry from cache.</b>\n");
-    emit report("<b>Opening file.</b>\n");
+    emit report(ReportLine::heading("Reading directory entry from cache."));
+    emit report(ReportLine::heading("Opening file."));
     WavFileAccess file;
     const std::optional<WavHeader> header = readHeader(file, m_request.inputFile);
     if (!header) {
@@ -62,14 +62,12 @@ bool WavImportJob::import()
     if (!data.open()) {
         return Tracer::fail("Cannot create temporary data buffer.");
     }
-    emit report("<b>Reading WAV-file data</b>\n");
+    emit report(ReportLine::heading("Reading WAV-file data"));
     {
         const JobStep step(*this, "Reading WAV-File Data...", file);
         if (!file.readSamples(data.stream(), 0)) {
             return false;
         }
     }
-    ImportTarget target = m_request.target;
-    target.clockHz = clockFor(*header);
-    return scaleAndSave(data, header->samples(), target);
+    return scaleAndSave(data, header->samples(), clockFor(*header));
 }

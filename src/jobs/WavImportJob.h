@@ -26,10 +26,8 @@ public:
     [[nodiscard]] static std::optional<WavHeader> readHeader(WavFileAccess &file,
                                                              const QString &fileName);
 
-protected:
-    [[nodiscard]] bool import() override;
-
 private:
+    [[nodiscard]] bool work() override;
     [[nodiscard]] double clockFor(const WavHeader &header) const;
 
     WavImportRequest m_request;

@@ -5,7 +5,6 @@
 #include "ui_DlgResample.h"
 
 #include "base/EngineeringNumber.h"
-#include "jobs/ReportText.h"
 #include "log/Tracer.h"
 #include "toolframe/questions.h"
 #include "toolframe/runjob.h"
@@ -217,7 +216,7 @@ void DlgResample::slot_create()
     m_ui->sw_assist->setCurrentIndex(StatusPage);
     updateButtons();
     if (!confirmOverwrite(this, m_ui->le_outfile->text())) {
-        appendReport(*m_ui->te_result, failureLine("Resampling aborted"));
+        appendReport(*m_ui->te_result, ReportLine::failure("Resampling aborted"));
         return;
     }
     m_ui->pb_prev->setEnabled(false);

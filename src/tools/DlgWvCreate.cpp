@@ -6,7 +6,6 @@
 #include "ui_DlgWvCreate.h"
 
 #include "jobs/CreateJob.h"
-#include "jobs/ReportText.h"
 #include "log/Tracer.h"
 #include "toolframe/questions.h"
 #include "toolframe/runjob.h"
@@ -354,7 +353,7 @@ void DlgWvCreate::slot_create()
     showPage(StatusPage);
     const QString fileName = m_ui->le_outfile->text();
     if (!fileName.isEmpty() && !confirmOverwrite(this, fileName)) {
-        appendReport(*m_ui->te_result, failureLine("Creation aborted"));
+        appendReport(*m_ui->te_result, ReportLine::failure("Creation aborted"));
         return;
     }
     CreateJob job(options());

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstring>
 
 #if Q_BYTE_ORDER != Q_LITTLE_ENDIAN
@@ -60,6 +61,18 @@ CORVANE_CLONES void encodeA(const float *values, qint16 *words, size_t count)
     }
 }
 
+CORVANE_CLONES quint32 clippedAmong(const float *values, size_t count)
+{
+    quint32 clipped = 0;
+    for (size_t i = 0; i < count; ++i) {
+        const float scaled = values[i] * fullScale + 0.5F;
+        // Written so that a NaN, which compares false, counts.
+        const bool fits = scaled < fullScale + 1 && scaled > -(fullScale + 1);
+        clipped += fits ? 0U : 1U;
+    }
+    return clipped;
+}
+
 } // namespace
 
 void decodeWords(SampleCoding coding, std::span<const std::byte> words, float gain,
@@ -97,6 +110,18 @@ void encodeWords(std::span<const float> values, std::span<std::byte> words)
         const size_t count = std::min(blockWords, values.size() - done);
         encodeA(values.data() + done, block.data(), count);
         std::memcpy(words.data() + 2 * done, block.data(), 2 * count);
+    }
+}
+
+void countClipped(std::span<const float> values, ClipCount &count)
+{
+    const quint32 clipped = clippedAmong(values.data(), values.size());
+    if (clipped == 0) {
+        return;
+    }
+    count.values += clipped;
+    for (const float value : values) {
+        count.largest = std::max(count.largest, static_cast<double>(std::fabs(value)));
     }
 }
 

@@ -24,5 +24,17 @@ void decodeWords(SampleCoding coding, std::span<const std::byte> words, float ga
 /// give -32767 or +32767, as does a NaN the latter.
 void encodeWords(std::span<const float> values, std::span<std::byte> words);
 
+/// Values that no word can hold, and the largest magnitude among them.
+struct ClipCount
+{
+    qint64 values = 0;
+    double largest = 0; ///< of full scale 1
+};
+
+/// Counts the values, I and Q each, that encodeWords() has to clip. Such are those whose word would
+/// lie beyond +-32767: what a file's own words decode to, or rounding leaves above 1, isn't
+/// clipped. A NaN counts and doesn't change the largest magnitude.
+void countClipped(std::span<const float> values, ClipCount &count);
+
 /// Encodes one value by coding A.
 [[nodiscard]] qint16 encodeWord(float value);

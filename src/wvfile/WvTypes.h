@@ -67,6 +67,14 @@ struct WvFileInfo
     BufferedIO *tagsStream = nullptr; ///< in: initialised stream; null if unknown tags don't matter
 };
 
+/// Sources of a waveform to be written; each may be null. None is owned.
+struct WvStreams
+{
+    BufferedIO *data = nullptr;
+    BufferedIO *markers = nullptr;
+    BufferedIO *tags = nullptr;
+};
+
 /// Job record of HvFileIO::writeWaveform.
 struct WvWriteJob
 {
@@ -82,6 +90,8 @@ struct WvWriteJob
     QList<float> iSamples;    ///< I values in memory, or empty
     QList<float> qSamples;    ///< Q values in memory, or empty
     QList<int> markers;       ///< bits 0 to 3 are markers 1 to 4; or empty
+    qint64 clippedValues = 0; ///< out: values, I and Q each, that no word of the file can hold
+    double largestValue = 0;  ///< out: largest magnitude among those, of full scale 1
 };
 
 /// One segment of a multi-segment waveform.

@@ -259,6 +259,7 @@ bool WvWriter::writeSamples(OutputFile &file)
 {
     std::vector<float> values(2 * static_cast<size_t>(std::min(m_job.samples, blockSamples)));
     std::vector<std::byte> words(2 * values.size());
+    ClipCount clipped;
     for (int done = 0; done < m_job.samples;) {
         if (m_progress.shouldStop(done, m_job.samples, 50, 100)) {
             return Tracer::fail("Action aborted by user.");
@@ -267,7 +268,9 @@ bool WvWriter::writeSamples(OutputFile &file)
         const int got =
             fetchSamples(done, std::span(values).first(2 * static_cast<size_t>(wanted)));
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));
-        encodeWords(std::span(values).first(2 * static_cast<size_t>(got)), bytes);
+        const auto samples = std::span(values).first(2 * static_cast<size_t>(got));
+        encodeWords(samples, bytes);
+        countClipped(samples, clipped);
         if (!put(file, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
             return false;
         }
@@ -276,5 +279,7 @@ bool WvWriter::writeSamples(OutputFile &file)
         }
         done += got;
     }
+    m_job.clippedValues = clipped.values;
+    m_job.largestValue = clipped.largest;
     return true;
 }

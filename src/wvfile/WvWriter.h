@@ -13,14 +13,6 @@ class BufferedIO;
 class OutputFile;
 class ProgressClock;
 
-/// Sources of a waveform to be written; each may be null. None is owned.
-struct WvStreams
-{
-    BufferedIO *data = nullptr;
-    BufferedIO *markers = nullptr;
-    BufferedIO *tags = nullptr;
-};
-
 /// Writes one waveform file. HvFileIO checks the job, opens the file and owns the signals; this
 /// class knows the format alone.
 class WvWriter

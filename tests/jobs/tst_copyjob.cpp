@@ -47,7 +47,7 @@ void TestCopyJob::staysInTheTargetFolder()
     CopyJob job({.sourceDevice = &device,
                  .source = "/var/user/",
                  .targetFolder = folder.filePath("a/target/")});
-    QVERIFY(!job.run());
+    QVERIFY(job.run() != JobOutcome::Finished);
     QCOMPARE(takeLog().last(), "4 The instrument lists a file '" + name +
                                    "', whose name leads out of the folder that is copied.");
     QVERIFY(fake.takeMessages().filter(":MMEM:DATA").isEmpty());
@@ -78,7 +78,7 @@ void TestCopyJob::sendsNoCommandCharacters()
     (void)takeLog();
     (void)fake.takeMessages();
     CopyJob job({.source = file.fileName(), .targetDevice = &device, .targetFolder = "/var/user/"});
-    QVERIFY(!job.run());
+    QVERIFY(job.run() != JobOutcome::Finished);
     QCOMPARE(takeLog(),
              QStringList({"4 The name \"" + name + "\" holds the character " + character +
                               ", which has a meaning in the commands of an instrument.",
@@ -90,7 +90,7 @@ void TestCopyJob::refusesTwoLocalEnds()
 {
     (void)takeLog();
     CopyJob job({.source = "/tmp/a.wv", .targetFolder = "/tmp/"});
-    QVERIFY(!job.run());
+    QVERIFY(job.run() != JobOutcome::Finished);
     QCOMPARE(takeLog().last(), "4 Copy operations between local file systems are not supported.");
 }
 

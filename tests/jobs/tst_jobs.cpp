@@ -3,7 +3,9 @@
 #include "jobs/DumpJob.h"
 #include "jobs/LevelJob.h"
 #include "jobs/MeasureJob.h"
+#include "jobs/ReportText.h"
 #include "jobs/WavImportJob.h"
+#include "jobs/WaveformOutput.h"
 #include "log/Tracer.h"
 #include "streams/TempStream.h"
 
@@ -16,6 +18,8 @@
 #include <algorithm>
 #include <cmath>
 #include <memory>
+#include <utility>
+#include <vector>
 
 using namespace filebytes;
 
@@ -39,6 +43,7 @@ private slots:
     void cancelKeepsLaterStepsFromStarting_data();
     void cancelKeepsLaterStepsFromStarting();
     void cancelAfterTheEndIsHarmless();
+    void clippingIsTold();
 
 private:
     [[nodiscard]] QString path(const QString &name) const { return m_folder.filePath(name); }
@@ -67,10 +72,37 @@ QStringList texts(const QSignalSpy &spy)
 {
     QStringList lines;
     for (const QList<QVariant> &arguments : spy) {
-        lines << arguments.first().toString();
+        const QVariant &value = arguments.first();
+        lines << (value.canConvert<ReportLine>() ? plainLine(value.value<ReportLine>())
+                                                 : value.toString());
     }
     return lines;
 }
+
+/// Writes values, I and Q in turn, as they are.
+class WriteJob final : public ToolJob
+{
+public:
+    WriteJob(const QString &fileName, std::vector<float> values)
+        : m_output(*this, {fileName, {}, {}})
+        , m_values(std::move(values))
+    {
+    }
+
+private:
+    bool work() override
+    {
+        TempStream data;
+        m_output.setLength(1e6, static_cast<qint64>(m_values.size() / 2));
+        return data.open() && data->writeHeader("IQF") &&
+               data->writeBytes(static_cast<int>(m_values.size() * sizeof(float)),
+                                m_values.data()) &&
+               m_output.save({.data = data.stream()}, "Saving...");
+    }
+
+    WaveformOutput m_output;
+    std::vector<float> m_values;
+};
 
 } // namespace
 
@@ -133,7 +165,7 @@ void TestJobs::importScales()
     WavImportRequest request{path("in.wav"), {.output = {path("out.wv"), {}, {}}}};
     request.target.scaling = scaling;
     WavImportJob job(request);
-    QVERIFY(job.run());
+    QCOMPARE(job.run(), JobOutcome::Finished);
     const QByteArray result = load(path("out.wv"));
     QTEST(sampleWords(result), "result");
     QCOMPARE(tag(result, "LEVEL OFFS").split(',').value(1), QByteArray::number(peakOffset, 'f', 6));
@@ -149,17 +181,15 @@ void TestJobs::importTellsItsSteps()
     WavImportJob job({path("in.wav"), {.output = {path("out.wv"), "a{bc}d", "me"}}});
     const QSignalSpy steps(&job, &ToolJob::stepStarted);
     const QSignalSpy report(&job, &ToolJob::report);
-    QVERIFY(job.run());
+    QCOMPARE(job.run(), JobOutcome::Finished);
     QCOMPARE(texts(steps), (QStringList{"Reading WAV-File Data...", "Analyzing Levels...",
                                         "Rescaling...", "Creating Waveform File..."}));
-    QCOMPARE(texts(report),
-             (QStringList{"<b>Reading directory entry from cache.</b>\n", "<b>Opening file.</b>\n",
-                          "<b>Reading WAV-file data</b>\n", "<b>Scaling</b>\n", " Samples:    \t3",
-                          " Peak Offset:\t0.00 dB",
-                          // One sample of three at full scale: 10 log10(3)
-                          " Peak/RMS:   \t4.77 dB", "\n<b>Saving</b>",
-                          " File:       \t" + path("out.wv"),
-                          "\n<font color=\"#00C000\"><b>Import completed</b></font>"}));
+    QCOMPARE(texts(report), (QStringList{"Reading directory entry from cache.", "Opening file.",
+                                         "Reading WAV-file data", "Scaling", "Samples:     3",
+                                         "Peak Offset: 0.00 dB",
+                                         // One sample of three at full scale: 10 log10(3)
+                                         "Peak/RMS:    4.77 dB", "Saving",
+                                         "File:        " + path("out.wv"), "Import completed"}));
     const QByteArray result = load(path("out.wv"));
     QCOMPARE(tag(result, "COMMENT"), "ac");
     QCOMPARE(tag(result, "COPYRIGHT"), "me");
@@ -193,7 +223,7 @@ void TestJobs::importSetsTheClock()
     WavImportRequest request{path("in.wav"), {.output = {path("out.wv"), {}, {}}}};
     request.clockFromFile = given == 0;
     request.target.clockHz = given;
-    QVERIFY(WavImportJob(request).run());
+    QCOMPARE(WavImportJob(request).run(), JobOutcome::Finished);
     const QByteArray result = load(path("out.wv"));
     QTEST(tag(result, "CLOCK"), "clock");
     QTEST(tag(result, "CLOCK MARKER"), "clock");
@@ -228,10 +258,9 @@ void TestJobs::importFails()
     QVERIFY(bytes.isEmpty() || store(path("in.wav"), bytes));
     WavImportJob job({path("in.wav"), {.output = {path(output), {}, {}}}});
     const QSignalSpy report(&job, &ToolJob::report);
-    QVERIFY(!job.run());
-    QVERIFY(!job.isCancelled());
+    QVERIFY(job.run() != JobOutcome::Finished);
     QTEST(takeLog(Tracer::Error), "errors");
-    QCOMPARE(texts(report).last(), "\n<font color=\"#C00000\"><b>Import failed</b></font>");
+    QCOMPARE(texts(report).last(), "Import failed");
     QVERIFY(!QFile::exists(path(output)));
 }
 
@@ -245,9 +274,9 @@ void TestJobs::measuresRanges_data()
     QTest::newRow("last") << qint64(99999) << qint64(1) << QString();
     QTest::newRow("behind the end")
         << qint64(100000) << qint64(1)
-        << "--from: 100000 lies outside the file; permitted: 0 to 99999";
+        << "First sample: 100000 lies outside the file; permitted: 0 to 99999";
     QTest::newRow("too many") << qint64(99999) << qint64(2)
-                              << "--count: 2 leads outside the file; permitted: 1 to 1";
+                              << "Sample count: 2 leads outside the file; permitted: 1 to 1";
 }
 
 void TestJobs::measuresRanges()
@@ -270,7 +299,7 @@ void TestJobs::measuresRanges()
     }
     QVERIFY(store(path("in.wv"), wvFile(plainTags, samples)));
     MeasureJob job({path("in.wv"), from, count});
-    QCOMPARE(job.run(), error.isEmpty());
+    QCOMPARE(job.run() == JobOutcome::Finished, error.isEmpty());
     if (!error.isEmpty()) {
         QCOMPARE(takeLog(Tracer::Error), QStringList{error});
         return;
@@ -322,7 +351,7 @@ void TestJobs::cancelKeepsLaterStepsFromStarting()
     if (at.isEmpty()) {
         job->cancel();
     }
-    QVERIFY(!job->run());
+    QVERIFY(job->run() != JobOutcome::Finished);
     QVERIFY(job->isCancelled());
     QCOMPARE(spy.size(), steps);
     QCOMPARE(takeLog(Tracer::Error), QStringList{"Action aborted by user."});
@@ -337,9 +366,24 @@ void TestJobs::cancelAfterTheEndIsHarmless()
         dumped += bytes;
         return true;
     });
-    QVERIFY(job.run());
+    QCOMPARE(job.run(), JobOutcome::Finished);
     job.cancel();
     QCOMPARE(dumped, words({2, 3}));
+}
+
+void TestJobs::clippingIsTold()
+{
+    const auto warning = [&](const std::vector<float> &values) {
+        WriteJob job(path("out.wv"), values);
+        const QSignalSpy report(&job, &ToolJob::report);
+        return job.run() == JobOutcome::Finished ? texts(report).value(0) : QString("failed");
+    };
+    // What words decode to, and what rounding leaves above 1, isn't clipped.
+    QCOMPARE(warning({1, -1, -32767.5F / 32767, std::nextafter(1.0F, 2.0F)}), QString());
+    // 20 log10(2) = 6.02
+    QVERIFY(warning({1, -2, 1.001F, 0, 0, 1.5F})
+                .startsWith("3 of 6 values clipped, largest 6.02 dB above full scale."));
+    QVERIFY(warning({std::nanf(""), 0}).startsWith("1 of 2 values clipped, largest 0.00 dB"));
 }
 
 QTEST_GUILESS_MAIN(TestJobs)

@@ -47,8 +47,8 @@ private:
     {
         QStringList lines;
         connect(&job, &ToolJob::report, &job,
-                [&lines](const QString &html) { lines << plainLine(html); });
-        done = job.run();
+                [&lines](const ReportLine &line) { lines << plainLine(line); });
+        done = job.run() == JobOutcome::Finished;
         return lines;
     }
 
@@ -107,7 +107,8 @@ void TestSignalJobs::seedsRepeat()
     const auto wordsOf = [&](std::optional<unsigned> seed) {
         CreateRequest request = requestFor(kind, path("out.wv"));
         request.seed = seed;
-        return CreateJob(request).run() ? sampleWords(load(path("out.wv"))) : QByteArray();
+        return CreateJob(request).run() == JobOutcome::Finished ? sampleWords(load(path("out.wv")))
+                                                                : QByteArray();
     };
     const QByteArray first = wordsOf(7);
     QVERIFY(!first.isEmpty());
@@ -118,7 +119,7 @@ void TestSignalJobs::seedsRepeat()
     CreateRequest request = requestFor(kind, {});
     request.seed = 7;
     SignalPreviewJob preview(request);
-    QVERIFY(preview.run());
+    QCOMPARE(preview.run(), JobOutcome::Finished);
     QCOMPARE(static_cast<qsizetype>(2 * preview.samples().size()), first.size());
     for (size_t i = 0; i < preview.samples().size(); ++i) {
         const int word = qFromLittleEndian<qint16>(first.constData() + 2 * i);
@@ -157,7 +158,7 @@ void TestSignalJobs::statesLevelsAndClock()
     if (clock > 0) {
         request.clockHz = clock;
     }
-    QVERIFY(CreateJob(request).run());
+    QCOMPARE(CreateJob(request).run(), JobOutcome::Finished);
     const QByteArray file = load(path("out.wv"));
     const QList<QByteArray> levels = tag(file, "LEVEL OFFS").split(',');
     QVERIFY(std::fabs(levels.value(0).toDouble() - rmsOffset) < 1e-4);
@@ -169,7 +170,7 @@ void TestSignalJobs::statesLevelsAndClock()
     function.offsetI = 0.4;
     request.autoScaling = false;
     request.zeroCrest = true;
-    QVERIFY(CreateJob(request).run());
+    QCOMPARE(CreateJob(request).run(), JobOutcome::Finished);
     const QList<QByteArray> high = tag(load(path("out.wv")), "LEVEL OFFS").split(',');
     QVERIFY(std::fabs(high.value(1).toDouble() + 20 * std::log10(1.4)) < 1e-4);
     QCOMPARE(high.value(0), high.value(1));
@@ -267,7 +268,7 @@ void TestSignalJobs::convertsLengths()
     ResampleRequest request{path("in.wv"), {path("out.wv"), {}, {}}, {}};
     request.target = {.clockDecides = false, .samples = target};
     ResampleJob job(request);
-    QCOMPARE(job.run(), error.isEmpty());
+    QCOMPARE(job.run() == JobOutcome::Finished, error.isEmpty());
     if (error.isEmpty()) {
         QCOMPARE(sampleWords(load(path("out.wv"))).size(), 4 * target);
     } else {

@@ -26,13 +26,14 @@ public:
     explicit SampleJob(End end)
         : m_end(end)
     {
+        setEnding({"Done", "Failed"});
     }
 
-    bool run() override
+    bool work() override
     {
         emit stepStarted("Reading Waveform...");
-        emit report("<b>Reading waveform</b>");
-        emit report(" Clock Rate: \t48 kHz");
+        emit report(ReportLine::heading("Reading waveform"));
+        emit report(ReportLine::row("Clock Rate", "48 kHz"));
         if (m_end == End::WaitForCancel) {
             std::atomic<bool> cancelled{false};
             connect(this, &ToolJob::cancelRequested, [&] { cancelled = true; });
@@ -41,7 +42,6 @@ public:
             }
             return false;
         }
-        emit report("\n<font color=\"#00C000\"><b>Done</b></font>");
         return m_end == End::Success;
     }
 
@@ -95,7 +95,7 @@ void TestRunJob::reportKeepsItsLayout()
     QCOMPARE(cursor.charFormat().foreground().color(), QColor("#00C000"));
     QVERIFY(cursor.charFormat().fontWeight() >= QFont::Bold);
     // The job is not bound to the report any longer.
-    emit job.report("late");
+    emit job.report(ReportLine::plain("late"));
     QVERIFY(!report.toPlainText().contains("late"));
 }
 

@@ -1,0 +1,50 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "SourceWaveform.h"
+#include "ToolJob.h"
+#include "WaveformOutput.h"
+
+/// The road of the tools that make one waveform out of another: source, work, output. Reads the
+/// source; the derived job works on it in edit() and saves its output there.
+class EditJob : public ToolJob
+{
+    Q_OBJECT
+
+public:
+    /// How the reading shows in the report: not at all, or by a headline.
+    enum class Reading { Quiet, Reported };
+
+    EditJob(const QString &inputFile, OutputOptions output, Reading reading,
+            QObject *parent = nullptr);
+
+    /// Works on a waveform that a dialog has read already, instead of reading the file again. It
+    /// isn't changed and outlives the job; its streams may stand anywhere.
+    void useSource(SourceWaveform &loaded) { m_loaded = &loaded; }
+
+protected:
+    /// Makes and saves the result. An empty output name has been refused; the source has been read;
+    /// the record of the output holds what the source says: type, clock, sample count, measured
+    /// levels, comment, copyright.
+    [[nodiscard]] virtual bool edit() = 0;
+
+    [[nodiscard]] SourceWaveform &source() { return m_loaded ? *m_loaded : m_source; }
+    [[nodiscard]] WaveformOutput &output() { return m_output; }
+    [[nodiscard]] const QString &inputFile() const { return m_inputFile; }
+
+    /// Reports file, clock, samples and levels of the source.
+    void reportSource();
+
+    /// Ends with another last line than usual, and the reason in the log.
+    [[nodiscard]] bool stopWith(const QString &reportText, const QString &logText);
+
+private:
+    [[nodiscard]] bool work() final;
+    [[nodiscard]] bool read();
+
+    QString m_inputFile;
+    Reading m_reading;
+    SourceWaveform m_source;
+    SourceWaveform *m_loaded = nullptr;
+    WaveformOutput m_output;
+};

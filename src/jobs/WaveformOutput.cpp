@@ -1,0 +1,84 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "WaveformOutput.h"
+
+#include "ReportText.h"
+#include "ToolJob.h"
+
+#include "log/Tracer.h"
+#include "wvfile/HvFileIO.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+namespace {
+
+QString clippingText(const WvWriteJob &record)
+{
+    return QString("%1 of %2 values clipped, largest %3 dB above full scale. "
+                   "Lower the level to keep the signal undistorted.")
+        .arg(record.clippedValues)
+        .arg(2 * static_cast<qint64>(record.samples))
+        .arg(20 * std::log10(std::max(record.largestValue, 1.0)), 0, 'f', 2);
+}
+
+} // namespace
+
+WaveformOutput::WaveformOutput(ToolJob &job, OutputOptions options)
+    : m_job(job)
+    , m_options(std::move(options))
+{
+    m_record.levelsValid = true;
+}
+
+void WaveformOutput::setLength(double clockHz, qint64 samples)
+{
+    m_record.clock = clockHz;
+    m_record.markerClock = clockHz;
+    m_record.samples = static_cast<int>(samples);
+}
+
+void WaveformOutput::setLevels(double peak, double rms)
+{
+    m_record.peakOffset = offsetDb(peak);
+    m_record.rmsOffset = offsetDb(rms);
+}
+
+void WaveformOutput::reportFile()
+{
+    emit m_job.report(fileRow(fileName()));
+}
+
+void WaveformOutput::reportLevels()
+{
+    for (const ReportLine &line : levelRows(m_record)) {
+        emit m_job.report(line);
+    }
+}
+
+void WaveformOutput::reportWaveform()
+{
+    for (const ReportLine &line : waveformRows(fileName(), m_record)) {
+        emit m_job.report(line);
+    }
+}
+
+bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
+{
+    m_record.comment = tagText("comment", m_options.comment.value_or(m_record.comment));
+    m_record.copyright = tagText("copyright", m_options.copyright.value_or(m_record.copyright));
+    HvFileIO file;
+    const JobStep step(m_job, stepLabel, file);
+    if (!file.writeWaveform(m_record, fileName(), streams.data, streams.markers, streams.tags)) {
+        return Tracer::fail("Waveform generation failed.");
+    }
+    if (m_record.clippedValues > 0) {
+        emit m_job.report(ReportLine::warning(clippingText(m_record)));
+    }
+    return true;
+}
+
+QString emptyFileNameText()
+{
+    return "Output file name is empty.";
+}

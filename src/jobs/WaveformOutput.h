@@ -1,0 +1,51 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "OutputOptions.h"
+
+#include "wvfile/WvTypes.h"
+
+class ToolJob;
+
+/// The waveform file that a job writes: its name, its record with the texts of the tags, the report
+/// lines about it, and the writing itself. A job with several results has several of these.
+class WaveformOutput
+{
+public:
+    /// `job` outlives the output: it carries the report and is asked for cancels.
+    WaveformOutput(ToolJob &job, OutputOptions options);
+
+    [[nodiscard]] const QString &fileName() const { return m_options.fileName; }
+
+    /// What is to be written. A job fills clock, sample count and level offsets; comment and
+    /// copyright hold those of the source, if any, for the case that no others are wanted.
+    [[nodiscard]] WvWriteJob &record() { return m_record; }
+
+    /// Sets both clocks (Hz) and the sample count of the record.
+    void setLength(double clockHz, qint64 samples);
+
+    /// Sets the level offsets of the record from linear levels of full scale 1.
+    void setLevels(double peak, double rms);
+
+    /// Reports the row with the file name.
+    void reportFile();
+
+    /// Reports the rows on samples and levels.
+    void reportLevels();
+
+    /// Reports the rows on file, clock, samples and levels.
+    void reportWaveform();
+
+    /// Writes the file as a step of this label. Tells in the report how many values lay beyond full
+    /// scale. False, with the reason logged, if it fails or the job is cancelled; a file that stood
+    /// there is then left as it was.
+    [[nodiscard]] bool save(const WvStreams &streams, const QString &stepLabel);
+
+private:
+    ToolJob &m_job;
+    OutputOptions m_options;
+    WvWriteJob m_record;
+};
+
+/// The reason that jobs log when no file name was given.
+[[nodiscard]] QString emptyFileNameText();
