@@ -110,10 +110,15 @@ function(corvane_add_program name)
 endfunction()
 
 # corvane_add_test(NAME LABEL unit|gui|instrument|e2e SOURCES ... LINK ... [ENVIRONMENT ...]):
-# a Qt Test program, run without a display and with settings and temporary files of its own.
+# a Qt Test program with tests/support, run without a display and with settings and temporary files
+# of its own. What drives modal windows comes with the label gui; others link corvane_test_windows.
 function(corvane_add_test name)
   cmake_parse_arguments(arg "" "LABEL" "SOURCES;LINK;ENVIRONMENT" ${ARGN})
-  corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} Qt6::Test)
+  set(support corvane_test_support)
+  if(arg_LABEL STREQUAL "gui")
+    list(PREPEND support corvane_test_windows)
+  endif()
+  corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} ${support} Qt6::Test)
   target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/tests")
   set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests")
   add_test(NAME ${name} COMMAND ${name})

@@ -1,0 +1,91 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/files.h"
+#include "support/logreader.h"
+#include "support/modals.h"
+#include "support/rows.h"
+#include "support/seed.h"
+#include "support/wvbytes.h"
+
+#include <QInputDialog>
+#include <QMessageBox>
+#include <QTest>
+
+/// What other tests trust in.
+class TestSupport : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void rows();
+    void logLines();
+    void files();
+    void bytes();
+    void modals();
+};
+
+void TestSupport::rows()
+{
+    struct Row
+    {
+        const char *name;
+        int value;
+    };
+    int sum = 0;
+    forRows<Row>({{"one", 1}, {"two", 2}}, [&](const Row &row) { sum += row.value; });
+    QCOMPARE(sum, 3);
+}
+
+void TestSupport::logLines()
+{
+    CapturedLog log(Tracer::DebugMask);
+    Tracer::Trace(Tracer::Error, "a  b");
+    Tracer::Trace(Tracer::Debug, "c");
+    QCOMPARE(log.take(), QStringList({"4|a  b", "16|c"}));
+    Tracer::Trace(Tracer::Error, "a");
+    Tracer::Trace(Tracer::Information, "b");
+    QCOMPARE(takeMessages(), QStringList("a"));
+    QCOMPARE(takeLog(), QStringList());
+}
+
+void TestSupport::files()
+{
+    const TestFolder folder;
+    QVERIFY(folder.load("none").isNull());
+    QVERIFY(folder.store("empty", {}) && !folder.load("empty").isNull());
+    QVERIFY(folder.store(".full", "abc"));
+    QCOMPARE(folder.load(".full"), QByteArray("abc"));
+    QCOMPARE(folder.entries(), QStringList({".full", "empty"}));
+}
+
+void TestSupport::bytes()
+{
+    const QByteArray file = wvFile("{CLOCK:5}", words({1, -2}));
+    QCOMPARE(file, QByteArray("{CLOCK:5}{WAVEFORM-5: #\1\0\xFE\xFF}", 28));
+    QCOMPARE(tag(file, "CLOCK"), QByteArray("5"));
+    QCOMPARE(sampleWords(file), words({1, -2}));
+    QCOMPARE(randomBytes(9, 3), randomBytes(9, 3));
+    QVERIFY(randomBytes(9, 3) != randomBytes(9, 4));
+}
+
+void TestSupport::modals()
+{
+    Seen question;
+    Seen request;
+    QString name;
+    const auto ask = [&] {
+        if (QMessageBox::question(nullptr, "Title", "Go on?") == QMessageBox::Yes) {
+            name = QInputDialog::getText(nullptr, "Name", "New name", QLineEdit::Normal, "old");
+        }
+    };
+    QVERIFY(withModals(ask, {answer("Yes", question), typeName("new", request)}));
+    QCOMPARE(question.title + '|' + question.text, "Title|Go on?");
+    QCOMPARE(request.title + '|' + request.text, "Name|New name");
+    QCOMPARE(name, "new");
+    QTest::ignoreMessage(QtWarningMsg, "unexpected window: Go on?");
+    QVERIFY(!withModals(ask, {}));
+    whenModal(press("No"));
+    ask();
+}
+
+QTEST_MAIN(TestSupport)
+#include "tst_support.moc"
