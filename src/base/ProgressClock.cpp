@@ -31,10 +31,15 @@ bool ProgressClock::shouldStop(int percent)
     }
     m_timer.restart();
     m_report(percent);
+    runEvents();
+    return m_cancelled.load(std::memory_order_relaxed);
+}
+
+void ProgressClock::runEvents()
+{
     const QCoreApplication *application = QCoreApplication::instance();
     if (application != nullptr && application->thread() == QThread::currentThread()) {
         QCoreApplication::processEvents();
         clearVectorState();
     }
-    return m_cancelled.load(std::memory_order_relaxed);
 }

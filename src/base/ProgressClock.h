@@ -25,6 +25,9 @@ public:
     /// As above, for a caller that knows its percentage.
     [[nodiscard]] bool shouldStop(int percent);
 
+    /// Lets the event loop run if this is the application's thread; in any other it does nothing.
+    static void runEvents();
+
 private:
     std::function<void(int)> m_report;
     const std::atomic<bool> &m_cancelled;

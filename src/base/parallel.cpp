@@ -11,6 +11,7 @@
 namespace {
 
 std::atomic<unsigned> threadLimit{0};
+thread_local unsigned ownThreadLimit = 0;
 
 /// Loops come block by block, and a new thread for each would cost more than a small block.
 QThreadPool &keptThreads()
@@ -27,10 +28,16 @@ void setThreadLimit(unsigned count)
     keptThreads().setMaxThreadCount(static_cast<int>(threadCount()));
 }
 
+void setOwnThreadLimit(unsigned count)
+{
+    ownThreadLimit = count;
+}
+
 unsigned threadCount()
 {
     const unsigned limit = threadLimit;
-    return limit > 0 ? limit : std::max(1U, std::thread::hardware_concurrency());
+    const unsigned count = limit > 0 ? limit : std::max(1U, std::thread::hardware_concurrency());
+    return ownThreadLimit > 0 ? std::min(ownThreadLimit, count) : count;
 }
 
 void parallelFor(std::size_t count, const std::function<void(std::size_t)> &work)

@@ -7,7 +7,11 @@
 /// Number of threads that parallelFor uses at most; 0 (the default) means one per processor.
 void setThreadLimit(unsigned count);
 
-/// The number of threads that parallelFor would use for many items.
+/// The same for work that the calling thread starts, and for that alone: threads that run beside
+/// each other share the processors. The lower of both limits counts.
+void setOwnThreadLimit(unsigned count);
+
+/// The number of threads that parallelFor would use for many items on the calling thread.
 [[nodiscard]] unsigned threadCount();
 
 /// Calls `work(index)` for each index from 0 to count - 1, spread over the processors, and returns

@@ -8,10 +8,8 @@
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
-#include "base/vectorstate.h"
 #include "log/Tracer.h"
 
-#include <QCoreApplication>
 #include <QDateTime>
 #include <QFile>
 #include <QFileInfo>
@@ -80,8 +78,7 @@ bool HvFileIO::readWaveform(WvFileInfo *info)
         return false;
     }
     emit ProgressUpdate(100);
-    QCoreApplication::processEvents();
-    clearVectorState();
+    ProgressClock::runEvents();
     if (!info->dataStream->restartAtBegining() || !info->markerStream->restartAtBegining()) {
         return Tracer::fail("Writing to temporary data storage failed.");
     }
