@@ -48,16 +48,16 @@ QString TimelinePainter::positionText(qint64 sample) const
 void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    fillArea(painter, area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(ColorSlot::PanelBackground));
     const QRectF place = bar(area, m_style.font);
     if (place.width() <= 0 || place.height() <= 0) {
         painter.restore();
         return;
     }
     const PixelGrid pixels(painter);
-    fillArea(painter, place, m_style.color(PlotColor::Marked));
+    fillArea(painter, place, m_style.color(ColorSlot::MarkedBackground));
     painter.setFont(m_style.font);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     const QRectF texts(place.left(), place.bottom() + 1, place.width(),
                        area.bottom() - place.bottom() - 1);
     if (m_scene.total > 0) {
@@ -66,8 +66,8 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
         const double width = std::max(to - from, LeastRangeWidth);
         const double left = std::max(place.left(), std::min(from, place.right() - width));
         const QRectF range(pixels.snap(left), place.top(), pixels.snap(width), place.height());
-        fillArea(painter, range, m_style.color(PlotColor::PeakTrace, 110));
-        pixels.frame(range, m_style.color(PlotColor::PeakTrace));
+        fillArea(painter, range, m_style.color(ColorSlot::PeakTrace, 110));
+        pixels.frame(range, m_style.color(ColorSlot::PeakTrace));
         painter.drawText(texts, Qt::AlignLeft | Qt::AlignVCenter, positionText(0));
         painter.drawText(texts, Qt::AlignRight | Qt::AlignVCenter, positionText(m_scene.total));
         const QFontMetricsF metrics(m_style.font);
@@ -78,7 +78,7 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
             painter.drawText(texts, Qt::AlignCenter, rangeText);
         }
     }
-    pixels.frame(place, m_style.color(PlotColor::Grid));
+    pixels.frame(place, m_style.color(ColorSlot::GridLines));
     for (std::size_t which = 0; which < m_scene.cursors.size(); ++which) {
         const qint64 sample = m_scene.cursors[which];
         if (sample < 0 || sample >= m_scene.total) {
@@ -86,7 +86,7 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
         }
         const double x = pixels.snap(xOf(place, static_cast<double>(sample)));
         const QColor color =
-            m_style.color(which == 0 ? PlotColor::PrimaryMarker : PlotColor::SecondaryMarker);
+            m_style.color(which == 0 ? ColorSlot::PrimaryMarker : ColorSlot::SecondaryMarker);
         pixels.vertical(x, place.top(), place.bottom(), color);
         drawFlag(painter, x + pixels.lineWidth() / 2, place.top(), FlagShape::Top, FlagSize, color);
     }

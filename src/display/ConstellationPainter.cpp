@@ -82,7 +82,7 @@ std::optional<IqSample> ConstellationPainter::valueAt(const QPointF &place,
 void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    fillArea(painter, area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(ColorSlot::PanelBackground));
     const QRectF plot = square(area, m_style.font);
     if (!plot.isEmpty()) {
         const PixelGrid pixels(painter);
@@ -126,7 +126,7 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
                                      const QRectF &plot) const
 {
     constexpr double size = 3;
-    const QColor color = m_style.color(PlotColor::AverageTrace);
+    const QColor color = m_style.color(ColorSlot::AverageTrace);
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
     painter.setClipRect(plot);
@@ -146,7 +146,7 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
 void ConstellationPainter::paintFrame(QPainter &painter, const PixelGrid &pixels,
                                       const QRectF &plot) const
 {
-    const QColor color = m_style.color(PlotColor::Grid);
+    const QColor color = m_style.color(ColorSlot::GridLines);
     const QPointF center = plot.center();
     pixels.frame(plot, color);
     pixels.horizontal(center.y(), plot.left(), plot.right(), color);
@@ -167,7 +167,7 @@ void ConstellationPainter::paintAxisTexts(QPainter &painter, const QRectF &area,
 {
     const QFontMetricsF metrics(m_style.font);
     painter.setFont(m_style.font);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     const double height = metrics.height();
     for (const double share : {-1.0, 0.0, 1.0}) {
         const QString textI = axisText(share * m_scene.scaleI);

@@ -74,7 +74,7 @@ double SpectrumPainter::yOf(const QRectF &plot, double db) const
 void SpectrumPainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
-    fillArea(painter, area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(ColorSlot::PanelBackground));
     painter.setFont(m_style.font);
     const QRectF plot = area.marginsRemoved(margins(m_style.font, m_scene.mode));
     if (plot.width() > 0 && plot.height() > LevelInset) {
@@ -84,12 +84,12 @@ void SpectrumPainter::paint(QPainter &painter, const QRectF &area) const
         } else {
             paintSpectrum(painter, pixels, area, plot);
         }
-        pixels.frame(plot, m_style.color(PlotColor::Grid));
+        pixels.frame(plot, m_style.color(ColorSlot::GridLines));
         paintHint(painter, plot);
         const QStringList lines = m_scene.mouse ? readOut(*m_scene.mouse, plot) : QStringList();
         if (!lines.isEmpty()) {
             pixels.dashedVertical(m_scene.mouse->x(), plot.top(), plot.bottom(),
-                                  m_style.color(PlotColor::Cursor, 150));
+                                  m_style.color(ColorSlot::CursorLine, 150));
             ValueBox box;
             box.lines = lines;
             box.cornerRadius = 5;
@@ -105,11 +105,12 @@ void SpectrumPainter::paintSpectrum(QPainter &painter, const PixelGrid &pixels, 
     const double height = QFontMetricsF(m_style.font).height();
     const double spacing = (plot.height() - LevelInset) / Divisions;
     const int stride = labelStride(spacing, height);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     for (int k = 0; k <= Divisions; ++k) {
         const double level = k == 0 ? 0.0 : -k * m_scene.dbPerDivision;
         const double y = yOf(plot, level);
-        pixels.horizontal(y, plot.left(), plot.right(), m_style.color(PlotColor::Grid, GridAlpha));
+        pixels.horizontal(y, plot.left(), plot.right(),
+                          m_style.color(ColorSlot::GridLines, GridAlpha));
         if (k % stride == 0) {
             painter.drawText(
                 QRectF(area.left(), y - height / 2, plot.left() - area.left() - 4, height),
@@ -127,7 +128,7 @@ void SpectrumPainter::paintSpectrum(QPainter &painter, const PixelGrid &pixels, 
         painter.save();
         painter.setClipRect(plot);
         painter.setRenderHint(QPainter::Antialiasing);
-        painter.setPen(QPen(m_style.color(PlotColor::AverageTrace), 1));
+        painter.setPen(QPen(m_style.color(ColorSlot::AverageTrace), 1));
         painter.translate(pixels.lineWidth() / 2, pixels.lineWidth() / 2); // onto the grid lines
         painter.drawPolyline(line);
         painter.restore();
@@ -163,8 +164,8 @@ void SpectrumPainter::paintColorBar(QPainter &painter, const PixelGrid &pixels, 
                         1 / pixels.ratio()),
                  QColor(ColorTable::colorOfLevel(m_scene.colors.mode(), level)));
     }
-    pixels.frame(bar, m_style.color(PlotColor::Grid));
-    painter.setPen(m_style.color(PlotColor::Text));
+    pixels.frame(bar, m_style.color(ColorSlot::GridLines));
+    painter.setPen(m_style.color(ColorSlot::Text));
     const double height = QFontMetricsF(m_style.font).height();
     constexpr int labelCount = 4;
     const int stride = labelStride(plot.height() / (labelCount - 1), height);
@@ -189,16 +190,17 @@ void SpectrumPainter::paintFrequencyAxis(QPainter &painter, const PixelGrid &pix
     const double spacing = step / bandwidth() * plot.width();
     const int stride = labelStride(spacing, metrics.horizontalAdvance(AxisTemplate));
     constexpr double tick = 3;
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     for (int k = -divisions; k <= divisions; ++k) {
         const double frequency = k * step;
         // The centres of the bins end half a bin before the upper edge.
         const double x =
             std::min(xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0), plot.right());
-        pixels.vertical(x, plot.bottom(), plot.bottom() + tick, m_style.color(PlotColor::Grid));
+        pixels.vertical(x, plot.bottom(), plot.bottom() + tick,
+                        m_style.color(ColorSlot::GridLines));
         if (gridAlpha > 0) {
             pixels.vertical(x, plot.top(), plot.bottom(),
-                            m_style.color(PlotColor::Grid, gridAlpha));
+                            m_style.color(ColorSlot::GridLines, gridAlpha));
         }
         if (k % stride == 0) {
             const QString text = frequencyText(frequency);
@@ -227,12 +229,12 @@ void SpectrumPainter::paintTimeAxis(QPainter &painter, const PixelGrid &pixels, 
     const double step = niceStep(duration / wantedLabels);
     const double height = QFontMetricsF(m_style.font).height();
     const int stride = labelStride(step / duration * plot.height(), height);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     const auto firstTick = static_cast<qint64>(std::ceil(start / step));
     for (qint64 k = firstTick; static_cast<double>(k) * step < start + duration; ++k) {
         const double time = static_cast<double>(k) * step;
         const double y = plot.top() + (time - start) / duration * plot.height();
-        pixels.horizontal(y, plot.left() - tick, plot.left(), m_style.color(PlotColor::Grid));
+        pixels.horizontal(y, plot.left() - tick, plot.left(), m_style.color(ColorSlot::GridLines));
         if (k % stride == 0) {
             const QString text = inSeconds
                                      ? formatNumber(time, NumberFormat{.unit = "s", .precision = 3})

@@ -2,6 +2,7 @@
 #include "TracePainter.h"
 
 #include "base/EngineeringNumber.h"
+#include "base/limits.h"
 #include "plotdraw.h"
 #include "view/plotscale.h"
 
@@ -14,8 +15,7 @@
 
 namespace {
 
-constexpr int Divisions = 10; ///< of the time axis
-constexpr int MarkerCount = 4;
+constexpr int Divisions = 10;        ///< of the time axis
 constexpr double MarkerPitch = 0.25; ///< of the pane's height from row to row
 constexpr double MarkerHeight = 0.1; ///< of a high level over a low one
 constexpr double LogRange = 100.0;   ///< dB from bottom to top
@@ -166,7 +166,7 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
 {
     const QRectF plot = area.marginsRemoved(margins(m_style.font));
     painter.save();
-    fillArea(painter, area, m_style.color(PlotColor::Background));
+    fillArea(painter, area, m_style.color(ColorSlot::PanelBackground));
     if (plot.width() > 0 && plot.height() > 0) {
         const PixelGrid grid(painter);
         const QList<QRectF> rects = panes(plot);
@@ -201,13 +201,13 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
 void TracePainter::paintAxis(QPainter &painter, const PixelGrid &grid, const QRectF &area,
                              const QRectF &pane, const QList<Label> &texts) const
 {
-    const QColor gridColor = m_style.color(PlotColor::Grid, GridAlpha);
+    const QColor gridColor = m_style.color(ColorSlot::GridLines, GridAlpha);
     for (int k = 1; k < Divisions; ++k) {
         grid.vertical(pane.left() + pane.width() * k / Divisions, pane.top(), pane.bottom(),
                       gridColor);
     }
     painter.setFont(m_style.font);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     const double height = QFontMetricsF(m_style.font).height();
     const double spacing =
         texts.size() > 1
@@ -223,7 +223,7 @@ void TracePainter::paintAxis(QPainter &painter, const PixelGrid &grid, const QRe
                 Qt::AlignRight | Qt::AlignVCenter, texts.at(k).text);
         }
     }
-    grid.frame(pane, m_style.color(PlotColor::Grid));
+    grid.frame(pane, m_style.color(ColorSlot::GridLines));
 }
 
 void TracePainter::paintPaneOfMode(QPainter &painter, const QRectF &plot, const QRectF &pane,
@@ -233,34 +233,34 @@ void TracePainter::paintPaneOfMode(QPainter &painter, const QRectF &plot, const 
     case TraceMode::IqEnvelope:
         if (index == 0) {
             paintValues(painter, plot, pane, &TraceBin::iMax, &TraceBin::iMin,
-                        PlotColor::AverageTrace);
+                        ColorSlot::AverageTrace);
         } else {
             paintValues(painter, plot, pane, &TraceBin::qMax, &TraceBin::qMin,
-                        PlotColor::PeakTrace);
+                        ColorSlot::PeakTrace);
         }
         break;
     case TraceMode::LogMagEnvelope:
         paintValues(painter, plot, pane, &TraceBin::magMax, &TraceBin::magMin,
-                    PlotColor::AverageTrace);
+                    ColorSlot::AverageTrace);
         break;
     case TraceMode::LogMagAverage:
     case TraceMode::LinMagAverage:
-        paintValues(painter, plot, pane, &TraceBin::magAvg, nullptr, PlotColor::AverageTrace);
+        paintValues(painter, plot, pane, &TraceBin::magAvg, nullptr, ColorSlot::AverageTrace);
         break;
     case TraceMode::Phase:
         paintValues(painter, plot, pane, &TraceBin::phaseHigh, &TraceBin::phaseLow,
-                    PlotColor::AverageTrace);
+                    ColorSlot::AverageTrace);
         break;
     case TraceMode::Frequency:
         paintValues(painter, plot, pane, &TraceBin::freqMax, &TraceBin::freqMin,
-                    PlotColor::AverageTrace);
+                    ColorSlot::AverageTrace);
         break;
     }
 }
 
 void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRectF &pane,
                                double TraceBin::*upper, double TraceBin::*lower,
-                               PlotColor place) const
+                               ColorSlot place) const
 {
     QPolygonF upperEdge;
     QPolygonF lowerEdge;
@@ -299,7 +299,7 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
     if (m_scene.bins.isSparse()) {
         constexpr double radius = 1.75;
         painter.setPen(Qt::NoPen);
-        painter.setBrush(m_style.color(PlotColor::Cursor));
+        painter.setBrush(m_style.color(ColorSlot::CursorLine));
         for (const QPointF &dot : dots) {
             painter.drawEllipse(dot, radius, radius);
         }
@@ -316,7 +316,7 @@ void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const
         const double lowY = grid.snap(yOf(pane, base));
         const double highY = grid.snap(yOf(pane, base + MarkerHeight));
         const QColor color =
-            m_style.color(row % 2 == 0 ? PlotColor::PrimaryMarker : PlotColor::SecondaryMarker);
+            m_style.color(row % 2 == 0 ? ColorSlot::PrimaryMarker : ColorSlot::SecondaryMarker);
         const auto edge = [&](double x) {
             grid.vertical(x, highY, lowY + grid.lineWidth(), color);
         };
@@ -359,8 +359,8 @@ void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const 
             continue;
         }
         const double x = grid.snap(xOf(plot, bin));
-        const QColor color = m_style.color(which == reference ? PlotColor::SecondaryMarker
-                                                              : PlotColor::PrimaryMarker);
+        const QColor color = m_style.color(which == reference ? ColorSlot::SecondaryMarker
+                                                              : ColorSlot::PrimaryMarker);
         for (const QRectF &pane : panes) {
             const double top = yOf(pane, 0.95);
             const double bottom = yOf(pane, 0.05);
@@ -373,9 +373,9 @@ void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const 
     }
     if (m_scene.mouseBin >= 0 && m_scene.mouseBin < TraceBins::BinCount) {
         const double x = xOf(plot, m_scene.mouseBin);
-        grid.dashedVertical(x, plot.top(), plot.bottom(), m_style.color(PlotColor::Cursor));
+        grid.dashedVertical(x, plot.top(), plot.bottom(), m_style.color(ColorSlot::CursorLine));
         drawFlag(painter, x + grid.lineWidth() / 2, plot.bottom() - flagSize, FlagShape::Bottom,
-                 flagSize, m_style.color(PlotColor::Trigger));
+                 flagSize, m_style.color(ColorSlot::TriggerSymbol));
     }
 }
 
@@ -416,7 +416,7 @@ void TracePainter::paintFootLine(QPainter &painter, const QRectF &line) const
         break;
     }
     painter.setFont(m_style.font);
-    painter.setPen(m_style.color(PlotColor::Text));
+    painter.setPen(m_style.color(ColorSlot::Text));
     painter.drawText(line, Qt::AlignLeft | Qt::AlignVCenter, quantity);
     painter.drawText(line, Qt::AlignRight | Qt::AlignVCenter, divisionText());
 }

@@ -72,7 +72,7 @@ private:
     void paintAxis(QPainter &painter, const PixelGrid &grid, const QRectF &area, const QRectF &pane,
                    const QList<Label> &texts) const;
     void paintValues(QPainter &painter, const QRectF &plot, const QRectF &pane,
-                     double TraceBin::*upper, double TraceBin::*lower, PlotColor place) const;
+                     double TraceBin::*upper, double TraceBin::*lower, ColorSlot place) const;
     void paintPaneOfMode(QPainter &painter, const QRectF &plot, const QRectF &pane,
                          int index) const;
     void paintMarkers(const PixelGrid &grid, const QRectF &plot, const QRectF &pane) const;

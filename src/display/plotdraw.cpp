@@ -147,12 +147,12 @@ QRectF drawValueBox(QPainter &painter, const PlotStyle &style, const QPointF &an
     painter.save();
     painter.setRenderHint(QPainter::Antialiasing, box.cornerRadius > 0);
     const qreal inset = grid.lineWidth() / 2; // the pen is centred on the outline
-    painter.setPen(QPen(style.color(PlotColor::Grid), grid.lineWidth()));
-    painter.setBrush(style.color(PlotColor::TextBox, BoxAlpha));
+    painter.setPen(QPen(style.color(ColorSlot::GridLines), grid.lineWidth()));
+    painter.setBrush(style.color(ColorSlot::TextboxBackground, BoxAlpha));
     painter.drawRoundedRect(place.adjusted(inset, inset, -inset, -inset), box.cornerRadius,
                             box.cornerRadius);
     painter.setFont(style.font);
-    painter.setPen(style.color(PlotColor::Text));
+    painter.setPen(style.color(ColorSlot::Text));
     painter.drawText(place.adjusted(BoxPadding, BoxPadding, -BoxPadding, -BoxPadding),
                      Qt::AlignLeft | Qt::AlignTop | Qt::TextDontClip, box.lines.join('\n'));
     painter.restore();
@@ -176,8 +176,8 @@ void drawCaption(QPainter &painter, const PlotStyle &style, const QRectF &area,
                              .boundingRect(area.adjusted(5, 3, -5, -3),
                                            static_cast<int>(alignment) | Qt::TextWordWrap, text)
                              .adjusted(-3, -1, 3, 1);
-    fillArea(painter, place, style.color(PlotColor::Background, 190));
-    painter.setPen(style.color(PlotColor::Text));
+    fillArea(painter, place, style.color(ColorSlot::PanelBackground, 190));
+    painter.setPen(style.color(ColorSlot::Text));
     painter.drawText(place, Qt::AlignCenter | Qt::TextWordWrap, text);
     painter.restore();
 }

@@ -15,7 +15,7 @@
 namespace {
 
 /// Most samples of the kinds that limit themselves.
-constexpr double MaxSamples = 1e6;
+constexpr double MaxFittedSamples = 1e6;
 
 void logError(const QString &text)
 {
@@ -139,8 +139,9 @@ bool checkCountAndLimit(const SignalFit &fit, const ClockLimits &limits)
     if (!checkCount(fit, limits)) {
         return false;
     }
-    if (fit.samples > MaxSamples) {
-        logError(QString("The number of samples exceeds %1. Check settings.").arg(MaxSamples));
+    if (fit.samples > MaxFittedSamples) {
+        logError(
+            QString("The number of samples exceeds %1. Check settings.").arg(MaxFittedSamples));
         return false;
     }
     return true;

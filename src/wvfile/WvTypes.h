@@ -1,22 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "base/limits.h"
+
 #include <QList>
 #include <QString>
 #include <QtGlobal>
 
-#include <limits>
-
 class BufferedIO;
-
-/// The most samples that a waveform can have here.
-inline constexpr qint64 MaxSamples = std::numeric_limits<qint32>::max();
-
-inline constexpr int MarkerCount = 4;
-
-/// Clock rates (Hz) that the reader accepts: above the first, up to and including the second.
-inline constexpr double MinClockHz = 0.001;
-inline constexpr double MaxClockHz = 600e6;
 
 /// Groups of file kinds that share a sample coding, as the reader reports them.
 enum WvFormat {

@@ -27,7 +27,7 @@ inline QRectF tracePlot()
     return PlotArea.marginsRemoved(TracePainter::margins(PlotStyle::current().font));
 }
 
-inline QColor plotColor(PlotColor place)
+inline QColor plotColor(ColorSlot place)
 {
     return PlotStyle::current().color(place);
 }

@@ -109,7 +109,7 @@ void TestPictures::envelopeIsFilled()
     // Every bin holds both +0.5 and -0.5.
     const QImage image = pictureOf(PlotView::Iq, squareSamples(20000));
     const QList<QRectF> panes = panesOf(TraceMode::IqEnvelope);
-    const QColor colors[2] = {plotColor(PlotColor::AverageTrace), plotColor(PlotColor::PeakTrace)};
+    const QColor colors[2] = {plotColor(ColorSlot::AverageTrace), plotColor(ColorSlot::PeakTrace)};
     for (int k = 0; k < 2; ++k) {
         const QRectF &pane = panes.at(k);
         for (int x = static_cast<int>(pane.left()) + 2; x < TracePainter::xOf(tracePlot(), 511) - 1;
@@ -141,7 +141,7 @@ void TestPictures::markerEdges()
     const QImage image = pictureOf(PlotView::Phase, toneSamples(count, 0.01), markers);
     const QRectF pane = panesOf(TraceMode::Phase, true).last();
     QVERIFY(std::fabs(pane.height() - tracePlot().height() / 3) < 1);
-    const QColor color = plotColor(PlotColor::PrimaryMarker);
+    const QColor color = plotColor(ColorSlot::PrimaryMarker);
     const int high = static_cast<int>(std::round(TracePainter::yOf(pane, 0.85)));
     const int low = static_cast<int>(std::round(TracePainter::yOf(pane, 0.75)));
     QVERIFY(high < low);
@@ -160,7 +160,7 @@ void TestPictures::markerEdges()
     }
     // M2 stays low all the way.
     const int secondLow = static_cast<int>(std::round(TracePainter::yOf(pane, 0.5)));
-    QVERIFY(isNear(image.pixel(x(256), secondLow), plotColor(PlotColor::SecondaryMarker), 4));
+    QVERIFY(isNear(image.pixel(x(256), secondLow), plotColor(ColorSlot::SecondaryMarker), 4));
 }
 
 void TestPictures::sparseDots()
@@ -172,7 +172,7 @@ void TestPictures::sparseDots()
         int runs = 0;
         bool inside = false;
         for (int x = static_cast<int>(pane.left()) - 1; x < pane.right(); ++x) {
-            const bool dot = isNear(image.pixel(x, y), plotColor(PlotColor::Cursor), 40);
+            const bool dot = isNear(image.pixel(x, y), plotColor(ColorSlot::CursorLine), 40);
             runs += dot && !inside ? 1 : 0;
             inside = dot;
         }
@@ -195,7 +195,7 @@ void TestPictures::toneColumnInSpectrum()
     int topColumn = -1;
     for (int x = static_cast<int>(plot.left()) + 1; x < plot.right() - 1; ++x) {
         for (int y = static_cast<int>(plot.top()) + 1; y < topRow; ++y) {
-            if (isNear(image.pixel(x, y), plotColor(PlotColor::AverageTrace))) {
+            if (isNear(image.pixel(x, y), plotColor(ColorSlot::AverageTrace))) {
                 topRow = y;
                 topColumn = x;
             }
@@ -243,7 +243,7 @@ void TestPictures::constellationCellsAndDots()
     for (const auto &[i, q] :
          {std::pair(0.45, 0.45), {-0.45, 0.45}, {0.45, -0.45}, {-0.45, -0.45}}) {
         QCOMPARE(colored(cells, i, q), ColorTable().entry(0));
-        QCOMPARE(QColor(colored(dots, i, q)), plotColor(PlotColor::AverageTrace));
+        QCOMPARE(QColor(colored(dots, i, q)), plotColor(ColorSlot::AverageTrace));
     }
     int cellCount = 0;
     for (int row = 0; row < 51; ++row) {
@@ -274,11 +274,11 @@ void TestPictures::timelineShowsRangeAndCursors()
     const auto pixel = [&](double sample) {
         return image.pixel(static_cast<int>(std::round(timeline.xOf(bar, sample))), y);
     };
-    QCOMPARE(QColor(pixel(50)), style.color(PlotColor::Marked));
-    QCOMPARE(QColor(pixel(800)), style.color(PlotColor::Marked));
-    QVERIFY(QColor(pixel(500)) != style.color(PlotColor::Marked));
-    QCOMPARE(QColor(pixel(100)), style.color(PlotColor::PrimaryMarker));
-    QCOMPARE(QColor(pixel(900)), style.color(PlotColor::SecondaryMarker));
+    QCOMPARE(QColor(pixel(50)), style.color(ColorSlot::MarkedBackground));
+    QCOMPARE(QColor(pixel(800)), style.color(ColorSlot::MarkedBackground));
+    QVERIFY(QColor(pixel(500)) != style.color(ColorSlot::MarkedBackground));
+    QCOMPARE(QColor(pixel(100)), style.color(ColorSlot::PrimaryMarker));
+    QCOMPARE(QColor(pixel(900)), style.color(ColorSlot::SecondaryMarker));
 }
 
 QTEST_MAIN(TestPictures)

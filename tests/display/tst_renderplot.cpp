@@ -140,8 +140,8 @@ void TestRenderPlot::linesAreSharp()
     QCOMPARE(image.size(), (QSizeF(PlotSize) * ratio).toSize());
     const QRectF plot = tracePlot();
     const int y = static_cast<int>((plot.top() + plot.height() * 0.55) * ratio);
-    const QRgb frame = plotColor(PlotColor::Grid).rgb();
-    const QRgb background = plotColor(PlotColor::Background).rgb();
+    const QRgb frame = plotColor(ColorSlot::GridLines).rgb();
+    const QRgb background = plotColor(ColorSlot::PanelBackground).rgb();
     std::set<QRgb> colors;
     int framePixels = 0;
     for (int x = static_cast<int>((plot.left() - 3) * ratio); x < image.width(); ++x) {
