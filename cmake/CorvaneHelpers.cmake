@@ -141,6 +141,7 @@ endfunction()
 function(corvane_add_fuzzer name)
   cmake_parse_arguments(arg "" "" "SOURCES;LINK" ${ARGN})
   corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK})
+  target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/fuzz")
   target_link_options(${name} PRIVATE -fsanitize=fuzzer)
   set_target_properties(${name} PROPERTIES
     AUTOMOC OFF AUTOUIC OFF AUTORCC OFF RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/fuzz")
