@@ -3,26 +3,62 @@
 
 #include <QTest>
 
+#include <initializer_list>
 #include <source_location>
+#include <tuple>
+#include <type_traits>
+#include <utility>
 #include <vector>
 
-/// Runs `check` for each row of a table, and names the row where it fails; the rows after it aren't
-/// run. A row is a plain struct that begins with its name, `const char *name`; `check` holds the
-/// QCOMPAREs:
+namespace rows {
+
+template <typename Class, typename... Values>
+std::tuple<const char *, std::decay_t<Values>...> rowOf(void (Class::*)(Values...) const);
+
+/// The row that a lambda takes: its name, then a value for each parameter.
+template <typename Check>
+using RowOf = decltype(rowOf(&Check::operator()));
+
+/// Says in which row the test has failed; false if it hasn't.
+inline bool tellFailure(const char *name, const std::source_location &place)
+{
+    if (!QTest::currentTestFailed()) {
+        return false;
+    }
+    const QByteArray text = "in the row '" + QByteArray(name) + '\'';
+    QTest::qFail(text.constData(), place.file_name(), static_cast<int>(place.line()));
+    return true;
+}
+
+} // namespace rows
+
+/// Runs `check`, which holds the QCOMPAREs, for each row of a table: a name and a value for each
+/// parameter of `check`. Names the row that fails; those after it aren't run.
 ///
-///     struct Row { const char *name; int a; int sum; };
-///     forRows<Row>({{"nothing", 0, 1}, {"one", 1, 2}}, [](const Row &row) {
-///         QCOMPARE(row.a + 1, row.sum);
+///     forRows({{"nothing", 0, 1}, {"one", 1, 2}}, [](int value, int next) {
+///         QCOMPARE(value + 1, next);
 ///     });
-template <typename Row, typename Check>
-void forRows(const std::vector<Row> &rows, const Check &check,
+template <typename Check>
+void forRows(std::initializer_list<rows::RowOf<Check>> table, const Check &check,
              const std::source_location &place = std::source_location::current())
 {
-    for (const Row &row : rows) {
+    for (const auto &row : table) {
+        std::apply([&check](const char *, const auto &...values) { check(values...); }, row);
+        if (rows::tellFailure(std::get<0>(row), place)) {
+            return;
+        }
+    }
+}
+
+/// As above for rows that are plain structs, for tables with many columns or made by a loop. The
+/// first member is `const char *name`.
+template <typename Row, typename Check>
+void forRows(const std::vector<Row> &table, const Check &check,
+             const std::source_location &place = std::source_location::current())
+{
+    for (const Row &row : table) {
         check(row);
-        if (QTest::currentTestFailed()) {
-            const QByteArray text = "in the row '" + QByteArray(row.name) + '\'';
-            QTest::qFail(text.constData(), place.file_name(), static_cast<int>(place.line()));
+        if (rows::tellFailure(row.name, place)) {
             return;
         }
     }

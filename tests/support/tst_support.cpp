@@ -25,14 +25,18 @@ private slots:
 
 void TestSupport::rows()
 {
+    int sum = 0;
+    forRows({{"one", 1, "a"}, {"two", 2, "ab"}}, [&](int value, const QByteArray &text) {
+        QCOMPARE(text.size(), value);
+        sum += value;
+    });
     struct Row
     {
         const char *name;
         int value;
     };
-    int sum = 0;
     forRows<Row>({{"one", 1}, {"two", 2}}, [&](const Row &row) { sum += row.value; });
-    QCOMPARE(sum, 3);
+    QCOMPARE(sum, 6);
 }
 
 void TestSupport::logLines()
