@@ -4,7 +4,7 @@
 #include "LocalTreeRemover.h"
 #include "instrument/remotepaths.h"
 #include "log/Tracer.h"
-#include "toolframe/QtProgressDialog.h"
+#include "toolframe/runjob.h"
 
 #include <QDir>
 #include <QFile>
@@ -133,11 +133,8 @@ bool LocalPaneFiles::removeEmptyFolder(const QString &path)
 bool LocalPaneFiles::removeTree(const QString &path, QWidget *parent)
 {
     logStep("Deleting folder structure", path);
-    QtProgressDialog progress("Deleting Files...", parent);
-    LocalTreeRemover remover;
-    connect(&remover, &LocalTreeRemover::ProgressUpdate, &progress, &QtProgressDialog::setValue);
-    connect(&progress, &QtProgressDialog::canceled, &remover, &LocalTreeRemover::cancel);
-    return remover.remove(withoutEndSlash(path)) ||
+    LocalTreeRemover remover(withoutEndSlash(path));
+    return runJob(remover, parent, nullptr) == JobOutcome::Finished ||
            fail("Deleting folder structure failed.", remover.failedPath(), remover.reason());
 }
 

@@ -8,23 +8,27 @@
 
 #include <cerrno>
 #include <cstring>
+#include <utility>
 
-bool LocalTreeRemover::remove(const QString &folder)
+LocalTreeRemover::LocalTreeRemover(QString folder, QObject *parent)
+    : ToolJob(parent)
+    , m_folder(std::move(folder))
 {
-    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    return removeContents(folder, clock);
 }
 
-void LocalTreeRemover::cancel()
+bool LocalTreeRemover::work()
 {
-    m_cancelled = true;
+    emit stepStarted("Deleting Files...");
+    // Nobody has counted the entries, so that there is no progress to tell.
+    ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, cancelFlag());
+    return removeContents(m_folder, clock);
 }
 
 bool LocalTreeRemover::removeContents(const QString &folder, ProgressClock &clock)
 {
     const QFileInfoList entries = QDir(folder).entryInfoList(Everything, QDir::Unsorted);
     for (const QFileInfo &entry : entries) {
-        if (clock.shouldStop(-1) || m_cancelled) {
+        if (clock.shouldStop(-1) || isCancelled()) {
             return fail(folder, "Cancelled.");
         }
         const QString path = entry.filePath();

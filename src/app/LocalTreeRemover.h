@@ -1,17 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <QDir>
-#include <QObject>
-#include <QString>
+#include "jobs/ToolJob.h"
 
-#include <atomic>
+#include <QDir>
+#include <QString>
 
 class ProgressClock;
 
 /// Removes a local folder with all that lies in it. A link to a folder is removed as a link and
-/// never followed. An object serves one removal.
-class LocalTreeRemover : public QObject
+/// never followed. Stops at the first
+/// entry that can't be removed, and on cancel; what was removed by then is gone.
+class LocalTreeRemover : public ToolJob
 {
     Q_OBJECT
 
@@ -21,28 +21,20 @@ public:
     static constexpr QDir::Filters Everything =
         QDir::AllEntries | QDir::Hidden | QDir::System | QDir::NoDotAndDotDot;
 
-    using QObject::QObject;
-
-    /// Stops at the first entry that can't be removed, and on cancel; false then. What was removed
-    /// by then is gone. Lets the event loop run every 100 ms.
-    [[nodiscard]] bool remove(const QString &folder);
+    explicit LocalTreeRemover(QString folder, QObject *parent = nullptr);
 
     /// After a failure: the entry that stopped it, and why.
     [[nodiscard]] QString failedPath() const { return m_failedPath; }
     [[nodiscard]] QString reason() const { return m_reason; }
 
-public slots:
-    void cancel();
-
-signals:
-    /// -1, since nobody has counted the entries.
-    void ProgressUpdate(int iPercentage);
+protected:
+    [[nodiscard]] bool work() override;
 
 private:
     [[nodiscard]] bool removeContents(const QString &folder, ProgressClock &clock);
     bool fail(const QString &path, const QString &reason);
 
-    std::atomic<bool> m_cancelled{false};
+    QString m_folder;
     QString m_failedPath;
     QString m_reason;
 };

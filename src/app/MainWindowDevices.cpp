@@ -69,7 +69,7 @@ void MainWindow::newDeviceSelection(int /*iIndex*/)
 
 void MainWindow::selectDevice(Pane &pane)
 {
-    if (isSameInstrument(pane.device->currentText(), otherPane(pane).device->currentText())) {
+    if (isSameInstrument(*pane.device, *otherPane(pane).device)) {
         Tracer::Trace(Tracer::Warning, "Warning: The same device cannot be selected twice.");
         const QSignalBlocker blocker(pane.device);
         pane.device->setCurrentIndex(0);

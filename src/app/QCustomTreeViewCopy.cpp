@@ -4,9 +4,9 @@
 
 #include "PaneFiles.h"
 #include "deviceactions.h"
-#include "instrument/remotepaths.h"
 #include "instrument/VisaDevice.h"
-#include "jobs/CopyJob.h"
+#include "instrument/remotepaths.h"
+#include "jobs/instrument/CopyJob.h"
 #include "toolframe/QtProgressDialog.h"
 
 #include <QApplication>

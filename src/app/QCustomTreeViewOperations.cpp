@@ -4,8 +4,8 @@
 
 #include "PaneFiles.h"
 #include "deviceactions.h"
-#include "instrument/remotepaths.h"
 #include "instrument/VisaDevice.h"
+#include "instrument/remotepaths.h"
 #include "toolframe/questions.h"
 
 void QCustomTreeView::slot_default()
@@ -94,9 +94,9 @@ void QCustomTreeView::slot_remove()
     }
     bool done = false;
     if (!m_files->isRealFolder(path)) {
-        if (!askYesNo(
-                this, "Delete File",
-                QString("Do you really want to delete the file\n%1 ?").arg(withoutEndSlash(path)))) {
+        if (!askYesNo(this, "Delete File",
+                      QString("Do you really want to delete the file\n%1 ?")
+                          .arg(withoutEndSlash(path)))) {
             return;
         }
         done = m_files->removeFile(path);

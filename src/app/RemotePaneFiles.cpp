@@ -5,7 +5,7 @@
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
 #include "log/Tracer.h"
-#include "toolframe/QtProgressDialog.h"
+#include "toolframe/runjob.h"
 
 #include <QTreeView>
 
@@ -136,48 +136,39 @@ QString RemotePaneFiles::removeTreeQuestion(const QString &path) const
 
 bool RemotePaneFiles::createFolder(const QString &parent, const QString &name)
 {
-    return report(device()->makeDirectory(native(parent), name),
-                  "Creation of the new folder failed.");
+    return run(EntryJob::Operation::MakeFolder, parent + name, {},
+               "Creation of the new folder failed.");
 }
 
 bool RemotePaneFiles::rename(const QString &path, const QString &newName)
 {
     const bool folder = isFolderPath(path);
     logStep(folder ? "Renaming folder" : "Renaming file", path);
-    return report(device()->renameEntry(native(parentFolder(path)), entryName(path), newName),
-                  folder ? "Renaming folder failed." : "Renaming file failed.");
+    return run(EntryJob::Operation::Rename, path, newName,
+               folder ? "Renaming folder failed." : "Renaming file failed.");
 }
 
 bool RemotePaneFiles::removeFile(const QString &path)
 {
     logStep("Deleting file", path);
-    // The view has asked already.
-    return report(device()->deleteRemoteFile(native(path), false), "Deleting file failed.");
+    return run(EntryJob::Operation::RemoveFile, path, {}, "Deleting file failed.");
 }
 
 bool RemotePaneFiles::removeEmptyFolder(const QString &path)
 {
     logStep("Deleting folder", path);
-    return report(device()->removeDirectory(native(parentFolder(path)), entryName(path)),
-                  "Deleting folder failed.");
+    return run(EntryJob::Operation::RemoveFolder, path, {}, "Deleting folder failed.");
 }
 
 bool RemotePaneFiles::removeTree(const QString &path, QWidget *parent)
 {
-    bool done = false;
-    bool canceled = false;
-    {
-        QtProgressDialog progress("Deleting Files...", parent);
-        connect(device(), &VisaDevice::ProgressUpdate, &progress, &QtProgressDialog::setValue);
-        connect(&progress, &QtProgressDialog::canceled, device(), &VisaDevice::cancel);
-        done = device()->removeTree(native(parentFolder(path)), entryName(path));
-        canceled = progress.wasCanceled();
-    }
-    if (!done && !canceled) {
+    RemoveTreeJob job({.device = device()}, path);
+    const JobOutcome outcome = runJob(job, parent, nullptr);
+    if (outcome == JobOutcome::Failed) {
         emit infoTextAvailable("An error occured while trying to delete a folder.\n"
                                "Please see the message log for details.");
     }
-    return done;
+    return outcome == JobOutcome::Finished;
 }
 
 QString RemotePaneFiles::native(const QString &path) const
@@ -185,13 +176,13 @@ QString RemotePaneFiles::native(const QString &path) const
     return nativePath(path, device()->pathSeparator());
 }
 
-bool RemotePaneFiles::report(bool done, const QString &words)
+bool RemotePaneFiles::run(EntryJob::Operation operation, const QString &path,
+                          const QString &newName, const QString &words)
 {
-    // A command that the instrument refuses is answered as done; only the queue tells.
-    if (done && device()->checkErrorQueue()) {
+    EntryJob job({.device = device()}, operation, path, newName);
+    if (job.run() == JobOutcome::Finished) {
         return true;
     }
-    const QString reason = device()->takeLastError();
-    emit failed(QString("%1 %2").arg(words, reason).simplified());
+    emit failed(QString("%1 %2").arg(words, job.reported()).simplified());
     return Tracer::fail(words);
 }

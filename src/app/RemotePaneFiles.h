@@ -3,6 +3,8 @@
 
 #include "PaneFiles.h"
 
+#include "jobs/instrument/EntryJob.h"
+
 class RemoteDirModel;
 
 /// The operations on the files of an instrument. Each asks the instrument and so blocks for the
@@ -41,9 +43,9 @@ private:
     /// The path as the instrument writes it.
     [[nodiscard]] QString native(const QString &path) const;
 
-    /// Passes the words of a failed step on with what the instrument reported; true if it didn't
-    /// fail.
-    bool report(bool done, const QString &words);
+    /// Runs an operation; the words of a failure go out with what the instrument reported.
+    [[nodiscard]] bool run(EntryJob::Operation operation, const QString &path,
+                           const QString &newName, const QString &words);
 
     RemoteDirModel *m_model;
 };

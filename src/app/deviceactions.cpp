@@ -3,20 +3,22 @@
 
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
-#include "jobs/CopyJob.h"
-#include "log/Tracer.h"
+#include "jobs/instrument/CopyJob.h"
+#include "jobs/instrument/StartJob.h"
 #include "toolframe/QtProgressDialog.h"
 #include "toolframe/questions.h"
+#include "toolframe/runjob.h"
 
 namespace {
 
 /// Lets one window at a time ask for the user: the question, then the progress again.
 template <typename Question>
-bool askBetween(QtProgressDialog &progress, const Question &question)
+bool askBetween(const Question &question)
 {
-    progress.suspend();
+    QtProgressDialog *progress = QtProgressDialog::running();
+    progress->suspend();
     const bool answer = question();
-    progress.resume();
+    progress->resume();
     return answer;
 }
 
@@ -58,34 +60,31 @@ QString outcomeText(const CopyJob &job, bool done)
 
 QString copyEntry(QWidget *parent, const CopyRequest &request)
 {
-    QtProgressDialog progress({}, parent);
     const CopyQuestions questions{
         .proceed =
             [&](qsizetype files, qint64 bytes) {
-                return askBetween(progress, [&] {
-                    return askYesNo(parent, "Copy Folder", proceedText(files, bytes));
-                });
+                return askBetween(
+                    [&] { return askYesNo(parent, "Copy Folder", proceedText(files, bytes)); });
             },
         .replace =
             [&](const QStringList &paths) {
-                return askBetween(progress, [&] {
-                    return askYesNo(parent, "Overwrite File", replaceText(paths));
-                });
+                return askBetween(
+                    [&] { return askYesNo(parent, "Overwrite File", replaceText(paths)); });
             },
         .goOn =
             [&] {
-                return askBetween(progress, [&] {
+                return askBetween([&] {
                     return askYesNo(parent, "Copy Folder",
                                     "An error occured during copying. Do you want to proceed with "
                                     "the next file?");
                 });
             }};
     CopyJob job(request, questions);
-    QObject::connect(&job, &ToolJob::stepStarted, &progress, &QtProgressDialog::setLabelText);
-    QObject::connect(&job, &CopyJob::bytesCopied, &progress, &QtProgressDialog::setBytes);
-    QObject::connect(&job, &ToolJob::ProgressUpdate, &progress, &QtProgressDialog::setValue);
-    QObject::connect(&progress, &QtProgressDialog::canceled, &job, &ToolJob::cancel);
-    return outcomeText(job, job.run() == JobOutcome::Finished);
+    QObject::connect(&job, &CopyJob::bytesCopied, parent, [](qint64 done, qint64 total) {
+        QtProgressDialog::running()->setBytes(done, total);
+    });
+    const JobOutcome outcome = runJob(job, parent, nullptr);
+    return outcomeText(job, outcome == JobOutcome::Finished);
 }
 
 bool isRunnable(const QString &path, const VisaDevice *device)
@@ -95,23 +94,8 @@ bool isRunnable(const QString &path, const VisaDevice *device)
 
 QString runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
 {
-    constexpr quint32 answerTimeoutMs = 5000;
-    const quint32 savedTimeoutMs = device.timeoutMs();
-    (void)device.setTimeoutMs(answerTimeoutMs);
-    bool started = false;
-    {
-        QtProgressDialog progress("Starting ARB...", parent);
-        QObject::connect(&progress, &QtProgressDialog::canceled, &device, &VisaDevice::cancel);
-        QObject::connect(&device, &VisaDevice::ProgressUpdate, &progress,
-                         &QtProgressDialog::setValue);
-        started = device.startArb(nativePath(path, device.pathSeparator()));
-    }
-    if (started) {
-        device.checkErrorQueue();
-    } else {
-        Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
-    }
-    (void)device.setTimeoutMs(savedTimeoutMs);
+    StartJob job({.device = &device}, path);
+    const bool started = runJob(job, parent, nullptr) == JobOutcome::Finished;
     return QString(started ? "'%1' plays on %2, %3."
                            : "'%1' was not started on %2, %3; see the log.")
         .arg(entryName(path), device.model(), device.serial());

@@ -7,30 +7,28 @@
 
 namespace {
 
-const QString localText = "Local";
-
-QString serialOf(const QString &text)
-{
-    constexpr int comparedLength = 6;
-    return text.section(',', 1, 1).trimmed().left(comparedLength);
-}
+constexpr int EntryRole = Qt::UserRole + 1;
 
 } // namespace
 
 void fillDeviceChoice(QComboBox &choice, const QList<InstrConfigEntry> &instruments)
 {
     choice.clear();
-    choice.addItem(localText, QString());
+    choice.addItem("Local", QString());
     for (const InstrConfigEntry &entry : instruments) {
         if (entry.enabled) {
             choice.addItem(QString("%1, %2, %3").arg(entry.model, entry.serial, entry.interface),
                            entry.resource);
+            choice.setItemData(choice.count() - 1, QVariant::fromValue(entry), EntryRole);
         }
     }
 }
 
-bool isSameInstrument(const QString &one, const QString &other)
+bool isSameInstrument(const QComboBox &one, const QComboBox &other)
 {
-    return one != localText && one.section(',', 0, 0) == other.section(',', 0, 0) &&
-           serialOf(one) == serialOf(other);
+    constexpr int comparedLength = 6;
+    const auto first = one.currentData(EntryRole).value<InstrConfigEntry>();
+    const auto second = other.currentData(EntryRole).value<InstrConfigEntry>();
+    return !first.resource.isEmpty() && first.model == second.model &&
+           first.serial.left(comparedLength) == second.serial.left(comparedLength);
 }

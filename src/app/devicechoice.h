@@ -13,6 +13,6 @@ struct InstrConfigEntry;
 /// for their data. What was chosen before is lost.
 void fillDeviceChoice(QComboBox &choice, const QList<InstrConfigEntry> &instruments);
 
-/// Whether two texts of choices name the same instrument: the same model, and the first six
-/// characters of its serial number. "Local" is none.
-[[nodiscard]] bool isSameInstrument(const QString &one, const QString &other);
+/// Whether two choices stand on the same instrument: the same model, and the first six characters
+/// of its serial number. "Local" is none.
+[[nodiscard]] bool isSameInstrument(const QComboBox &one, const QComboBox &other);

@@ -6,16 +6,18 @@
 #include "instrument/InstrumentSummary.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
-#include "jobs/ToolJob.h"
+#include "jobs/instrument/EntryJob.h"
+#include "jobs/instrument/ListJob.h"
+#include "jobs/instrument/QueryJob.h"
+#include "jobs/instrument/ScanJob.h"
+#include "jobs/instrument/StartJob.h"
+#include "jobs/instrument/TransferJob.h"
 
-#include <QCoreApplication>
 #include <QDir>
 #include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
-
-#include <algorithm>
 
 namespace {
 
@@ -31,98 +33,42 @@ struct InstrumentArguments
     bool json = false;
     bool recursive = false;
     bool force = false;
+    bool needsInstrument = false;
+    int (*run)(InstrumentArguments &) = nullptr;
 };
 
-using Work = std::function<bool(VisaDevice &)>;
-
-/// Runs some work on a device of its own, which SIGINT cancels through the job.
-class DeviceJob final : public ToolJob
+int runNamed(InstrumentArguments &arguments)
 {
-public:
-    /// With a resource, the work finds the device open.
-    DeviceJob(Console &console, QString resource, QString label, Work work)
-        : m_console(console)
-        , m_resource(std::move(resource))
-        , m_label(std::move(label))
-        , m_work(std::move(work))
-    {
-    }
-
-    /// The instrument's own words on a failure that has another reason besides.
-    [[nodiscard]] const QString &instrumentWords() const { return m_instrumentWords; }
-
-private:
-    [[nodiscard]] bool work() override
-    {
-        VisaDevice device;
-        const JobStep step(*this, m_label, device);
-        if (const QString problem = device.takeLastError(); !problem.isEmpty()) {
-            m_console.error(problem);
-        }
-        const bool isReady = m_resource.isEmpty() || device.openResource(m_resource);
-        // A SIGINT from while the instrument was being opened.
-        QCoreApplication::processEvents();
-        if (isCancelled()) {
-            return false;
-        }
-        if (!isReady && m_console.lastReason().isEmpty()) {
-            m_console.error("The instrument '" + m_resource + "' cannot be reached.");
-        }
-        const bool done = isReady && m_work(device);
-        if (!done && !isCancelled()) {
-            explain(device);
-        }
-        return done;
-    }
-
-    void explain(VisaDevice &device)
-    {
-        if (device.isOpen()) {
-            device.checkErrorQueue();
-        }
-        const QString reported = device.takeLastError().trimmed().replace('\n', "; ");
-        if (!reported.isEmpty()) {
-            m_instrumentWords = "The instrument reports: " + reported;
-        }
-        if (m_console.lastReason().isEmpty()) {
-            m_console.error(reported.isEmpty() ? "The instrument did not do as it was told."
-                                               : m_instrumentWords);
-            m_instrumentWords.clear();
-        }
-    }
-
-    Console &m_console;
-    QString m_resource;
-    QString m_label;
-    Work m_work;
-    QString m_instrumentWords;
-};
-
-int runSession(const InstrumentArguments &arguments, const QString &label, const Work &work)
-{
-    const QString resource = resourceOf(arguments.resource);
-    if (resource.isEmpty()) {
+    if (arguments.needsInstrument && resourceOf(arguments.resource).isEmpty()) {
         return arguments.console.wrongUsage("RES: the name of the instrument is empty");
     }
-    DeviceJob job(arguments.console, resource, label, work);
-    const int exitCode = arguments.console.run(job);
-    // Behind the reason that the program saw, as they tell more.
-    if (exitCode == ExitFailed && !job.instrumentWords().isEmpty()) {
-        arguments.console.error(job.instrumentWords());
+    return arguments.run(arguments);
+}
+
+/// Runs a job; behind the reason that the program saw goes what the instrument reported, as that
+/// tells more.
+int runJob(Console &console, InstrumentJob &job)
+{
+    const int exitCode = console.run(job);
+    const QString words = "The instrument reports: " + job.reported();
+    if (exitCode == ExitFailed && !job.reported().isEmpty() && console.lastReason() != words) {
+        console.error(words);
     }
     return exitCode;
+}
+
+/// Makes a job for the instrument of the arguments and runs it.
+template <typename Job, typename... Request>
+int runOn(const InstrumentArguments &arguments, const Request &...request)
+{
+    Job job({.resource = resourceOf(arguments.resource)}, request...);
+    return runJob(arguments.console, job);
 }
 
 /// Ends a command with its result on standard output.
 int printed(Console &console, int exitCode, const QByteArray &text)
 {
     return exitCode != ExitDone || console.print(text) ? exitCode : console.failed();
-}
-
-/// What an instrument refuses without an answer of its own stands in its error queue.
-Work checked(const Work &work)
-{
-    return [work](VisaDevice &device) { return work(device) && device.checkErrorQueue(); };
 }
 
 QJsonObject infoObject(const InstrumentSummary &summary)
@@ -170,41 +116,28 @@ QByteArray infoLines(const InstrumentSummary &summary)
 
 int runInfo(InstrumentArguments &arguments)
 {
-    InstrumentSummary summary;
-    const int exitCode = runSession(arguments, "Reading...", [&](VisaDevice &device) {
-        summary = summaryOf(device);
-        return true;
-    });
+    IdentifyJob job({.resource = resourceOf(arguments.resource)});
+    const int exitCode = runJob(arguments.console, job);
     return printed(arguments.console, exitCode,
-                   arguments.json ? QJsonDocument(infoObject(summary)).toJson()
-                                  : infoLines(summary));
+                   arguments.json ? QJsonDocument(infoObject(job.summary())).toJson()
+                                  : infoLines(job.summary()));
 }
 
 int runScan(InstrumentArguments &arguments)
 {
+    ScanJob job(arguments.scanKind);
+    const int exitCode = arguments.console.run(job);
     QJsonArray objects;
     QString text;
-    const Work scan = [&](VisaDevice &device) {
-        // The scan lets no events through by itself.
-        QObject::connect(&device, &VisaDevice::ProgressUpdate, &device,
-                         [] { QCoreApplication::processEvents(); });
-        QList<VisaDevice *> found;
-        const bool done = device.scanResources(found, arguments.scanKind);
-        for (const VisaDevice *instrument : std::as_const(found)) {
-            objects.append(QJsonObject{{"resource", instrument->resource()},
-                                       {"model", instrument->model()},
-                                       {"serial", instrument->serial()},
-                                       {"interface", instrument->interfaceName()}});
-            text += QStringList{instrument->resource(), instrument->model(), instrument->serial(),
-                                instrument->interfaceName()}
-                        .join('\t') +
-                    '\n';
-        }
-        qDeleteAll(found);
-        return done;
-    };
-    DeviceJob job(arguments.console, {}, "Scanning...", scan);
-    const int exitCode = arguments.console.run(job);
+    for (const InstrumentSummary &found : job.found()) {
+        objects.append(QJsonObject{{"resource", found.resource},
+                                   {"model", found.model},
+                                   {"serial", found.serial},
+                                   {"interface", found.interfaceName}});
+        text +=
+            QStringList{found.resource, found.model, found.serial, found.interfaceName}.join('\t') +
+            '\n';
+    }
     return printed(arguments.console, exitCode,
                    arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
 }
@@ -214,13 +147,12 @@ int runQuery(InstrumentArguments &arguments)
     if (arguments.first.isEmpty()) {
         return arguments.console.wrongUsage("COMMAND: the query is empty");
     }
-    QString answer;
-    const int exitCode = runSession(arguments, "Reading...", [&](VisaDevice &device) {
-        return device.queryText(arguments.first, answer);
-    });
+    QueryJob job({.resource = resourceOf(arguments.resource)}, QueryJob::Kind::Query,
+                 arguments.first);
+    const int exitCode = runJob(arguments.console, job);
     // An answer counts even where the instrument also complained.
-    if ((exitCode == ExitDone || !answer.isEmpty()) &&
-        !arguments.console.print(answer.toLocal8Bit() + '\n')) {
+    if ((exitCode == ExitDone || !job.answer().isEmpty()) &&
+        !arguments.console.print(job.answer().toLocal8Bit() + '\n')) {
         return arguments.console.failed();
     }
     return exitCode;
@@ -228,15 +160,10 @@ int runQuery(InstrumentArguments &arguments)
 
 int runSend(InstrumentArguments &arguments)
 {
-    const QString &command = arguments.first;
-    if (command.isEmpty()) {
+    if (arguments.first.isEmpty()) {
         return arguments.console.wrongUsage("COMMAND: the command is empty");
     }
-    return runSession(arguments, "Sending...", [&](VisaDevice &device) {
-        // After a query that nobody reads, the answer to the next one would be that of this one.
-        const bool leavesAnswer = command.contains('?') && !command.contains("*OPC?");
-        return device.sendCommand(command) && (leavesAnswer || device.checkErrorQueue());
-    });
+    return runOn<QueryJob>(arguments, QueryJob::Kind::Command, arguments.first);
 }
 
 int runList(InstrumentArguments &arguments)
@@ -244,15 +171,11 @@ int runList(InstrumentArguments &arguments)
     if (const QString problem = pathProblem(arguments.first); !problem.isEmpty()) {
         return arguments.console.wrongUsage("PATH: " + problem);
     }
-    QList<RemoteFileEntry> entries;
-    const int exitCode = runSession(arguments, "Reading...", [&](VisaDevice &device) {
-        return arguments.recursive
-                   ? device.listTreeEntries(entries, withoutEndSlash(arguments.first))
-                   : device.listDirectory(entries, arguments.first);
-    });
+    ListJob job({.resource = resourceOf(arguments.resource)}, arguments.first, arguments.recursive);
+    const int exitCode = runJob(arguments.console, job);
     QJsonArray objects;
     QString text;
-    for (const RemoteFileEntry &entry : std::as_const(entries)) {
+    for (const RemoteFileEntry &entry : job.entries()) {
         objects.append(
             QJsonObject{{"name", entry.name}, {"type", entry.type}, {"size", entry.size}});
         text += entry.type.leftJustified(4) + QString::number(entry.size).rightJustified(12) +
@@ -262,43 +185,43 @@ int runList(InstrumentArguments &arguments)
                    arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
 }
 
-/// For the commands that take one folder apart into its parent and its name.
-int runOnFolder(InstrumentArguments &arguments, const QString &label,
-                bool (VisaDevice::*operation)(const QString &, const QString &))
+/// For the commands that take a path apart into a folder and a name.
+int badFullPath(const InstrumentArguments &arguments, const char *name, const QString &path)
 {
-    const QString path = withoutEndSlash(arguments.first);
-    if (const QString problem = fullPathProblem(path); !problem.isEmpty()) {
-        return arguments.console.wrongUsage("PATH: " + problem);
-    }
-    const RemotePath parts = splitPath(path);
-    return runSession(arguments, label, checked([&](VisaDevice &device) {
-                          return (device.*operation)(parts.directory, parts.fileName);
-                      }));
+    const QString problem = fullPathProblem(withoutEndSlash(path));
+    return problem.isEmpty() ? ExitDone : arguments.console.wrongUsage(name + problem);
 }
 
 int runMakeFolder(InstrumentArguments &arguments)
 {
-    return runOnFolder(arguments, "Creating folder...", &VisaDevice::makeDirectory);
+    const int bad = badFullPath(arguments, "PATH: ", arguments.first);
+    return bad != ExitDone
+               ? bad
+               : runOn<EntryJob>(arguments, EntryJob::Operation::MakeFolder, arguments.first);
 }
 
 int runRemoveFolder(InstrumentArguments &arguments)
 {
-    return runOnFolder(arguments, "Deleting Files...",
-                       arguments.recursive ? &VisaDevice::removeTree
-                                           : &VisaDevice::removeDirectory);
+    const int bad = badFullPath(arguments, "PATH: ", arguments.first);
+    if (bad != ExitDone) {
+        return bad;
+    }
+    return arguments.recursive
+               ? runOn<RemoveTreeJob>(arguments, arguments.first)
+               : runOn<EntryJob>(arguments, EntryJob::Operation::RemoveFolder, arguments.first);
 }
 
 int runMove(InstrumentArguments &arguments)
 {
-    const QString oldPath = withoutEndSlash(arguments.first);
-    const QString newPath = withoutEndSlash(arguments.second);
-    if (const QString problem = fullPathProblem(oldPath); !problem.isEmpty()) {
-        return arguments.console.wrongUsage("OLD: " + problem);
+    const int bad = badFullPath(arguments, "OLD: ", arguments.first);
+    if (bad != ExitDone) {
+        return bad;
     }
+    const QString newPath = withoutEndSlash(arguments.second);
     if (const QString problem = pathProblem(newPath); !problem.isEmpty()) {
         return arguments.console.wrongUsage("NEW: " + problem);
     }
-    const RemotePath oldParts = splitPath(oldPath);
+    const RemotePath oldParts = splitPath(withoutEndSlash(arguments.first));
     const RemotePath newParts = splitPath(newPath);
     const auto isSameFolder = [](const QString &a, const QString &b) {
         return slashPath(a, '\\') == slashPath(b, '\\');
@@ -308,10 +231,8 @@ int runMove(InstrumentArguments &arguments)
         return arguments.console.wrongUsage("NEW: '" + newPath + "' is no name in the folder '" +
                                             oldParts.directory + "'");
     }
-    return runSession(arguments, "Renaming...", checked([&](VisaDevice &device) {
-                          return device.renameEntry(oldParts.directory, oldParts.fileName,
-                                                    newParts.fileName);
-                      }));
+    return runOn<EntryJob>(arguments, EntryJob::Operation::Rename, arguments.first,
+                           newParts.fileName);
 }
 
 int runRemoveFile(InstrumentArguments &arguments)
@@ -319,9 +240,7 @@ int runRemoveFile(InstrumentArguments &arguments)
     if (const QString problem = pathProblem(arguments.first); !problem.isEmpty()) {
         return arguments.console.wrongUsage("PATH: " + problem);
     }
-    return runSession(arguments, "Deleting...", [&](VisaDevice &device) {
-        return device.deleteRemoteFile(arguments.first, false);
-    });
+    return runOn<EntryJob>(arguments, EntryJob::Operation::RemoveFile, arguments.first);
 }
 
 int runGet(InstrumentArguments &arguments)
@@ -340,9 +259,7 @@ int runGet(InstrumentArguments &arguments)
     if (!mayWrite(arguments.console, local, arguments.force)) {
         return arguments.console.failed();
     }
-    return runSession(arguments, "Reading file...", [&](VisaDevice &device) {
-        return device.readRemoteFile(remote, local, OutputFile::Unfinished::Vanishes);
-    });
+    return runOn<TransferJob>(arguments, TransferJob::Direction::Get, local, remote);
 }
 
 int runPut(InstrumentArguments &arguments)
@@ -359,8 +276,7 @@ int runPut(InstrumentArguments &arguments)
     if (remote.endsWith('/') || remote.endsWith('\\')) {
         remote += QFileInfo(local).fileName();
     }
-    return runSession(arguments, "Sending file...",
-                      [&](VisaDevice &device) { return device.writeRemoteFile(local, remote); });
+    return runOn<TransferJob>(arguments, TransferJob::Direction::Put, local, remote);
 }
 
 int runStart(InstrumentArguments &arguments)
@@ -372,11 +288,8 @@ int runStart(InstrumentArguments &arguments)
     if (!path.endsWith(".wv", Qt::CaseInsensitive)) {
         return arguments.console.wrongUsage("REMOTE: '" + path + "' is no waveform file (*.wv)");
     }
-    return runSession(arguments, "Starting ARB...", [&](VisaDevice &device) {
-        const auto seconds =
-            static_cast<int>(arguments.seconds.value_or(VisaDevice::DefaultArbSeconds));
-        return device.startArb(path, seconds);
-    });
+    return runOn<StartJob>(arguments, path,
+                           static_cast<int>(arguments.seconds.value_or(StartJob::DefaultSeconds)));
 }
 
 } // namespace
@@ -387,14 +300,15 @@ void addInstrumentCommands(CommandSet &commands)
     instr->require_subcommand(1);
     const auto add = [&](const std::string &name, const std::string &help,
                          int (*run)(InstrumentArguments &)) {
-        auto arguments =
-            std::make_shared<InstrumentArguments>(InstrumentArguments{.console = commands.console});
-        CLI::App &command = addCommand(*instr, name, help, commands.action, arguments, run);
+        auto arguments = std::make_shared<InstrumentArguments>(
+            InstrumentArguments{.console = commands.console, .run = run});
+        CLI::App &command = addCommand(*instr, name, help, commands.action, arguments, runNamed);
         return std::pair<CLI::App &, InstrumentArguments &>(command, *arguments);
     };
     const auto addOnDevice = [&](const std::string &name, const std::string &help,
                                  int (*run)(InstrumentArguments &)) {
         auto result = add(name, help, run);
+        result.second.needsInstrument = true;
         addText(result.first, "resource", result.second.resource,
                 "VISA resource string, host name or address")
             ->type_name("RES")

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <QMetaType>
 #include <QString>
 
 /// One instrument that the user has configured.
@@ -16,3 +17,5 @@ struct InstrConfigEntry
 
     friend bool operator==(const InstrConfigEntry &, const InstrConfigEntry &) = default;
 };
+
+Q_DECLARE_METATYPE(InstrConfigEntry)

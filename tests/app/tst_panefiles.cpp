@@ -3,8 +3,8 @@
 #include "app/LocalFileModel.h"
 #include "app/LocalTreeRemover.h"
 #include "app/PaneFiles.h"
-#include "instrument/remotepaths.h"
 #include "guitesting.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 
 #include <QDir>
@@ -194,17 +194,17 @@ void TestPaneFiles::failuresHaveTheirWords()
 
 void TestPaneFiles::treeRemovalStopsAtTheFirstFailure()
 {
-    LocalTreeRemover remover;
-    QVERIFY(!remover.remove("/proc/self/fdinfo"));
+    LocalTreeRemover remover("/proc/self/fdinfo");
+    QCOMPARE(remover.run(), JobOutcome::Failed);
     QVERIFY(remover.failedPath().startsWith("/proc/self/fdinfo/"));
     QVERIFY(!remover.reason().isEmpty());
 }
 
 void TestPaneFiles::treeRemovalCanBeCancelled()
 {
-    LocalTreeRemover remover;
+    LocalTreeRemover remover(path("folder"));
     remover.cancel();
-    QVERIFY(!remover.remove(path("folder")));
+    QCOMPARE(remover.run(), JobOutcome::Cancelled);
     QCOMPARE(remover.reason(), "Cancelled.");
     QVERIFY(QFileInfo::exists(path("folder/inner/file")));
 }

@@ -4,7 +4,7 @@
 #include "instrument/FakeInstrument.h"
 #include "instrument/LogRecorder.h"
 #include "instrument/VisaDevice.h"
-#include "jobs/CopyJob.h"
+#include "jobs/instrument/CopyJob.h"
 
 #include <QDir>
 #include <QFile>

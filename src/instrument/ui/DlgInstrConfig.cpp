@@ -4,10 +4,11 @@
 #include "instrument/InstrumentSummary.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
+#include "jobs/instrument/ScanJob.h"
 #include "log/Tracer.h"
-#include "toolframe/QtProgressDialog.h"
 #include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"
+#include "toolframe/runjob.h"
 #include "toolframe/windowplace.h"
 #include "ui_DlgInstrConfig.h"
 
@@ -19,6 +20,8 @@
 #include <QSet>
 #include <QSettings>
 #include <QSignalBlocker>
+
+#include <algorithm>
 
 namespace {
 
@@ -159,23 +162,15 @@ void DlgInstrConfig::rebuildTree()
     tree->clear();
     const QList<InstrConfigEntry> entries = m_list.entries();
     if (!entries.isEmpty()) {
-        QtProgressDialog progress({}, this);
-        VisaDevice device(m_noVisa);
+        LookJob job(entries, m_noVisa);
+        (void)runJob(job, this, nullptr);
         for (qsizetype i = 0; i < entries.size(); ++i) {
-            const InstrConfigEntry &entry = entries.at(i);
-            progress.setLabelText(QString("Looking for the instrument '%1'...")
-                                      .arg(instrumentName(entry.model, entry.serial)));
-            progress.setValue(static_cast<int>(100 * i / entries.size()));
-            // Those behind a cancel are shown as well, without being asked.
-            const bool isAsked = entry.enabled && !progress.wasCanceled();
-            const bool isBusy = isAsked && device.isOpenElsewhere(entry.model, entry.serial);
-            if (isAsked && !isBusy && device.openResource(entry.resource)) {
-                device.closeResource();
-                const InstrumentSummary summary = summaryOf(device);
-                m_list.identify(i, entryOf(summary, {}));
-                showOnline(entry, summary);
+            const LookJob::State &state = job.states().at(i);
+            if (state.summary) {
+                m_list.identify(i, entryOf(*state.summary, {}));
+                showOnline(entries.at(i), *state.summary);
             } else {
-                showOffline(entry, isBusy);
+                showOffline(entries.at(i), state.isBusy);
             }
         }
     }
@@ -198,30 +193,29 @@ void DlgInstrConfig::instr_add_manual()
     const QString trying = QString("Trying to open device '%1'...").arg(resource);
     Tracer::Trace(Tracer::Information, trying);
     say(trying);
-    VisaDevice device(m_noVisa);
     const InstrConfigEntry present = m_list.entries().value(m_list.indexOf(resource));
-    if (device.isOpenElsewhere(present.model, present.serial)) {
+    if (VisaDevice(m_noVisa).isOpenElsewhere(present.model, present.serial)) {
         // A second session might disturb the pane that works with it.
         reportKnownInstrument(present);
         say("The instrument was already added and is in use.");
         return;
     }
-    bool isOpen = false;
+    IdentifyJob job({.resource = resource, .noVisa = m_noVisa});
+    bool isKnown = false;
     {
         const QScopedValueRollback<bool> busy(m_busy, true);
         const WaitCursor cursor;
-        isOpen = device.openResource(resource);
-        device.closeResource();
+        isKnown = job.run() == JobOutcome::Finished;
     }
-    if (!isOpen) {
+    if (!isKnown) {
         const QString reason = QString("The device '%1' was not added.").arg(resource);
         Tracer::Trace(Tracer::Error, reason);
         say(reason + " See the log.");
         return;
     }
-    const bool isNew = addOnline(summaryOf(device), "Manually Added");
+    const bool isNew = addOnline(job.summary(), "Manually Added");
     say(QString(isNew ? "The instrument '%1' was added." : "The instrument '%1' was already added.")
-            .arg(instrumentName(device.model(), device.serial())));
+            .arg(instrumentName(job.summary().model, job.summary().serial)));
     m_ui->le_manual->selectAll();
     emit updateInstruments();
 }
@@ -241,25 +235,17 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
     if (m_busy) {
         return;
     }
-    QList<VisaDevice *> found;
-    bool done = false;
-    int added = 0;
+    ScanJob job(kind, m_noVisa);
+    JobOutcome outcome = JobOutcome::Failed;
     {
         const QScopedValueRollback<bool> busy(m_busy, true);
-        QtProgressDialog progress(kind == VisaDevice::ScanGpib ? "Scanning for GPIB devices..."
-                                                               : "Scanning for USB devices...",
-                                  this);
-        VisaDevice device(m_noVisa);
-        connect(&device, &VisaDevice::ProgressUpdate, &progress, &QtProgressDialog::setValue);
-        connect(&progress, &QtProgressDialog::canceled, &device, &VisaDevice::cancel);
-        done = device.scanResources(found, kind);
+        outcome = runJob(job, this, nullptr);
     }
-    for (const VisaDevice *device : std::as_const(found)) {
-        added += addOnline(summaryOf(*device), origin) ? 1 : 0;
-    }
-    const bool isChanged = !found.isEmpty();
-    qDeleteAll(found);
-    if (!done && !isChanged) {
+    const QList<InstrumentSummary> &found = job.found();
+    const auto added =
+        std::count_if(found.cbegin(), found.cend(),
+                      [&](const InstrumentSummary &summary) { return addOnline(summary, origin); });
+    if (outcome != JobOutcome::Finished && found.isEmpty()) {
         say("The scan found nothing. See the log.");
         return;
     }

@@ -10,7 +10,6 @@
 class QLabel;
 class QSettings;
 class QTreeWidgetItem;
-class VisaDevice;
 struct InstrumentSummary;
 
 namespace Ui {

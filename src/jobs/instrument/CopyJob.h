@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "ToolJob.h"
+#include "jobs/ToolJob.h"
 
 #include <QList>
 #include <QStringList>
@@ -19,7 +19,8 @@ struct CopyRequest
     QString source;         ///< a file; with "/" at its end a folder, whose contents are copied
     qint64 sourceBytes = 0; ///< of a file on an instrument, as its catalogue told
     VisaDevice *targetDevice = nullptr;
-    QString targetFolder; ///< ends in "/"
+    QString targetFolder; ///< ends in "/"; empty for the present one, with a name
+    QString targetName{}; ///< of a file at the target; empty for that of the source
 };
 
 /// What a copy asks its user in the middle of the run; an empty function stands for yes.
@@ -50,6 +51,9 @@ public:
     /// Files to copy, and those that were copied; also while and after running.
     [[nodiscard]] qsizetype fileCount() const { return m_files.size(); }
     [[nodiscard]] qsizetype copiedCount() const { return m_copiedCount; }
+
+    /// What the instruments have reported on the last file that failed, one error a line.
+    [[nodiscard]] const QString &reported() const { return m_reported; }
 
 signals:
     /// How much of the whole is copied, in bytes, as exact as the percentages of the transfers.
@@ -87,7 +91,8 @@ private:
     qint64 m_doneBytes = 0;    ///< of the files before the one in hand
     qsizetype m_fileIndex = 0; ///< of the one in hand
     qsizetype m_copiedCount = 0;
-    int m_leg = 0;               ///< of the way of the file in hand from instrument to instrument
-    int m_legCount = 1;          ///< 2 for a file that goes by way of the disk
+    int m_leg = 0;      ///< part of the way that the file in hand is on: 1 from the disk onwards
+    int m_legCount = 1; ///< 2 between two instruments, which is by way of the disk
+    QString m_reported;
     QStringList m_remoteFolders; ///< known to exist at the target
 };

@@ -48,7 +48,7 @@ bool CopyJob::work()
     if (m_request.sourceDevice == nullptr && m_request.targetDevice == nullptr) {
         return Tracer::fail("Copy operations between local file systems are not supported.");
     }
-    if (!m_request.targetFolder.endsWith('/')) {
+    if (!isFolderPath(m_request.targetFolder) && m_request.targetName.isEmpty()) {
         return Tracer::fail("The target location for the copy operation must be a folder.");
     }
     m_legCount = m_request.sourceDevice && m_request.targetDevice ? 2 : 1;
@@ -66,7 +66,7 @@ bool CopyJob::work()
         const File &file = m_files.at(m_fileIndex);
         showProgress(0);
         if (isCancelled()) {
-            return false; // here, for a transfer forgets what came before it
+            return false; // a transfer would forget a cancel from before it
         }
         if (isFolderRequest()) {
             Tracer::Trace(Tracer::Information,
@@ -90,7 +90,8 @@ bool CopyJob::collect()
     if (!isFolderRequest()) {
         const qint64 bytes =
             m_request.sourceDevice ? m_request.sourceBytes : QFileInfo(m_request.source).size();
-        const QString name = entryName(m_request.source);
+        const QString name =
+            m_request.targetName.isEmpty() ? entryName(m_request.source) : m_request.targetName;
         m_files = {{m_request.source, m_request.targetFolder + name, bytes}};
         m_totalBytes = bytes;
         return true;
@@ -208,10 +209,12 @@ bool CopyJob::transfer(VisaDevice *device, const QString &label, const char *fai
     const bool done = device->isOpen() ? run() : Tracer::fail("Device is not open.");
     disconnect(progress);
     disconnect(stop);
-    const QStringList reasons = device->takeLastError().split('\n', Qt::SkipEmptyParts);
+    const QString errors = device->takeLastError();
     if (done || isCancelled()) {
         return done;
     }
+    m_reported = errors;
+    const QStringList reasons = errors.split('\n', Qt::SkipEmptyParts);
     Tracer::Trace(Tracer::Error, failure);
     for (const QString &reason : reasons) {
         Tracer::Trace(Tracer::Error, reason);
@@ -285,7 +288,7 @@ bool CopyJob::makeRemoteFolder(const QString &folder)
 void CopyJob::showProgress(int percentOfFile)
 {
     const int wayPercent = (100 * m_leg + percentOfFile) / m_legCount;
-    // By files; the bytes beside it tell how long it takes.
+    // Each file counts the same here; bytesCopied() is the exact measure.
     emit ProgressUpdate(static_cast<int>((100 * m_fileIndex + wayPercent) / m_files.size()));
     emit bytesCopied(m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100, m_totalBytes);
 }
