@@ -2,12 +2,14 @@
 #include "base/ProgressClock.h"
 #include "base/SideWorker.h"
 #include "base/parallel.h"
+#include "support/rows.h"
 
 #include <QCoreApplication>
 #include <QDeadlineTimer>
 #include <QTest>
 #include <QTimer>
 
+#include <algorithm>
 #include <atomic>
 #include <thread>
 #include <vector>
@@ -19,67 +21,49 @@ class TestParallel : public QObject
 private slots:
     void cleanup() { setThreadLimit(0); }
 
-    void everyIndexOnce_data();
     void everyIndexOnce();
-    void sideWorkerKeepsTheOrder_data();
     void sideWorkerKeepsTheOrder();
     void sideWorkerEndsWithItsWorkDone();
     void clockTicksAndStops();
 };
 
-void TestParallel::everyIndexOnce_data()
+void TestParallel::everyIndexOnce()
 {
-    QTest::addColumn<unsigned>("limit");
-    QTest::addColumn<int>("count");
     for (const unsigned limit : {0U, 1U, 2U, 7U}) {
-        for (const int count : {0, 1, 2, 1000}) {
-            QTest::addRow("%u threads, %d items", limit, count) << limit << count;
+        setThreadLimit(limit);
+        QVERIFY(limit == 0 || threadCount() == limit);
+        for (const size_t count : {0U, 1U, 2U, 1000U}) {
+            std::vector<std::atomic<int>> calls(count);
+            parallelFor(count, [&](size_t index) { ++calls.at(index); });
+            QVERIFY(std::all_of(calls.begin(), calls.end(),
+                                [](const auto &call) { return call == 1; }));
         }
     }
 }
 
-void TestParallel::everyIndexOnce()
-{
-    QFETCH(unsigned, limit);
-    QFETCH(int, count);
-    setThreadLimit(limit);
-    QCOMPARE(threadCount() == limit || limit == 0, true);
-    std::vector<std::atomic<int>> calls(static_cast<size_t>(count));
-    parallelFor(calls.size(), [&](size_t index) { ++calls.at(index); });
-    for (const auto &call : calls) {
-        QCOMPARE(call.load(), 1);
-    }
-}
-
-void TestParallel::sideWorkerKeepsTheOrder_data()
-{
-    QTest::addColumn<unsigned>("limit");
-    QTest::newRow("beside the caller") << 2U;
-    QTest::newRow("no second thread allowed") << 1U;
-}
-
 void TestParallel::sideWorkerKeepsTheOrder()
 {
-    QFETCH(unsigned, limit);
-    setThreadLimit(limit);
-    constexpr int rounds = 2000;
-    std::vector<int> done; // touched by one thread at a time, or the sanitizer finds it
-    const auto caller = std::this_thread::get_id();
-    bool sawOther = false;
-    SideWorker worker;
-    for (int i = 0; i < rounds; ++i) {
-        worker.start([&, i] {
-            done.push_back(i);
-            sawOther = std::this_thread::get_id() != caller;
-        });
-    }
-    worker.wait();
-    worker.wait(); // nothing to wait for
-    QCOMPARE(done.size(), size_t(rounds));
-    for (int i = 0; i < rounds; ++i) {
-        QCOMPARE(done.at(static_cast<size_t>(i)), i);
-    }
-    QCOMPARE(sawOther, limit > 1);
+    forRows({{"beside the caller", 2U}, {"no second thread allowed", 1U}}, [&](unsigned limit) {
+        setThreadLimit(limit);
+        constexpr int rounds = 2000;
+        std::vector<int> done; // touched by one thread at a time, or the sanitizer finds it
+        const auto caller = std::this_thread::get_id();
+        bool sawOther = false;
+        SideWorker worker;
+        for (int i = 0; i < rounds; ++i) {
+            worker.start([&, i] {
+                done.push_back(i);
+                sawOther = std::this_thread::get_id() != caller;
+            });
+        }
+        worker.wait();
+        worker.wait(); // nothing to wait for
+        QCOMPARE(done.size(), size_t(rounds));
+        for (int i = 0; i < rounds; ++i) {
+            QCOMPARE(done.at(static_cast<size_t>(i)), i);
+        }
+        QCOMPARE(sawOther, limit > 1);
+    });
 }
 
 void TestParallel::sideWorkerEndsWithItsWorkDone()

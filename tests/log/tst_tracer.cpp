@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CapturedLog.h"
-
 #include "log/Tracer.h"
+
+#include "support/logreader.h"
+#include "support/rows.h"
 
 #include <QLocale>
 #include <QSignalSpy>
@@ -21,51 +22,37 @@ private slots:
     void init() { static_cast<void>(Tracer::takeEntries()); }
     void cleanup() { Tracer::setMask(Tracer::DefaultMask); }
 
-    void levelsAgainstMask_data();
     void levelsAgainstMask();
     void lineIsStampedWithTimeAndTwoBlanks();
-    void entriesComeInOrderAndOnce();
     void everyListenerIsTold();
     void workerReachesTheListenersThread();
     void slotMayLogAndDestroyListeners();
     void slotHoldsUpNoOtherThread();
     void threadsKeepTheirOrder();
-    void queueIsBounded();
+    void entriesComeInOrderUpToABound();
 };
-
-void TestTracer::levelsAgainstMask_data()
-{
-    QTest::addColumn<unsigned>("mask");
-    QTest::addColumn<int>("level");
-    QTest::addColumn<bool>("kept");
-    QTest::newRow("information") << Tracer::DefaultMask << 1 << true;
-    QTest::newRow("warning") << Tracer::DefaultMask << 2 << true;
-    QTest::newRow("error") << Tracer::DefaultMask << 4 << true;
-    QTest::newRow("severe") << Tracer::DefaultMask << 8 << true;
-    QTest::newRow("debug without --debug") << Tracer::DefaultMask << 16 << false;
-    QTest::newRow("debug with --debug") << Tracer::DebugMask << 16 << true;
-    QTest::newRow("one common bit is enough") << 4U << 12 << true;
-    QTest::newRow("no common bit") << 8U << 7 << false;
-    QTest::newRow("no level") << Tracer::DebugMask << 0 << false;
-}
 
 void TestTracer::levelsAgainstMask()
 {
-    QFETCH(unsigned, mask);
-    QFETCH(int, level);
-    QFETCH(bool, kept);
-    const Tracer listener;
-    QSignalSpy told(&listener, &Tracer::TraceDataAvailable);
-    Tracer::setMask(mask);
-    QCOMPARE(Tracer::isEnabled(level), kept);
-    Tracer::Trace(level, QString("text"));
-    Tracer::Trace(level, "literal");
-    QCOMPARE(told.count(), kept ? 2 : 0);
-    const QList<Tracer::Entry> entries = Tracer::takeEntries();
-    QCOMPARE(entries.size(), kept ? 2 : 0);
-    for (const Tracer::Entry &entry : entries) {
-        QCOMPARE(entry.second, level);
-    }
+    forRows({{"error", Tracer::DefaultMask, 4, true},
+             {"debug without --debug", Tracer::DefaultMask, 16, false},
+             {"debug with --debug", Tracer::DebugMask, 16, true},
+             {"one common bit is enough", 4U, 12, true},
+             {"no common bit", 8U, 7, false}},
+            [&](unsigned mask, int level, bool kept) {
+                const Tracer listener;
+                QSignalSpy told(&listener, &Tracer::TraceDataAvailable);
+                Tracer::setMask(mask);
+                QCOMPARE(Tracer::isEnabled(level), kept);
+                Tracer::Trace(level, QString("text"));
+                Tracer::Trace(level, "literal");
+                QCOMPARE(told.count(), kept ? 2 : 0);
+                const QList<Tracer::Entry> entries = Tracer::takeEntries();
+                QCOMPARE(entries.size(), kept ? 2 : 0);
+                for (const Tracer::Entry &entry : entries) {
+                    QCOMPARE(entry.second, level);
+                }
+            });
 }
 
 void TestTracer::lineIsStampedWithTimeAndTwoBlanks()
@@ -80,16 +67,6 @@ void TestTracer::lineIsStampedWithTimeAndTwoBlanks()
     const QString line = Tracer::takeEntries().value(0).first;
     QVERIFY2(line == before + "    two blanks more" || line == after + "    two blanks more",
              qPrintable(line));
-}
-
-void TestTracer::entriesComeInOrderAndOnce()
-{
-    CapturedLog log;
-    Tracer::Trace(1, "a");
-    QVERIFY(!Tracer::fail("b"));
-    Tracer::Trace(2, "");
-    QCOMPARE(log.take(), QStringList({"1|a", "4|b", "2|"}));
-    QVERIFY(Tracer::takeEntries().isEmpty());
 }
 
 void TestTracer::everyListenerIsTold()
@@ -114,9 +91,7 @@ void TestTracer::workerReachesTheListenersThread()
     const QThread *slotThread = nullptr;
     connect(&listener, &Tracer::TraceDataAvailable, this, [&] {
         slotThread = QThread::currentThread();
-        for (const Tracer::Entry &entry : Tracer::takeEntries()) {
-            lines << CapturedLog::withoutStamp(entry.first);
-        }
+        lines << takeMessages();
     });
     std::thread worker([] { Tracer::Trace(4, "from a worker"); });
     worker.join();
@@ -175,18 +150,22 @@ void TestTracer::threadsKeepTheirOrder()
     for (std::thread &worker : workers) {
         worker.join();
     }
-    const QList<Tracer::Entry> entries = Tracer::takeEntries();
+    const QStringList entries = takeMessages(Tracer::Information);
     QCOMPARE(entries.size(), threads * lines);
     std::vector<int> next(threads, 0);
-    for (const Tracer::Entry &entry : entries) {
-        const QStringList text = CapturedLog::withoutStamp(entry.first).split(' ');
+    for (const QString &entry : entries) {
+        const QStringList text = entry.split(' ');
         QCOMPARE(text.at(1).toInt(), next.at(text.at(0).toUInt())++);
     }
 }
 
-void TestTracer::queueIsBounded()
+void TestTracer::entriesComeInOrderUpToABound()
 {
     CapturedLog log;
+    Tracer::Trace(1, "a");
+    QVERIFY(!Tracer::fail("b"));
+    Tracer::Trace(2, "");
+    QCOMPARE(log.take(), QStringList({"1|a", "4|b", "2|"}));
     constexpr int lines = 250'000;
     for (int i = 0; i < lines; ++i) {
         Tracer::Trace(1, QString::number(i));

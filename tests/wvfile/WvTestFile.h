@@ -1,43 +1,21 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "TestDevice.h"
+#include "support/TestDevice.h"
 
-#include "log/CapturedLog.h"
 #include "streams/BufferedIO.h"
+#include "support/logreader.h"
 #include "wvfile/HvFileIO.h"
 #include "wvfile/WvTypes.h"
 
+#include "support/files.h"
+#include "support/wvbytes.h"
 #include <QByteArray>
-#include <QFile>
+#include <QDateTime>
 #include <QList>
-#include <QTemporaryDir>
+#include <QRegularExpression>
 
 #include <cstring>
-
-/// Bytes of a sample block with these words, I and Q in turn.
-inline QByteArray wordBytes(const QList<int> &words)
-{
-    QByteArray bytes;
-    for (const int word : words) {
-        bytes += static_cast<char>(word & 0xFF);
-        bytes += static_cast<char>(word >> 8 & 0xFF);
-    }
-    return bytes;
-}
-
-/// The sample block as this program writes it.
-inline QByteArray sampleBlock(const QList<int> &words)
-{
-    return "{WAVEFORM-" + QByteArray::number(2 * words.size() + 1) + ": #" + wordBytes(words) + '}';
-}
-
-/// The block of `count` samples 0.
-inline QByteArray silentBlock(qint64 count)
-{
-    return "{WAVEFORM-" + QByteArray::number(4 * count + 1) + ": #" + QByteArray(4 * count, '\0') +
-           '}';
-}
 
 /// Streams in memory and a file on disk for one read.
 class ReadRun
@@ -52,10 +30,8 @@ public:
 
     explicit ReadRun(const QByteArray &bytes, bool keepTags = false)
     {
-        info.fileName = m_folder.filePath("in.wv");
-        QFile file(info.fileName);
-        ok = file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size() &&
-             m_data.initBuf(&dataDevice, BufferedIO::ReadWrite) &&
+        info.fileName = m_folder.path("in.wv");
+        ok = m_folder.store("in.wv", bytes) && m_data.initBuf(&dataDevice, BufferedIO::ReadWrite) &&
              m_markers.initBuf(&markerDevice, BufferedIO::ReadWrite) &&
              m_tags.initBuf(&tagsDevice, BufferedIO::ReadWrite);
         info.dataStream = &m_data;
@@ -95,8 +71,61 @@ public:
     }
 
 private:
-    QTemporaryDir m_folder;
+    TestFolder m_folder;
     BufferedIO m_data;
     BufferedIO m_markers;
     BufferedIO m_tags;
+};
+
+/// One write to a file in a folder of its own.
+class WriteRun
+{
+public:
+    QStringList log;
+    QByteArray bytes; ///< with "#DATE#" where the tag DATE stands
+    QString path;
+
+    bool write(WvWriteJob &job, BufferedIO *data = nullptr, BufferedIO *markers = nullptr,
+               BufferedIO *tags = nullptr)
+    {
+        path = m_folder.path("out.wv");
+        CapturedLog captured;
+        const QDateTime before = QDateTime::currentDateTime().addSecs(-1);
+        HvFileIO io;
+        const bool ok = io.writeWaveform(job, path, data, markers, tags);
+        log = captured.take();
+        bytes = m_folder.load("out.wv");
+        static const QRegularExpression date(
+            "\\{DATE:(\\d{4}-\\d\\d-\\d\\d;\\d\\d:\\d\\d:\\d\\d)\\}");
+        const auto match = date.match(QString::fromLatin1(bytes));
+        if (match.hasMatch()) {
+            const auto written = QDateTime::fromString(match.captured(1), "yyyy-MM-dd;HH:mm:ss");
+            if (written >= before && written <= QDateTime::currentDateTime()) {
+                bytes.replace(match.captured(0).toLatin1(), "#DATE#");
+            }
+        }
+        return ok;
+    }
+
+private:
+    TestFolder m_folder;
+};
+
+/// A stream in memory with some content.
+class Filled
+{
+public:
+    explicit Filled(const QByteArray &content)
+    {
+        m_device.bytes = content;
+        m_ready = m_stream.initBuf(&m_device, BufferedIO::ReadWrite);
+    }
+
+    BufferedIO *stream() { return m_ready ? &m_stream : nullptr; }
+    TestDevice &device() { return m_device; }
+
+private:
+    TestDevice m_device;
+    BufferedIO m_stream;
+    bool m_ready = false;
 };

@@ -1,11 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 //
 // A disk that fills up: a small file system in memory, mounted where this process alone sees it.
-#include "log/CapturedLog.h"
 #include "streams/BufferedIO.h"
 #include "streams/TempStream.h"
+#include "support/logreader.h"
+#include "support/rows.h"
 #include "wvfile/HvFileIO.h"
 
+#include "support/files.h"
 #include <QCoreApplication>
 #include <QDir>
 #include <QFile>
@@ -25,13 +27,6 @@ namespace {
 
 constexpr qint64 mebibyte = 1'048'576;
 
-bool writeText(const char *path, const QByteArray &text)
-{
-    QFile file(path);
-    return file.open(QIODevice::WriteOnly | QIODevice::Unbuffered) &&
-           file.write(text) == text.size();
-}
-
 /// Gives this process a mount table of its own; without the rights for that, by way of a user table
 /// of its own. Must come before any thread. Empty on success, else what is missing.
 QByteArray enterOwnMountTable()
@@ -46,9 +41,9 @@ QByteArray enterOwnMountTable()
         if (::unshare(CLONE_NEWUSER | CLONE_NEWNS) != 0) {
             return QByteArray("neither root nor user namespaces: ") + std::strerror(errno);
         }
-        if (!writeText("/proc/self/setgroups", "deny") ||
-            !writeText("/proc/self/uid_map", "0 " + QByteArray::number(user) + " 1") ||
-            !writeText("/proc/self/gid_map", "0 " + QByteArray::number(group) + " 1")) {
+        if (!store("/proc/self/setgroups", "deny") ||
+            !store("/proc/self/uid_map", "0 " + QByteArray::number(user) + " 1") ||
+            !store("/proc/self/gid_map", "0 " + QByteArray::number(group) + " 1")) {
             return "the user table can't be filled";
         }
     }
@@ -75,9 +70,7 @@ private slots:
     void cleanupTestCase();
     void init() { QVERIFY(freeBytes() == m_freeAtStart); }
 
-    void writingAFile_data();
     void writingAFile();
-    void readingIntoStreams_data();
     void readingIntoStreams();
 
 private:
@@ -119,94 +112,70 @@ void TestDiskFull::cleanupTestCase()
     }
 }
 
-void TestDiskFull::writingAFile_data()
-{
-    QTest::addColumn<qint64>("freeBytes");
-    QTest::addColumn<QByteArray>("before");
-    QTest::newRow("not a page left") << qint64(0) << QByteArray();
-    QTest::newRow("some samples fit") << mebibyte << QByteArray();
-    QTest::newRow("over a file") << mebibyte << QByteArray("what stood there");
-}
-
 void TestDiskFull::writingAFile()
 {
-    QFETCH(qint64, freeBytes);
-    QFETCH(QByteArray, before);
-    const QString path = m_disk + "/out.wv";
-    QFile target(path);
-    QVERIFY(before.isEmpty() ||
-            (target.open(QIODevice::WriteOnly) && target.write(before) == before.size()));
-    target.close();
-    const qint64 taken = m_freeAtStart - this->freeBytes();
-    QFile filler(m_disk + "/filler");
-    QVERIFY(filler.open(QIODevice::WriteOnly | QIODevice::Unbuffered));
-    const QByteArray zeros(m_freeAtStart - taken - freeBytes, '\0');
-    QCOMPARE(filler.write(zeros), qint64(zeros.size()));
-    filler.close();
-    WvWriteJob job;
-    job.clock = 1;
-    job.samples = 1000 * 1000;
-    job.iSamples = job.qSamples = QList<float>(job.samples, 0.5F);
-    job.markers = QList<int>(job.samples, 1);
-    CapturedLog log;
-    QVERIFY(!HvFileIO().writeWaveform(job, path, nullptr, nullptr, nullptr));
-    QCOMPARE(log.take(Tracer::Error),
-             QStringList("4|Error writing output file: No space left on device"));
-    if (before.isEmpty()) {
-        QVERIFY2(QFileInfo(path).size() <= freeBytes, "what fitted stays");
-    } else {
-        QVERIFY(target.open(QIODevice::ReadOnly));
-        QCOMPARE(target.readAll(), before);
-    }
-    QVERIFY(target.remove());
-    QVERIFY2(filler.remove(), "and nothing else");
-}
-
-void TestDiskFull::readingIntoStreams_data()
-{
-    QTest::addColumn<QByteArray>("head");
-    QTest::addColumn<qint64>("samples");
-    QTest::addColumn<QStringList>("words");
-    QTest::newRow("samples") << QByteArray() << qint64(4 * mebibyte)
-                             << QStringList("4|Cannot write to temporary file!");
-    QTest::newRow("a marker list")
-        << QByteArray("{MARKER LIST 1: 0:1;40000000:0}") << qint64(50 * mebibyte)
-        << QStringList("4| Cannot write to marker file at position 33554432");
-    QTest::newRow("markers up to the control length")
-        << QByteArray("{CONTROL LENGTH:40000000}") << qint64(50 * mebibyte)
-        << QStringList("4|Writing marker stream failed at position 33554432");
-    QTest::newRow("unknown tags") << "{FREE:" + QByteArray(40 * mebibyte, 'x') + '}' << qint64(1)
-                                  << QStringList("4|Cannot save unknown tag.");
+    forRows({{"some samples fit", mebibyte, {}}, {"over a file", mebibyte, "what stood there"}},
+            [&](qint64 freeBytes, const QByteArray &before) {
+                const QString path = m_disk + "/out.wv";
+                QVERIFY(before.isEmpty() || store(path, before));
+                const qint64 taken = m_freeAtStart - this->freeBytes();
+                const QString filler = m_disk + "/filler";
+                QVERIFY(store(filler, QByteArray(m_freeAtStart - taken - freeBytes, '\0')));
+                WvWriteJob job;
+                job.clock = 1;
+                job.samples = 1000 * 1000;
+                job.iSamples = job.qSamples = QList<float>(job.samples, 0.5F);
+                job.markers = QList<int>(job.samples, 1);
+                CapturedLog log;
+                QVERIFY(!HvFileIO().writeWaveform(job, path, nullptr, nullptr, nullptr));
+                QCOMPARE(log.take(Tracer::Error),
+                         QStringList("4|Error writing output file: No space left on device"));
+                if (before.isEmpty()) {
+                    QVERIFY2(QFileInfo(path).size() <= freeBytes, "what fitted stays");
+                } else {
+                    QCOMPARE(load(path), before);
+                }
+                QVERIFY(QFile::remove(path));
+                QVERIFY2(QFile::remove(filler), "and nothing else");
+            });
 }
 
 void TestDiskFull::readingIntoStreams()
 {
-    QFETCH(QByteArray, head);
-    QFETCH(qint64, samples);
-    QFETCH(QStringList, words);
-    // The samples are a hole in a file on the large disk.
-    QFile source(m_folder.filePath("in.wv"));
-    QVERIFY(source.open(QIODevice::WriteOnly));
-    source.write("{TYPE:TGX-WV}{SAMPLES:" + QByteArray::number(samples) + '}' + head +
-                 "{WAVEFORM-" + QByteArray::number(4 * samples + 1) + ": #");
-    QVERIFY(source.resize(source.pos() + 4 * samples));
-    source.close();
-    CapturedLog log;
-    {
-        TempStream data;
-        TempStream markers;
-        TempStream tags;
-        QVERIFY(data.open() && markers.open() && tags.open());
-        WvFileInfo info;
-        info.fileName = source.fileName();
-        info.dataStream = data.stream();
-        info.markerStream = markers.stream();
-        info.tagsStream = tags.stream();
-        QVERIFY(!HvFileIO().readWaveform(&info));
-    }
-    QCOMPARE(log.take(Tracer::Error), words);
-    QCOMPARE(freeBytes(), m_freeAtStart);
-    QVERIFY(source.remove());
+    forRows({{"samples", {}, qint64(4 * mebibyte), {"4|Cannot write to temporary file!"}},
+             {"markers up to the control length",
+              "{CONTROL LENGTH:40000000}",
+              qint64(50 * mebibyte),
+              {"4|Writing marker stream failed at position 33554432"}},
+             {"unknown tags",
+              "{FREE:" + QByteArray(40 * mebibyte, 'x') + '}',
+              1,
+              {"4|Cannot save unknown tag."}}},
+            [&](const QByteArray &head, qint64 samples, const QStringList &words) {
+                // The samples are a hole in a file on the large disk.
+                QFile source(m_folder.filePath("in.wv"));
+                QVERIFY(source.open(QIODevice::WriteOnly));
+                source.write("{TYPE:TGX-WV}{SAMPLES:" + QByteArray::number(samples) + '}' + head +
+                             "{WAVEFORM-" + QByteArray::number(4 * samples + 1) + ": #");
+                QVERIFY(source.resize(source.pos() + 4 * samples));
+                source.close();
+                CapturedLog log;
+                {
+                    TempStream data;
+                    TempStream markers;
+                    TempStream tags;
+                    QVERIFY(data.open() && markers.open() && tags.open());
+                    WvFileInfo info;
+                    info.fileName = source.fileName();
+                    info.dataStream = data.stream();
+                    info.markerStream = markers.stream();
+                    info.tagsStream = tags.stream();
+                    QVERIFY(!HvFileIO().readWaveform(&info));
+                }
+                QCOMPARE(log.take(Tracer::Error), words);
+                QCOMPARE(freeBytes(), m_freeAtStart);
+                QVERIFY(source.remove());
+            });
 }
 
 int main(int argc, char **argv)

@@ -2,11 +2,12 @@
 //
 // Files that lie. What they may cost is counted in bytes moved and not in seconds, so that a slow
 // machine doesn't matter; one that really hangs ends at the time limit of the test.
-#include "TestDevice.h"
+#include "support/TestDevice.h"
 
 #include "base/ProgressClock.h"
-#include "log/CapturedLog.h"
 #include "streams/BufferedIO.h"
+#include "support/logreader.h"
+#include "support/rows.h"
 #include "wvfile/HvFileIO.h"
 #include "wvfile/WvReader.h"
 #include "wvfile/WvScanner.h"
@@ -35,141 +36,118 @@ class TestHostileFiles : public QObject
     Q_OBJECT
 
 private slots:
-    void workIsBounded_data();
     void workIsBounded();
-    void noPlainFile_data();
     void noPlainFile();
     void everyCut();
 };
 
-void TestHostileFiles::workIsBounded_data()
+void TestHostileFiles::workIsBounded()
 {
-    QTest::addColumn<QByteArray>("bytes");
-    QTest::addColumn<QString>("words"); // the reader's last
-    const auto row = [](const char *name, const QByteArray &bytes, const char *words) {
-        QTest::newRow(name) << bytes << "4|" + QString(words);
-    };
     const char *noTag = "No tag mark found! Probably incorrect format.";
     const char *tooShort = "Cannot read enough data from xWAVEFORM tag!";
     const char *tooLarge = " Marker position value is too large.";
-    row("two thousand million samples", tgx + "{SAMPLES:2000000000}{WAVEFORM-8000000001: #abcd}",
-        tooShort);
-    row("no SAMPLES either", tgx + "{WAVEFORM-8000000001: #abcd}", tooShort);
-    row("a long control", tgx + "{SAMPLES:1}{CONTROL LENGTH:2000000000}{WAVEFORM-5: #abcd}",
-        "CONTROL LENGTH tag is invalid ('2000000000').");
-    row("a marker far out", tgx + "{MARKER LIST 1: 0:0;2000000000:1}", tooLarge);
-    row("a hundred thousand marker lists",
-        tgx + repeated("{MARKER LIST 1: 0:1}", 100'000) + "{SAMPLES:1}{WAVEFORM-5: #abc", tooShort);
-    row("lists as long as they may be",
-        tgx + repeated("{MARKER LIST 1: 0:1;500000:0}", 100'000) + "{SAMPLES:1}{WAVEFORM-5: #abc",
-        "Too many MARKER LIST tags: their positions exceed what a file of this size can hold.");
     QByteArray dense = "{MARKER LIST 1: ";
     for (int i = 0; i < 1'200'000; i += 2) {
         dense += QByteArray::number(i) + (i % 4 == 0 ? ":1;" : ":0;");
     }
-    row("dense lists, again and again",
-        tgx + dense + '}' + repeated("{MARKER LIST 2: 0:1}", 100'000) +
-            "{SAMPLES:1}{WAVEFORM-5: #ab",
-        "Too many MARKER LIST tags: their positions exceed what a file of this size can hold.");
-    row("the same position for ever", tgx + "{MARKER LIST 1: " + repeated("7:1;", mebibyte),
-        " old pos. = 9, new pos. = 7");
-    row("a name of megabytes", tgx + '{' + QByteArray(4 * mebibyte, 'x'),
-        qPrintable("Tag name '" + QString(100, 'x') + "' is invalid."));
-    row("a text of megabytes", tgx + "{COMMENT:" + QByteArray(4 * mebibyte, 'x'),
-        "Invalid tag data");
-    row("an unknown tag of megabytes", tgx + "{FREE:" + QByteArray(4 * mebibyte, 'x'),
-        "Invalid tag. '}' is missing.");
-    row("blanks", tgx + "{COMMENT:" + QByteArray(4 * mebibyte, ' '), noTag);
-    row("opening braces", QByteArray(4 * mebibyte, '{'),
-        qPrintable("Tag name '" + QString(100, '{') + "' is invalid."));
-    row("closing braces", QByteArray(4 * mebibyte, '}'), noTag);
-    row("colons", QByteArray(4 * mebibyte, ':'), noTag);
-    row("empty tags", repeated("{:}", mebibyte), noTag);
-    row("zeros", QByteArray(4 * mebibyte, '\0'), noTag);
-    row("types", repeated(tgx, 100'000), noTag);
-    row("blocks behind the block", tgx + repeated("{WAVEFORM-1:#}", 100'000),
-        "Invalid number of samples in WAVEFORM tag.");
-}
+    forRows(
+        {{"two thousand million samples", tgx + "{SAMPLES:2000000000}{WAVEFORM-8000000001: #abcd}",
+          tooShort},
+         {"a long control", tgx + "{SAMPLES:1}{CONTROL LENGTH:2000000000}{WAVEFORM-5: #abcd}",
+          "CONTROL LENGTH tag is invalid ('2000000000')."},
+         {"a marker far out", tgx + "{MARKER LIST 1: 0:0;2000000000:1}", tooLarge},
+         {"lists as long as they may be",
+          tgx + repeated("{MARKER LIST 1: 0:1;500000:0}", 100'000) + "{SAMPLES:1}{WAVEFORM-5: #abc",
+          "Too many MARKER LIST tags: their positions exceed what a file of this size can hold."},
+         {"dense lists, again and again",
+          tgx + dense + '}' + repeated("{MARKER LIST 2: 0:1}", 100'000) +
+              "{SAMPLES:1}{WAVEFORM-5: #ab",
+          "Too many MARKER LIST tags: their positions exceed what a file of this size can hold."},
+         {"the same position for ever", tgx + "{MARKER LIST 1: " + repeated("7:1;", mebibyte),
+          " old pos. = 9, new pos. = 7"},
+         {"a name of megabytes", tgx + '{' + QByteArray(4 * mebibyte, 'x'),
+          "Tag name \'" + QString(100, 'x') + "\' is invalid."},
+         {"a text of megabytes", tgx + "{COMMENT:" + QByteArray(4 * mebibyte, 'x'),
+          "Invalid tag data"},
+         {"blanks", tgx + "{COMMENT:" + QByteArray(4 * mebibyte, ' '), noTag},
+         {"opening braces", QByteArray(4 * mebibyte, '{'),
+          "Tag name \'" + QString(100, '{') + "\' is invalid."},
+         {"empty tags", repeated("{:}", mebibyte), noTag},
+         {"blocks behind the block", tgx + repeated("{WAVEFORM-1:#}", 100'000),
+          "Invalid number of samples in WAVEFORM tag."}},
+        [](const QByteArray &bytes, const QString &words) {
+            const qint64 fileSize = bytes.size();
+            TestDevice file;
+            file.bytes = bytes;
+            TestDevice devices[3];
+            BufferedIO streams[3];
+            for (int i = 0; i < 3; ++i) {
+                QVERIFY(streams[i].initBuf(&devices[i], BufferedIO::ReadWrite));
+            }
+            WvFileInfo info;
+            info.dataStream = &streams[0];
+            info.markerStream = &streams[1];
+            info.tagsStream = &streams[2];
+            CapturedLog log;
+            const std::atomic<bool> cancelled{false};
+            ProgressClock progress([](int) {}, cancelled);
+            QVERIFY(file.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
+            QVERIFY(!WvReader(info, file, progress).read());
+            QCOMPARE(log.take().last(), "4|" + words);
+            QVERIFY(file.bytesRead <= fileSize + mebibyte);
+            qint64 moved = 0;
+            for (TestDevice &device : devices) {
+                moved += device.bytesRead + device.bytesWritten;
+                QVERIFY(device.bytes.size() <= 2 * fileSize + mebibyte);
+            }
+            QVERIFY2(moved <= 64 * fileSize + 32 * mebibyte, qPrintable(QString::number(moved)));
 
-void TestHostileFiles::workIsBounded()
-{
-    QFETCH(QByteArray, bytes);
-    QFETCH(QString, words);
-    const qint64 fileSize = bytes.size();
-    TestDevice file;
-    file.bytes = bytes;
-    TestDevice devices[3];
-    BufferedIO streams[3];
-    for (int i = 0; i < 3; ++i) {
-        QVERIFY(streams[i].initBuf(&devices[i], BufferedIO::ReadWrite));
-    }
-    WvFileInfo info;
-    info.dataStream = &streams[0];
-    info.markerStream = &streams[1];
-    info.tagsStream = &streams[2];
-    CapturedLog log;
-    const std::atomic<bool> cancelled{false};
-    ProgressClock progress([](int) {}, cancelled);
-    QVERIFY(file.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
-    QVERIFY(!WvReader(info, file, progress).read());
-    QCOMPARE(log.take().last(), words);
-    QVERIFY(file.bytesRead <= fileSize + mebibyte);
-    qint64 moved = 0;
-    for (TestDevice &device : devices) {
-        moved += device.bytesRead + device.bytesWritten;
-        QVERIFY(device.bytes.size() <= 2 * fileSize + mebibyte);
-    }
-    QVERIFY2(moved <= 64 * fileSize + 32 * mebibyte, qPrintable(QString::number(moved)));
-
-    file.close();
-    file.bytesRead = 0;
-    QVERIFY(file.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
-    WvFileSummary summary;
-    static_cast<void>(WvScanner(summary).scan(file));
-    QVERIFY(file.bytesRead <= fileSize + mebibyte);
-    QVERIFY(log.take().size() <= 5 * fileSize / 13 + 2);
-}
-
-void TestHostileFiles::noPlainFile_data()
-{
-    QTest::addColumn<QString>("kind");
-    QTest::newRow("a device without end") << "/dev/zero";
-    QTest::newRow("a folder") << "folder";
-    QTest::newRow("a pipe that nobody fills") << "pipe";
-    QTest::newRow("a link to a device") << "link";
-    QTest::newRow("a link to nothing") << "dangling";
+            file.close();
+            file.bytesRead = 0;
+            QVERIFY(file.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
+            WvFileSummary summary;
+            static_cast<void>(WvScanner(summary).scan(file));
+            QVERIFY(file.bytesRead <= fileSize + mebibyte);
+            QVERIFY(log.take().size() <= 5 * fileSize / 13 + 2);
+        });
 }
 
 void TestHostileFiles::noPlainFile()
 {
-    QFETCH(QString, kind);
-    const QTemporaryDir folder;
-    QString path = kind;
-    if (kind == "folder") {
-        path = folder.path();
-    } else if (kind == "pipe") {
-        path = folder.filePath("pipe");
-        QCOMPARE(::mkfifo(path.toLocal8Bit().constData(), 0600), 0);
-    } else if (kind != "/dev/zero") {
-        path = folder.filePath("link");
-        QVERIFY(QFile::link(kind == "link" ? "/dev/zero" : folder.filePath("none"), path));
-    }
-    TestDevice devices[2];
-    BufferedIO data;
-    BufferedIO markers;
-    QVERIFY(data.initBuf(&devices[0], BufferedIO::ReadWrite));
-    QVERIFY(markers.initBuf(&devices[1], BufferedIO::ReadWrite));
-    WvFileInfo info;
-    info.fileName = path;
-    info.dataStream = &data;
-    info.markerStream = &markers;
-    CapturedLog log;
-    QVERIFY(!HvFileIO().readWaveform(&info));
-    QCOMPARE(log.take().last(), QString("4|Cannot open waveform input file."));
-    WvFileSummary summary;
-    QVERIFY(!HvFileIO().readWaveformInfo(path, &summary));
-    QCOMPARE(log.take().last(), kind == "dangling" ? QString("4|File does not exist.")
-                                                   : QString("4|Cannot open file."));
+    forRows({{"a device without end", "/dev/zero"},
+             {"a folder", "folder"},
+             {"a pipe that nobody fills", "pipe"},
+             {"a link to a device", "link"}},
+            [&](const QString &kind) {
+                const QTemporaryDir folder;
+                QString path = kind;
+                if (kind == "folder") {
+                    path = folder.path();
+                } else if (kind == "pipe") {
+                    path = folder.filePath("pipe");
+                    QCOMPARE(::mkfifo(path.toLocal8Bit().constData(), 0600), 0);
+                } else if (kind != "/dev/zero") {
+                    path = folder.filePath("link");
+                    QVERIFY(
+                        QFile::link(kind == "link" ? "/dev/zero" : folder.filePath("none"), path));
+                }
+                TestDevice devices[2];
+                BufferedIO data;
+                BufferedIO markers;
+                QVERIFY(data.initBuf(&devices[0], BufferedIO::ReadWrite));
+                QVERIFY(markers.initBuf(&devices[1], BufferedIO::ReadWrite));
+                WvFileInfo info;
+                info.fileName = path;
+                info.dataStream = &data;
+                info.markerStream = &markers;
+                CapturedLog log;
+                QVERIFY(!HvFileIO().readWaveform(&info));
+                QCOMPARE(log.take().last(), QString("4|Cannot open waveform input file."));
+                WvFileSummary summary;
+                QVERIFY(!HvFileIO().readWaveformInfo(path, &summary));
+                QCOMPARE(log.take().last(), kind == "dangling" ? QString("4|File does not exist.")
+                                                               : QString("4|Cannot open file."));
+            });
 }
 
 /// A good file cut at each of its bytes: always an end, and a reason.

@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvTestFile.h"
 
+#include "QRegularExpression"
+#include "support/rows.h"
+#include "support/seed.h"
 #include <QTest>
 
 #include <random>
@@ -119,132 +122,77 @@ class TestMarkerLists : public QObject
     Q_OBJECT
 
 private slots:
-    void merged_data();
     void merged();
-    void cuts_data();
     void cuts();
-    void refused_data();
     void refused();
-    void randomLists_data();
     void randomLists();
     void listsOfManyTransitions();
     void controlLengthShorterThanTheSamples();
 };
 
-void TestMarkerLists::merged_data()
-{
-    QTest::addColumn<QByteArray>("lists");
-    QTest::addColumn<int>("samples");
-    QTest::addColumn<QByteArray>("bytes");
-    const auto row = [](const char *lists, int samples, const char *bytes) {
-        QTest::newRow(lists) << QByteArray(lists) << samples << trace(bytes);
-    };
-    row("{MARKER LIST 1: 0:1;10:0}", 20, "11111111110000000000");
-    row("{MARKER LIST 1: 0:0;10:1}", 14, "00000000001111");
-    row("{MARKER LIST 4:3:1}", 6, "000888");
-    row("{MARKER LIST 1:}", 3, "000");
-    row("{MARKER LIST 1: }", 3, "000");
-    row("{MARKER LIST 1: 0:1;2:0}{MARKER LIST 2: 0:0;1:1;3:0}{MARKER LIST 3: 0:1}", 5, "57640");
-    row("{MARKER LIST 1: 0:1;4:0}{MARKER LIST 1: 6:1}", 8, "11110011");
-    row("{MARKER LIST 1: 0:7;1:-1;2:1}", 3, "001");
-    row("{MARKER LIST 1: 0 : 1 ; 2: 0}", 4, "1100");
-    row("{MARKER LIST 1: +0:+1;2:00}", 4, "1100");
-    row("{MARKER LIST 1: 0:1:0;2:0:1}", 4, "1100");
-    row("{MARKER LIST 1: 0:1;;2:0}", 4, "1111");
-    row("{MARKER LIST 1: 0:1;2:0\n;3:1}", 5, "11000");
-    row("{MARKER LIST 1: 5:1;5:1}", 9, "000001111");
-    row("{MY MARKER LIST 2: 1:1}", 3, "022");
-}
-
 void TestMarkerLists::merged()
 {
-    QFETCH(QByteArray, lists);
-    QFETCH(int, samples);
-    QFETCH(QByteArray, bytes);
-    ReadRun run(fileOf(lists, samples));
-    QVERIFY(run.read().ok);
-    QCOMPARE(run.markers(), bytes);
-    QCOMPARE(run.info.controlLength, samples);
+    forRows({{"one list", "{MARKER LIST 1: 0:1;10:0}", 20, "11111111110000000000"},
+             {"no transition", "{MARKER LIST 1: }", 3, "000"},
+             {"first one late", "{MARKER LIST 4:3:1}", 6, "000888"},
+             {"states that are no 1", "{MARKER LIST 1: 0:7;1:-1;2:1}", 3, "001"},
+             {"signs and blanks", "{MARKER LIST 1: +0 : +1 ; 2: 00}", 4, "1100"},
+             {"a third number", "{MARKER LIST 1: 0:1:0;2:0:1}", 4, "1100"},
+             {"an empty one ends it", "{MARKER LIST 1: 0:1;;2:0}", 4, "1111"},
+             {"a control byte", "{MARKER LIST 1: 0:1;2:0\n;3:1}", 5, "11000"},
+             {"any name with it", "{MY MARKER LIST 2: 1:1}", 3, "022"}},
+            [](const QByteArray &lists, int samples, const char *bytes) {
+                ReadRun run(fileOf(lists, samples));
+                QVERIFY(run.read().ok);
+                QCOMPARE(run.markers(), trace(bytes));
+                QCOMPARE(run.info.controlLength, samples);
+            });
 }
 
-void TestMarkerLists::cuts_data()
+void TestMarkerLists::cuts()
 {
-    QTest::addColumn<QByteArray>("lists");
-    QTest::addColumn<QStringList>("warnings");
     const auto warning = [](int marker, int position) {
         return QString("2|The list of marker %1 ends high, but the marker falls at position %2, "
                        "where the other lists end.")
             .arg(marker)
             .arg(position);
     };
-    const auto row = [](const char *lists, const QStringList &warnings) {
-        QTest::newRow(lists) << QByteArray(lists) << warnings;
-    };
-    row("{MARKER LIST 1: 0:1}", {});
-    row("{MARKER LIST 1: 0:0;5:1}", {});
-    row("{MARKER LIST 1: 0:0;9:0}{MARKER LIST 2: 0:1}", {warning(2, 10)});
-    row("{MARKER LIST 1: 0:0;9:0}{MARKER LIST 2: 0:1;9:1}", {warning(2, 10)});
-    row("{MARKER LIST 1: 0:0;9:0}{MARKER LIST 2: 0:1;10:1}", {});
-    row("{MARKER LIST 1: 0:0;9:1}{MARKER LIST 2: 0:1}{MARKER LIST 3: 3:1}",
-        {warning(2, 10), warning(3, 10)});
-    row("{MARKER LIST 1: 0:0;19:0}{MARKER LIST 2: 0:1}", {}); // as long as the samples
-}
-
-void TestMarkerLists::cuts()
-{
-    QFETCH(QByteArray, lists);
-    QFETCH(QStringList, warnings);
-    ReadRun run(fileOf(lists, 20, 20));
-    QVERIFY(run.read().ok);
-    QStringList found;
-    for (const QString &line : run.log) {
-        if (line.startsWith("2|")) {
-            found << line;
-        }
-    }
-    QCOMPARE(found, warnings);
-}
-
-void TestMarkerLists::refused_data()
-{
-    QTest::addColumn<QByteArray>("list");
-    QTest::addColumn<QStringList>("log");
-    const auto row = [](const QByteArray &list, const QStringList &log) {
-        QTest::newRow(list.left(60).constData()) << list << log;
-    };
-    const QString index = "4|Invalid MARKER LIST tag. Index range is 1-4.";
-    row("{MARKER LIST 0:0:1}", {index});
-    row("{MARKER LIST 5:0:1}", {index});
-    row("{MARKER LIST x:0:1}", {index});
-    row("{MARKER LIST :0:1}", {index});
-    row("{MARKER LIST 1: 0:1;7}",
-        {"4|Unsupported MARKER LIST format. Use transition format.", "4|'MARKER LIST 1' -> '7'"});
-    row("{MARKER LIST 1: 0:1;a:1}",
-        {"4|Invalid MARKER LIST tag data.", "4|'MARKER LIST 1' -> 'a:1'"});
-    row("{MARKER LIST 2: 0:}", {"4|Invalid MARKER LIST tag data.", "4|'MARKER LIST 2' -> '0:'"});
-    row("{MARKER LIST 2: 0:99999999999}",
-        {"4|Invalid MARKER LIST tag data.", "4|'MARKER LIST 2' -> '0:99999999999'"});
-    row("{MARKER LIST 2: 99999999999999999999:0}",
-        {"4|Invalid MARKER LIST tag data.", "4|'MARKER LIST 2' -> '99999999999999999999:0'"});
-    row("{MARKER LIST 1: -1:1}", {"4|Marker position cannot be zero."});
-    row("{MARKER LIST 1: 5:1;3:0}",
-        {"4|Marker positions seem to go backwards.", "4| old pos. = 6, new pos. = 3"});
-    row("{MARKER LIST 1: 5:1;5:0}",
-        {"4| Same Marker position used with two states.", "4| pos. = 5"});
-    row("{MARKER LIST 1: 1000000:1}", {"4| Marker position value is too large."});
-    row("{MARKER LIST 1: 9223372036854775807:1}", {"4| Marker position value is too large."});
-    row("{MARKER LIST 1: " + QByteArray(1025, '1') + '}',
-        {"4|Tag content exceeds limit.", "4|Error in MARKER LIST tag."});
+    forRows({{"alone", "{MARKER LIST 1: 0:0;5:1}", {}},
+             {"cut", "{MARKER LIST 1: 0:0;9:0}{MARKER LIST 2: 0:1;9:1}", {warning(2, 10)}},
+             {"longer by one", "{MARKER LIST 1: 0:0;9:0}{MARKER LIST 2: 0:1;10:1}", {}},
+             {"two cut",
+              "{MARKER LIST 1: 0:0;9:1}{MARKER LIST 2: 0:1}{MARKER LIST 3: 3:1}",
+              {warning(2, 10), warning(3, 10)}},
+             {"as long as the samples", "{MARKER LIST 1: 0:0;19:0}{MARKER LIST 2: 0:1}", {}}},
+            [](const QByteArray &lists, const QStringList &warnings) {
+                ReadRun run(fileOf(lists, 20, 20));
+                QVERIFY(run.read().ok);
+                QCOMPARE(run.log.filter(QRegularExpression("^2")), warnings);
+            });
 }
 
 void TestMarkerLists::refused()
 {
-    QFETCH(QByteArray, list);
-    QFETCH(QStringList, log);
-    ReadRun run(fileOf(list, 20));
-    QVERIFY(!run.read().ok);
-    QCOMPARE(run.log, QStringList("1|Format is TGX waveform.") + log);
-
+    forRows(
+        {{"index", "5:0:1", "4|Invalid MARKER LIST tag. Index range is 1-4."},
+         {"no index", ":0:1", "4|Invalid MARKER LIST tag. Index range is 1-4."},
+         {"no state", "1: 0:1;7",
+          "4|Unsupported MARKER LIST format. Use transition format.|4|'MARKER LIST 1' -> '7'"},
+         {"no number", "1: 0:1;a:1", "4|Invalid MARKER LIST tag data.|4|'MARKER LIST 1' -> 'a:1'"},
+         {"large number", "2: 99999999999999999999:0",
+          "4|Invalid MARKER LIST tag data.|4|'MARKER LIST 2' -> '99999999999999999999:0'"},
+         {"negative", "1: -1:1", "4|Marker position cannot be zero."},
+         {"backwards", "1: 5:1;3:0",
+          "4|Marker positions seem to go backwards.|4| old pos. = 6, new pos. = 3"},
+         {"two states", "1: 5:1;5:0", "4| Same Marker position used with two states.|4| pos. = 5"},
+         {"largest number", "1: 9223372036854775807:1", "4| Marker position value is too large."},
+         {"endless", "1: " + QByteArray(1025, '1'),
+          "4|Tag content exceeds limit.|4|Error in MARKER LIST tag."}},
+        [](const QByteArray &list, const QString &log) {
+            ReadRun run(fileOf("{MARKER LIST " + list + '}', 20));
+            QVERIFY(!run.read().ok);
+            QCOMPARE(run.log.join('|'), "1|Format is TGX waveform.|" + log);
+        });
     // The limit itself is the last position that passes.
     const QByteArray rest = fileOf("{MARKER LIST 1: 00:1}", 20);
     const QByteArray last = QByteArray::number(rest.size() / 4);
@@ -254,69 +202,61 @@ void TestMarkerLists::refused()
     QVERIFY(!ReadRun(QByteArray(rest).replace("00:1", next + ":1")).read().ok);
 }
 
-void TestMarkerLists::randomLists_data()
-{
-    QTest::addColumn<int>("rounds");
-    QTest::addColumn<int>("longest");
-    QTest::newRow("short lists") << 300 << 12;
-    QTest::newRow("long lists") << 20 << 3000;
-}
-
 void TestMarkerLists::randomLists()
 {
-    QFETCH(int, rounds);
-    QFETCH(int, longest);
-    const unsigned seed = std::random_device{}();
-    qInfo("seed %u", seed);
-    std::mt19937 random(seed);
-    const auto upTo = [&](int limit) { return static_cast<int>(random() % unsigned(limit + 1)); };
-    for (int round = 0; round < rounds; ++round) {
-        const int samples = 1 + upTo(3 * longest);
-        const int controlLength = upTo(1) == 0 ? 0 : 1 + upTo(samples + 5);
-        PlainTrace expected;
-        QByteArray tags;
-        for (int count = upTo(7); count > 0; --count) {
-            MarkerList list{1 + upTo(3), {}};
-            qint64 position = upTo(1) == 0 ? 0 : upTo(longest);
-            int state = upTo(1);
-            const int step = 1 + upTo(9);
-            for (int i = upTo(longest); i > 0 && position < samples; --i) {
-                list.transitions.append({position, state});
-                if (upTo(15) != 0) { // else the same once more
-                    position = list.transitions.last().first + 1 + upTo(step);
-                    state = upTo(1);
+    std::mt19937 random = randomGenerator();
+    forRows({{"short lists", 200, 12}, {"long lists", 10, 3000}}, [&](int rounds, int longest) {
+        const auto upTo = [&](int limit) {
+            return static_cast<int>(random() % unsigned(limit + 1));
+        };
+        for (int round = 0; round < rounds; ++round) {
+            const int samples = 1 + upTo(3 * longest);
+            const int controlLength = upTo(1) == 0 ? 0 : 1 + upTo(samples + 5);
+            PlainTrace expected;
+            QByteArray tags;
+            for (int count = upTo(7); count > 0; --count) {
+                MarkerList list{1 + upTo(3), {}};
+                qint64 position = upTo(1) == 0 ? 0 : upTo(longest);
+                int state = upTo(1);
+                const int step = 1 + upTo(9);
+                for (int i = upTo(longest); i > 0 && position < samples; --i) {
+                    list.transitions.append({position, state});
+                    if (upTo(15) != 0) { // else the same once more
+                        position = list.transitions.last().first + 1 + upTo(step);
+                        state = upTo(1);
+                    }
                 }
-            }
-            // A repeated position pushes the list on by one; the rules look at that place then.
-            qint64 pos = 0;
-            QList<Transition> valid;
-            for (const Transition &item : list.transitions) {
-                const bool repeated = !valid.isEmpty() && item.first == pos - 1;
-                if (item.first < pos - 1 || (repeated && item.second != valid.last().second)) {
-                    continue;
+                // A repeated position pushes the list on by one; the rules look at that place then.
+                qint64 pos = 0;
+                QList<Transition> valid;
+                for (const Transition &item : list.transitions) {
+                    const bool repeated = !valid.isEmpty() && item.first == pos - 1;
+                    if (item.first < pos - 1 || (repeated && item.second != valid.last().second)) {
+                        continue;
+                    }
+                    pos = repeated ? pos + 1 : item.first + 1;
+                    valid.append(item);
                 }
-                pos = repeated ? pos + 1 : item.first + 1;
-                valid.append(item);
+                list.transitions = valid;
+                tags += tagOf(list, &random);
+                expected.merge(list);
             }
-            list.transitions = valid;
-            tags += tagOf(list, &random);
-            expected.merge(list);
+            ReadRun run(fileOf(tags, samples, controlLength));
+            run.read();
+            QVERIFY2(run.ok, qPrintable(run.log.join('\n')));
+            const QByteArray bytes =
+                expected.finished(controlLength > 0 ? controlLength : samples, samples);
+            if (run.markers() != bytes) {
+                QFAIL(tags.left(2000).constData());
+            }
         }
-        ReadRun run(fileOf(tags, samples, controlLength));
-        run.read();
-        QVERIFY2(run.ok, qPrintable(run.log.join('\n')));
-        const QByteArray bytes =
-            expected.finished(controlLength > 0 ? controlLength : samples, samples);
-        if (run.markers() != bytes) {
-            QFAIL(tags.left(2000).constData());
-        }
-    }
+    });
 }
 
 /// So many transitions that they are no longer held in memory in one piece.
 void TestMarkerLists::listsOfManyTransitions()
 {
-    constexpr int samples = 1'500'000;
+    constexpr int samples = 900'000;
     PlainTrace expected;
     QByteArray tags;
     for (int marker = 1; marker <= 4; ++marker) {

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "streams/levels.h"
+#include "support/rows.h"
 #include "wvfile/SampleCoding.h"
 
+#include "support/seed.h"
 #include <QTest>
 
 #include <cmath>
@@ -64,51 +65,38 @@ class TestSampleCoding : public QObject
     Q_OBJECT
 
 private slots:
-    void decodesEveryWord_data();
     void decodesEveryWord();
     void everyWordComesBack();
-    void encodesTable_data();
     void encodesTable();
     void encodesAnything();
-    void levelsInOrder();
 };
-
-void TestSampleCoding::decodesEveryWord_data()
-{
-    QTest::addColumn<int>("coding");
-    QTest::addColumn<float>("gain");
-    for (const float gain : {1.0F, 0.5F, 1.9952623F}) {
-        QTest::addRow("A, gain %g", double(gain)) << int(SampleCoding::A) << gain;
-        QTest::addRow("B, gain %g", double(gain)) << int(SampleCoding::B) << gain;
-        QTest::addRow("C, gain %g", double(gain)) << int(SampleCoding::C) << gain;
-        QTest::addRow("D, gain %g", double(gain)) << int(SampleCoding::D) << gain;
-    }
-}
 
 void TestSampleCoding::decodesEveryWord()
 {
-    QFETCH(int, coding);
-    QFETCH(float, gain);
-    const auto kind = static_cast<SampleCoding>(coding);
     const std::vector<std::byte> words = allWords();
-    std::vector<float> values(wordCount);
-    decodeWords(kind, words, gain, values);
-    for (int word = 0; word < wordCount; ++word) {
-        // The quotient of two such numbers rounds to the same float on the way over a double.
-        const float expected = static_cast<float>(plainValue(kind, word)) * gain;
-        if (values.at(static_cast<size_t>(word)) != expected) {
-            QFAIL(qPrintable(QString("word %1").arg(word)));
+    for (const float gain : {1.0F, 0.5F, 1.9952623F}) {
+        for (const SampleCoding kind :
+             {SampleCoding::A, SampleCoding::B, SampleCoding::C, SampleCoding::D}) {
+            std::vector<float> values(wordCount);
+            decodeWords(kind, words, gain, values);
+            for (int word = 0; word < wordCount; ++word) {
+                // The quotient of two such numbers rounds to the same float on the way over a
+                // double.
+                const float expected = static_cast<float>(plainValue(kind, word)) * gain;
+                QVERIFY2(values.at(static_cast<size_t>(word)) == expected,
+                         qPrintable(QString::number(word)));
+            }
+            // Any length, any address.
+            std::vector<std::byte> shifted(words.size() + 1);
+            std::memcpy(shifted.data() + 1, words.data(), words.size());
+            for (const size_t count : {0U, 1U, 2U, 3U, 15U, 17U, 4095U, 4097U, 12289U}) {
+                std::vector<float> some(count + 1, 7.0F);
+                decodeWords(kind, std::span(shifted).subspan(1, 2 * count), gain,
+                            std::span(some).first(count));
+                QVERIFY(std::equal(some.begin(), some.end() - 1, values.begin()));
+                QCOMPARE(some.back(), 7.0F);
+            }
         }
-    }
-    // Any length, any address.
-    std::vector<std::byte> shifted(words.size() + 1);
-    std::memcpy(shifted.data() + 1, words.data(), words.size());
-    for (const size_t count : {0U, 1U, 2U, 3U, 15U, 17U, 4095U, 4097U, 12289U}) {
-        std::vector<float> some(count + 1, 7.0F);
-        decodeWords(kind, std::span(shifted).subspan(1, 2 * count), gain,
-                    std::span(some).first(count));
-        QVERIFY(std::equal(some.begin(), some.end() - 1, values.begin()));
-        QCOMPARE(some.back(), 7.0F);
     }
 }
 
@@ -134,52 +122,32 @@ void TestSampleCoding::everyWordComesBack()
     QVERIFY(twice == back);
 }
 
-void TestSampleCoding::encodesTable_data()
-{
-    QTest::addColumn<float>("value");
-    QTest::addColumn<int>("word");
-    const float infinity = std::numeric_limits<float>::infinity();
-    QTest::newRow("one") << 1.0F << 32767;
-    QTest::newRow("minus one") << -1.0F << -32766;
-    QTest::newRow("zero") << 0.0F << 0;
-    QTest::newRow("minus zero") << -0.0F << 0;
-    QTest::newRow("zero as read") << -0.5F / 32767 << 0;
-    QTest::newRow("half") << 0.5F << 16384;
-    QTest::newRow("minus half") << -0.5F << -16383;
-    QTest::newRow("above") << 1.5F << 32767;
-    QTest::newRow("below") << -1.5F << -32767;
-    QTest::newRow("just above") << std::nextafter(1.0F, 2.0F) << 32767;
-    QTest::newRow("just below") << std::nextafter(-1.0F, -2.0F) << -32767;
-    QTest::newRow("infinite") << infinity << 32767;
-    QTest::newRow("minus infinite") << -infinity << -32767;
-    QTest::newRow("largest") << std::numeric_limits<float>::max() << 32767;
-    QTest::newRow("smallest") << std::numeric_limits<float>::denorm_min() << 0;
-    QTest::newRow("no number") << std::numeric_limits<float>::quiet_NaN() << 32767;
-    QTest::newRow("no number, negative") << -std::numeric_limits<float>::quiet_NaN() << 32767;
-}
-
 void TestSampleCoding::encodesTable()
 {
-    QFETCH(float, value);
-    QFETCH(int, word);
-    QCOMPARE(int(encodeWord(value)), word);
-    QCOMPARE(plainWord(value), word);
-    // In a block all places must agree, also those of the vector loop.
-    const std::vector<float> values(67, value);
-    std::vector<std::byte> words(2 * values.size());
-    encodeWords(values, words);
-    for (size_t i = 0; i < values.size(); ++i) {
-        qint16 got = 0;
-        std::memcpy(&got, words.data() + 2 * i, 2);
-        QCOMPARE(int(got), word);
-    }
+    const float infinity = std::numeric_limits<float>::infinity();
+    forRows({{"one", 1.0F, 32767},
+             {"half", 0.5F, 16384},
+             {"infinite", infinity, 32767},
+             {"no number", std::numeric_limits<float>::quiet_NaN(), 32767},
+             {"no number, negative", -std::numeric_limits<float>::quiet_NaN(), 32767}},
+            [&](float value, int word) {
+                QCOMPARE(int(encodeWord(value)), word);
+                QCOMPARE(plainWord(value), word);
+                // In a block all places must agree, also those of the vector loop.
+                const std::vector<float> values(67, value);
+                std::vector<std::byte> words(2 * values.size());
+                encodeWords(values, words);
+                for (size_t i = 0; i < values.size(); ++i) {
+                    qint16 got = 0;
+                    std::memcpy(&got, words.data() + 2 * i, 2);
+                    QCOMPARE(int(got), word);
+                }
+            });
 }
 
 void TestSampleCoding::encodesAnything()
 {
-    const unsigned seed = std::random_device{}();
-    qInfo("seed %u", seed);
-    std::mt19937 random(seed);
+    std::mt19937 random = randomGenerator();
     std::uniform_real_distribution<float> around(-1.1F, 1.1F);
     std::vector<float> values(1'000'003);
     for (size_t i = 0; i < values.size(); ++i) {
@@ -197,32 +165,6 @@ void TestSampleCoding::encodesAnything()
         if (got != plainWord(values[i]) || got != encodeWord(values[i])) {
             QFAIL(qPrintable(QString::number(values[i], 'g', 9)));
         }
-    }
-}
-
-void TestSampleCoding::levelsInOrder()
-{
-    std::mt19937 random(1);
-    std::uniform_real_distribution<float> around(-2, 2);
-    std::vector<float> values(20'014);
-    for (float &value : values) {
-        value = around(random);
-    }
-    LevelSums expected;
-    for (size_t i = 0; i < values.size(); i += 2) {
-        const double power =
-            static_cast<double>(values[i]) * static_cast<double>(values[i]) +
-            static_cast<double>(values[i + 1]) * static_cast<double>(values[i + 1]);
-        expected.sum += power;
-        expected.peak = std::max(expected.peak, power);
-    }
-    for (const size_t block : {2U, 6U, 14U, 512U, 514U, 20014U}) {
-        LevelSums sums;
-        for (size_t done = 0; done < values.size(); done += block) {
-            addLevels(std::span(values).subspan(done, std::min(block, values.size() - done)), sums);
-        }
-        // Bit by bit: the order of the additions is part of the result.
-        QVERIFY(sums.sum == expected.sum && sums.peak == expected.peak);
     }
 }
 

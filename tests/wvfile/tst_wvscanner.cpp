@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvTestFile.h"
 
+#include "support/rows.h"
 #include "wvfile/WvScanner.h"
 
 #include <QDate>
@@ -21,10 +22,10 @@ struct Scan
     QStringList log;
 };
 
-Scan scan(const QByteArray &bytes, unsigned mask = Tracer::DefaultMask)
+Scan scan(const QByteArray &bytes)
 {
     Scan result;
-    CapturedLog log(mask);
+    CapturedLog log;
     TestDevice device;
     device.bytes = bytes;
     result.ok = device.open(QIODevice::ReadOnly) && WvScanner(result.summary).scan(device);
@@ -46,134 +47,105 @@ class TestWvScanner : public QObject
     Q_OBJECT
 
 private slots:
-    void words_data();
-    void words();
-    void kinds_data();
+    void accepted();
+    void refused();
     void kinds();
     void fields();
     void tagsBehindTheBlock();
     void segments();
     void unknownValues();
-    void names_data();
     void names();
-    void debugWords();
     void files();
     void samplesAreNotRead();
 };
 
-void TestWvScanner::words_data()
+void TestWvScanner::accepted()
 {
-    QTest::addColumn<QByteArray>("file");
-    QTest::addColumn<bool>("ok");
-    QTest::addColumn<QStringList>("log");
-    const auto good = [](const char *name, const QByteArray &file, const QStringList &log = {}) {
-        QTest::newRow(name) << file << true << log;
-    };
-    good("no tag at all", "", {noLevels, noClock});
-    good("clock and levels", clocked);
-    good("no levels", "{CLOCK:1}", {noLevels});
-    good("no clock", levels, {noClock});
-    good("clock 0", levels + "{CLOCK:0}", {noClock});
-    good("negative clock", levels + "{CLOCK:-5}", {noClock});
-    good("any clock above 0", levels + "{CLOCK:1e12}");
-    good("LEVEL OFFSET isn't known here", "{CLOCK:1}{LEVEL OFFSET:1,2}", {noLevels});
-    good("whatever the case", "{clock:1}{ Level   Offs :1,2}");
-    good("tags of no interest", clocked + "{CONTROL LENGTH:x}{CRESTFACTOR:{}{RESOLUTION:" +
-                                    QByteArray(2000, '1') + "}{FREE" + QByteArray(5, '\0') + ":}" +
-                                    "{MWV_SEGMENT_NEWS:" + QByteArray(2000, '1') + '}');
-    good("block as stated", clocked + "{SAMPLES:2}" + silentBlock(2));
-    good("block overrules SAMPLES", clocked + "{SAMPLES:3}" + silentBlock(2), {suspicious(2, 3)});
-    good("block without SAMPLES", clocked + silentBlock(2), {suspicious(2, -1)});
-    good("block of broken length", clocked + "{SAMPLES:1}{WAVEFORM-8:1,#abcdef}",
-         {"2|Resulting data length in WAVEFORM tag is invalid: 5",
-          "2|Tag begins with 'WAVEFORM-8:1,#'",
-          "2|Number of stripped bytes at beginning (including #): 3"});
-    good("empty block", clocked + "{SAMPLES:1}{WAVEFORM-1: #}",
-         {"2|Invalid number of samples in WAVEFORM tag: 0", suspicious(0, 1)});
-    good("largest block", clocked + "{SAMPLES:4000000000}{WAVEFORM-16000000001: #ab}");
-    good("block beyond belief", clocked + "{SAMPLES:1}{WAVEFORM-16000000005: #ab}",
-         {"2|Invalid number of samples in WAVEFORM tag: 4000000001", suspicious(4'000'000'001, 1)});
-    good("block shorter than its prefix", clocked + "{SAMPLES:1}{WAVEFORM-2:12345#}",
-         {"2|Invalid number of samples in WAVEFORM tag: 0", suspicious(0, 1)});
+    forRows(
+        {{"no tag at all", "", {noLevels, noClock}},
+         {"no levels", "{CLOCK:1}", {noLevels}},
+         {"clock 0", levels + "{CLOCK:0}", {noClock}},
+         {"any clock above 0", levels + "{CLOCK:1e12}", {}},
+         {"LEVEL OFFSET isn't known here", "{CLOCK:1}{LEVEL OFFSET:1,2}", {noLevels}},
+         {"whatever the case", "{clock:1}{ Level   Offs :1,2}", {}},
+         {"tags of no interest",
+          clocked + "{CONTROL LENGTH:x}{CRESTFACTOR:{}{RESOLUTION:" + QByteArray(2000, '1') +
+              "}{FREE" + QByteArray(5, '\0') + ":}{MWV_SEGMENT_NEWS:" + QByteArray(2000, '1') + '}',
+          {}},
+         {"block as stated", clocked + "{SAMPLES:2}" + silentBlock(2), {}},
+         {"block without SAMPLES", clocked + silentBlock(2), {suspicious(2, -1)}},
+         {"block of broken length",
+          clocked + "{SAMPLES:1}{WAVEFORM-8:1,#abcdef}",
+          {"2|Resulting data length in WAVEFORM tag is invalid: 5",
+           "2|Tag begins with 'WAVEFORM-8:1,#'",
+           "2|Number of stripped bytes at beginning (including #): 3"}},
+         {"largest block", clocked + "{SAMPLES:4000000000}{WAVEFORM-16000000001: #ab}", {}},
+         {"block beyond belief",
+          clocked + "{SAMPLES:1}{WAVEFORM-16000000005: #ab}",
+          {"2|Invalid number of samples in WAVEFORM tag: 4000000001",
+           suspicious(4'000'000'001, 1)}},
+         {"block shorter than its prefix",
+          clocked + "{SAMPLES:1}{WAVEFORM-2:12345#}",
+          {"2|Invalid number of samples in WAVEFORM tag: 0", suspicious(0, 1)}}},
+        [](const QByteArray &file, const QStringList &log) {
+            const Scan result = scan(file);
+            QCOMPARE(result.log, log);
+            QVERIFY(result.ok);
+        });
+}
 
-    const auto bad = [](const char *name, const QByteArray &file, const QString &words) {
-        QTest::newRow(name) << clocked + file + "{CLOCK:0}" << false << QStringList(words);
-    };
-    bad("kind", "{TYPE:XYZ,0}", "4|Invalid file format in TYPE tag.");
-    bad("no kind", "{TYPE:}", "4|Invalid file format in TYPE tag.");
-    bad("clock", "{CLOCK:x}", "4|Invalid clock rate in CLOCK tag.");
-    bad("clock without end", "{CLOCK:inf}", "4|Invalid clock rate in CLOCK tag.");
-    bad("samples", "{SAMPLES:x}", "4|Invalid samples count in SAMPLES tag.");
-    bad("levels", "{LEVEL OFFS:1;2}", "4|Invalid parameters in LEVEL OFFS tag.");
-    bad("one level", "{LEVEL OFFS:1}", "4|Invalid parameters in LEVEL OFFS tag.");
-    bad("segment count", "{MWV_SEGMENT_COUNT:x}", "4|Invalid MWV_SEGMENT_COUNT tag.");
-    bad("negative segment count", "{MWV_SEGMENT_COUNT:-1}",
-        "4|Invalid count in MSW_SEGMENT_COUNT tag.");
-    for (const char *tag : {"DURATION", "CLOCK", "START", "LENGTH"}) {
-        for (const char *list : {"1,x", "1,,2", ""}) {
-            QTest::addRow("%s '%s'", tag, list)
-                << clocked + "{MWV_SEGMENT_" + tag + ':' + list + '}' << false
-                << QStringList(QString("4|Invalid MWV_SEGMENT_%1 tag.").arg(tag));
-        }
-    }
-    bad("segment levels", "{MWV_SEGMENT_LEVEL_OFFS:1,2,3,x}",
-        "4|Invalid MWV_SEGMENT_LEVEL_OFFS tag.");
-    bad("block without number", "{WAVEFORM: #}", "4|Invalid WAVEFORM tag.");
-    bad("block without mark", "{WAVEFORM-5:}", "4|Invalid WAVEFORM tag.");
-    QTest::newRow("marker list without end")
-        << clocked + "{MARKER LIST 1:0:1" << false << QStringList("4|Invalid MARKER LIST tag.");
+void TestWvScanner::refused()
+{
+    forRows(
+        {{"kind", "{TYPE:XYZ,0}", "4|Invalid file format in TYPE tag."},
+         {"clock", "{CLOCK:inf}", "4|Invalid clock rate in CLOCK tag."},
+         {"samples", "{SAMPLES:x}", "4|Invalid samples count in SAMPLES tag."},
+         {"one level", "{LEVEL OFFS:1}", "4|Invalid parameters in LEVEL OFFS tag."},
+         {"segment count", "{MWV_SEGMENT_COUNT:x}", "4|Invalid MWV_SEGMENT_COUNT tag."},
+         {"negative count", "{MWV_SEGMENT_COUNT:-1}", "4|Invalid count in MSW_SEGMENT_COUNT tag."},
+         {"segment duration", "{MWV_SEGMENT_DURATION:1,x}", "4|Invalid MWV_SEGMENT_DURATION tag."},
+         {"segment clock", "{MWV_SEGMENT_CLOCK:1,,2}", "4|Invalid MWV_SEGMENT_CLOCK tag."},
+         {"segment start", "{MWV_SEGMENT_START:}", "4|Invalid MWV_SEGMENT_START tag."},
+         {"segment length", "{MWV_SEGMENT_LENGTH:x}", "4|Invalid MWV_SEGMENT_LENGTH tag."},
+         {"segment levels", "{MWV_SEGMENT_LEVEL_OFFS:1,2,3,x}",
+          "4|Invalid MWV_SEGMENT_LEVEL_OFFS tag."},
+         {"block without number", "{WAVEFORM: #}", "4|Invalid WAVEFORM tag."},
+         {"block without mark", "{WAVEFORM-5:}", "4|Invalid WAVEFORM tag."},
+         {"list without end", "{MARKER LIST 1:0:1", "4|Invalid MARKER LIST tag."}},
+        [](const QByteArray &tags, const QString &words) {
+            const Scan result = scan(clocked + tags);
+            QCOMPARE(result.log, QStringList(words));
+            QVERIFY(!result.ok);
+        });
     for (const char *tag :
          {"TYPE", "COMMENT", "COPYRIGHT", "DATE", "CLOCK", "SAMPLES", "LEVEL OFFS", "WAVEFORM-1",
           "MWV_SEGMENT_SETTINGS_FILE", "MWV_SEGMENT_LEVEL_MODE", "MWV_SEGMENT_CLOCK_MODE",
           "MWV_SEGMENT_COUNT", "MWV_SEGMENT_DURATION", "MWV_SEGMENT_CLOCK", "MWV_SEGMENT_START",
           "MWV_SEGMENT_LENGTH", "MWV_SEGMENT_FILES", "MWV_SEGMENT_LEVEL_OFFS"}) {
         const QString name = QString(tag).section('-', 0, 0);
-        QTest::addRow("endless %s", tag)
-            << clocked + '{' + tag + ':' + QByteArray(1025, '1') + '}' << false
-            << QStringList({"4|Tag content exceeds limit.", "4|Invalid " + name + " tag."});
+        QCOMPARE(scan(clocked + '{' + tag + ':' + QByteArray(1025, '1') + '}').log,
+                 QStringList({"4|Tag content exceeds limit.", "4|Invalid " + name + " tag."}));
     }
-}
-
-void TestWvScanner::words()
-{
-    QFETCH(QByteArray, file);
-    QFETCH(bool, ok);
-    QFETCH(QStringList, log);
-    const Scan result = scan(file);
-    QCOMPARE(result.log, log);
-    QCOMPARE(result.ok, ok);
-}
-
-void TestWvScanner::kinds_data()
-{
-    QTest::addColumn<QByteArray>("content");
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<bool>("checksum");
-    const auto row = [](const char *content, const char *text, bool checksum) {
-        QTest::newRow(content) << QByteArray(content) << QString(text) << checksum;
-    };
-    row("TGX-WV,0", "TGX Waveform File", false);
-    row(" tgx-wv , 0 ", "TGX Waveform File", false);
-    row("TBX-WV", "TBX Waveform File", false);
-    row("TVX-WV,", "TVX Waveform File", false);
-    row("TQX-130-WV,123456", "TQX-130 waveform file", true);
-    row("WV, -1", "TQX-110, TQX-120 waveform file", true);
-    row("WV-ADD,x", "TQX-110, TQX-120 additional waveform file", false);
-    row("TGX-MWV,1", "TGX Multi-Segment Waveform", true);
-    row("TGX-DL,0", "TGX data list", false);
-    row("TGX-CL,0,7", "TGX control list", false);
 }
 
 void TestWvScanner::kinds()
 {
-    QFETCH(QByteArray, content);
-    QFETCH(QString, text);
-    QFETCH(bool, checksum);
-    const Scan result = scan("{TYPE:" + content + '}' + clocked);
-    QVERIFY(result.ok);
-    QCOMPARE(result.log, QStringList("1|Waveform TYPE-tag : " + text));
-    QCOMPARE(result.summary.typeText, text);
-    QCOMPARE(result.summary.hasChecksum, checksum);
+    forRows({{"TGX", " tgx-wv , 0 ", "TGX Waveform File", false},
+             {"TBX", "TBX-WV", "TBX Waveform File", false},
+             {"TVX", "TVX-WV,", "TVX Waveform File", false},
+             {"TQX-130", "TQX-130-WV,123456", "TQX-130 waveform file", true},
+             {"TQX-110", "WV, -1", "TQX-110, TQX-120 waveform file", true},
+             {"added", "WV-ADD,x", "TQX-110, TQX-120 additional waveform file", false},
+             {"segments", "TGX-MWV,1", "TGX Multi-Segment Waveform", true},
+             {"data", "TGX-DL,0", "TGX data list", false},
+             {"control", "TGX-CL,0,7", "TGX control list", false}},
+            [](const QByteArray &content, const QString &text, bool checksum) {
+                const Scan result = scan("{TYPE:" + content + '}' + clocked);
+                QVERIFY(result.ok);
+                QCOMPARE(result.log, QStringList("1|Waveform TYPE-tag : " + text));
+                QCOMPARE(result.summary.typeText, text);
+                QCOMPARE(result.summary.hasChecksum, checksum);
+            });
 }
 
 void TestWvScanner::fields()
@@ -248,40 +220,24 @@ void TestWvScanner::unknownValues()
     QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
 }
 
-void TestWvScanner::names_data()
-{
-    QTest::addColumn<QByteArray>("before");
-    QTest::newRow("control byte in a name") << QByteArray("{COM\nMENT:no}");
-    QTest::newRow("byte beyond ASCII in a name") << QByteArray("{COMMENT\xE4:no}");
-    QTest::newRow("tilde in a name") << QByteArray("{COMMENT~:no}");
-    QTest::newRow("empty name") << QByteArray("{:no}");
-    QTest::newRow("blank name") << QByteArray("{   :no}");
-    QTest::newRow("name of 1024 characters") << '{' + QByteArray(1024, 'x') + ":no}";
-    QTest::newRow("longer name") << '{' + QByteArray(1100, 'x') + ":no}";
-    QTest::newRow("brace in a name") << QByteArray("{{COMMENT:no}");
-}
-
 void TestWvScanner::names()
 {
-    QFETCH(QByteArray, before);
-    const Scan result = scan(before + clocked + "{COMMENT:yes}");
-    QVERIFY(result.ok);
-    QCOMPARE(result.log, QStringList());
-    QCOMPARE(result.summary.comment, QString("yes"));
-}
-
-void TestWvScanner::debugWords()
-{
-    const Scan result = scan(clocked + "{ x  y :}{SAMPLES:1}" + silentBlock(1), Tracer::DebugMask);
-    QCOMPARE(result.log, QStringList({"16|Evaluating tag 'LEVEL OFFS'", "16|Evaluating tag 'CLOCK'",
-                                      "16|Evaluating tag 'X Y'", "16|Evaluating tag 'SAMPLES'",
-                                      "16|Evaluating tag 'WAVEFORM-5'", "16|WAVEFORM-tag found."}));
+    forRows({{"control byte in a name", "{COM\nMENT:no}"},
+             {"empty name", "{:no}"},
+             {"long name", '{' + QByteArray(1100, 'x') + ":no}"},
+             {"brace in a name", "{{COMMENT:no}"}},
+            [](const QByteArray &before) {
+                const Scan result = scan(before + clocked + "{COMMENT:yes}");
+                QVERIFY(result.ok);
+                QCOMPARE(result.log, QStringList());
+                QCOMPARE(result.summary.comment, QString("yes"));
+            });
 }
 
 void TestWvScanner::files()
 {
-    const QTemporaryDir folder;
-    const QString path = folder.filePath("some.wv");
+    const TestFolder folder;
+    const QString path = folder.path("some.wv");
     const QString reading = "1|Reading information from file: ";
     CapturedLog log;
     HvFileIO io;
@@ -294,10 +250,7 @@ void TestWvScanner::files()
     QCOMPARE(log.take(), QStringList({reading + folder.path(), "4|Cannot open file."}));
     QVERIFY(!io.readWaveformInfo(path, nullptr));
 
-    QFile file(path);
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.write(clocked);
-    file.close();
+    QVERIFY(folder.store("some.wv", clocked));
     static_cast<void>(log.take());
     const QDate before = QDate::currentDate();
     QVERIFY(io.readWaveformInfo(path, &summary));

@@ -1,0 +1,372 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "streams/BufferedIO.h"
+#include "streams/levels.h"
+
+#include "support/TestDevice.h"
+#include "support/logreader.h"
+#include "support/rows.h"
+#include "support/seed.h"
+
+#include <QTemporaryFile>
+#include <QTest>
+
+#include <algorithm>
+#include <vector>
+
+namespace {
+
+constexpr int Buffer = 1000;
+
+/// The stream as its users know it, with no thought of speed: one window of the file for reading
+/// and one piece that waits to be written.
+class PlainStream
+{
+public:
+    QByteArray file;
+
+    explicit PlainStream(int bufferSize)
+        : m_bufferSize(bufferSize)
+    {
+    }
+
+    int read(int length, QByteArray &target)
+    {
+        target.clear();
+        while (target.size() < length) {
+            const QByteArray part = m_window.mid(m_taken, length - target.size());
+            target += part;
+            m_taken += part.size();
+            if (target.size() < length) {
+                m_window = file.mid(m_readPosition, m_bufferSize);
+                m_taken = 0;
+                m_readPosition += m_window.size();
+                if (m_window.isEmpty()) {
+                    break;
+                }
+            }
+        }
+        return static_cast<int>(target.size());
+    }
+
+    void write(const QByteArray &bytes)
+    {
+        m_waiting += bytes;
+        while (m_waiting.size() > m_bufferSize) {
+            store(m_waiting.left(m_bufferSize));
+            m_waiting.remove(0, m_bufferSize);
+        }
+    }
+
+    void writeBlock(const QByteArray &bytes)
+    {
+        store(m_waiting + bytes);
+        m_waiting.clear();
+    }
+
+    void restart(qint64 position)
+    {
+        store(m_waiting);
+        m_waiting.clear();
+        m_writePosition = 0;
+        m_window = position < 0 ? file.left(m_bufferSize) : QByteArray();
+        m_taken = 0;
+        m_readPosition = position < 0 ? m_window.size() : position;
+    }
+
+private:
+    void store(const QByteArray &bytes)
+    {
+        file.replace(m_writePosition, bytes.size(), bytes);
+        m_writePosition += bytes.size();
+    }
+
+    const int m_bufferSize;
+    QByteArray m_window;
+    qsizetype m_taken = 0;
+    QByteArray m_waiting;
+    qint64 m_readPosition = 0;
+    qint64 m_writePosition = 0;
+};
+
+} // namespace
+
+class TestStreams : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void anyOrderOfCalls();
+    void headers();
+    void markersRewrittenInPlace();
+    void modes();
+    void releasedAndTakenUpAgain();
+    void refusedCalls();
+    void failingDevice();
+    void levelsInOrder();
+};
+
+/// Any order of reads, writes and restarts gives what the plain stream gives.
+void TestStreams::anyOrderOfCalls()
+{
+    std::mt19937 random = randomGenerator();
+    const auto below = [&random](int limit) {
+        return static_cast<int>(random() % static_cast<unsigned>(limit));
+    };
+    // Blocks from 256 KiB on may go past the buffer.
+    forRows({{"a byte", 1, 5, 2000},
+             {"some bytes", 1000, 5000, 2000},
+             {"below the large blocks", 100'000, 600'000, 500},
+             {"above them", 400'000, 900'000, 500}},
+            [&](int bufferSize, int largest, int calls) {
+                const QByteArray source = randomBytes(2 * largest);
+                TestDevice device;
+                device.bytes = randomBytes(largest, 2);
+                PlainStream plain(bufferSize);
+                plain.file = device.bytes;
+                BufferedIO stream(bufferSize);
+                QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+                plain.restart(-1);
+                QByteArray expected;
+                for (int i = 0; i < calls; ++i) {
+                    const int size = 1 + below(1 + below(largest));
+                    const QByteArray piece = source.mid(below(largest), size);
+                    switch (below(8)) {
+                    case 0:
+                        QVERIFY(stream.restartAtBegining());
+                        plain.restart(-1);
+                        QCOMPARE(stream.deviceSize(), plain.file.size());
+                        break;
+                    case 1: {
+                        const int position = below(2 * largest);
+                        QVERIFY(stream.restartAtPosition(position));
+                        plain.restart(position);
+                        break;
+                    }
+                    case 2:
+                        QVERIFY(stream.writeBlock(size, piece.constData()));
+                        plain.writeBlock(piece);
+                        break;
+                    case 3:
+                    case 4:
+                        QVERIFY(stream.writeBytes(size, piece.constData()));
+                        plain.write(piece);
+                        break;
+                    default:
+                        QByteArray block = piece;
+                        const int got = plain.read(size, expected);
+                        if (below(2) == 0) {
+                            QCOMPARE(stream.readBlock(size, block.data()), got);
+                        } else {
+                            QCOMPARE(stream.readBytes(size, block.data()), got > 0);
+                        }
+                        // Behind the end the caller's bytes stay as they were.
+                        QVERIFY(block == expected + piece.mid(got));
+                    }
+                }
+                QVERIFY(stream.releaseBuf());
+                plain.restart(-1);
+                QVERIFY(device.bytes == plain.file);
+            });
+}
+
+void TestStreams::headers()
+{
+    TestDevice device;
+    BufferedIO stream(Buffer);
+    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+    QVERIFY(!stream.checkHeader("IQF"));
+    QVERIFY(stream.writeHeader("IQ"));
+    QVERIFY(!stream.checkHeader("IQF"));
+    const float record[2] = {0.25F, -0.5F};
+    QVERIFY(stream.writeHeader("IQF"));
+    QVERIFY(stream.writeBytes(BufferedIO::RecordSize, record));
+    QVERIFY(stream.checkHeader("IQF"));
+    float back[2] = {};
+    QVERIFY(stream.readBytes(BufferedIO::RecordSize, back));
+    QCOMPARE(back[0], record[0]);
+    QCOMPARE(back[1], record[1]);
+    QCOMPARE(device.bytes.size(), qsizetype(BufferedIO::HeaderSize + BufferedIO::RecordSize));
+    QVERIFY(!stream.checkHeader("iqf"));
+}
+
+void TestStreams::markersRewrittenInPlace()
+{
+    const QByteArray content = randomBytes(3 * Buffer + 7);
+    QTemporaryFile file;
+    BufferedIO stream(Buffer);
+    QVERIFY(stream.initBuf(&file, BufferedIO::ReadWrite));
+    QVERIFY(stream.writeBytes(static_cast<int>(content.size()), content.constData()));
+    QVERIFY(stream.restartAtBegining());
+    for (qsizetype i = 0; i < content.size(); ++i) {
+        char byte = 0;
+        QVERIFY(stream.readBytes(1, &byte));
+        byte = static_cast<char>(byte ^ 5);
+        QVERIFY(stream.writeBytes(1, &byte));
+    }
+    QVERIFY(stream.restartAtBegining());
+    QByteArray back(content.size(), '\0');
+    QVERIFY(stream.readBytes(static_cast<int>(back.size()), back.data()));
+    for (char &byte : back) {
+        byte = static_cast<char>(byte ^ 5);
+    }
+    QVERIFY(back == content);
+}
+
+void TestStreams::modes()
+{
+    forRows({{"neither", 0, false},
+             {"unknown bit", 4, false},
+             {"read", int(BufferedIO::Read), true},
+             {"write", int(BufferedIO::Write), true},
+             {"both", int(BufferedIO::ReadWrite), true}},
+            [&](int mode, bool starts) {
+                TestDevice device;
+                device.bytes = "content";
+                BufferedIO stream;
+                QCOMPARE(stream.initBuf(&device, mode), starts);
+                QCOMPARE(stream.isInitialised(), starts);
+                QCOMPARE(device.isOpen(), starts);
+                if (!starts) {
+                    QVERIFY(!stream.initBuf(nullptr, BufferedIO::ReadWrite));
+                    return;
+                }
+                QVERIFY2(!stream.initBuf(&device, mode), "a second time without a release");
+                char block[4] = {};
+                QCOMPARE(stream.readBytes(4, block), (mode & BufferedIO::Read) != 0);
+                QCOMPARE(stream.writeBytes(3, "new"), (mode & BufferedIO::Write) != 0);
+                QVERIFY(stream.restartAtBegining());
+                QCOMPARE(device.bytes,
+                         QByteArray(mode == BufferedIO::Read ? "content" : "newtent"));
+                QVERIFY(stream.releaseBuf());
+                QVERIFY(!device.isOpen());
+            });
+}
+
+void TestStreams::releasedAndTakenUpAgain()
+{
+    QTemporaryFile file;
+    BufferedIO stream;
+    QVERIFY(!stream.reinitBuf());
+    QVERIFY(stream.initBuf(&file, BufferedIO::ReadWrite));
+    const QString name = file.fileName();
+    QVERIFY(stream.writeBytes(5, "bytes"));
+    QVERIFY(stream.releaseBuf());
+    QVERIFY(!stream.isInitialised());
+    QVERIFY(stream.reinitBuf());
+    QCOMPARE(file.fileName(), name);
+    char back[5] = {};
+    QVERIFY(stream.readBytes(5, back));
+    QCOMPARE(QByteArray(back, 5), QByteArray("bytes"));
+}
+
+void TestStreams::refusedCalls()
+{
+    CapturedLog log;
+    TestDevice device;
+    BufferedIO stream(Buffer);
+    char byte = 0;
+    QVERIFY(!stream.readBytes(1, &byte));
+    QVERIFY(!stream.writeBytes(1, &byte));
+    QVERIFY(!stream.writeBlock(1, &byte));
+    QVERIFY(!stream.restartAtBegining());
+    QVERIFY(!stream.restartAtPosition(3));
+    QVERIFY(!stream.checkHeader("IQF"));
+    QVERIFY(!stream.writeHeader("IQF"));
+    QVERIFY(!stream.releaseBuf());
+    QStringList expected(7, "4|Library not initialized.");
+    expected << "4|Buffer not initialized.";
+    QCOMPARE(log.take(), expected);
+
+    // All other failures are the caller's to name.
+    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+    for (const int length : {0, -1, 4}) {
+        char *target = length > 0 ? nullptr : &byte;
+        QVERIFY(!stream.readBytes(length, target));
+        QVERIFY(!stream.writeBytes(length, target));
+        QVERIFY(!stream.writeBlock(length, target));
+    }
+    QCOMPARE(log.take(), QStringList());
+}
+
+void TestStreams::failingDevice()
+{
+    forRows({{"does not open", "open"},
+             {"does not read at the start", "read 0"},
+             {"does not read behind the first block", "read 1"},
+             {"full at once", "full 0"},
+             {"full behind the first block", "full 1"},
+             {"does not seek", "seek"}},
+            [&](const QString &fault) {
+                CapturedLog log;
+                TestDevice device;
+                device.bytes = randomBytes(2 * Buffer);
+                BufferedIO stream(Buffer);
+                QByteArray block(2 * Buffer, '\0');
+                const int size = static_cast<int>(block.size());
+                if (fault == "open") {
+                    device.canOpen = false;
+                    QVERIFY(!stream.initBuf(&device, BufferedIO::ReadWrite));
+                } else if (fault == "read 0") {
+                    device.unreadableFrom = 0;
+                    QVERIFY(!stream.initBuf(&device, BufferedIO::ReadWrite));
+                    QVERIFY(!stream.isInitialised());
+                } else if (fault == "read 1") {
+                    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+                    device.unreadableFrom = Buffer;
+                    QVERIFY(!stream.readBytes(size, block.data()));
+                    QCOMPARE(stream.readBlock(size, block.data()), -1);
+                    device.unreadableFrom = -1;
+                    QVERIFY(stream.restartAtBegining());
+                    QVERIFY(stream.readBytes(size, block.data()));
+                    QVERIFY(block == device.bytes);
+                } else if (fault == "seek") {
+                    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+                    device.canSeek = false;
+                    QVERIFY(!stream.restartAtBegining());
+                    QVERIFY(!stream.restartAtPosition(3));
+                    QVERIFY(!stream.writeBytes(size, block.data()));
+                    QVERIFY(!stream.writeBlock(size, block.data()));
+                } else {
+                    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+                    device.capacity = fault == "full 0" ? 0 : Buffer + 1;
+                    // What fits the buffer fails no earlier than its way to the device.
+                    QVERIFY(stream.writeBytes(100, block.data()));
+                    QCOMPARE(stream.restartAtBegining(), fault != "full 0");
+                    QVERIFY(!stream.writeBlock(size, block.data()));
+                    QVERIFY(stream.writeBytes(size, block.data()) || fault == "full 0");
+                    QVERIFY(!stream.restartAtBegining());
+                    QVERIFY(!stream.releaseBuf());
+                    QVERIFY(stream.isInitialised());
+                }
+                QCOMPARE(log.take(), QStringList());
+            });
+}
+
+void TestStreams::levelsInOrder()
+{
+    std::mt19937 random = randomGenerator();
+    std::uniform_real_distribution<float> around(-2, 2);
+    std::vector<float> values(20'014);
+    for (float &value : values) {
+        value = around(random);
+    }
+    LevelSums expected;
+    for (size_t i = 0; i < values.size(); i += 2) {
+        const double power =
+            static_cast<double>(values[i]) * static_cast<double>(values[i]) +
+            static_cast<double>(values[i + 1]) * static_cast<double>(values[i + 1]);
+        expected.sum += power;
+        expected.peak = std::max(expected.peak, power);
+    }
+    for (const size_t block : {2U, 6U, 14U, 512U, 514U, 20014U}) {
+        LevelSums sums;
+        for (size_t done = 0; done < values.size(); done += block) {
+            addLevels(std::span(values).subspan(done, std::min(block, values.size() - done)), sums);
+        }
+        // Bit by bit: the order of the additions is part of the result.
+        QVERIFY(sums.sum == expected.sum && sums.peak == expected.peak);
+    }
+}
+
+QTEST_GUILESS_MAIN(TestStreams)
+#include "tst_streams.moc"
