@@ -4,6 +4,7 @@
 #include "ToolJob.h"
 
 #include "log/Tracer.h"
+#include "streams/markerstream.h"
 #include "wvfile/HvFileIO.h"
 
 #include <algorithm>
@@ -108,38 +109,8 @@ bool SourceWaveform::read(ToolJob &job, const QString &fileName)
     m_info.tagsStream = unknownTags.stream();
     HvFileIO file;
     const JobStep step(job, "Reading Waveform...", file);
-    return file.readWaveform(&m_info) && completeMarkers() && filterTags(unknownTags);
-}
-
-/// A file may state marker positions for fewer samples than it has; the trace then goes on with its
-/// last byte, so that each sample has markers to be carried on.
-bool SourceWaveform::completeMarkers()
-{
-    BufferedIO &stream = *m_markers.stream();
-    qint64 held = stream.deviceSize();
-    if (held >= m_info.samples) {
-        return true;
-    }
-    // Only a pass over the stream brings the write side to its end.
-    std::vector<char> block(blockSize);
-    char last = 0;
-    for (qint64 done = 0; done < held;) {
-        const int got = stream.readBlock(blockSize, block.data());
-        if (got <= 0 || !stream.writeBytes(got, block.data())) {
-            return Tracer::fail("Cannot complete the temporary marker data.");
-        }
-        last = block[static_cast<size_t>(got) - 1];
-        done += got;
-    }
-    std::fill(block.begin(), block.end(), last);
-    while (held < m_info.samples) {
-        const auto count = static_cast<int>(std::min<qint64>(m_info.samples - held, blockSize));
-        if (!stream.writeBytes(count, block.data())) {
-            return Tracer::fail("Cannot complete the temporary marker data.");
-        }
-        held += count;
-    }
-    return stream.restartAtBegining() || Tracer::fail("Cannot complete the temporary marker data.");
+    return file.readWaveform(&m_info) && completeMarkers(*m_markers.stream(), m_info.samples) &&
+           filterTags(unknownTags);
 }
 
 bool SourceWaveform::filterTags(TempStream &unknownTags)

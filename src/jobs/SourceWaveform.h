@@ -33,7 +33,6 @@ public:
     [[nodiscard]] WvWriteJob writeJob() const;
 
 private:
-    [[nodiscard]] bool completeMarkers();
     [[nodiscard]] bool filterTags(TempStream &unknownTags);
 
     TempStream m_data;

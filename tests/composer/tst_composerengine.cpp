@@ -1,0 +1,454 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "composer/ComposerEngine.h"
+#include "composer/renderreference.h"
+#include "streams/samplestream.h"
+#include "support/files.h"
+#include "support/logreader.h"
+#include "support/seed.h"
+#include "support/wvbytes.h"
+
+#include <QTest>
+
+#include <functional>
+#include <numbers>
+
+using Change = std::function<void(Composition &)>;
+using Samples = std::vector<std::complex<float>>;
+
+namespace {
+
+QByteArray markerLists(const std::vector<quint8> &bytes)
+{
+    QByteArray text = "{CONTROL LENGTH:" + QByteArray::number(qsizetype(bytes.size())) + '}';
+    for (int marker = 0; marker < 4; ++marker) {
+        text += "{MARKER LIST " + QByteArray::number(marker + 1) + ':';
+        for (std::size_t i = 0; i < bytes.size(); ++i) {
+            text += (i > 0 ? ";" : "") + QByteArray::number(qsizetype(i)) + ':' +
+                    QByteArray::number((bytes[i] >> marker) & 1);
+        }
+        text += '}';
+    }
+    return text;
+}
+
+/// The marker bytes that a file's lists of transitions stand for.
+std::vector<quint8> writtenMarkers(const QByteArray &file, std::size_t count)
+{
+    std::vector<quint8> bytes(count);
+    for (int marker = 0; marker < 4; ++marker) {
+        const QByteArray list = tag(file, "MARKER LIST " + QByteArray::number(marker + 1));
+        const QList<QByteArray> transitions = list.split(';');
+        for (const QByteArray &transition : transitions) {
+            const QList<QByteArray> parts = transition.split(':');
+            const auto bit = static_cast<quint8>(1 << marker);
+            for (std::size_t i = parts.value(0).trimmed().toUInt(); i < count; ++i) {
+                bytes[i] = parts.value(1) == "1" ? bytes[i] | bit : bytes[i] & quint8(~bit);
+            }
+        }
+    }
+    return bytes;
+}
+
+struct Waveform
+{
+    Samples samples;
+    std::vector<quint8> markers;
+    WvFileInfo info;
+};
+
+bool readFile(const QString &name, Waveform &waveform)
+{
+    TempStream data;
+    TempStream markers;
+    waveform.info.fileName = name;
+    waveform.info.dataStream = data.stream();
+    waveform.info.markerStream = markers.stream();
+    if (!data.open() || !markers.open() || !HvFileIO().readWaveform(&waveform.info) ||
+        !data->checkHeader("IQF")) {
+        return false;
+    }
+    const auto count = static_cast<std::size_t>(waveform.info.samples);
+    waveform.samples.resize(count);
+    waveform.markers.resize(count);
+    return data->readBlock(int(8 * count), waveform.samples.data()) == int(8 * count) &&
+           markers->readBlock(int(count), waveform.markers.data()) == int(count);
+}
+
+Samples resampled(const Samples &input, std::vector<quint8> &markers, qint64 count)
+{
+    TempStream in;
+    TempStream out;
+    TempStream markersIn;
+    TempStream markersOut;
+    const auto length = static_cast<int>(input.size());
+    Resample resample;
+    if (!in.open() || !out.open() || !markersIn.open() || !markersOut.open() ||
+        !in->writeHeader("IQF") || !in->writeBytes(8 * length, input.data()) ||
+        !markersIn->writeBytes(length, markers.data())) {
+        return {};
+    }
+    resample.setInput(in.stream(), length);
+    resample.setOutput(out.stream(), count);
+    resample.setMarkers(markersIn.stream(), markersOut.stream());
+    Samples result(static_cast<std::size_t>(count));
+    markers.resize(result.size());
+    if (!resample.run() || !out->checkHeader("IQF") || !markersOut->restartAtBegining() ||
+        !out->readBytes(int(8 * count), result.data()) ||
+        !markersOut->readBytes(int(count), markers.data())) {
+        return {};
+    }
+    return result;
+}
+
+} // namespace
+
+class tst_composerengine : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void initTestCase();
+    void render_data();
+    void render();
+    void randomDocuments();
+    void failures_data();
+    void failures();
+    void cancel_data();
+    void cancel();
+    void reports();
+
+private:
+    [[nodiscard]] ComposerSegment place(int file, qint64 target) const;
+    [[nodiscard]] Composition twoTracks() const;
+    void compare(const Composition &document);
+
+    TestFolder m_folder;
+};
+
+/// Files of 300, 500 and 700 samples at 1 MHz, 1 MHz and 2 MHz.
+void tst_composerengine::initTestCase()
+{
+    std::mt19937 generator(7);
+    for (int file = 0; file < 3; ++file) {
+        QList<int> values;
+        std::vector<quint8> markers;
+        for (int i = 0; i < 300 + 200 * file; ++i) {
+            values << int(generator() % 30000) - 15000 + 1 << int(generator() % 30000) - 15000;
+            markers.push_back(generator() % 16);
+        }
+        const QByteArray clock = file == 2 ? "2000000" : "1000000";
+        QVERIFY(m_folder.store(
+            QString::number(file) + ".wv",
+            wvFile("{TYPE: TGX-WV,0}{CLOCK:" + clock + '}' + markerLists(markers), words(values))));
+    }
+}
+
+ComposerSegment tst_composerengine::place(int file, qint64 target) const
+{
+    ComposerSegment segment;
+    segment.sName = m_folder.path(QString::number(file) + ".wv");
+    segment.lSamples = 300 + 200 * file;
+    segment.lUsed = segment.lSamples;
+    segment.dSrcClk = file == 2 ? 2e6 : 1e6;
+    segment.lTarget = target;
+    segment.bMkr = true;
+    return segment;
+}
+
+Composition tst_composerengine::twoTracks() const
+{
+    Composition document;
+    document.addTrack();
+    document.addTrack();
+    document.track(0)->segments = {place(0, 20), place(1, 400)};
+    document.track(1)->segments = {place(1, 100)};
+    document.target.sName = m_folder.path("out.wv");
+    document.target.lSamples = 1000;
+    return document;
+}
+
+void tst_composerengine::compare(const Composition &document)
+{
+    std::vector<std::vector<ReferenceSource>> sources;
+    const double clock = document.target.dUsrClk;
+    for (const ComposerTrack &track : document.tracks()) {
+        sources.emplace_back();
+        for (const ComposerSegment &segment : track.segments) {
+            Waveform waveform;
+            QVERIFY(readFile(segment.sName, waveform));
+            ReferenceSource source{waveform.samples, waveform.markers};
+            const auto count =
+                static_cast<qint64>(clock / segment.dSrcClk * double(segment.lSamples) + 0.5);
+            if (clock != segment.dSrcClk) {
+                source.samples = resampled(waveform.samples, source.markers, count);
+                QCOMPARE(qint64(source.samples.size()), count);
+            }
+            const double step = 2 * std::numbers::pi * document.effectiveOffset(segment).hz / clock;
+            for (std::size_t i = 0; i < source.samples.size() && step != 0; ++i) {
+                source.samples[i] = std::complex<float>(std::complex<double>(source.samples[i]) *
+                                                        std::polar(1.0, step * double(i)));
+            }
+            sources.back().push_back(std::move(source));
+        }
+    }
+    const Rendered expected = renderLiterally(document, sources);
+    ComposerEngine engine(document);
+    QVERIFY(engine.runComposer());
+    Waveform result;
+    QVERIFY(readFile(document.target.sName, result));
+    QCOMPARE(qint64(result.info.samples), document.target.lSamples);
+    QCOMPARE(result.info.clock, clock);
+    for (std::size_t i = 0; i < expected.samples.size(); ++i) {
+        const std::complex<float> error = result.samples[i] - expected.samples[i];
+        const float worst = std::max(std::fabs(error.real()), std::fabs(error.imag()));
+        QVERIFY2(worst < 1.0 / 32767, qPrintable(QString("sample %1: %2").arg(i).arg(worst)));
+    }
+    QVERIFY(writtenMarkers(m_folder.load("out.wv"), expected.markers.size()) == expected.markers);
+    QVERIFY(std::fabs(result.info.rmsOffsetTag + 20 * std::log10(expected.rms)) < 1e-5);
+    QCOMPARE(result.info.peakOffsetTag, 0.0);
+}
+
+void tst_composerengine::render_data()
+{
+    QTest::addColumn<Change>("change");
+    const auto row = [](const QString &name, const Change &change) {
+        QTest::newRow(qPrintable(name)) << change;
+    };
+    row("overlap and gaps", [](Composition &) {});
+    for (int shape = FadeLinear; shape <= FadeBlank; ++shape) {
+        row(QString("fades of shape %1").arg(shape), [shape](Composition &document) {
+            ComposerSegment &segment = *document.segment(0, 0);
+            segment.iFadeIn = shape;
+            segment.iFadeOut = shape;
+            segment.dFadeIn = 100e-6;
+            segment.dFadeOut = 70.4e-6;
+        });
+    }
+    row("fades that overlap", [](Composition &document) {
+        document.segment(0, 0)->dFadeIn = 250e-6;
+        document.segment(0, 0)->dFadeOut = 200e-6;
+        document.segment(0, 0)->iFadeOut = FadeRaisedCosine;
+    });
+    row("levels and no markers", [](Composition &document) {
+        document.segment(0, 0)->dLOfs = 6;
+        document.segment(1, 0)->dLOfs = 20.5;
+        document.segment(1, 0)->bMkr = false;
+    });
+    row("wrap with fades", [](Composition &document) {
+        ComposerSegment &segment = *document.segment(0, 1);
+        segment.bWrap = true;
+        segment.dFadeIn = 20e-6;
+        segment.dFadeOut = 30e-6;
+        segment.lTarget = 850;
+        document.track(0)->segments.erase(document.track(0)->segments.begin());
+    });
+    row("wrap of the same segment in one block", [](Composition &document) {
+        // 300 samples from 10 on in a target of 250: the tail plays to 59, then the start again.
+        document.target.lSamples = 250;
+        document.track(1)->segments.clear();
+        document.track(0)->segments.resize(1);
+        document.segment(0, 0)->lTarget = 100;
+        document.segment(0, 0)->bWrap = true;
+    });
+    row("past the end without a wrap",
+        [](Composition &document) { document.segment(0, 1)->lTarget = 1200; });
+    row("past the end with a wrap", [](Composition &document) {
+        document.segment(0, 1)->lTarget = 1200;
+        document.segment(0, 1)->bWrap = true;
+    });
+    row("piece of a file", [](Composition &document) {
+        document.segment(1, 0)->lStart = 77;
+        document.segment(1, 0)->lUsed = 111;
+    });
+    row("disabled track", [](Composition &document) { document.track(1)->bEnable = false; });
+    row("offset", [](Composition &document) {
+        document.segment(0, 0)->dFOfs = 12345.6;
+        document.segment(0, 0)->bAdjOfs = false;
+    });
+    row("offset adjusted", [](Composition &document) {
+        document.segment(0, 0)->dFOfs = -12345.6;
+        document.segment(0, 0)->dAdjLim = 100;
+    });
+    row("higher target clock", [](Composition &document) {
+        document.target.dUsrClk = 2e6;
+        document.target.lSamples = 2000;
+        document.segment(0, 1)->lTarget = 800;
+        document.segment(0, 0)->dFOfs = 5000;
+    });
+    row("down-sampled source read past its end", [this](Composition &document) {
+        ComposerSegment segment = place(2, 400);
+        segment.lStart = 300; // stays: 350 samples are left of the stream, of which 50 come
+        segment.lUsed = 400;
+        document.track(1)->segments = {segment};
+    });
+    row("empty segment", [](Composition &document) {
+        ComposerSegment empty = *document.segment(0, 0);
+        empty.lUsed = 0;
+        empty.lTarget = 0;
+        document.track(0)->segments.insert(document.track(0)->segments.begin(), empty);
+    });
+}
+
+void tst_composerengine::render()
+{
+    QFETCH(Change, change);
+    Composition document = twoTracks();
+    change(document);
+    compare(document);
+}
+
+void tst_composerengine::randomDocuments()
+{
+    std::mt19937 generator = randomGenerator();
+    const auto draw = [&generator](int limit) { return int(generator() % unsigned(limit)); };
+    for (int run = 0; run < 20; ++run) {
+        Composition document;
+        document.target.sName = m_folder.path("out.wv");
+        document.target.lSamples = run == 0 ? 100000 : 1 + draw(3000);
+        const int tracks = 1 + draw(4);
+        for (int t = 0; t < tracks; ++t) {
+            document.addTrack();
+            qint64 position = draw(500);
+            for (int s = draw(5) + (t == 0); s > 0; --s) {
+                ComposerSegment segment = place(draw(3), position);
+                segment.lStart = draw(100);
+                segment.lUsed = 1 + draw(int(segment.lSamples - segment.lStart));
+                segment.dLOfs = draw(200) / 10.0;
+                segment.dFadeIn = draw(2) * draw(300) * 1e-6;
+                segment.dFadeOut = draw(2) * draw(300) * 1e-6;
+                segment.iFadeIn = draw(4);
+                segment.iFadeOut = draw(4);
+                segment.bWrap = draw(2) == 0;
+                segment.bMkr = draw(2) == 0;
+                position += document.targetSamples(segment) + draw(2) * draw(200);
+                document.track(t)->segments.push_back(segment);
+            }
+        }
+        // Something must sound.
+        document.track(0)->segments.front() = place(0, 0);
+        compare(document);
+        if (QTest::currentTestFailed()) {
+            return;
+        }
+    }
+}
+
+void tst_composerengine::failures_data()
+{
+    QTest::addColumn<Change>("change");
+    QTest::addColumn<QString>("reason");
+    const auto row = [](const char *name, const char *reason, const Change &change) {
+        QTest::newRow(name) << change << QString(reason);
+    };
+    row("missing source", "of track 2, segment 1 is missing",
+        [](Composition &document) { document.segment(1, 0)->sName += "x"; });
+    row("clock of the source has changed", "Waveform clock rate in file",
+        [](Composition &document) { document.segment(1, 0)->dSrcClk = 1.5e6; });
+    row("length of the source has changed", "Sample count in file",
+        [](Composition &document) { document.segment(1, 0)->lSamples = 499; });
+    row("silence", "sum of the tracks is silent",
+        [](Composition &document) { document.target.lSamples = 10; });
+    row("target too long", "samples; 1 to 2147483647 can be rendered",
+        [](Composition &document) { document.target.lSamples = 3000000000; });
+    row("start before the target", "no valid place",
+        [](Composition &document) { document.segment(1, 0)->lTarget = -1; });
+    row("start before the source", "Cannot initialize data stream",
+        [](Composition &document) { document.segment(1, 0)->lStart = -1; });
+    row("folder of the target is missing", "Error opening output file",
+        [](Composition &document) { document.target.sName = "/nowhere/out.wv"; });
+    row("nothing enabled", "", [](Composition &document) {
+        document.track(0)->bEnable = false;
+        document.track(1)->bEnable = false;
+    });
+}
+
+void tst_composerengine::failures()
+{
+    QFETCH(Change, change);
+    QFETCH(QString, reason);
+    QVERIFY(m_folder.store("out.wv", "as it was"));
+    Composition document = twoTracks();
+    change(document);
+    CapturedLog log;
+    ComposerEngine engine(document);
+    QVERIFY(!engine.runComposer());
+    const QString text = log.take(Complaints).join('\n');
+    QVERIFY2(text.contains(reason), qPrintable(text));
+    QCOMPARE(m_folder.load("out.wv"), "as it was");
+}
+
+void tst_composerengine::cancel_data()
+{
+    QTest::addColumn<QString>("line");
+    for (const char *line : {"reading files", "resampling", "Combining", "Rescaling"}) {
+        QTest::newRow(line) << QString(line);
+    }
+}
+
+/// A cancel at any stage ends the run, leaves the output as it was and no temporary file behind.
+void tst_composerengine::cancel()
+{
+    QFETCH(QString, line);
+    QVERIFY(m_folder.store("out.wv", "as it was"));
+    const Composition document = twoTracks();
+    CapturedLog log;
+    ComposerEngine engine(document);
+    QStringList messages;
+    connect(&engine, &ComposerEngine::message, this, [&](const QString &text) {
+        messages.append(text);
+        if (text.startsWith(line)) {
+            engine.slot_cancel();
+        }
+    });
+    QVERIFY(!engine.runComposer());
+    QVERIFY(log.take(Complaints).join('\n').contains("aborted by user"));
+    QCOMPARE(messages.last(), "Cleaning up 3 Temporary Files");
+    QCOMPARE(m_folder.load("out.wv"), "as it was");
+}
+
+void tst_composerengine::reports()
+{
+    Composition document = twoTracks();
+    document.segment(1, 0)->dLOfs = -12; // lifts the sum beyond full scale
+    document.track(0)->segments.pop_back();
+    ComposerEngine engine(document);
+    engine.setMaxThreads(1);
+    QStringList lines;
+    for (const auto signal : {&ComposerEngine::message, &ComposerEngine::headline,
+                              &ComposerEngine::warningMessage, &ComposerEngine::errorMessage}) {
+        connect(&engine, signal, this, [&lines](const QString &text) { lines.append(text); });
+    }
+    QVERIFY(engine.runComposer());
+    QVERIFY(lines.takeFirst().startsWith("Composer Engine started at "));
+    QVERIFY(lines.takeLast().startsWith("Job Completed at "));
+    const auto clipped = QRegularExpression("^\\d+ of 2000 values clipped, largest \\d\\.\\d\\d dB "
+                                            "above full scale");
+    QCOMPARE(lines.filter(clipped).size(), 1);
+    lines.removeIf([&](const QString &line) { return line.contains(clipped); });
+    const QStringList expected{
+        "reading files 2 Waveforms, 800 Input Samples",
+        "Processing Track 1, Segment 1 (37.5 %)",
+        "Processing Track 2, Segment 1 (62.5 %)",
+        "Waiting for all 2 tasks to finish...",
+        "All jobs finished.",
+        "resampling 2 Waveforms, 800 Input Samples",
+        "Processing Track 1, Segment 1 (0 %)",
+        "Processing Track 2, Segment 1 (0 %)",
+        "Waiting for all 2 tasks to finish...",
+        "All jobs finished.",
+        "frequency shifting 2 Waveforms, 800 Input Samples",
+        "Processing Track 1, Segment 1 (0 %)",
+        "Processing Track 2, Segment 1 (0 %)",
+        "Waiting for all 2 tasks to finish...",
+        "All jobs finished.",
+        "Combining Waveforms",
+        "  Will Create 1000 Output Samples",
+        "Rescaling Waveform Data",
+        "Saving Final Waveform to " + document.target.sName,
+        "Cleaning up 2 Temporary Files",
+    };
+    QCOMPARE(lines.join('\n'), expected.join('\n'));
+}
+
+QTEST_GUILESS_MAIN(tst_composerengine)
+#include "tst_composerengine.moc"
