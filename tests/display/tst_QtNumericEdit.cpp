@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "display/QtNumericEdit.h"
 #include "log/Tracer.h"
+#include "support/rows.h"
 
+#include "support/logreader.h"
 #include <QApplication>
 #include <QContextMenuEvent>
 #include <QMenu>
@@ -10,7 +12,7 @@
 #include <QVBoxLayout>
 #include <QWheelEvent>
 
-#include <memory>
+#include <algorithm>
 
 namespace {
 
@@ -70,25 +72,6 @@ QMenu *openMenu(QtNumericEdit *field)
     return qobject_cast<QMenu *>(QApplication::activePopupWidget());
 }
 
-QAction *findAction(QMenu *menu, const QString &text)
-{
-    for (QAction *action : menu->actions()) {
-        if (action->text() == text) {
-            return action;
-        }
-    }
-    return nullptr;
-}
-
-QStringList takeLog()
-{
-    QStringList lines;
-    for (const Tracer::Entry &entry : Tracer::takeEntries()) {
-        lines += entry.first;
-    }
-    return lines;
-}
-
 } // namespace
 
 class TestQtNumericEdit : public QObject
@@ -97,75 +80,51 @@ class TestQtNumericEdit : public QObject
 
 private slots:
     void init() { (void)Tracer::takeEntries(); }
-    void typing_data();
     void typing();
     void rangeIsAValueOfItsOwn();
-    void programmaticValuesAreSilent();
     void untouchedFieldKeepsFullPrecision();
     void invalidTextRestores();
-    void stepping_data();
     void stepping();
     void decimalStepsReachTheBound();
-    void readOnly();
     void contextMenu();
-    void cursorStep_data();
     void cursorStep();
-    void toolTip();
 };
-
-void TestQtNumericEdit::typing_data()
-{
-    QTest::addColumn<QString>("unit");
-    QTest::addColumn<bool>("lowerPrefix");
-    QTest::addColumn<QString>("typed");
-    QTest::addColumn<double>("value");
-    QTest::addColumn<QString>("shown");
-
-    QTest::newRow("prefix") << "Hz" << false << "1.5 k" << 1500.0 << "1.5 kHz";
-    QTest::newRow("comma") << "Hz" << false << "1,5M" << 1.5e6 << "1.5 MHz";
-    QTest::newRow("mega by case") << "Hz" << true << "2 MHz" << 2e6 << "2 MHz";
-    QTest::newRow("milli by case") << "Hz" << true << "2 mHz" << 2e-3 << "2 mHz";
-    QTest::newRow("mega whatever case") << "Hz" << false << "2 mhz" << 2e6 << "2 MHz";
-    QTest::newRow("unit without prefix") << "s" << true << "3s" << 3.0 << "3 s";
-    QTest::newRow("clamped above") << "Hz" << false << "99G" << 1e10 << "10 GHz";
-    QTest::newRow("clamped below") << "Hz" << false << "-2M" << -1e6 << "-1 MHz";
-    QTest::newRow("blanks in the number") << "Hz" << false << " 1 000 " << 1000.0 << "1 kHz";
-}
 
 void TestQtNumericEdit::typing()
 {
-    QFETCH(QString, unit);
-    QFETCH(bool, lowerPrefix);
-    QFETCH(QString, typed);
-    QFETCH(double, value);
-    QFETCH(QString, shown);
+    forRows({{"comma", "Hz", false, "1,5M", 1.5e6, "1.5 MHz"},
+             {"milli by case", "Hz", true, "2 mHz", 2e-3, "2 mHz"},
+             {"clamped above", "Hz", false, "99G", 1e10, "10 GHz"},
+             {"clamped below", "Hz", false, "-2M", -1e6, "-1 MHz"}},
+            [&](const QString &unit, bool lowerPrefix, const QString &typed, double value,
+                const QString &shown) {
+                Window w;
+                w.field->setUnit(unit);
+                w.field->setLowerPrefix(lowerPrefix);
+                w.show();
+                QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
 
-    Window w;
-    w.field->setUnit(unit);
-    w.field->setLowerPrefix(lowerPrefix);
-    w.show();
-    QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
+                typeText(w.field, typed);
+                QCOMPARE(w.field->property("edit_mode").toString(), "true");
+                QVERIFY(w.field->font().bold());
+                QCOMPARE(updates.count(), 0);
 
-    typeText(w.field, typed);
-    QCOMPARE(w.field->property("edit_mode").toString(), "true");
-    QVERIFY(w.field->font().bold());
-    QCOMPARE(updates.count(), 0);
+                QTest::keyClick(w.field, Qt::Key_Return);
+                QCOMPARE(w.field->getVal(), value);
+                QCOMPARE(w.field->text(), shown);
+                QCOMPARE(w.field->property("edit_mode").toString(), "false");
+                QVERIFY(!w.field->font().bold());
+                QCOMPARE(updates.count(), 1);
+                QCOMPARE(updates.at(0).at(0).toDouble(), value);
+                const QString words = QString("  'le_freq' >> %1 %2 , value update!")
+                                          .arg(QString::number(value, 'g', 15), unit);
+                QVERIFY(takeMessages(Tracer::DebugMask).join('\n').contains(words));
 
-    QTest::keyClick(w.field, Qt::Key_Return);
-    QCOMPARE(w.field->getVal(), value);
-    QCOMPARE(w.field->text(), shown);
-    QCOMPARE(w.field->property("edit_mode").toString(), "false");
-    QVERIFY(!w.field->font().bold());
-    QCOMPARE(updates.count(), 1);
-    QCOMPARE(updates.at(0).at(0).toDouble(), value);
-    const QString words =
-        QString("  'le_freq' >> %1 %2 , value update!").arg(QString::number(value, 'g', 15), unit);
-    QVERIFY(takeLog().join('\n').contains(words));
-
-    // Leaving the field afterwards must not send a second time.
-    w.other->setFocus();
-    QTRY_VERIFY(w.other->hasFocus());
-    QCOMPARE(updates.count(), 1);
+                // Leaving the field afterwards must not send a second time.
+                w.other->setFocus();
+                QTRY_VERIFY(w.other->hasFocus());
+                QCOMPARE(updates.count(), 1);
+            });
 }
 
 void TestQtNumericEdit::rangeIsAValueOfItsOwn()
@@ -183,27 +142,19 @@ void TestQtNumericEdit::rangeIsAValueOfItsOwn()
     QCOMPARE(field.text(), "12");
     field.setMax(qQNaN());
     QCOMPARE(field.max(), 12.0);
+    field.setVal(qQNaN());
+    QCOMPARE(field.getVal(), 12.0);
+    field.setMax(1e9);
+    field.setUnit("Hz");
+    field.setScaled(true);
+    field.setVal(qlonglong(123456789));
+    QCOMPARE(field.text(), "123.456789 MHz");
+    QCOMPARE(field.getValInt(), 123456789);
+    field.setPrecision(1);
+    QCOMPARE(field.text(), "123.5 MHz");
+    QCOMPARE(field.property("edit_mode").toBool(), false);
     QCOMPARE(updates.count(), 0);
-}
-
-void TestQtNumericEdit::programmaticValuesAreSilent()
-{
-    Window w;
-    QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
-    w.field->setVal(5e10);
-    QCOMPARE(w.field->getVal(), 1e10);
-    w.field->setVal(qQNaN());
-    QCOMPARE(w.field->getVal(), 1e10);
-    w.field->setVal(qlonglong(123456789));
-    QCOMPARE(w.field->text(), "123.456789 MHz");
-    QCOMPARE(w.field->getValInt(), 123456789);
-    w.field->setPrecision(1);
-    QCOMPARE(w.field->text(), "123.5 MHz");
-    w.field->setScaled(false);
-    QCOMPARE(w.field->text(), "123456789 Hz");
-    QCOMPARE(w.field->property("edit_mode").toBool(), false);
-    QCOMPARE(updates.count(), 0);
-    QVERIFY(takeLog().isEmpty());
+    QVERIFY(takeMessages(Tracer::DebugMask).isEmpty());
 }
 
 void TestQtNumericEdit::untouchedFieldKeepsFullPrecision()
@@ -236,54 +187,44 @@ void TestQtNumericEdit::invalidTextRestores()
         QCOMPARE(w.field->getVal(), 1500.0);
         QCOMPARE(w.field->text(), "1.5 kHz");
         QCOMPARE(w.field->property("edit_mode").toBool(), false);
-        QVERIFY(takeLog().join('\n').endsWith("  Invalid input. Restoring previous value."));
+        QVERIFY(takeMessages(Tracer::DebugMask)
+                    .join('\n')
+                    .endsWith("  Invalid input. Restoring previous value."));
         w.field->setFocus();
     }
     QCOMPARE(updates.count(), 0);
 }
 
-void TestQtNumericEdit::stepping_data()
-{
-    QTest::addColumn<double>("start");
-    QTest::addColumn<int>("direction");
-    QTest::addColumn<double>("result");
-
-    QTest::newRow("up") << 10.0 << 1 << 12.0;
-    QTest::newRow("down") << 10.0 << -1 << 8.0;
-    QTest::newRow("up onto the bound") << 18.0 << 1 << 20.0;
-    QTest::newRow("no clamp above") << 19.0 << 1 << 19.0;
-    QTest::newRow("no clamp below") << 1.0 << -1 << 1.0;
-}
-
 void TestQtNumericEdit::stepping()
 {
-    QFETCH(double, start);
-    QFETCH(int, direction);
-    QFETCH(double, result);
+    forRows({{"up", 10.0, 1, 12.0},
+             {"up onto the bound", 18.0, 1, 20.0},
+             {"no clamp below", 1.0, -1, 1.0}},
+            [&](double start, int direction, double result) {
+                Window w;
+                w.field->setMin(0);
+                w.field->setMax(20);
+                w.field->setVal(start);
+                w.show();
+                QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
+                const bool taken = result != start;
 
-    Window w;
-    w.field->setMin(0);
-    w.field->setMax(20);
-    w.field->setVal(start);
-    w.show();
-    QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
-    const bool taken = result != start;
+                // Without a step neither key nor wheel changes anything.
+                QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
+                QVERIFY(!turnWheel(w.field, 120 * direction));
+                QCOMPARE(w.field->getVal(), start);
 
-    // Without a step neither key nor wheel changes anything.
-    QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
-    QVERIFY(!turnWheel(w.field, 120 * direction));
-    QCOMPARE(w.field->getVal(), start);
+                w.field->setStep(-2);
+                w.field->setStep(2);
+                QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
+                QCOMPARE(w.field->getVal(), result);
+                QCOMPARE(updates.count(), taken ? 1 : 0);
 
-    w.field->setStep(-2);
-    w.field->setStep(2);
-    QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
-    QCOMPARE(w.field->getVal(), result);
-    QCOMPARE(updates.count(), taken ? 1 : 0);
-
-    w.field->setVal(start);
-    QCOMPARE(turnWheel(w.field, 120 * direction), taken);
-    QCOMPARE(w.field->getVal(), result);
-    QCOMPARE(updates.count(), taken ? 2 : 0);
+                w.field->setVal(start);
+                QCOMPARE(turnWheel(w.field, 120 * direction), taken);
+                QCOMPARE(w.field->getVal(), result);
+                QCOMPARE(updates.count(), taken ? 2 : 0);
+            });
 }
 
 void TestQtNumericEdit::decimalStepsReachTheBound()
@@ -305,19 +246,6 @@ void TestQtNumericEdit::decimalStepsReachTheBound()
     QCOMPARE(shown, QStringList({"-0.2 dB", "-0.1 dB", "0 dB", "0.1 dB", "0.2 dB", "0.3 dB"}));
 }
 
-void TestQtNumericEdit::readOnly()
-{
-    Window w;
-    w.field->setStep(1);
-    w.field->setVal(7);
-    w.field->setReadOnly(true);
-    w.show();
-    QTest::keyClick(w.field, Qt::Key_Up);
-    QVERIFY(!turnWheel(w.field, 120));
-    QVERIFY(!openMenu(w.field));
-    QCOMPARE(w.field->getVal(), 7.0);
-}
-
 void TestQtNumericEdit::contextMenu()
 {
     Window w;
@@ -327,11 +255,12 @@ void TestQtNumericEdit::contextMenu()
     const auto choose = [&w](const QString &text) {
         QMenu *menu = openMenu(w.field);
         QVERIFY(menu);
-        QAction *action = findAction(menu, text);
-        QVERIFY2(action, qPrintable(text));
-        QVERIFY2(action->isEnabled(), qPrintable(text));
+        const QList<QAction *> actions = menu->actions();
+        const auto found = std::find_if(actions.begin(), actions.end(),
+                                        [&](QAction *each) { return each->text() == text; });
+        QVERIFY2(found != actions.end() && (*found)->isEnabled(), qPrintable(text));
         QTest::mouseClick(menu, Qt::LeftButton, Qt::NoModifier,
-                          menu->actionGeometry(action).center());
+                          menu->actionGeometry(*found).center());
         QTRY_VERIFY(!QApplication::activePopupWidget());
     };
 
@@ -354,50 +283,25 @@ void TestQtNumericEdit::contextMenu()
     QCOMPARE(updates.count(), 2);
 }
 
-void TestQtNumericEdit::cursorStep_data()
-{
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<int>("position");
-    QTest::addColumn<QString>("tip");
-
-    QTest::newRow("first digit") << "-1.25 kHz" << 1 << "1 kHz";
-    QTest::newRow("point counts left") << "-1.25 kHz" << 2 << "1 kHz";
-    QTest::newRow("fraction") << "-1.25 kHz" << 4 << "10 Hz";
-    QTest::newRow("behind the digits") << "-1.25 kHz" << 9 << "10 Hz";
-    QTest::newRow("sign has no weight") << "-1.25 kHz" << 0 << QString();
-    QTest::newRow("no digit") << "kHz" << 0 << QString();
-}
-
 void TestQtNumericEdit::cursorStep()
 {
-    QFETCH(QString, text);
-    QFETCH(int, position);
-    QFETCH(QString, tip);
-
-    Window w;
-    w.show();
-    typeText(w.field, text);
-    w.field->setCursorPosition(position == 0 ? 1 : 0);
-    w.field->setCursorPosition(position);
-    const QString line = "\n Step = " + tip + " (at the cursor)";
-    QCOMPARE(w.field->toolTip().contains("Step"), !tip.isEmpty());
-    QVERIFY2(tip.isEmpty() || w.field->toolTip().endsWith(line), qPrintable(w.field->toolTip()));
-    w.other->setFocus();
-    QTRY_VERIFY(w.other->hasFocus());
-    QVERIFY(!w.field->toolTip().contains("Step"));
-}
-
-void TestQtNumericEdit::toolTip()
-{
-    Window w;
-    QCOMPARE(w.field->toolTip(), "Frequency\n Min = -1 MHz Max = 10 GHz");
-    w.field->setStep(1000);
-    QCOMPARE(w.field->toolTip(), "Frequency\n Min = -1 MHz Max = 10 GHz\n Step = 1 kHz");
-    w.field->setToolTip("Carrier");
-    QCOMPARE(w.field->toolTip(), "Carrier\n Min = -1 MHz Max = 10 GHz\n Step = 1 kHz");
-    QtNumericEdit angle;
-    angle.setupAngle(-180, 180, 5);
-    QCOMPARE(angle.toolTip(), " Min = -180 deg Max = 180 deg\n Step = 5 deg");
+    forRows({{"point counts left", "-1.25 kHz", 2, "1 kHz"},
+             {"fraction", "-1.25 kHz", 4, "10 Hz"},
+             {"sign has no weight", "-1.25 kHz", 0, {}}},
+            [&](const QString &text, int position, const QString &tip) {
+                Window w;
+                w.show();
+                typeText(w.field, text);
+                w.field->setCursorPosition(position == 0 ? 1 : 0);
+                w.field->setCursorPosition(position);
+                const QString line = "\n Step = " + tip + " (at the cursor)";
+                QCOMPARE(w.field->toolTip().contains("Step"), !tip.isEmpty());
+                QVERIFY2(tip.isEmpty() || w.field->toolTip().endsWith(line),
+                         qPrintable(w.field->toolTip()));
+                w.other->setFocus();
+                QTRY_VERIFY(w.other->hasFocus());
+                QVERIFY(!w.field->toolTip().contains("Step"));
+            });
 }
 
 QTEST_MAIN(TestQtNumericEdit)

@@ -4,17 +4,17 @@
 #include "display/CWidgetSpectrum.h"
 #include "display/CWidgetTimeline.h"
 #include "displaysamples.h"
-#include "log/Tracer.h"
+#include "support/files.h"
+#include "support/logreader.h"
 
 #include <QApplication>
 #include <QClipboard>
 #include <QContextMenuEvent>
-#include <QFile>
 #include <QMenu>
 #include <QMouseEvent>
 #include <QSignalSpy>
-#include <QTemporaryDir>
 #include <QTest>
+#include <QWheelEvent>
 
 #include <cmath>
 
@@ -46,10 +46,20 @@ bool chooseEntry(QWidget &widget, const QString &text)
     return false;
 }
 
-QByteArray contentOf(const QString &fileName)
+/// Moves the mouse over a widget, with a button held or none.
+void moveTo(QWidget &widget, const QPointF &place, Qt::MouseButton held = Qt::NoButton)
 {
-    QFile file(fileName);
-    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
+    QMouseEvent move(QEvent::MouseMove, place, widget.mapToGlobal(place), Qt::NoButton, held,
+                     Qt::NoModifier);
+    QApplication::sendEvent(&widget, &move);
+}
+
+/// The point of a trace's plot at a share of its width.
+QPoint tracePoint(const CWidgetIQTrace &trace, double share)
+{
+    const QRectF plot =
+        QRectF(trace.rect()).marginsRemoved(TracePainter::margins(PlotStyle::current().font));
+    return {static_cast<int>(std::round(plot.left() + share * plot.width())), 60};
 }
 
 } // namespace
@@ -59,16 +69,140 @@ class TestDisplayWidgets : public QObject
     Q_OBJECT
 
 private slots:
-    void init() { (void)Tracer::takeEntries(); }
+    void init() { (void)takeMessages(); }
+    void traceMouse();
+    void traceCursors();
+    void traceKeepsNothingOfTheFormerData();
     void spectrumReadOut();
     void spectrumCache();
     void colorModesFromTheMenu();
     void constellationValueBox();
-    void picturesFromTheMenu();
     void savedPicturesAndData();
     void timelineDrag();
-    void powerOfTheBase();
 };
+
+void TestDisplayWidgets::traceMouse()
+{
+    CWidgetIQTrace trace;
+    trace.resize(600, 300);
+    QSignalSpy left(&trace, &CWidgetIQTrace::mouseLeftPress);
+    QSignalSpy right(&trace, &CWidgetIQTrace::mouseRightPress);
+    QSignalSpy data(&trace, &CWidgetIQTrace::mouseCsrData);
+
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.5));
+    QCOMPARE(left.count(), 0); // nothing to point at
+
+    IqList samples(1000);
+    for (qsizetype k = 0; k < samples.size(); ++k) {
+        samples[k] = {static_cast<double>(k), -static_cast<double>(k)};
+    }
+    trace.setData(samples);
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(left.count(), 1);
+    const int sample = left.at(0).at(0).toInt();
+    QVERIFY2(std::abs(sample - 250) <= 2, qPrintable(QString::number(sample)));
+    QCOMPARE(data.count(), 1);
+    QCOMPARE(data.at(0).at(0).toLongLong(), sample);
+    QCOMPARE(data.at(0).at(1).toDouble(), static_cast<double>(sample));
+    QCOMPARE(data.at(0).at(2).toDouble(), -static_cast<double>(sample));
+    QCOMPARE(trace.scene().mouseBin, sample * 512 / 1000);
+
+    // The same column again is no news, other data in it are.
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(data.count(), 1);
+    trace.setData(toneSamples(1000, 0.1));
+    QTest::mousePress(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.25));
+    QCOMPARE(data.count(), 2);
+
+    QTest::mousePress(&trace, Qt::RightButton, {}, tracePoint(trace, 0.75));
+    QCOMPARE(right.count(), 1);
+    QVERIFY(std::abs(right.at(0).at(0).toInt() - 750) <= 2);
+
+    // Outside the plot.
+    QTest::mousePress(&trace, Qt::LeftButton, {}, QPoint(3, 60));
+    QTest::mousePress(&trace, Qt::LeftButton, {}, QPoint(598, 60));
+    QCOMPARE(left.count(), 3);
+
+    // Each new column under a held button is news.
+    data.clear();
+    QSignalSpy zoomSet(&trace, &CWidgetIQTrace::mouseZoomSet);
+    for (const double share : {0.3, 0.4, 0.4}) {
+        moveTo(trace, tracePoint(trace, share), Qt::LeftButton);
+    }
+    QCOMPARE(data.count(), 2);
+    QTest::mouseDClick(&trace, Qt::LeftButton, {}, tracePoint(trace, 0.6));
+    QCOMPARE(zoomSet.count(), 1);
+    QVERIFY(std::abs(zoomSet.at(0).at(0).toInt() - 600) <= 2);
+    QSignalSpy in(&trace, &CWidgetIQTrace::zoom_in);
+    QSignalSpy out(&trace, &CWidgetIQTrace::zoom_out);
+    for (const int delta : {120, -120, -120}) {
+        const QPointF center = trace.rect().center();
+        QWheelEvent event(center, trace.mapToGlobal(center), QPoint(), QPoint(0, delta),
+                          Qt::NoButton, Qt::NoModifier, Qt::NoScrollPhase, false);
+        event.setAccepted(false);
+        QApplication::sendEvent(&trace, &event);
+        QVERIFY(event.isAccepted());
+    }
+    QCOMPARE(in.count(), 1);
+    QCOMPARE(out.count(), 2);
+}
+
+void TestDisplayWidgets::traceCursors()
+{
+    CWidgetIQTrace trace;
+    trace.resize(600, 300);
+    trace.setView(3);
+    trace.setData(IqList(1000, {0.0, 0.0}));
+    const QImage plain = trace.picture();
+    trace.setCursor(2, 500);
+    QCOMPARE(trace.scene().cursorBins[1], 256);
+    const QImage reference = trace.picture();
+    trace.setCursor(2, -1);
+    QCOMPARE(trace.picture(), plain);
+    trace.setCursor(1, 500);
+    const QImage measuring = trace.picture();
+
+    // The reference cursor alone has serifs: three pixels to each side at both ends.
+    const QRectF plot =
+        QRectF(trace.rect()).marginsRemoved(TracePainter::margins(PlotStyle::current().font));
+    const int x = static_cast<int>(TracePainter::xOf(plot, 256));
+    for (const double end : {0.95, 0.05}) {
+        const int y = static_cast<int>(std::round(TracePainter::yOf(plot, end)));
+        QVERIFY(reference.pixel(x - 3, y) != plain.pixel(x - 3, y));
+        QVERIFY(reference.pixel(x + 3, y) != plain.pixel(x + 3, y));
+        QVERIFY(measuring.pixel(x - 3, y) == plain.pixel(x - 3, y));
+    }
+    const int middle = static_cast<int>(plot.center().y());
+    QVERIFY(reference.pixel(x, middle) != plain.pixel(x, middle));
+    QVERIFY(measuring.pixel(x, middle) != plain.pixel(x, middle));
+
+    trace.setCursor(1, 1000); // behind the last sample
+    QCOMPARE(trace.scene().cursorBins[0], -1);
+    trace.setCursor(1, 999);
+    QCOMPARE(trace.scene().cursorBins[0], 511);
+    trace.setCursor(3, 10);
+    QCOMPARE(trace.scene().cursorBins[1], -1);
+}
+
+void TestDisplayWidgets::traceKeepsNothingOfTheFormerData()
+{
+    CWidgetIQTrace trace;
+    trace.resize(500, 300);
+    const QImage empty = trace.picture();
+    trace.setData(toneSamples(1000, 0.01), QList<quint8>(1000, 3));
+    QVERIFY(trace.picture() != empty);
+    trace.setCursor(1, 5);
+    trace.clear();
+    QCOMPARE(trace.picture(), empty);
+    // Three samples leave the table alone, but what it holds isn't theirs and isn't shown.
+    trace.setData(toneSamples(1000, 0.01));
+    (void)trace.picture();
+    trace.setData(toneSamples(3, 0.01));
+    const QImage three = trace.picture();
+    trace.clear();
+    trace.setData(toneSamples(3, 0.01));
+    QCOMPARE(trace.picture(), three);
+}
 
 void TestDisplayWidgets::spectrumReadOut()
 {
@@ -94,9 +228,7 @@ void TestDisplayWidgets::spectrumReadOut()
 
         const QImage before = spectrum.picture();
         QTest::mouseMove(&spectrum, place.toPoint());
-        QMouseEvent move(QEvent::MouseMove, place, spectrum.mapToGlobal(place), Qt::NoButton,
-                         Qt::NoButton, Qt::NoModifier);
-        QApplication::sendEvent(&spectrum, &move);
+        moveTo(spectrum, place);
         QVERIFY(spectrum.picture() != before);
         QEvent leave(QEvent::Leave);
         QApplication::sendEvent(&spectrum, &leave);
@@ -146,12 +278,11 @@ void TestDisplayWidgets::colorModesFromTheMenu()
     QCOMPARE(constellation.colorMode(), 0);
     constellation.col_noise();
     QCOMPARE(constellation.colorMode(), 3);
-    QMenu *menu = openMenu(constellation);
-    QVERIFY(menu);
-    for (int k = 0; k < 4; ++k) {
-        QCOMPARE(menu->actions().at(k)->isChecked(), k == 3);
-    }
-    menu->close();
+    // The picture goes to the clipboard the same way.
+    QApplication::clipboard()->clear();
+    QVERIFY(chooseEntry(spectrum, "Copy Picture"));
+    QCOMPARE(QApplication::clipboard()->image().convertToFormat(QImage::Format_RGB32),
+             pictures.last().convertToFormat(QImage::Format_RGB32));
 }
 
 void TestDisplayWidgets::constellationValueBox()
@@ -172,74 +303,50 @@ void TestDisplayWidgets::constellationValueBox()
 
     const QImage before = constellation.picture();
     const QPointF place = square.center() + QPointF(20, -20);
-    QMouseEvent move(QEvent::MouseMove, place, constellation.mapToGlobal(place), Qt::NoButton,
-                     Qt::NoButton, Qt::NoModifier);
-    QApplication::sendEvent(&constellation, &move);
+    moveTo(constellation, place);
     QVERIFY(constellation.picture() != before);
     QEvent leave(QEvent::Leave);
     QApplication::sendEvent(&constellation, &leave);
     QCOMPARE(constellation.picture(), before);
 }
 
-void TestDisplayWidgets::picturesFromTheMenu()
-{
-    CWidgetIQTrace trace;
-    trace.resize(320, 200);
-    trace.setData(toneSamples(1000, 0.01));
-    QApplication::clipboard()->clear();
-    QVERIFY(chooseEntry(trace, "Copy Picture"));
-    QCOMPARE(QApplication::clipboard()->image().convertToFormat(QImage::Format_RGB32),
-             trace.picture().convertToFormat(QImage::Format_RGB32));
-    trace.clear();
-    QVERIFY(!chooseEntry(trace, "Save Data..."));
-}
-
 void TestDisplayWidgets::savedPicturesAndData()
 {
-    const QTemporaryDir folder;
+    const TestFolder folder;
     CWidgetIQTrace trace;
     trace.resize(320, 200);
     trace.setData({{0.5, -0.25}, {1.0 / 3, 0}, {0, 0}, {-1, 1}}, {1, 0, 15, 2});
     trace.setFirstSample(40);
-    const QString png = folder.filePath("plot.png");
+    const QString png = folder.path("plot.png");
     QVERIFY(trace.savePicture(png));
     QCOMPARE(QImage(png).convertToFormat(QImage::Format_RGB32), trace.picture());
-    const QString svg = folder.filePath("plot.svg");
+    const QString svg = folder.path("plot.svg");
     QVERIFY(trace.savePicture(svg));
-    QVERIFY(contentOf(svg).contains("<svg"));
-    QVERIFY(contentOf(svg).contains("full scale 1")); // texts stay texts
-    const QString csv = folder.filePath("plot.csv");
+    QVERIFY(load(svg).contains("<svg"));
+    QVERIFY(load(svg).contains("full scale 1")); // texts stay texts
+    const QString csv = folder.path("plot.csv");
     QVERIFY(trace.saveData(csv));
-    QCOMPARE(contentOf(csv), "sample,i,q,markers\n40,0.5,-0.25,1\n41,0.333333333,0,0\n42,0,0,15\n"
-                             "43,-1,1,2\n");
+    QCOMPARE(load(csv), "sample,i,q,markers\n40,0.5,-0.25,1\n41,0.333333333,0,0\n42,0,0,15\n"
+                        "43,-1,1,2\n");
 
     CWidgetSpectrum spectrum;
     spectrum.setClock(512);
     spectrum.setData(toneSamples(1000, 0.25, 1), 256, 1255);
     spectrum.setView(0);
     QVERIFY(spectrum.saveData(csv));
-    QList<QByteArray> lines = contentOf(csv).split('\n');
+    const QList<QByteArray> lines = load(csv).split('\n');
     QCOMPARE(lines.size(), 514);
     QCOMPARE(lines.first(), "frequency_hz,level_db");
     QVERIFY(lines.at(1).startsWith("-256,"));
     QCOMPARE(lines.at(1 + 384).split(',').first(), "128");
     QVERIFY(std::fabs(lines.at(1 + 384).split(',').last().toDouble()) < 1e-6);
-    spectrum.setView(1);
-    QVERIFY(spectrum.saveData(csv));
-    lines = contentOf(csv).split('\n');
-    QCOMPARE(lines.size(), 4); // two frames between head line and last line end
-    QVERIFY(lines.at(1).startsWith("256,"));
-    QCOMPARE(lines.at(1).count(','), 512);
-
-    (void)Tracer::takeEntries();
-    const QString nowhere = folder.filePath("missing/plot.png");
+    const QString nowhere = folder.path("missing/plot.png");
     QVERIFY(!trace.savePicture(nowhere));
-    QVERIFY(!trace.savePicture(folder.filePath("plot.bmp")));
-    QVERIFY(!trace.saveData(folder.filePath("missing/plot.csv")));
-    const auto entries = Tracer::takeEntries();
-    QCOMPARE(entries.size(), 3);
-    QVERIFY(entries.at(0).first.contains("Cannot write '" + nowhere + "': "));
-    QVERIFY(entries.at(1).first.contains(".png or .svg"));
+    QVERIFY(!trace.savePicture(folder.path("plot.bmp")));
+    const QStringList errors = takeMessages();
+    QCOMPARE(errors.size(), 2);
+    QVERIFY(errors.at(0).contains("Cannot write '" + nowhere + "': "));
+    QVERIFY(errors.at(1).contains(".png or .svg"));
 }
 
 void TestDisplayWidgets::timelineDrag()
@@ -256,11 +363,7 @@ void TestDisplayWidgets::timelineDrag()
         return QPoint(static_cast<int>(std::round(bar.left() + sample / 100000 * bar.width())),
                       static_cast<int>(bar.center().y()));
     };
-    const auto drag = [&timeline](const QPoint &place) {
-        QMouseEvent move(QEvent::MouseMove, place, timeline.mapToGlobal(place), Qt::NoButton,
-                         Qt::LeftButton, Qt::NoModifier);
-        QApplication::sendEvent(&timeline, &move);
-    };
+    const auto drag = [&timeline](const QPoint &place) { moveTo(timeline, place, Qt::LeftButton); };
 
     // Taken inside, the range follows by the point that was taken.
     QTest::mousePress(&timeline, Qt::LeftButton, {}, point(25000));
@@ -282,36 +385,6 @@ void TestDisplayWidgets::timelineDrag()
     QTest::mouseClick(&timeline, Qt::LeftButton, {}, point(70000));
     QCOMPARE(positions.count(), 1);
     QCOMPARE(positions.at(0).at(0).toDouble(), 65000.0);
-
-    // Set from outside it tells nobody.
-    positions.clear();
-    timeline.set_xpos(12345);
-    QCOMPARE(timeline.scene().first, 12345);
-    QCOMPARE(timeline.scene().count, 10000);
-    QCOMPARE(positions.count(), 0);
-
-    timeline.setWaveform(0, 0);
-    QTest::mousePress(&timeline, Qt::LeftButton, {}, point(5000));
-    QCOMPARE(positions.count(), 0);
-}
-
-void TestDisplayWidgets::powerOfTheBase()
-{
-    CWidgetIQTrace display;
-    double in[2] = {0, 0.01};
-    double out[2] = {};
-    display.powerToLog(out, in, 2);
-    QCOMPARE(out[0], 10.0);
-    QCOMPARE(in[0], 0.01);
-    QCOMPARE(display.powerToLog(0.001), 0.0);
-    QCOMPARE(display.formatPower(0, false), "  0.00 dBm");
-    display.setLinearPower(true);
-    double zero[1] = {0};
-    display.powerToLog(out, zero, 1);
-    QCOMPARE(out[0], 0.0);
-    QCOMPARE(zero[0], 0.0);
-    QCOMPARE(display.powerToLog(0.25), 0.25);
-    QCOMPARE(display.formatPower(0.25, false), "250.000 mW");
 }
 
 QTEST_MAIN(TestDisplayWidgets)

@@ -1,0 +1,207 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/rows.h"
+#include "view/ConstellationGrid.h"
+#include "view/SpectrumLines.h"
+#include "view/plotscale.h"
+
+#include <QTest>
+
+#include <cmath>
+#include <numbers>
+#include <vector>
+
+namespace {
+
+/// A tone in the middle of a transform's bin (0 is zero frequency).
+std::vector<IqSample> tone(std::size_t count, int bin, double amplitude = 1, qint64 first = 0)
+{
+    std::vector<IqSample> samples(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        const double turns = bin * static_cast<double>(first + static_cast<qint64>(i)) / 512;
+        const double angle = 2 * std::numbers::pi * turns;
+        samples[i] = {amplitude * std::cos(angle), amplitude * std::sin(angle)};
+    }
+    return samples;
+}
+
+std::vector<qint64> positions(const SpectrumLines &lines)
+{
+    std::vector<qint64> result;
+    for (const SpectrumLines::Line &line : lines.lines()) {
+        result.push_back(line.position);
+    }
+    return result;
+}
+
+} // namespace
+
+class TestPlotData : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void toneLevels();
+    void lineCounts();
+    void movesTransformOnlyNewFrames();
+    void resultDoesNotDependOnTheWay();
+    void meanIsInDb();
+    void constellationCells();
+    void constellationLevels();
+    void scales();
+    void power();
+};
+
+void TestPlotData::toneLevels()
+{
+    SpectrumLines lines;
+    lines.update(tone(512, 40, 0.5), 0);
+    const std::vector<double> &level = lines.lines().at(0).level;
+    // The window 1 - cos has a mean of 1 and puts half the amplitude into each neighbour.
+    const double full = 20 * std::log10(0.5);
+    QVERIFY(std::fabs(level[256 + 40] - full) < 1e-9);
+    QVERIFY(std::fabs(level[256 + 39] - (full - 20 * std::log10(2.0))) < 1e-9);
+    QVERIFY(std::fabs(level[256 + 41] - (full - 20 * std::log10(2.0))) < 1e-9);
+    QVERIFY(level[256 + 43] < -200);
+    QVERIFY(level[256 - 40] < -200);
+}
+
+void TestPlotData::lineCounts()
+{
+    forRows({{"one short", 511, 0}, {"second one short", 767, 1}, {"5000", 5000, 18}},
+            [&](int samples, int lines) {
+                SpectrumLines spectrum;
+                spectrum.update(tone(static_cast<std::size_t>(samples), 3), 100);
+                QCOMPARE(static_cast<int>(spectrum.lines().size()), lines);
+                QCOMPARE(spectrum.mean().empty(), lines == 0);
+                for (int k = 0; k < lines; ++k) {
+                    QCOMPARE(spectrum.lines()[static_cast<std::size_t>(k)].position, 100 + 256 * k);
+                }
+            });
+}
+
+void TestPlotData::movesTransformOnlyNewFrames()
+{
+    SpectrumLines lines;
+    lines.update(tone(2048, 7), 0);
+    QCOMPARE(lines.transformCount(), 7);
+    lines.update(tone(2048, 7, 1, 512), 512); // two frames later: two new ones at the back
+    QCOMPARE(lines.transformCount(), 9);
+    lines.update(tone(2048, 7, 1, 256), 256); // one back: one new at the front
+    QCOMPARE(lines.transformCount(), 10);
+    lines.update(tone(2560, 7, 1, 256), 256); // longer from the same start
+    QCOMPARE(lines.transformCount(), 12);
+    lines.update(tone(1024, 7, 1, 512), 512); // a part
+    QCOMPARE(lines.transformCount(), 12);
+    QCOMPARE(positions(lines), std::vector<qint64>({512, 768, 1024}));
+    lines.clear();
+    lines.update(tone(1024, 7, 1, 512), 512);
+    QCOMPARE(lines.transformCount(), 15);
+}
+
+void TestPlotData::resultDoesNotDependOnTheWay()
+{
+    SpectrumLines walked;
+    SpectrumLines direct;
+    for (const qint64 first : {0, 250, 500, 756, 300}) {
+        walked.update(tone(20000, 11, 0.3, first), first);
+    }
+    direct.update(tone(20000, 11, 0.3, 300), 300);
+    QCOMPARE(positions(walked), positions(direct));
+    for (std::size_t k = 0; k < direct.lines().size(); ++k) {
+        QCOMPARE(walked.lines()[k].level, direct.lines()[k].level);
+    }
+}
+
+void TestPlotData::meanIsInDb()
+{
+    // One frame at 0 dB and one at -20 dB: the mean of the levels, not of the powers.
+    std::vector<IqSample> samples = tone(512, 16);
+    SpectrumLines lines;
+    lines.update(samples, 0);
+    std::vector<SpectrumLines::Line> both = lines.lines();
+    lines.clear();
+    lines.update(tone(512, 16, 0.1), 0);
+    both.push_back(lines.lines().front());
+    lines.setLines(both);
+    QVERIFY(std::fabs(lines.mean()[256 + 16] + 10) < 1e-9);
+}
+
+void TestPlotData::constellationCells()
+{
+    forRows({{"zero", 0.0, 0.0, 25, 25},
+             {"corner", 1.0, 1.0, 50, 50},
+             {"next cell", 0.0401, -0.0401, 26, 24},
+             {"outside", 1.0001, 0.0, -1, -1}},
+            [&](double i, double q, int row, int column) {
+                const double scale = 2;
+                const std::vector<IqSample> samples{{i * scale, q * scale}};
+                ConstellationGrid grid;
+                grid.compute(samples, scale, scale);
+                double sum = 0;
+                for (int r = 0; r < ConstellationGrid::Size; ++r) {
+                    for (int c = 0; c < ConstellationGrid::Size; ++c) {
+                        sum += grid.count(r, c);
+                    }
+                }
+                QCOMPARE(sum, row < 0 ? 0.0 : 1.0);
+                if (row >= 0) {
+                    QCOMPARE(grid.count(row, column), 1.0);
+                }
+            });
+}
+
+void TestPlotData::constellationLevels()
+{
+    std::vector<IqSample> samples(1000, {0.5, 0.5});
+    samples.insert(samples.end(), 100, {-0.5, 0.5});
+    samples.push_back({-0.5, -0.5});
+    ConstellationGrid grid;
+    grid.compute(samples, 1, 1);
+    const int low = ConstellationGrid::cellOf(-0.5);
+    const int high = ConstellationGrid::cellOf(0.5);
+    QCOMPARE(grid.levelDb(high, high), 0.0);
+    QCOMPARE(grid.levelDb(25, 25), ConstellationGrid::EmptyDb);
+    QVERIFY(grid.levelDb(low, high) < -30);
+    QVERIFY(grid.levelDb(low, low) < grid.levelDb(low, high));
+    QVERIFY(grid.levelDb(low, low) > ConstellationGrid::EmptyDb + 5);
+}
+
+void TestPlotData::scales()
+{
+    forRows({{"zero", 0.0, 0.0},
+             {"exact", 0.2, 0.2},
+             {"to 2", 1.01, 2.0},
+             {"to 5", 2.5e6, 5e6},
+             {"to 10", 0.0051, 0.01},
+             {"a thousand, whose logarithm rounds", 1000.0, 1000.0},
+             {"negative", -30.0, -50.0}},
+            [](double value, double step) { QCOMPARE(niceStep(value), step); });
+    QCOMPARE(labelStride(20, 14), 1);
+    QCOMPARE(labelStride(13, 14), 2);
+    QCOMPARE(labelStride(5, 14), 5);
+    QCOMPARE(labelStride(0, 14), 1);
+}
+
+void TestPlotData::power()
+{
+    QCOMPARE(powerText(-3.456, false, false), " -3.46 dBm");
+    QCOMPARE(powerText(12, true, false), " 12.00 dB ");
+    QCOMPARE(powerText(999999, false, true), "999.999 kW");
+    QCOMPARE(powerText(9e-13, false, true), "");
+    QCOMPARE(powerToDbm(-1.0), 30.0);
+    QCOMPARE(powerToDbm(0.0), -60.0);
+    // What is 0 takes the smallest power that isn't.
+    std::vector<double> in{0, 0, 0.01, 0, 0.1};
+    std::vector<double> out(in.size());
+    powerToDbm(in, out);
+    QCOMPARE(out, std::vector<double>({10, 10, 10, 10, 20}));
+    QCOMPARE(in, std::vector<double>({0.01, 0.01, 0.01, 0.01, 0.1}));
+    std::vector<double> silent{0, 0};
+    out.resize(2);
+    powerToDbm(silent, out);
+    QCOMPARE(silent, std::vector<double>({-60, -60}));
+    QCOMPARE(out[1], 47.781512503836435); // 10 log10(60) + 30
+}
+
+QTEST_APPLESS_MAIN(TestPlotData)
+#include "tst_plotdata.moc"
