@@ -48,21 +48,6 @@ bool DlgInfo::startModule(const QString &path)
     return true;
 }
 
-QString DlgInfo::moduleName() const
-{
-    return "Waveform Info";
-}
-
-QString DlgInfo::menuPath() const
-{
-    return "/Analyze/File Info";
-}
-
-bool DlgInfo::extensionAllowed(const QString &upperCaseExtension) const
-{
-    return upperCaseExtension == "WV";
-}
-
 void DlgInfo::slot_dialog_rejected()
 {
     // A report of many segments is large, and nobody sees it any more.

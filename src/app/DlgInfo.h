@@ -19,9 +19,6 @@ public:
     ~DlgInfo() override;
 
     [[nodiscard]] bool startModule(const QString &path) override;
-    [[nodiscard]] QString moduleName() const override;
-    [[nodiscard]] QString menuPath() const override;
-    [[nodiscard]] bool extensionAllowed(const QString &upperCaseExtension) const override;
 
 private slots:
     void slot_dialog_rejected();

@@ -13,8 +13,10 @@
 #include <QAction>
 #include <QMenu>
 #include <QMenuBar>
+#include <QSettings>
 
 #include <algorithm>
+#include <utility>
 
 namespace {
 
@@ -29,21 +31,32 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
     return bar.addMenu(title);
 }
 
+/// The tools, in the order of the menus.
+QList<ToolInfo> toolTable()
+{
+    using enum ToolInfo::Selection;
+    return {
+        toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),
+        toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}),
+        toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
+        toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
+    };
+}
+
 } // namespace
 
 ModulesDb::ModulesDb()
 {
-    addTool(std::make_unique<DlgInfo>());
-    addTool(std::make_unique<DlgView>());
-    addTool(std::make_unique<DlgWvCreate>());
-    addTool(std::make_unique<DlgResample>());
+    for (ToolInfo &info : toolTable()) {
+        addTool(std::move(info));
+    }
 }
 
 ModulesDb::~ModulesDb() = default;
 
-void ModulesDb::addTool(std::unique_ptr<DlgBase> tool)
+void ModulesDb::addTool(ToolInfo info)
 {
-    m_tools.push_back(std::move(tool));
+    m_tools.push_back({std::move(info), nullptr});
 }
 
 void ModulesDb::buildMenu(QMenuBar *bar)
@@ -51,8 +64,8 @@ void ModulesDb::buildMenu(QMenuBar *bar)
     if (!bar || !m_menuActions.isEmpty()) {
         return;
     }
-    for (const auto &tool : m_tools) {
-        QString path = tool->menuPath();
+    for (const Tool &tool : m_tools) {
+        QString path = tool.info.menuPath;
         if (path.startsWith('/')) {
             path.remove(0, 1);
         }
@@ -64,53 +77,61 @@ void ModulesDb::buildMenu(QMenuBar *bar)
         QAction *action = findOrAddMenu(*bar, title)->addAction(entry);
         action->setEnabled(false);
         connect(action, &QAction::triggered, this, &ModulesDb::menuActionTriggered);
-        m_menuActions.append({action, tool.get()});
+        m_menuActions.append({action, &tool.info});
     }
 }
 
 QList<ModulesDb::ToolAction> ModulesDb::contextActions(QObject *parent) const
 {
     QList<ToolAction> actions;
-    for (const auto &tool : m_tools) {
-        actions.append({new QAction(tool->moduleName(), parent), tool.get()});
+    for (const Tool &tool : m_tools) {
+        actions.append({new QAction(tool.info.name, parent), &tool.info});
     }
     return actions;
 }
 
-bool ModulesDb::isAllowed(const DlgBase &tool, const QString &path, bool local)
+QList<const ToolInfo *> ModulesDb::allAllowed(const QString &path, bool local) const
 {
-    const bool isFile = !isFolderPath(path);
-    // A file without a dot has the whole path as its type, which no tool takes that wants one.
-    const QString extension = path.toUpper().section('.', -1);
-    return tool.sourceAllowed(local) && tool.selectionAllowed(isFile) &&
-           (!isFile || tool.extensionAllowed(extension));
-}
-
-QList<DlgBase *> ModulesDb::allAllowed(const QString &path, bool local) const
-{
-    QList<DlgBase *> tools;
-    for (const auto &tool : m_tools) {
-        if (isAllowed(*tool, path, local)) {
-            tools.append(tool.get());
+    QList<const ToolInfo *> tools;
+    for (const Tool &tool : m_tools) {
+        if (tool.info.accepts(path, local)) {
+            tools.append(&tool.info);
         }
     }
     return tools;
 }
 
-DlgBase *ModulesDb::firstAllowed(const QString &path, bool local) const
+const ToolInfo *ModulesDb::firstAllowed(const QString &path, bool local) const
 {
     return allAllowed(path, local).value(0, nullptr);
 }
 
-bool ModulesDb::start(DlgBase &tool, const QString &path)
+DlgBase &ModulesDb::dialog(const ToolInfo &info)
 {
-    Tracer::Trace(Tracer::Debug, QString("Invoking %1.").arg(tool.moduleName()));
-    if (!tool.startModule(path)) {
+    const auto tool = std::find_if(m_tools.begin(), m_tools.end(),
+                                   [&info](const Tool &entry) { return &entry.info == &info; });
+    Q_ASSERT(tool != m_tools.end());
+    if (!tool->dialog) {
+        tool->dialog = info.make();
+        tool->dialog->instrumentsUpdated(m_instruments);
+        if (!m_settingsFile.isEmpty()) {
+            QSettings settings(m_settingsFile, QSettings::IniFormat);
+            tool->dialog->readSettings(settings);
+        }
+    }
+    return *tool->dialog;
+}
+
+bool ModulesDb::start(const ToolInfo &tool, const QString &path)
+{
+    Tracer::Trace(Tracer::Debug, QString("Invoking %1.").arg(tool.name));
+    DlgBase &window = dialog(tool);
+    if (!window.startModule(path)) {
         return Tracer::fail("Cannot initialize module.");
     }
-    tool.show();
-    tool.raise();
-    tool.activateWindow();
+    window.show();
+    window.raise();
+    window.activateWindow();
     return true;
 }
 
@@ -120,53 +141,58 @@ void ModulesDb::setSelection(const QString &path, bool local)
                   QString("Selecting %1: %2.").arg(local ? "LOCAL" : "REMOTE", path));
     m_selection = path;
     for (const auto &[action, tool] : std::as_const(m_menuActions)) {
-        action->setEnabled(isAllowed(*tool, path, local));
+        action->setEnabled(tool->accepts(path, local));
     }
 }
 
 void ModulesDb::writeAllSettings(QSettings &settings)
 {
-    for (const auto &tool : m_tools) {
-        tool->writeSettings(settings);
+    for (const Tool &tool : m_tools) {
+        if (tool.dialog) {
+            tool.dialog->writeSettings(settings);
+        }
     }
 }
 
 void ModulesDb::readAllSettings(QSettings &settings)
 {
-    for (const auto &tool : m_tools) {
-        tool->readSettings(settings);
-    }
+    m_settingsFile = settings.fileName();
 }
 
 void ModulesDb::updateInstruments(const QList<InstrConfigEntry> &instruments)
 {
-    for (const auto &tool : m_tools) {
-        tool->instrumentsUpdated(instruments);
+    m_instruments = instruments;
+    for (const Tool &tool : m_tools) {
+        if (tool.dialog) {
+            tool.dialog->instrumentsUpdated(instruments);
+        }
     }
 }
 
 void ModulesDb::closeAll()
 {
-    for (const auto &tool : m_tools) {
-        tool->close();
+    for (const Tool &tool : m_tools) {
+        if (tool.dialog) {
+            tool.dialog->close();
+        }
     }
 }
 
 void ModulesDb::hideAll()
 {
     m_hidden.clear();
-    for (const auto &tool : m_tools) {
-        if (tool->isVisible()) {
-            m_hidden.push_back(tool.get());
-            tool->hide();
+    for (const Tool &tool : m_tools) {
+        if (tool.dialog && tool.dialog->isVisible()) {
+            m_hidden.append(tool.dialog.get());
+            tool.dialog->hide();
         }
     }
 }
 
 void ModulesDb::showAgain()
 {
-    for (DlgBase *tool : m_hidden) {
-        tool->show();
+    for (DlgBase *dialog : std::as_const(m_hidden)) {
+        dialog->show();
     }
     m_hidden.clear();
 }

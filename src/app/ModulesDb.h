@@ -1,35 +1,36 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "instrument/InstrConfigEntry.h"
+#include "toolframe/ToolInfo.h"
+
 #include <QList>
 #include <QObject>
 #include <QPair>
 #include <QString>
 
+#include <deque>
 #include <memory>
-#include <vector>
 
-class DlgBase;
 class QAction;
 class QMenuBar;
 class QSettings;
-struct InstrConfigEntry;
 
-/// All tools of the program: creates them, enters them in the menus, enables them according to the
-/// selected entry, starts them, and passes settings on to them.
+/// All tools of the program: enters them in the menus, enables them according to the selected
+/// entry, makes their dialogs at the first use, starts them, and passes settings on to them.
 class ModulesDb : public QObject
 {
     Q_OBJECT
 
 public:
-    using ToolAction = QPair<QAction *, DlgBase *>;
+    using ToolAction = QPair<QAction *, const ToolInfo *>;
 
-    /// Creates all tools. The order here is that of the menus.
+    /// Takes the table of tools, whose order is that of the menus. Makes no dialog.
     ModulesDb();
     ~ModulesDb() override;
 
     /// Appends a tool; to be called before the menus are built.
-    void addTool(std::unique_ptr<DlgBase> tool);
+    void addTool(ToolInfo info);
 
     /// Enters the tools in a menu bar, adding the menus that it lacks. Does nothing for a null bar
     /// or the second time.
@@ -38,22 +39,26 @@ public:
     /// One new action for each tool, owned by `parent`, with the tool's name as its text.
     [[nodiscard]] QList<ToolAction> contextActions(QObject *parent) const;
 
-    /// Whether a tool accepts this entry: its side, its kind and, for a file, its type.
-    [[nodiscard]] static bool isAllowed(const DlgBase &tool, const QString &path, bool local);
-
     /// The first tool that accepts an entry; null if there is none.
-    [[nodiscard]] DlgBase *firstAllowed(const QString &path, bool local) const;
+    [[nodiscard]] const ToolInfo *firstAllowed(const QString &path, bool local) const;
 
     /// All tools that accept an entry, in order.
-    [[nodiscard]] QList<DlgBase *> allAllowed(const QString &path, bool local) const;
+    [[nodiscard]] QList<const ToolInfo *> allAllowed(const QString &path, bool local) const;
 
-    /// Starts a tool with a path and shows its window. False if the tool can't start; logged.
-    bool start(DlgBase &tool, const QString &path);
+    /// Starts a tool of this registry with a path and shows its window. False if the tool can't
+    /// start; logged.
+    bool start(const ToolInfo &tool, const QString &path);
+
+    /// The dialog of a tool of this registry, made now if there was none. Owned by the registry.
+    [[nodiscard]] DlgBase &dialog(const ToolInfo &tool);
 
     /// The selection of a pane has changed: enables the entries of the menu bar accordingly.
     void setSelection(const QString &path, bool local);
 
+    /// Lets the dialogs that were used save their groups; what stands in those of others stays.
     void writeAllSettings(QSettings &settings);
+
+    /// Remembers the store, from which each dialog reads its group when it is made.
     void readAllSettings(QSettings &settings);
     void updateInstruments(const QList<InstrConfigEntry> &instruments);
 
@@ -67,8 +72,16 @@ private slots:
     void menuActionTriggered();
 
 private:
-    std::vector<std::unique_ptr<DlgBase>> m_tools;
-    std::vector<DlgBase *> m_hidden; ///< tools that hideAll() has hidden
+    struct Tool
+    {
+        ToolInfo info;
+        std::unique_ptr<DlgBase> dialog; ///< null until it is used
+    };
+
+    std::deque<Tool> m_tools;  ///< their addresses stay
+    QList<DlgBase *> m_hidden; ///< dialogs that hideAll() has hidden
     QString m_selection;
+    QString m_settingsFile;
+    QList<InstrConfigEntry> m_instruments;
     QList<ToolAction> m_menuActions;
 };

@@ -273,7 +273,7 @@ void QCustomTreeView::contextMenuEvent(QContextMenuEvent *event)
     }
     m_runAction->setVisible(isRunnable(path, device()));
     for (const auto &[action, tool] : std::as_const(m_toolActions)) {
-        action->setVisible(ModulesDb::isAllowed(*tool, path, isLocal()));
+        action->setVisible(tool->accepts(path, isLocal()));
     }
     const QPoint position = byMouse ? event->pos() : visualRect(index).bottomLeft();
     m_contextMenu->popup(viewport()->mapToGlobal(position));
@@ -354,7 +354,7 @@ bool QCustomTreeView::focusNextPrevChild(bool next)
 void QCustomTreeView::startFirstTool()
 {
     const QString path = currentPath();
-    if (DlgBase *tool = m_modules ? m_modules->firstAllowed(path, isLocal()) : nullptr) {
+    if (const ToolInfo *tool = m_modules ? m_modules->firstAllowed(path, isLocal()) : nullptr) {
         m_modules->start(*tool, path);
     } else if (!path.isEmpty()) {
         const QString words = isLocal() ? "No tool works on '%1'."
@@ -368,9 +368,9 @@ void QCustomTreeView::slot_module(int iModIndex)
     if (iModIndex < 0 || iModIndex >= m_toolActions.size()) {
         return;
     }
-    DlgBase *tool = m_toolActions.at(iModIndex).second;
+    const ToolInfo *tool = m_toolActions.at(iModIndex).second;
     const QString path = currentPath();
-    if (ModulesDb::isAllowed(*tool, path, isLocal())) {
+    if (tool->accepts(path, isLocal())) {
         m_modules->start(*tool, path);
     }
 }

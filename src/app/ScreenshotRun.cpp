@@ -125,10 +125,10 @@ void ScreenshotRun::takePictures()
     bool done = true;
     if (!m_file.isEmpty()) {
         // The tools first, since their reading fills the log of the main window.
-        const QList<DlgBase *> tools = m_window.modules().allAllowed(m_file, true);
-        for (DlgBase *tool : tools) {
+        const QList<const ToolInfo *> tools = m_window.modules().allAllowed(m_file, true);
+        for (const ToolInfo *tool : tools) {
             done = done && m_window.modules().start(*tool, m_file) && saveTool(*tool);
-            tool->close();
+            m_window.modules().dialog(*tool).close();
         }
         if (!done) {
             complain(QString("not all tools could show '%1'").arg(m_file));
@@ -218,9 +218,10 @@ bool ScreenshotRun::saveTransfer()
 
 /// A picture of the tool, or of each of its pages: first those on the way that "Next" leads, as a
 /// user would see them, then the others. Nothing is run, so no file is written.
-bool ScreenshotRun::saveTool(DlgBase &tool) const
+bool ScreenshotRun::saveTool(const ToolInfo &info) const
 {
-    const QString name = tool.moduleName().toLower().replace(' ', '-');
+    DlgBase &tool = m_window.modules().dialog(info);
+    const QString name = info.name.toLower().replace(' ', '-');
     auto *pages = tool.findChild<QStackedWidget *>("sw_assist");
     auto *next = tool.findChild<QPushButton *>("pb_next");
     if (!pages || !next) {

@@ -7,7 +7,7 @@
 #include <QSet>
 #include <QString>
 
-class DlgBase;
+struct ToolInfo;
 class MainWindow;
 class QCustomTreeView;
 class QPixmap;
@@ -40,7 +40,7 @@ private:
     [[nodiscard]] bool offersInstruments() const;
     [[nodiscard]] bool makeTransferFile();
     [[nodiscard]] bool saveTransfer();
-    [[nodiscard]] bool saveTool(DlgBase &tool) const;
+    [[nodiscard]] bool saveTool(const ToolInfo &info) const;
     [[nodiscard]] bool save(QWidget &window, const QString &name) const;
     [[nodiscard]] bool savePicture(const QPixmap &picture, const QString &name) const;
     void finish(int status);

@@ -49,6 +49,9 @@ signals:
     /// Progress of the running step, 0 to 100.
     void ProgressUpdate(int iPercentage);
 
+    /// How much of a transfer is done, in bytes, over all its steps.
+    void bytesMoved(qint64 done, qint64 total);
+
     void report(const ReportLine &line);
 
     /// To the worker of the running step.

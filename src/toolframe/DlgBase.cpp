@@ -12,36 +12,6 @@ DlgBase::DlgBase(QWidget *parent)
                    Qt::WindowMinMaxButtonsHint | Qt::WindowCloseButtonHint);
 }
 
-bool DlgBase::startModule(const QString & /*path*/)
-{
-    return false;
-}
-
-QString DlgBase::moduleName() const
-{
-    return {};
-}
-
-QString DlgBase::menuPath() const
-{
-    return {};
-}
-
-bool DlgBase::sourceAllowed(bool local) const
-{
-    return local;
-}
-
-bool DlgBase::selectionAllowed(bool isFile) const
-{
-    return isFile;
-}
-
-bool DlgBase::extensionAllowed(const QString & /*upperCaseExtension*/) const
-{
-    return false;
-}
-
 void DlgBase::instrumentsUpdated(const QList<InstrConfigEntry> & /*instruments*/) {}
 
 void DlgBase::writeSettings(QSettings & /*settings*/) {}

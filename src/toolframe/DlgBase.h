@@ -8,11 +8,8 @@
 class QSettings;
 struct InstrConfigEntry;
 
-/// Base of all tool dialogs: modeless windows that the main window creates once, enters in its
-/// menus and starts with the path of the selected file.
-///
-/// A tool says by its texts where it appears, by the three tests what it works on, and keeps its
-/// settings in a group of its own. The defaults are those of a tool that takes no file at all.
+/// Base of all tool dialogs: modeless windows that are made at their first use and then kept. Where
+/// a tool appears and what it works on stands in its ToolInfo.
 class DlgBase : public QDialog
 {
     Q_OBJECT
@@ -22,30 +19,15 @@ public:
 
     /// Prepares the dialog for a file, or a folder (its path ends in "/"). False means that it
     /// can't start; the reason has been logged, and the dialog stays as it was.
-    [[nodiscard]] virtual bool startModule(const QString &path);
+    [[nodiscard]] virtual bool startModule(const QString &path) = 0;
 
-    /// Text of the entry in the context menu of the panes.
-    [[nodiscard]] virtual QString moduleName() const;
-
-    /// Place in the menu bar, "/Menu/Entry"; empty for none.
-    [[nodiscard]] virtual QString menuPath() const;
-
-    /// Whether the tool works on the local file system or on that of an instrument.
-    [[nodiscard]] virtual bool sourceAllowed(bool local) const;
-
-    /// Whether the tool works on files, or folders.
-    [[nodiscard]] virtual bool selectionAllowed(bool isFile) const;
-
-    /// Whether the tool takes files of this type, "WV" for "noise.wv".
-    [[nodiscard]] virtual bool extensionAllowed(const QString &upperCaseExtension) const;
-
-    /// The list of configured instruments has changed.
+    /// The list of configured instruments has changed, or the dialog was just made.
     virtual void instrumentsUpdated(const QList<InstrConfigEntry> &instruments);
 
 public slots:
     /// Saves the tool's group of settings.
     virtual void writeSettings(QSettings &settings);
 
-    /// Restores the tool's group of settings.
+    /// Restores the tool's group of settings; called once, before the first start.
     virtual void readSettings(QSettings &settings);
 };

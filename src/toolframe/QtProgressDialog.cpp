@@ -145,8 +145,11 @@ void QtProgressDialog::setLabelText(const QString &text)
 void QtProgressDialog::startStep(const QString &labelText)
 {
     setLabelText(labelText);
-    m_bar->setValue(-1);
-    m_sinceStep.start();
+    // Bytes are counted over all steps of a job, and so is then its progress.
+    if (m_bytesTotal == 0) {
+        m_bar->setValue(-1);
+        m_sinceStep.start();
+    }
     showTimes();
 }
 

@@ -43,7 +43,8 @@ public slots:
 
     void setLabelText(const QString &text);
 
-    /// A new step of the same job: its label, with progress and times starting over.
+    /// A new step of the same job: its label, with progress and times starting over unless bytes
+    /// are counted.
     void startStep(const QString &labelText);
 
     /// How far a transfer is, in bytes; its rate and the remaining time are shown from the second

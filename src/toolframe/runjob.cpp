@@ -47,6 +47,7 @@ JobOutcome runJob(ToolJob &job, QWidget *parent, QTextEdit *report)
     QtProgressDialog progress({}, parent);
     QObject::connect(&job, &ToolJob::stepStarted, &progress, &QtProgressDialog::startStep);
     QObject::connect(&job, &ToolJob::ProgressUpdate, &progress, &QtProgressDialog::setValue);
+    QObject::connect(&job, &ToolJob::bytesMoved, &progress, &QtProgressDialog::setBytes);
     QObject::connect(&progress, &QtProgressDialog::canceled, &job, &ToolJob::cancel);
     if (report) {
         QObject::connect(&job, &ToolJob::report, report,

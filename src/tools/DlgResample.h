@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "toolframe/DlgBase.h"
+#include "EditWizard.h"
 
 #include "jobs/ResampleJob.h"
 
@@ -13,7 +13,7 @@ class DlgResample;
 
 /// Converts a waveform file to another clock rate or number of samples: source file, target,
 /// output file, status, a page each.
-class DlgResample : public DlgBase
+class DlgResample : public EditWizard
 {
     Q_OBJECT
 
@@ -21,31 +21,23 @@ public:
     explicit DlgResample(QWidget *parent = nullptr);
     ~DlgResample() override;
 
-    [[nodiscard]] bool startModule(const QString &path) override;
-    [[nodiscard]] QString moduleName() const override;
-    [[nodiscard]] QString menuPath() const override;
-    [[nodiscard]] bool extensionAllowed(const QString &upperCaseExtension) const override;
-    void writeSettings(QSettings &settings) override;
-    void readSettings(QSettings &settings) override;
-
     /// What the fields ask for.
     [[nodiscard]] ResampleRequest options() const;
 
+protected:
+    [[nodiscard]] std::unique_ptr<ToolJob> makeJob() const override;
+    [[nodiscard]] bool isComplete(int page) const override;
+    void jobEnded(JobOutcome outcome) override;
+    void sourceChanged() override;
+    void writeFields(QSettings &settings) const override;
+    void readFields(const QSettings &settings) override;
+
 private slots:
-    void slot_infile();
-    void slot_outfile();
     void slot_mode();
     void slot_updatesettings();
-    void slot_create();
-    void slot_next();
-    void slot_prev();
 
 private:
-    [[nodiscard]] bool loadSource(const QString &fileName);
     [[nodiscard]] ResampleTarget target() const;
-    void updateButtons();
 
     std::unique_ptr<Ui::DlgResample> m_ui;
-    double m_sourceClockHz = 0;
-    qint64 m_sourceSamples = 0;
 };

@@ -93,7 +93,7 @@ bool DlgView::startModule(const QString &path)
     m_ui->w_iqtrace->setClock(m_clockHz);
     m_ui->w_spectrum->setClock(m_clockHz);
     m_ui->w_timeline->setWaveform(info.samples, m_clockHz);
-    setWindowTitle(tr("View Waveform") + " - " + QFileInfo(path).fileName());
+    setWindowTitle(QString("View Waveform") + " - " + QFileInfo(path).fileName());
     showFile();
     if (!m_window.show(0)) {
         unload();
@@ -101,21 +101,6 @@ bool DlgView::startModule(const QString &path)
     }
     refresh();
     return true;
-}
-
-QString DlgView::moduleName() const
-{
-    return "View";
-}
-
-QString DlgView::menuPath() const
-{
-    return "/Analyze/View Content";
-}
-
-bool DlgView::extensionAllowed(const QString &upperCaseExtension) const
-{
-    return upperCaseExtension == "WV";
 }
 
 void DlgView::writeSettings(QSettings &settings)

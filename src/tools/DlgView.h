@@ -28,9 +28,6 @@ public:
     ~DlgView() override;
 
     [[nodiscard]] bool startModule(const QString &path) override;
-    [[nodiscard]] QString moduleName() const override;
-    [[nodiscard]] QString menuPath() const override;
-    [[nodiscard]] bool extensionAllowed(const QString &upperCaseExtension) const override;
     void writeSettings(QSettings &settings) override;
     void readSettings(QSettings &settings) override;
 

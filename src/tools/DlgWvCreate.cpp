@@ -6,10 +6,6 @@
 #include "ui_DlgWvCreate.h"
 
 #include "jobs/CreateJob.h"
-#include "log/Tracer.h"
-#include "toolframe/questions.h"
-#include "toolframe/runjob.h"
-#include "toolframe/windowplace.h"
 
 #include <QDir>
 #include <QFileInfo>
@@ -20,13 +16,7 @@
 namespace {
 
 /// Pages of the wizard, by their index on the stack. Those of the types lie between.
-enum Page {
-    WaveformPage = 0,
-    FirstTypePage = 1,
-    PreviewPage = 10,
-    OutputPage = 11,
-    StatusPage = 12
-};
+enum Page { WaveformPage = 0, FirstTypePage = 1, PreviewPage = 10, OutputPage = 11 };
 
 /// The entries of the first choice, in their order, with the variants that each offers.
 struct Waveform
@@ -60,15 +50,19 @@ constexpr int shortWaveform = 512;
 } // namespace
 
 DlgWvCreate::DlgWvCreate(QWidget *parent)
-    : DlgBase(parent)
+    : ToolWizard({.settingsGroup = "WvCreate",
+                  .position = {180, 120},
+                  .size = {820, 560},
+                  .abortedText = "Creation aborted"},
+                 parent)
     , m_ui(std::make_unique<Ui::DlgWvCreate>())
 {
     m_ui->setupUi(this);
     m_pages = std::make_unique<CreateTypePages>(*m_ui);
-    setUpResult(*m_ui->le_samples, tr("Number of Samples"), {}, 1e6);
-    setUpResult(*m_ui->le_arbclock, tr("ARB clock rate"), "Hz", 6e8);
-    setUpResult(*m_ui->le_peak, tr("Peak Vector"), {}, 100);
-    setUpResult(*m_ui->le_crf, tr("Peak/RMS"), "dB", 100);
+    setUpResult(*m_ui->le_samples, "Number of Samples", {}, 1e6);
+    setUpResult(*m_ui->le_arbclock, "ARB clock rate", "Hz", 6e8);
+    setUpResult(*m_ui->le_peak, "Peak Vector", {}, 100);
+    setUpResult(*m_ui->le_crf, "Peak/RMS", "dB", 100);
     m_ui->le_samples->setScaled(false);
     m_ui->le_crf->setPrecision(2);
     m_ui->w_iq->setView(0);
@@ -83,14 +77,12 @@ DlgWvCreate::DlgWvCreate(QWidget *parent)
     connect(m_ui->rb_sc_auto, &QRadioButton::clicked, this, &DlgWvCreate::slot_scaling);
     connect(m_ui->rb_sc_no, &QRadioButton::clicked, this, &DlgWvCreate::slot_scaling);
     connect(m_ui->cb_zerocrf, &QCheckBox::stateChanged, this, &DlgWvCreate::slot_crf);
-    connect(m_ui->pb_outfile, &QPushButton::clicked, this, &DlgWvCreate::slot_outfile);
-    connect(m_ui->pb_next, &QPushButton::clicked, this, &DlgWvCreate::slot_next);
-    connect(m_ui->pb_prev, &QPushButton::clicked, this, &DlgWvCreate::slot_prev);
-    connect(m_ui->cb_close, &QPushButton::clicked, this, &DlgWvCreate::reject);
+    connect(m_ui->pb_outfile, &QPushButton::clicked, this,
+            [this] { chooseTargetFile(this, *m_ui->le_outfile); });
     m_ui->le_outfile->setText(QDir::homePath() + "/NewSignal.wv");
     slot_waveform(0);
     slot_over_enable(m_pages->oversamplingBox().checkState());
-    showPage(WaveformPage);
+    setUpWizard();
 }
 
 DlgWvCreate::~DlgWvCreate() = default;
@@ -118,30 +110,8 @@ bool DlgWvCreate::startModule(const QString &path)
     return true;
 }
 
-QString DlgWvCreate::moduleName() const
+void DlgWvCreate::writeFields(QSettings &settings) const
 {
-    return "Create Signal";
-}
-
-QString DlgWvCreate::menuPath() const
-{
-    return "/File/Create";
-}
-
-bool DlgWvCreate::selectionAllowed(bool) const
-{
-    return true;
-}
-
-bool DlgWvCreate::extensionAllowed(const QString &) const
-{
-    return true;
-}
-
-void DlgWvCreate::writeSettings(QSettings &settings)
-{
-    settings.beginGroup("WvCreate");
-    writeWindowPlace(settings, *this);
     settings.setValue("ver", settingsVersion);
     m_pages->writeSettings(settings);
     settings.setValue("wv.main", m_ui->cb_waveform->currentIndex());
@@ -149,25 +119,22 @@ void DlgWvCreate::writeSettings(QSettings &settings)
     settings.setValue("outfile", m_ui->le_outfile->text());
     settings.setValue("comment", m_ui->te_comment->toPlainText());
     settings.setValue("copyright", m_ui->le_copyright->text());
-    settings.endGroup();
 }
 
-void DlgWvCreate::readSettings(QSettings &settings)
+void DlgWvCreate::readFields(const QSettings &settings)
 {
-    settings.beginGroup("WvCreate");
-    readWindowPlace(settings, *this, {180, 120}, {820, 560});
-    if (settings.value("ver", 0.0).toDouble() >= settingsVersion) {
-        m_pages->readSettings(settings);
-        readChoice(settings, "wv.main", *m_ui->cb_waveform);
-        readChoice(settings, "wv.sub", *m_ui->cb_wtype);
-        const QString output = settings.value("outfile").toString();
-        if (!output.isEmpty()) {
-            m_ui->le_outfile->setText(output);
-        }
-        m_ui->te_comment->setPlainText(settings.value("comment").toString());
-        m_ui->le_copyright->setText(settings.value("copyright").toString());
+    if (settings.value("ver", 0.0).toDouble() < settingsVersion) {
+        return;
     }
-    settings.endGroup();
+    m_pages->readSettings(settings);
+    readChoice(settings, "wv.main", *m_ui->cb_waveform);
+    readChoice(settings, "wv.sub", *m_ui->cb_wtype);
+    const QString output = settings.value("outfile").toString();
+    if (!output.isEmpty()) {
+        m_ui->le_outfile->setText(output);
+    }
+    m_ui->te_comment->setPlainText(settings.value("comment").toString());
+    m_ui->le_copyright->setText(settings.value("copyright").toString());
 }
 
 CreateKind DlgWvCreate::kind() const
@@ -191,8 +158,7 @@ CreateRequest DlgWvCreate::options() const
     CreateChoices choices = m_pages->choices(kind());
     choices.subKind = subKind();
     CreateRequest request;
-    request.output = {m_ui->le_outfile->text(), m_ui->te_comment->toPlainText(),
-                      m_ui->le_copyright->text()};
+    request.output = outputOptions();
     request.signal = makeSettings(
         kind(), choices, [this](const CreateField &field) { return m_pages->value(field); });
     request.minClockHz = m_ui->le_minclock->getVal();
@@ -215,12 +181,7 @@ void DlgWvCreate::slot_waveform(int index)
     m_ui->t_cb_wtype->setVisible(!waveform.variants.isEmpty());
 }
 
-void DlgWvCreate::slot_first()
-{
-    showPage(WaveformPage);
-}
-
-void DlgWvCreate::slot_next_type()
+void DlgWvCreate::enableSecondTone()
 {
     const bool twoToneFm = subKind() == static_cast<int>(FmKind::TwoTone);
     const bool twoToneAm = subKind() >= static_cast<int>(AmKind::TwoTone);
@@ -228,14 +189,6 @@ void DlgWvCreate::slot_next_type()
     m_pages->setEnabled(createfields::fmDeviation2, twoToneFm);
     m_pages->setEnabled(createfields::amFrequency2, twoToneAm);
     m_pages->setEnabled(createfields::amDepth2, twoToneAm);
-    showPage(typePage());
-}
-
-void DlgWvCreate::slot_next_preview()
-{
-    if (preview()) {
-        showPage(PreviewPage);
-    }
 }
 
 bool DlgWvCreate::preview()
@@ -244,7 +197,7 @@ bool DlgWvCreate::preview()
     m_ui->w_spectrum->clear();
     m_ui->w_constellation->clear();
     SignalPreviewJob job(options());
-    if (runJob(job, this, nullptr) != JobOutcome::Finished) {
+    if (runInPlace(job) != JobOutcome::Finished) {
         return false;
     }
     const SignalFacts &facts = job.facts();
@@ -270,7 +223,7 @@ bool DlgWvCreate::preview()
 
 void DlgWvCreate::slot_scaling()
 {
-    if (m_ui->sw_assist->currentIndex() == PreviewPage && !preview()) {
+    if (currentPage() == PreviewPage && !preview()) {
         showPage(typePage());
     }
 }
@@ -286,79 +239,33 @@ void DlgWvCreate::slot_over_enable(int state)
     m_pages->setEnabled(createfields::oversampling, state != Qt::Unchecked);
 }
 
-void DlgWvCreate::slot_next_outfile()
+int DlgWvCreate::pageAfter(int page)
 {
-    showPage(OutputPage);
-}
-
-void DlgWvCreate::slot_prev4()
-{
-    showPage(PreviewPage);
-}
-
-void DlgWvCreate::slot_outfile()
-{
-    chooseTargetFile(this, *m_ui->le_outfile);
-}
-
-void DlgWvCreate::slot_next()
-{
-    switch (m_ui->sw_assist->currentIndex()) {
+    switch (page) {
     case WaveformPage:
-        slot_next_type();
-        break;
+        enableSecondTone();
+        return typePage();
     case PreviewPage:
-        slot_next_outfile();
-        break;
-    case OutputPage:
-        slot_create();
-        break;
+        return OutputPage;
     default:
-        slot_next_preview();
-        break;
+        return preview() ? PreviewPage : page;
     }
 }
 
-void DlgWvCreate::slot_prev()
+int DlgWvCreate::pageBefore(int page)
 {
-    switch (m_ui->sw_assist->currentIndex()) {
+    switch (page) {
     case PreviewPage:
-        showPage(typePage());
-        break;
+        return typePage();
     case OutputPage:
-        slot_prev4();
-        break;
-    case StatusPage:
-        showPage(OutputPage);
-        break;
+    case OutputPage + 1:
+        return page - 1;
     default:
-        slot_first();
-        break;
+        return WaveformPage;
     }
 }
 
-void DlgWvCreate::showPage(int page)
+std::unique_ptr<ToolJob> DlgWvCreate::makeJob() const
 {
-    m_ui->sw_assist->setCurrentIndex(page);
-    m_ui->pb_prev->setEnabled(page != WaveformPage);
-    m_ui->pb_next->setVisible(page != StatusPage);
-    m_ui->pb_next->setText(page == OutputPage ? tr("&Run") : tr("&Next"));
-    m_ui->pb_next->setDefault(page != StatusPage);
-    m_ui->cb_close->setDefault(page == StatusPage);
-}
-
-void DlgWvCreate::slot_create()
-{
-    m_ui->te_result->clear();
-    showPage(StatusPage);
-    const QString fileName = m_ui->le_outfile->text();
-    if (!fileName.isEmpty() && !confirmOverwrite(this, fileName)) {
-        appendReport(*m_ui->te_result, ReportLine::failure("Creation aborted"));
-        return;
-    }
-    CreateJob job(options());
-    m_ui->pb_prev->setEnabled(false);
-    // The outcome stands in the report.
-    static_cast<void>(runJob(job, this, m_ui->te_result));
-    m_ui->pb_prev->setEnabled(true);
+    return std::make_unique<CreateJob>(options());
 }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "toolframe/DlgBase.h"
+#include "toolframe/ToolWizard.h"
 
 #include "jobs/CreateRequest.h"
 
@@ -15,7 +15,7 @@ class DlgWvCreate;
 }
 
 /// The wizard that makes a signal: kind, its settings, preview, output file, status.
-class DlgWvCreate : public DlgBase
+class DlgWvCreate : public ToolWizard
 {
     Q_OBJECT
 
@@ -24,38 +24,30 @@ public:
     ~DlgWvCreate() override;
 
     [[nodiscard]] bool startModule(const QString &path) override;
-    [[nodiscard]] QString moduleName() const override;
-    [[nodiscard]] QString menuPath() const override;
-    [[nodiscard]] bool selectionAllowed(bool isFile) const override;
-    [[nodiscard]] bool extensionAllowed(const QString &upperCaseExtension) const override;
-    void writeSettings(QSettings &settings) override;
-    void readSettings(QSettings &settings) override;
 
     /// What the fields ask for.
     [[nodiscard]] CreateRequest options() const;
 
+protected:
+    [[nodiscard]] std::unique_ptr<ToolJob> makeJob() const override;
+    [[nodiscard]] int pageAfter(int page) override;
+    [[nodiscard]] int pageBefore(int page) override;
+    void writeFields(QSettings &settings) const override;
+    void readFields(const QSettings &settings) override;
+
 private slots:
     void slot_waveform(int index);
-    void slot_first();
-    void slot_next_type();
-    void slot_next_preview();
-    void slot_next_outfile();
-    void slot_prev4();
-    void slot_outfile();
-    void slot_create();
     void slot_scaling();
     void slot_crf(int state);
     void slot_over_enable(int state);
-    void slot_next();
-    void slot_prev();
 
 private:
     void setUpResult(QtNumericEdit &edit, const QString &name, const QString &unit, double max);
     [[nodiscard]] CreateKind kind() const;
     [[nodiscard]] int typePage() const;
     [[nodiscard]] int subKind() const;
+    void enableSecondTone();
     [[nodiscard]] bool preview();
-    void showPage(int page);
 
     std::unique_ptr<Ui::DlgWvCreate> m_ui;
     std::unique_ptr<CreateTypePages> m_pages;

@@ -47,10 +47,6 @@ public:
         started.append(path);
         return accepts;
     }
-    QString moduleName() const override { return "Any Tool"; }
-    QString menuPath() const override { return "/Edit/Any"; }
-    bool selectionAllowed(bool /*isFile*/) const override { return true; }
-    bool extensionAllowed(const QString & /*extension*/) const override { return true; }
 
     QStringList started;
     bool accepts = true;
@@ -161,9 +157,12 @@ void TestMainWindow::selectionEnablesTools()
 void TestMainWindow::registryPlacesAndStartsTools()
 {
     ModulesDb modules;
-    auto owned = std::make_unique<AnyTool>();
-    AnyTool *tool = owned.get();
-    modules.addTool(std::move(owned));
+    AnyTool *tool = nullptr;
+    modules.addTool({"Any Tool", "/Edit/Any", ToolInfo::Selection::FileOrFolder, {}, [&tool] {
+                         auto made = std::make_unique<AnyTool>();
+                         tool = made.get();
+                         return made;
+                     }});
     QMenuBar bar;
     bar.addMenu("&File");
     modules.buildMenu(&bar);
@@ -187,7 +186,9 @@ void TestMainWindow::registryPlacesAndStartsTools()
     modules.setSelection("/data/x.dat", false);
     QVERIFY2(!entry->isEnabled(), "tools never work on an instrument");
     modules.setSelection("/data/x.dat", true);
+    QVERIFY2(!tool, "a dialog is made at its first use");
     entry->trigger();
+    QVERIFY(tool);
     QCOMPARE(tool->started, QStringList("/data/x.dat"));
     QVERIFY(tool->isVisible());
 

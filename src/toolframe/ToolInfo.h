@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "DlgBase.h"
+
+#include <QString>
+#include <QStringList>
+
+#include <functional>
+#include <memory>
+
+/// What the program knows of a tool before its dialog is made.
+struct ToolInfo
+{
+    enum class Selection { File, FileOrFolder };
+
+    QString name;     ///< text of the entry in the context menu of the panes
+    QString menuPath; ///< "/Menu/Entry" in the menu bar; empty for none
+    Selection selection = Selection::File;
+    QStringList extensions; ///< upper case, such as "WV"; empty for files of any type
+    std::function<std::unique_ptr<DlgBase>()> make;
+
+    /// Whether the tool works on an entry of a pane. A path that ends in "/" is a folder. All tools
+    /// work on the local file system only.
+    [[nodiscard]] bool accepts(const QString &path, bool local) const
+    {
+        if (!local) {
+            return false;
+        }
+        if (path.endsWith('/')) {
+            return selection == Selection::FileOrFolder;
+        }
+        // A file without a dot has the whole path as its type, which no tool takes that wants one.
+        return extensions.isEmpty() || extensions.contains(path.toUpper().section('.', -1));
+    }
+};
+
+/// A tool whose dialog is of a class that needs nothing but a parent.
+template <typename Dialog>
+[[nodiscard]] ToolInfo toolInfo(const QString &name, const QString &menuPath,
+                                ToolInfo::Selection selection, const QStringList &extensions)
+{
+    return {name, menuPath, selection, extensions, [] { return std::make_unique<Dialog>(); }};
+}

@@ -1,0 +1,191 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "ToolWizard.h"
+
+#include "questions.h"
+#include "runjob.h"
+#include "windowplace.h"
+
+#include <QLineEdit>
+#include <QPlainTextEdit>
+#include <QPushButton>
+#include <QScopedValueRollback>
+#include <QSettings>
+#include <QStackedWidget>
+#include <QTextEdit>
+
+#include <utility>
+
+ToolWizard::ToolWizard(Frame frame, QWidget *parent)
+    : DlgBase(parent)
+    , m_frame(std::move(frame))
+{
+}
+
+void ToolWizard::setUpWizard()
+{
+    m_pages = findChild<QStackedWidget *>("sw_assist");
+    m_next = findChild<QPushButton *>("pb_next");
+    m_previous = findChild<QPushButton *>("pb_prev");
+    m_close = findChild<QPushButton *>("cb_close");
+    m_report = findChild<QTextEdit *>("te_result");
+    Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
+    connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
+    connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
+    connect(m_close, &QPushButton::clicked, this, &ToolWizard::reject);
+    showPage(0);
+}
+
+int ToolWizard::pageAfter(int page)
+{
+    return page + 1;
+}
+
+int ToolWizard::pageBefore(int page)
+{
+    return page - 1;
+}
+
+bool ToolWizard::isComplete(int /*page*/) const
+{
+    return true;
+}
+
+void ToolWizard::pageShown(int /*page*/) {}
+
+QStringList ToolWizard::outputFiles() const
+{
+    return {outputOptions().fileName};
+}
+
+void ToolWizard::jobEnded(JobOutcome /*outcome*/) {}
+
+void ToolWizard::writeFields(QSettings & /*settings*/) const {}
+
+void ToolWizard::readFields(const QSettings & /*settings*/) {}
+
+int ToolWizard::currentPage() const
+{
+    return m_pages->currentIndex();
+}
+
+int ToolWizard::outputPage() const
+{
+    return m_pages->count() - 2;
+}
+
+int ToolWizard::statusPage() const
+{
+    return m_pages->count() - 1;
+}
+
+OutputOptions ToolWizard::outputOptions() const
+{
+    OutputOptions options;
+    if (const auto *name = findChild<QLineEdit *>("le_outfile")) {
+        options.fileName = name->text();
+    }
+    if (const auto *comment = findChild<QPlainTextEdit *>("te_comment")) {
+        options.comment = comment->toPlainText();
+    }
+    if (const auto *copyright = findChild<QLineEdit *>("le_copyright")) {
+        options.copyright = copyright->text();
+    }
+    return options;
+}
+
+void ToolWizard::showPage(int page)
+{
+    m_pages->setCurrentIndex(page);
+    updateButtons();
+    // A field of the page, or else its default button, takes the next key.
+    QWidget *first = page == statusPage() ? m_close : m_pages->currentWidget()->nextInFocusChain();
+    while (first != m_close &&
+           (!m_pages->currentWidget()->isAncestorOf(first) ||
+            (first->focusPolicy() & Qt::TabFocus) == 0 || !first->isEnabled())) {
+        first = first->nextInFocusChain();
+    }
+    first->setFocus(Qt::TabFocusReason);
+    pageShown(page);
+}
+
+void ToolWizard::updateButtons()
+{
+    const int page = currentPage();
+    m_previous->setEnabled(page > 0 && !m_isRunning);
+    m_next->setVisible(page != statusPage());
+    m_next->setText(page == outputPage() ? "&Run" : "&Next");
+    m_next->setEnabled(isComplete(page));
+    m_next->setDefault(page != statusPage());
+    m_close->setDefault(page == statusPage());
+}
+
+/// A click on a button takes the focus, and with it the text, from a field; a key doesn't.
+void ToolWizard::takeTypedValues() const
+{
+    if (QWidget *field = focusWidget(); field && m_pages->isAncestorOf(field)) {
+        field->clearFocus();
+    }
+}
+
+void ToolWizard::goOn()
+{
+    takeTypedValues();
+    const int page = currentPage();
+    // The values that were just taken may not do.
+    if (!isComplete(page)) {
+        updateButtons();
+    } else if (page == outputPage()) {
+        run();
+    } else if (const int next = pageAfter(page); next != page) {
+        showPage(next);
+    }
+}
+
+void ToolWizard::goBack()
+{
+    takeTypedValues();
+    showPage(pageBefore(currentPage()));
+}
+
+void ToolWizard::run()
+{
+    m_report->clear();
+    showPage(statusPage());
+    const QStringList files = outputFiles();
+    for (const QString &file : files) {
+        if (!file.isEmpty() && !confirmOverwrite(this, file)) {
+            appendReport(*m_report, ReportLine::failure(m_frame.abortedText));
+            return;
+        }
+    }
+    JobOutcome outcome = JobOutcome::Failed;
+    {
+        const std::unique_ptr<ToolJob> job = makeJob();
+        const QScopedValueRollback<bool> running(m_isRunning, true);
+        updateButtons();
+        outcome = runJob(*job, this, m_report);
+    }
+    updateButtons();
+    jobEnded(outcome);
+}
+
+JobOutcome ToolWizard::runInPlace(ToolJob &job)
+{
+    return runJob(job, this, nullptr);
+}
+
+void ToolWizard::writeSettings(QSettings &settings)
+{
+    settings.beginGroup(m_frame.settingsGroup);
+    writeWindowPlace(settings, *this);
+    writeFields(settings);
+    settings.endGroup();
+}
+
+void ToolWizard::readSettings(QSettings &settings)
+{
+    settings.beginGroup(m_frame.settingsGroup);
+    readWindowPlace(settings, *this, m_frame.position, m_frame.size);
+    readFields(settings);
+    settings.endGroup();
+}
