@@ -80,9 +80,6 @@ QString copyEntry(QWidget *parent, const CopyRequest &request)
                 });
             }};
     CopyJob job(request, questions);
-    QObject::connect(&job, &CopyJob::bytesCopied, parent, [](qint64 done, qint64 total) {
-        QtProgressDialog::running()->setBytes(done, total);
-    });
     const JobOutcome outcome = runJob(job, parent, nullptr);
     return outcomeText(job, outcome == JobOutcome::Finished);
 }

@@ -288,7 +288,7 @@ bool CopyJob::makeRemoteFolder(const QString &folder)
 void CopyJob::showProgress(int percentOfFile)
 {
     const int wayPercent = (100 * m_leg + percentOfFile) / m_legCount;
-    // Each file counts the same here; bytesCopied() is the exact measure.
+    // Each file counts the same here; bytesMoved() is the exact measure.
     emit ProgressUpdate(static_cast<int>((100 * m_fileIndex + wayPercent) / m_files.size()));
-    emit bytesCopied(m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100, m_totalBytes);
+    emit bytesMoved(m_doneBytes + m_files.at(m_fileIndex).bytes * wayPercent / 100, m_totalBytes);
 }

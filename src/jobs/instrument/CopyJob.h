@@ -55,10 +55,6 @@ public:
     /// What the instruments have reported on the last file that failed, one error a line.
     [[nodiscard]] const QString &reported() const { return m_reported; }
 
-signals:
-    /// How much of the whole is copied, in bytes, as exact as the percentages of the transfers.
-    void bytesCopied(qint64 done, qint64 total);
-
 private:
     struct File
     {
