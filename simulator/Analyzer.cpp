@@ -38,24 +38,27 @@ void Analyzer::start(TimePoint now, bool ifPowerFires)
     m_hasRecord = true;
     const bool fires = m_settings.trigger == IqSettings::Trigger::Immediate ||
                        (m_settings.trigger == IqSettings::Trigger::IfPower && ifPowerFires);
-    if (fires)
+    if (fires) {
         begin(now);
-    else
+    } else {
         m_waiting = true;
+    }
 }
 
 void Analyzer::abort(TimePoint now)
 {
-    if (isPending(now))
+    if (isPending(now)) {
         m_hasRecord = false;
+    }
     m_waiting = false;
     m_sweepEnd = {};
 }
 
 void Analyzer::trigger(TimePoint now)
 {
-    if (m_waiting && m_settings.trigger == IqSettings::Trigger::External)
+    if (m_waiting && m_settings.trigger == IqSettings::Trigger::External) {
         begin(now);
+    }
 }
 
 bool Analyzer::isSweeping(TimePoint now) const

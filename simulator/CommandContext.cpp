@@ -19,8 +19,9 @@ std::size_t CommandContext::parameterCount() const
 std::optional<std::string> CommandContext::string(std::size_t index)
 {
     const Parameter &parameter = unit.parameters.at(index);
-    if (parameter.kind == Parameter::Kind::String)
+    if (parameter.kind == Parameter::Kind::String) {
         return parameter.text;
+    }
     error(DataTypeError);
     return std::nullopt;
 }
@@ -29,12 +30,15 @@ std::optional<double> CommandContext::number(std::size_t index, const NumberRang
 {
     const Parameter &parameter = unit.parameters.at(index);
     if (parameter.kind == Parameter::Kind::Character) {
-        if (matchesMnemonic(parameter.text, "MINimum"))
+        if (matchesMnemonic(parameter.text, "MINimum")) {
             return range.minimum;
-        if (matchesMnemonic(parameter.text, "MAXimum"))
+        }
+        if (matchesMnemonic(parameter.text, "MAXimum")) {
             return range.maximum;
-        if (matchesMnemonic(parameter.text, "DEFault"))
+        }
+        if (matchesMnemonic(parameter.text, "DEFault")) {
             return range.preset;
+        }
         error(InvalidCharacterData);
         return std::nullopt;
     }
@@ -61,19 +65,22 @@ std::optional<std::int64_t> CommandContext::integer(std::size_t index, std::int6
     const NumberRange range{"", static_cast<double>(minimum), static_cast<double>(maximum),
                             static_cast<double>(minimum)};
     const std::optional<double> value = number(index, range);
-    if (!value)
+    if (!value) {
         return std::nullopt;
+    }
     return std::llround(*value);
 }
 
 std::optional<bool> CommandContext::boolean(std::size_t index)
 {
     const Parameter &parameter = unit.parameters.at(index);
-    if (parameter.kind == Parameter::Kind::Number && parameter.suffix.empty())
+    if (parameter.kind == Parameter::Kind::Number && parameter.suffix.empty()) {
         return std::llround(std::clamp(parameter.value, -1e9, 1e9)) != 0;
+    }
     const std::optional<std::size_t> word = choice(index, {"OFF", "ON"});
-    if (!word)
+    if (!word) {
         return std::nullopt;
+    }
     return *word == 1;
 }
 
@@ -87,8 +94,9 @@ std::optional<std::size_t> CommandContext::choice(std::size_t index,
     }
     std::size_t place = 0;
     for (const std::string_view word : words) {
-        if (matchesMnemonic(parameter.text, word))
+        if (matchesMnemonic(parameter.text, word)) {
             return place;
+        }
         ++place;
     }
     error(IllegalParameterValue);
@@ -121,8 +129,9 @@ std::string quoted(std::string_view text)
 {
     std::string result = "\"";
     for (const char byte : text) {
-        if (byte == '"')
+        if (byte == '"') {
             result += '"';
+        }
         result += byte;
     }
     return result + '"';

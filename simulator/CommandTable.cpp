@@ -22,8 +22,9 @@ CommandTable::Result CommandTable::find(std::span<const std::string> nodes, bool
 {
     Result result{nullptr, UndefinedHeader};
     for (const Entry &entry : m_entries) {
-        if (entry.common != common)
+        if (entry.common != common) {
             continue;
+        }
         switch (match(nodes, entry.nodes)) {
         case Match::Yes:
             return {entry.command, NoError};
@@ -48,16 +49,19 @@ std::vector<CommandTable::Node> CommandTable::compile(std::string_view pattern)
     while (begin < pattern.size()) {
         const char mark = pattern[begin];
         if (isMark(mark)) {
-            if (mark == '[' || mark == ']')
+            if (mark == '[' || mark == ']') {
                 optional = mark == '[';
-            if (mark == '#')
+            }
+            if (mark == '#') {
                 nodes.back().suffix = true;
+            }
             ++begin;
             continue;
         }
         std::size_t end = begin;
-        while (end < pattern.size() && !isMark(pattern[end]))
+        while (end < pattern.size() && !isMark(pattern[end])) {
             ++end;
+        }
         nodes.push_back({pattern.substr(begin, end - begin), optional, false});
         begin = end;
     }
@@ -66,33 +70,38 @@ std::vector<CommandTable::Node> CommandTable::compile(std::string_view pattern)
 
 CommandTable::Match CommandTable::matchNode(std::string_view typed, const Node &node)
 {
-    if (matchesMnemonic(typed, node.mnemonic))
+    if (matchesMnemonic(typed, node.mnemonic)) {
         return Match::Yes;
+    }
     const std::size_t last = typed.find_last_not_of("0123456789");
     const std::size_t length = last == std::string_view::npos ? 0 : last + 1;
-    if (length == typed.size() || !matchesMnemonic(typed.substr(0, length), node.mnemonic))
+    if (length == typed.size() || !matchesMnemonic(typed.substr(0, length), node.mnemonic)) {
         return Match::No;
+    }
     return node.suffix && typed.substr(length) == "1" ? Match::Yes : Match::WrongSuffix;
 }
 
 CommandTable::Match CommandTable::match(std::span<const std::string> typed,
                                         std::span<const Node> nodes)
 {
-    if (nodes.empty())
+    if (nodes.empty()) {
         return typed.empty() ? Match::Yes : Match::No;
+    }
     Match best = Match::No;
     if (!typed.empty()) {
         const Match here = matchNode(typed.front(), nodes.front());
         if (here != Match::No) {
             const Match rest = match(typed.subspan(1), nodes.subspan(1));
-            if (rest != Match::No)
+            if (rest != Match::No) {
                 best = here == Match::Yes ? rest : here;
+            }
         }
     }
     if (best != Match::Yes && nodes.front().optional) {
         const Match without = match(typed, nodes.subspan(1));
-        if (without != Match::No)
+        if (without != Match::No) {
             best = without;
+        }
     }
     return best;
 }

@@ -16,8 +16,9 @@ std::string_view trimmed(std::string_view text)
 {
     constexpr std::string_view White = " \t\r";
     const std::size_t begin = text.find_first_not_of(White);
-    if (begin == std::string_view::npos)
+    if (begin == std::string_view::npos) {
         return {};
+    }
     return text.substr(begin, text.find_last_not_of(White) - begin + 1);
 }
 
@@ -37,8 +38,9 @@ void addFaults(const ConfigEntry &entry, std::vector<std::string> &faults)
     while (!rest.empty()) {
         const std::size_t length = std::min(rest.find(','), rest.size());
         const std::string_view fault = trimmed(rest.substr(0, length));
-        if (!fault.empty())
+        if (!fault.empty()) {
             faults.emplace_back(fault);
+        }
         rest.remove_prefix(std::min(length + 1, rest.size()));
     }
 }
@@ -57,8 +59,9 @@ bool setValue(RawInstrument &raw, const ConfigEntry &entry, std::string &error)
     const auto found = keys.find(entry.key);
     if (found == keys.end()) {
         std::string names = "fault";
-        for (const auto &[name, target] : keys)
+        for (const auto &[name, target] : keys) {
             names.append(", ").append(name);
+        }
         error = atLine(entry.line, "unknown key '" + entry.key + "'; there are " + names);
         return false;
     }
@@ -98,8 +101,9 @@ std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text, std::
         const std::string_view line = trimmed(text.substr(0, length));
         text.remove_prefix(std::min(length + 1, text.size()));
         ++number;
-        if (line.empty() || line.front() == ';' || line.front() == '#')
+        if (line.empty() || line.front() == ';' || line.front() == '#') {
             continue;
+        }
         if (line.front() == '[') {
             if (line.back() != ']') {
                 error = atLine(number, "']' is missing behind the name of the group");
@@ -120,8 +124,9 @@ std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text, std::
         }
         std::string_view value = trimmed(line.substr(equals + 1));
         const bool quoted = value.size() >= 2 && value.front() == '"' && value.back() == '"';
-        if (quoted)
+        if (quoted) {
             value = value.substr(1, value.size() - 2);
+        }
         entries.push_back({group, std::string(trimmed(line.substr(0, equals))), std::string(value),
                            number, quoted});
     }
@@ -133,10 +138,11 @@ instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, s
 {
     std::vector<RawInstrument> raws;
     for (const ConfigEntry &entry : entries) {
-        if (entry.key.empty())
+        if (entry.key.empty()) {
             raws.push_back({.label = "[" + entry.group + "] "});
-        else if (!setValue(raws.back(), entry, error))
+        } else if (!setValue(raws.back(), entry, error)) {
             return std::nullopt;
+        }
     }
     if (raws.empty()) {
         error = "it holds no group, so no instrument";
@@ -149,18 +155,22 @@ instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, s
             return std::nullopt;
         }
         // Two of one model are told apart by their serial numbers.
-        if (!raw.serial)
+        if (!raw.serial) {
             raw.serial = std::to_string(FirstSerial + places.size());
+        }
         // A name that stands in a file is meant from that file's place on.
-        if (raw.root && !raw.root->empty())
+        if (raw.root && !raw.root->empty()) {
             raw.root = (std::filesystem::path(folder) / *raw.root).string();
+        }
         std::optional<InstrumentPlace> place = checkInstrument(raw, error);
-        if (!place)
+        if (!place) {
             return std::nullopt;
+        }
         places.push_back(std::move(*place));
     }
-    if (!arePlacesDistinct(places, error))
+    if (!arePlacesDistinct(places, error)) {
         return std::nullopt;
+    }
     return places;
 }
 

@@ -69,16 +69,18 @@ std::string_view errorText(int number)
 
 void ErrorQueue::push(int number, std::string_view detail)
 {
-    if (m_entries.size() < Capacity)
+    if (m_entries.size() < Capacity) {
         m_entries.push_back(entryText(number, detail));
-    else
+    } else {
         m_entries.back() = entryText(QueueOverflow, {});
+    }
 }
 
 std::string ErrorQueue::take()
 {
-    if (m_entries.empty())
+    if (m_entries.empty()) {
         return entryText(NoError, {});
+    }
     std::string text = std::move(m_entries.front());
     m_entries.pop_front();
     return text;

@@ -48,8 +48,9 @@ std::optional<std::int64_t> parseNumber(std::string_view text)
 {
     std::int64_t value = 0;
     const auto result = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (result.ec != std::errc() || result.ptr != text.data() + text.size())
+    if (result.ec != std::errc() || result.ptr != text.data() + text.size()) {
         return std::nullopt;
+    }
     return value;
 }
 
@@ -57,8 +58,9 @@ std::string names()
 {
     std::string text;
     for (const Spec &spec : Specs) {
-        if (!text.empty())
+        if (!text.empty()) {
             text += ", ";
+        }
         text += spec.name;
     }
     return text;
@@ -100,8 +102,9 @@ bool Faults::set(std::string_view name, std::string_view value, std::string &err
 bool Faults::set(std::string_view text, std::string &error)
 {
     const std::size_t equals = text.find('=');
-    if (equals == std::string_view::npos)
+    if (equals == std::string_view::npos) {
         return set(text, {}, error);
+    }
     return set(text.substr(0, equals), text.substr(equals + 1), error);
 }
 
@@ -126,11 +129,13 @@ std::string Faults::list() const
 {
     std::string text;
     for (const auto &[name, value] : m_values) {
-        if (!text.empty())
+        if (!text.empty()) {
             text += ',';
+        }
         text += name;
-        if (!value.empty())
+        if (!value.empty()) {
             text += '=' + value;
+        }
     }
     return text;
 }

@@ -37,8 +37,9 @@ void FileWriter::write(std::span<const char> bytes)
             return;
         }
     }
-    if (!bytes.empty())
+    if (!bytes.empty()) {
         std::memcpy(m_buffer.data() + m_used, bytes.data(), bytes.size());
+    }
     m_used += bytes.size();
 }
 
@@ -52,10 +53,11 @@ void FileWriter::writeOut(std::span<const char> bytes)
 {
     while (m_error == NoError && !bytes.empty()) {
         const ssize_t count = ::write(m_fd.get(), bytes.data(), bytes.size());
-        if (count > 0)
+        if (count > 0) {
             bytes = bytes.subspan(static_cast<std::size_t>(count));
-        else if (count == 0 || errno != EINTR)
+        } else if (count == 0 || errno != EINTR) {
             m_error = errno == ENOSPC || errno == EDQUOT ? MediaFull : MassStorageError;
+        }
     }
 }
 

@@ -20,8 +20,9 @@ constexpr std::chrono::milliseconds LookInterval{200};
 
 Applies kindOf(const ModelInfo &model)
 {
-    if (model.analyzer)
+    if (model.analyzer) {
         return ToAnalyzer;
+    }
     return model.coder ? ToGenerator : ToPlainGenerator;
 }
 
@@ -34,8 +35,9 @@ Instrument::Instrument(InstrumentSetup setup)
 {
     for (const std::span<const Command> commands :
          {commonCommands(), systemCommands(), memoryCommands(), generatorCommands(),
-          analyzerCommands(), settingCommands()})
+          analyzerCommands(), settingCommands()}) {
         m_commands.add(commands, kindOf(model()));
+    }
 }
 
 Instrument::~Instrument()
@@ -60,10 +62,12 @@ bool Instrument::start(std::string &error)
         }
         m_temporaryFolder = folder;
     }
-    if (!memory.open(folder, error))
+    if (!memory.open(folder, error)) {
         return false;
-    for (std::int64_t i = faults().number("queue").value_or(0); i > 0; --i)
+    }
+    for (std::int64_t i = faults().number("queue").value_or(0); i > 0; --i) {
         reportError(SystemError);
+    }
     return true;
 }
 
@@ -135,12 +139,15 @@ TimePoint Instrument::operationEnd() const
 void Instrument::refresh(TimePoint now)
 {
     unsigned condition = 0;
-    if (arb.isLoading(now))
+    if (arb.isLoading(now)) {
         condition |= Settling;
-    if (analyzer.isSweeping(now))
+    }
+    if (analyzer.isSweeping(now)) {
         condition |= Sweeping;
-    if (analyzer.isWaiting())
+    }
+    if (analyzer.isWaiting()) {
         condition |= WaitingForTrigger;
+    }
     status.operation.setCondition(condition);
     if (status.completionPending && !isOperationPending(now)) {
         status.completionPending = false;
@@ -179,8 +186,9 @@ void Instrument::releaseAccess()
 
 std::string Instrument::identification() const
 {
-    if (m_setup.faults.has("idn"))
+    if (m_setup.faults.has("idn")) {
         return m_setup.faults.text("idn");
+    }
     // Generators put the part number in front of the serial number, analyzers a variant behind it.
     std::string part(model().name);
     std::erase(part, '-');
@@ -194,18 +202,23 @@ Instrument::Wait Instrument::waitFor(std::unique_lock<std::mutex> &lock, Link &l
                                      const Condition &condition)
 {
     for (;;) {
-        if (m_stopped)
+        if (m_stopped) {
             return Wait::Stopped;
-        if (link.takeAbort())
+        }
+        if (link.takeAbort()) {
             return Wait::Aborted;
+        }
         const TimePoint now = Clock::now();
         TimePoint wake = std::min(deadline, now + LookInterval);
-        if (condition(now, wake))
+        if (condition(now, wake)) {
             return Wait::Ready;
-        if (now >= deadline)
+        }
+        if (now >= deadline) {
             return Wait::TimedOut;
-        if (peerGone())
+        }
+        if (peerGone()) {
             return Wait::PeerGone;
+        }
         m_changed.wait_until(lock, wake);
     }
 }
@@ -216,8 +229,9 @@ Instrument::Wait Instrument::waitForOutput(std::unique_lock<std::mutex> &lock, L
 {
     return waitFor(lock, link, deadline, peerGone, [&](TimePoint now, TimePoint &wake) {
         TimePoint ready = link.output().readyTime();
-        if (link.output().awaitsOperation())
+        if (link.output().awaitsOperation()) {
             ready = std::max(ready, operationEnd());
+        }
         wake = std::min(wake, ready);
         return now >= ready;
     });

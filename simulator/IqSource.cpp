@@ -24,8 +24,9 @@ std::uint64_t mix(std::uint64_t value)
 std::uint32_t littleEndian(float value)
 {
     const auto bits = std::bit_cast<std::uint32_t>(value);
-    if constexpr (std::endian::native == std::endian::little)
+    if constexpr (std::endian::native == std::endian::little) {
         return bits;
+    }
     return __builtin_bswap32(bits);
 }
 

@@ -23,8 +23,9 @@ std::string blockHead(std::uint64_t size)
     constexpr std::size_t MaxDigits = 9;
     const std::string count = std::to_string(size);
     std::string head = "#";
-    if (count.size() > MaxDigits)
+    if (count.size() > MaxDigits) {
         return head.append("(").append(count).append(")");
+    }
     return head.append(std::to_string(count.size())).append(count);
 }
 
@@ -56,17 +57,20 @@ std::size_t Link::feed(std::span<const char> bytes, bool end)
 OutputQueue::ReadResult Link::read(std::span<char> buffer, std::optional<char> termChar)
 {
     const OutputQueue::ReadResult result = m_output.read(buffer, termChar);
-    if (result.blockBytes > 0)
+    if (result.blockBytes > 0) {
         countBlockBytes(result.blockBytes);
-    if (result.messageEnd)
+    }
+    if (result.messageEnd) {
         m_blockBytes = 0;
+    }
     return result;
 }
 
 void Link::noteUnterminated()
 {
-    if (!std::exchange(m_silenceWanted, false) && m_output.isEmpty())
+    if (!std::exchange(m_silenceWanted, false) && m_output.isEmpty()) {
         m_instrument.reportError(QueryUnterminated);
+    }
 }
 
 void Link::clear()
@@ -102,8 +106,9 @@ void Link::respondBlock(std::unique_ptr<DataSource> source, std::uint64_t size)
         sent -= std::min(missing, size);
         m_withoutTerminator = true;
     }
-    if (faults.has("no-terminator"))
+    if (faults.has("no-terminator")) {
         m_withoutTerminator = true;
+    }
     m_response.push_back({.text = {}, .source = std::move(source), .size = sent, .isBlock = true});
     m_blockBytes = 0;
     countBlockBytes(0);
@@ -111,8 +116,9 @@ void Link::respondBlock(std::unique_ptr<DataSource> source, std::uint64_t size)
 
 void Link::beginMessage()
 {
-    if (std::exchange(m_inMessage, true))
+    if (std::exchange(m_inMessage, true)) {
         return;
+    }
     m_silenceWanted = false;
     // IEEE 488.2, 6.3.2.3: a controller that sends a new message instead of reading the answer to
     // the last one loses that answer. Raw sockets have no such rule.
@@ -124,8 +130,9 @@ void Link::beginMessage()
 
 void Link::beginAnswer()
 {
-    if (!m_response.empty())
+    if (!m_response.empty()) {
         m_response.push_back({.text = ";"});
+    }
     m_held = m_held && m_instrument.isOperationPending(Clock::now());
     m_awaitsOperation = m_awaitsOperation || m_held;
 }
@@ -134,8 +141,9 @@ void Link::countBlockBytes(std::uint64_t count)
 {
     m_blockBytes += count;
     const std::optional<std::int64_t> limit = m_instrument.faults().number("drop-after");
-    if (limit && m_blockBytes >= static_cast<std::uint64_t>(*limit))
+    if (limit && m_blockBytes >= static_cast<std::uint64_t>(*limit)) {
         m_dropDue = true;
+    }
 }
 
 // SCPI-99, volume 1, 6.2.4: a header without a colon in front continues where the last one of the
@@ -143,11 +151,13 @@ void Link::countBlockBytes(std::uint64_t count)
 std::vector<std::string> Link::fullHeader(bool common, bool absolute,
                                           const std::vector<std::string> &nodes)
 {
-    if (common)
+    if (common) {
         return nodes;
+    }
     std::vector<std::string> full;
-    if (!absolute)
+    if (!absolute) {
         full = m_path;
+    }
     full.insert(full.end(), nodes.begin(), nodes.end());
     m_path.assign(full.begin(), std::prev(full.end()));
     return full;
@@ -156,8 +166,9 @@ std::vector<std::string> Link::fullHeader(bool common, bool absolute,
 void Link::onUnit(std::string_view text, bool hasBlock)
 {
     beginMessage();
-    if (!hasBlock)
+    if (!hasBlock) {
         Log::conversation(m_name, ">>", text);
+    }
     ProgramUnit unit;
     if (const int error = unit.parse(text); error != NoError) {
         m_instrument.reportError(error);
@@ -173,20 +184,23 @@ void Link::onUnit(std::string_view text, bool hasBlock)
 void Link::onBlockBegin(std::string_view text, std::optional<std::uint64_t> size)
 {
     beginMessage();
-    if (Log::isVerbose())
+    if (Log::isVerbose()) {
         Log::conversation(m_name, ">>", std::string(text) + sizeMark(size));
+    }
     ProgramUnit unit;
     m_hasTransfer = false;
     m_transferError = NoError;
     m_blockBytes = 0;
-    if (unit.parse(std::string(text) + '#') != NoError)
+    if (unit.parse(std::string(text) + '#') != NoError) {
         return;
+    }
     // The unit is resolved again when it is complete; the path must be the same then.
     const std::vector<std::string> path = m_path;
     unit.nodes = fullHeader(unit.common, unit.absolute, unit.nodes);
     m_path = path;
-    if (!m_instrument.takesFile(unit))
+    if (!m_instrument.takesFile(unit)) {
         return;
+    }
     m_hasTransfer = true;
     m_transferError = m_instrument.openTransfer(unit, m_writer);
     countBlockBytes(0);
@@ -194,8 +208,9 @@ void Link::onBlockBegin(std::string_view text, std::optional<std::uint64_t> size
 
 void Link::onBlockData(std::span<const char> bytes)
 {
-    if (!m_writer || m_dropDue)
+    if (!m_writer || m_dropDue) {
         return;
+    }
     const std::optional<std::int64_t> limit = m_instrument.faults().number("drop-after");
     if (limit) {
         const auto most = static_cast<std::uint64_t>(*limit);
@@ -211,8 +226,9 @@ void Link::onBlockEnd(bool complete)
     if (m_writer) {
         const int error = m_writer->finish();
         m_writer.reset();
-        if (complete)
+        if (complete) {
             m_transferError = error;
+        }
     }
     m_blockBytes = 0;
 }
@@ -226,14 +242,16 @@ void Link::onError(int number)
 void Link::onMessageEnd()
 {
     if (!m_response.empty()) {
-        if (m_withoutTerminator)
+        if (m_withoutTerminator) {
             m_silenceWanted = true;
-        else
+        } else {
             m_response.push_back({.text = "\n"});
+        }
         if (Log::isVerbose()) {
             std::string answer;
-            for (const OutputSegment &segment : m_response)
+            for (const OutputSegment &segment : m_response) {
                 answer += segment.isBlock ? sizeMark(segment.size) : segment.text;
+            }
             Log::conversation(m_name, "<<", answer);
         }
         const auto delay =

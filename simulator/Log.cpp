@@ -30,14 +30,17 @@ bool Log::isVerbose()
 void Log::conversation(std::string_view who, std::string_view arrow, std::string_view text)
 {
     constexpr std::size_t MaxLength = 500;
-    if (!verboseFlag)
+    if (!verboseFlag) {
         return;
+    }
     std::string line;
     line.append(who).append(" ").append(arrow).append(" ");
-    for (const char byte : text.substr(0, MaxLength))
+    for (const char byte : text.substr(0, MaxLength)) {
         line += static_cast<unsigned char>(byte) < ' ' || byte == '\x7F' ? '.' : byte;
-    if (text.size() > MaxLength)
+    }
+    if (text.size() > MaxLength) {
         line += "...";
+    }
     writeLine(line + '\n');
 }
 

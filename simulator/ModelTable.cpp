@@ -94,8 +94,9 @@ std::string modelNames()
 {
     std::string names;
     for (const ModelInfo &model : Table) {
-        if (!names.empty())
+        if (!names.empty()) {
             names += ", ";
+        }
         names += model.name;
     }
     return names;
@@ -110,8 +111,9 @@ std::vector<std::string> rootFolders(const ModelInfo &model, std::string_view op
         folders.emplace_back(rest.substr(0, length));
         rest.remove_prefix(std::min(length + 1, rest.size()));
     }
-    if (!model.diskOption.empty() && options.find(model.diskOption) != std::string_view::npos)
+    if (!model.diskOption.empty() && options.find(model.diskOption) != std::string_view::npos) {
         folders.emplace_back("/hdd");
+    }
     return folders;
 }
 

@@ -27,8 +27,9 @@ std::optional<std::uint64_t> wholeNumber(std::string_view text)
 {
     std::uint64_t value = 0;
     const auto result = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (text.empty() || result.ec != std::errc() || result.ptr != text.data() + text.size())
+    if (text.empty() || result.ec != std::errc() || result.ptr != text.data() + text.size()) {
         return std::nullopt;
+    }
     return value;
 }
 
@@ -62,8 +63,9 @@ std::optional<std::string> readFile(const std::string &name)
     std::string text(MaxConfigSize + 1, '\0');
     file.read(text.data(), static_cast<std::streamsize>(text.size()));
     text.resize(static_cast<std::size_t>(file.gcount()));
-    if (file.bad() || (text.empty() && !file.eof()) || text.size() > MaxConfigSize)
+    if (file.bad() || (text.empty() && !file.eof()) || text.size() > MaxConfigSize) {
         return std::nullopt;
+    }
     return text;
 }
 
@@ -79,12 +81,14 @@ bool loadConfig(const std::string &name, Options &options, std::string &error)
         return false;
     };
     const auto entries = parseConfig(*text, error);
-    if (!entries)
+    if (!entries) {
         return fail();
+    }
     const std::string folder = std::filesystem::path(name).parent_path().string();
     auto instruments = instrumentsOf(*entries, folder, error);
-    if (!instruments)
+    if (!instruments) {
         return fail();
+    }
     options.instruments = std::move(*instruments);
     return true;
 }
@@ -103,25 +107,31 @@ std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::st
 
     const std::string model = raw.model.value_or(std::string(DefaultModel));
     setup.model = findModel(model);
-    if (setup.model == nullptr)
+    if (setup.model == nullptr) {
         return refuse("model", model, "there are " + modelNames());
+    }
     setup.serial = raw.serial.value_or(std::string(DefaultSerial));
-    if (!isIdentityField(setup.serial))
+    if (!isIdentityField(setup.serial)) {
         return refuse("serial", setup.serial, "it needs characters other than blank, ',' and '/'");
+    }
     setup.firmware = raw.firmware.value_or(std::string(DefaultFirmware));
-    if (!isIdentityField(setup.firmware))
+    if (!isIdentityField(setup.firmware)) {
         return refuse("firmware", setup.firmware,
                       "it needs characters other than blank, ',' and '/'");
+    }
     setup.options = raw.options.value_or(std::string(setup.model->defaultOptions));
-    if (!isPrintable(setup.options))
+    if (!isPrintable(setup.options)) {
         return refuse("options", setup.options, "control characters are not allowed");
+    }
     setup.root = raw.root.value_or(std::string());
-    if (raw.root && raw.root->empty())
+    if (raw.root && raw.root->empty()) {
         return refuse("root", *raw.root, "it needs the name of a folder");
+    }
     if (raw.seed) {
         const auto seed = wholeNumber(*raw.seed);
-        if (!seed)
+        if (!seed) {
             return refuse("seed", *raw.seed, "a whole number from 0 on is needed");
+        }
         setup.seed = *seed;
     }
     for (const std::string &fault : raw.faults) {
@@ -133,22 +143,27 @@ std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::st
 
     if (!raw.gateway) {
         place.address = raw.address.value_or(std::string(DefaultAddress));
-        if (!isLoopback(place.address))
+        if (!isLoopback(place.address)) {
             return refuse("address", place.address, "it has to be one of 127.0.0.0/8");
-        if (raw.gpib)
+        }
+        if (raw.gpib) {
             return refuse("gpib", *raw.gpib, "it goes with a gateway only");
+        }
         return place;
     }
-    if (raw.address)
+    if (raw.address) {
         return refuse("address", *raw.address, "it does not go with a gateway");
+    }
     const auto port = wholeNumber(*raw.gateway);
-    if (!port || *port > MaxPort || (*port != 0 && *port < FirstFreePort))
+    if (!port || *port > MaxPort || (*port != 0 && *port < FirstFreePort)) {
         return refuse("gateway", *raw.gateway,
                       "a port from 1025 to 65535, or 0 for any free one, is needed");
+    }
     const auto gpib = wholeNumber(raw.gpib.value_or(std::string()));
-    if (!gpib || *gpib > MaxGpib)
+    if (!gpib || *gpib > MaxGpib) {
         return refuse("gpib", raw.gpib.value_or(std::string()),
                       "a gateway's instrument needs an address from 0 to 30");
+    }
     place.gateway = static_cast<std::uint16_t>(*port);
     place.gpib = static_cast<unsigned>(*gpib);
     return place;
@@ -200,10 +215,11 @@ std::optional<Options> parseOptions(std::span<const std::string_view> arguments,
             return std::nullopt;
         }
         single = single || name != "--config";
-        if (known == switches.end())
+        if (known == switches.end()) {
             raw.faults.push_back(std::move(value));
-        else
+        } else {
             *known->second = std::move(value);
+        }
     }
 
     if (config) {
@@ -211,13 +227,15 @@ std::optional<Options> parseOptions(std::span<const std::string_view> arguments,
             error = "--config takes no switches of a single instrument beside it";
             return std::nullopt;
         }
-        if (!loadConfig(*config, options, error))
+        if (!loadConfig(*config, options, error)) {
             return std::nullopt;
+        }
         return options;
     }
     std::optional<InstrumentPlace> place = checkInstrument(raw, error);
-    if (!place)
+    if (!place) {
         return std::nullopt;
+    }
     options.instruments.push_back(std::move(*place));
     return options;
 }

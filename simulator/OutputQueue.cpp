@@ -13,10 +13,12 @@ std::size_t FileSource::read(std::uint64_t offset, std::span<char> buffer)
     while (count < buffer.size()) {
         const ssize_t got = ::pread(m_fd.get(), buffer.data() + count, buffer.size() - count,
                                     static_cast<off_t>(offset + count));
-        if (got < 0 && errno == EINTR)
+        if (got < 0 && errno == EINTR) {
             continue;
-        if (got <= 0)
+        }
+        if (got <= 0) {
             break;
+        }
         count += static_cast<std::size_t>(got);
     }
     return count;
@@ -25,10 +27,12 @@ std::size_t FileSource::read(std::uint64_t offset, std::span<char> buffer)
 void OutputQueue::push(std::deque<OutputSegment> segments, TimePoint notBefore,
                        bool awaitsOperation)
 {
-    if (segments.empty())
+    if (segments.empty()) {
         return;
-    if (m_messages.empty())
+    }
+    if (m_messages.empty()) {
         m_offset = 0;
+    }
     m_messages.push_back({std::move(segments), notBefore, awaitsOperation});
 }
 
@@ -45,8 +49,9 @@ bool OutputQueue::awaitsOperation() const
 OutputQueue::ReadResult OutputQueue::read(std::span<char> buffer, std::optional<char> termChar)
 {
     ReadResult result;
-    if (m_messages.empty())
+    if (m_messages.empty()) {
         return result;
+    }
     std::deque<OutputSegment> &segments = m_messages.front().segments;
     while (result.count < buffer.size() && !segments.empty()) {
         OutputSegment &segment = segments.front();
@@ -73,15 +78,17 @@ OutputQueue::ReadResult OutputQueue::read(std::span<char> buffer, std::optional<
         }
         result.count += count;
         m_offset += count;
-        if (segment.isBlock)
+        if (segment.isBlock) {
             result.blockBytes += count;
+        }
         // A file that shrank since it was opened ends its segment; nobody waits for the rest.
         if (m_offset == size || cut) {
             segments.pop_front();
             m_offset = 0;
         }
-        if (result.termChar)
+        if (result.termChar) {
             break;
+        }
     }
     if (segments.empty()) {
         m_messages.pop_front();

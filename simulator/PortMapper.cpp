@@ -48,8 +48,9 @@ bool PortMapper::open(const std::string &address, std::string &error)
         return false;
     }
     m_udp = bindUdp(address, Port, error);
-    if (!m_udp.isValid())
+    if (!m_udp.isValid()) {
         error = "UDP: " + error;
+    }
     return m_udp.isValid();
 }
 
@@ -85,23 +86,28 @@ RpcStatus PortMapper::call(std::uint32_t procedure, XdrReader &arguments, XdrWri
         const std::uint32_t version = arguments.number();
         const std::uint32_t protocol = arguments.number();
         (void)arguments.number();
-        if (!arguments.isGood())
+        if (!arguments.isGood()) {
             return RpcStatus::GarbageArguments;
+        }
         std::uint32_t port = 0;
         for (const Mapping &mapping : m_mappings) {
-            if (mapping.program == program && mapping.version == version && protocol == ProtocolTcp)
+            if (mapping.program == program && mapping.version == version &&
+                protocol == ProtocolTcp) {
                 port = mapping.port;
+            }
         }
-        if (program == Program)
+        if (program == Program) {
             port = Port;
+        }
         results.number(port);
         return RpcStatus::Success;
     }
     case Dump:
         putMapping(results, Program, Version, ProtocolTcp, Port);
         putMapping(results, Program, Version, ProtocolUdp, Port);
-        for (const Mapping &mapping : m_mappings)
+        for (const Mapping &mapping : m_mappings) {
             putMapping(results, mapping.program, mapping.version, ProtocolTcp, mapping.port);
+        }
         results.number(0);
         return RpcStatus::Success;
     default:
@@ -130,16 +136,19 @@ void PortMapper::serveUdp() const
     XdrWriter reply;
     for (;;) {
         std::array<pollfd, 2> events{{{m_wake.get(), POLLIN, 0}, {m_udp.get(), POLLIN, 0}}};
-        if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR)
+        if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR) {
             return;
-        if (events[0].revents != 0)
+        }
+        if (events[0].revents != 0) {
             return;
+        }
         sockaddr_in peer{};
         socklen_t length = sizeof(peer);
         const ssize_t count = ::recvfrom(m_udp.get(), buffer.data(), buffer.size(), MSG_DONTWAIT,
                                          reinterpret_cast<sockaddr *>(&peer), &length);
-        if (count <= 0)
+        if (count <= 0) {
             continue;
+        }
         const std::span<const char> call = std::span(buffer).first(static_cast<std::size_t>(count));
         if (answerRpcCall(call, programs, reply)) {
             const std::span<const char> bytes = reply.bytes().subspan(RecordMarkSize);

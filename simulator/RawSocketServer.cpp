@@ -22,16 +22,19 @@ bool sendAnswers(Instrument &instrument, Link &link, int fd, std::vector<char> &
         OutputQueue::ReadResult result;
         {
             std::unique_lock lock(instrument.mutex());
-            if (link.output().isEmpty())
+            if (link.output().isEmpty()) {
                 return !link.isDropDue();
+            }
             const Instrument::Wait waited = instrument.waitForOutput(
                 lock, link, TimePoint::max(), [fd] { return isPeerGone(fd); });
-            if (waited != Instrument::Wait::Ready)
+            if (waited != Instrument::Wait::Ready) {
                 return false;
+            }
             result = link.read(buffer, std::nullopt);
         }
-        if (!sendAll(fd, std::span(buffer).first(result.count)) || link.isDropDue())
+        if (!sendAll(fd, std::span(buffer).first(result.count)) || link.isDropDue()) {
             return false;
+        }
     }
 }
 
@@ -42,18 +45,21 @@ void serve(Instrument &instrument, const std::string &label, int fd)
     std::vector<char> output(BufferSize);
     for (;;) {
         const ssize_t count = ::recv(fd, input.data(), input.size(), 0);
-        if (count < 0 && errno == EINTR)
+        if (count < 0 && errno == EINTR) {
             continue;
-        if (count <= 0)
+        }
+        if (count <= 0) {
             return;
+        }
         std::span<const char> rest = std::span(input).first(static_cast<std::size_t>(count));
         while (!rest.empty()) {
             {
                 const std::lock_guard lock(instrument.mutex());
                 rest = rest.subspan(link.feed(rest, false));
             }
-            if (!sendAnswers(instrument, link, fd, output))
+            if (!sendAnswers(instrument, link, fd, output)) {
                 return;
+            }
         }
     }
 }

@@ -49,8 +49,9 @@ bool answerRpcCall(std::span<const char> call, std::span<const RpcProgram> progr
 {
     XdrReader reader(call);
     const std::uint32_t transaction = reader.number();
-    if (reader.number() != Call || !reader.isGood())
+    if (reader.number() != Call || !reader.isGood()) {
         return false;
+    }
     beginReply(reply, transaction);
     if (reader.number() != RpcVersion) {
         reply.number(Denied);
@@ -66,11 +67,13 @@ bool answerRpcCall(std::span<const char> call, std::span<const RpcProgram> progr
     // Credential and verifier: any are welcome, none are looked at.
     for (int i = 0; i < 2; ++i) {
         (void)reader.number();
-        if (reader.opaque().size() > MaxCredentialSize)
+        if (reader.opaque().size() > MaxCredentialSize) {
             return false;
+        }
     }
-    if (!reader.isGood())
+    if (!reader.isGood()) {
         return false;
+    }
 
     reply.number(Accepted);
     reply.number(0); // verifier AUTH_NONE
@@ -83,8 +86,9 @@ bool answerRpcCall(std::span<const char> call, std::span<const RpcProgram> progr
     });
     RpcStatus status = RpcStatus::Success;
     if (found != programs.end()) {
-        if (procedure != NullProcedure)
+        if (procedure != NullProcedure) {
             status = found->handler(procedure, reader, reply);
+        }
     } else {
         const auto other = std::find_if(programs.begin(), programs.end(),
                                         [&](const RpcProgram &p) { return p.number == number; });
@@ -96,8 +100,9 @@ bool answerRpcCall(std::span<const char> call, std::span<const RpcProgram> progr
         }
     }
     if (status == RpcStatus::ProcedureUnavailable || status == RpcStatus::GarbageArguments ||
-        status == RpcStatus::SystemError)
+        status == RpcStatus::SystemError) {
         reply.truncate(statusPlace + RecordMarkSize);
+    }
     reply.patch(statusPlace, static_cast<std::uint32_t>(status));
     finishReply(reply);
     return true;
@@ -115,57 +120,68 @@ std::optional<std::span<const char>> RecordReader::next()
     m_record.clear();
     m_inRecord = false;
     for (;;) {
-        if (!fill(RecordMarkSize))
+        if (!fill(RecordMarkSize)) {
             return std::nullopt;
+        }
         m_inRecord = true;
         const std::span<const char> head = std::span(m_buffer).subspan(m_begin, RecordMarkSize);
         const std::uint32_t mark = XdrReader(head).number();
         const bool last = (mark & LastFragment) != 0;
         const std::size_t size = mark & ~LastFragment;
         // An empty fragment that is not the last would let a peer keep a record open for ever.
-        if (size > m_maxRecord - m_record.size() || (size == 0 && !last))
+        if (size > m_maxRecord - m_record.size() || (size == 0 && !last)) {
             return std::nullopt;
+        }
         m_begin += RecordMarkSize;
-        if (!fill(size))
+        if (!fill(size)) {
             return std::nullopt;
+        }
         const std::span<const char> fragment = std::span(m_buffer).subspan(m_begin, size);
         m_begin += size;
-        if (last && m_record.empty())
+        if (last && m_record.empty()) {
             return fragment;
+        }
         m_record.insert(m_record.end(), fragment.begin(), fragment.end());
-        if (last)
+        if (last) {
             return m_record;
+        }
     }
 }
 
 // Makes that many bytes available behind m_begin.
 bool RecordReader::fill(std::size_t size)
 {
-    if (m_begin == m_end)
+    if (m_begin == m_end) {
         m_begin = m_end = 0;
+    }
     while (m_end - m_begin < size) {
         if (m_buffer.size() - m_begin < size) {
             std::memmove(m_buffer.data(), m_buffer.data() + m_begin, m_end - m_begin);
             m_end -= m_begin;
             m_begin = 0;
             // Grows with what really came, not with what the peer announces.
-            if (m_buffer.size() < size && m_end == m_buffer.size())
+            if (m_buffer.size() < size && m_end == m_buffer.size()) {
                 m_buffer.resize(std::min(size, 2 * m_buffer.size()));
+            }
         }
         const bool started = m_inRecord || m_end > m_begin;
         if (started) {
             pollfd event{m_fd, POLLIN, 0};
             const int ready = ::poll(&event, 1, RecordTimeoutMilliseconds);
-            if (ready < 0 && errno == EINTR)
+            if (ready < 0 && errno == EINTR) {
                 continue;
-            if (ready <= 0)
+            }
+            if (ready <= 0) {
                 return false;
+            }
         }
         const ssize_t count = ::recv(m_fd, m_buffer.data() + m_end, m_buffer.size() - m_end, 0);
-        if (count < 0 && errno == EINTR)
+        if (count < 0 && errno == EINTR) {
             continue;
-        if (count <= 0)
+        }
+        if (count <= 0) {
             return false;
+        }
         m_end += static_cast<std::size_t>(count);
     }
     return true;
@@ -177,10 +193,12 @@ void serveRpcStream(int fd, std::size_t maxRecord, std::span<const RpcProgram> p
     RecordReader reader(fd, maxRecord);
     XdrWriter reply;
     while (const std::optional<std::span<const char>> call = reader.next()) {
-        if (!answerRpcCall(*call, programs, reply) || isDropped())
+        if (!answerRpcCall(*call, programs, reply) || isDropped()) {
             return;
-        if (!sendAll(fd, reply.bytes()))
+        }
+        if (!sendAll(fd, reply.bytes())) {
             return;
+        }
     }
 }
 

@@ -33,18 +33,21 @@ std::size_t ScpiParser::feed(std::span<const char> bytes, bool end)
         case State::IndefiniteBlock: {
             const std::size_t taken = takeIndefinite(rest, end);
             used += taken;
-            if (m_state == State::Text)
+            if (m_state == State::Text) {
                 return used;
+            }
             break;
         }
         default:
             ++used;
-            if (takeTextByte(rest.front()))
+            if (takeTextByte(rest.front())) {
                 return used;
+            }
         }
     }
-    if (end && m_started)
+    if (end && m_started) {
         endMessage();
+    }
     return used;
 }
 
@@ -71,8 +74,9 @@ bool ScpiParser::takeTextByte(char byte)
         break;
     case State::Quoted:
         append(byte);
-        if (byte == m_quote && m_state == State::Quoted)
+        if (byte == m_quote && m_state == State::Quoted) {
             m_state = State::Text;
+        }
         break;
     case State::Hash:
         takeHashByte(byte);
@@ -90,10 +94,11 @@ bool ScpiParser::takeTextByte(char byte)
 void ScpiParser::takeHashByte(char byte)
 {
     if (byte == '0') {
-        if (m_transportHasEnd)
+        if (m_transportHasEnd) {
             beginBlock(std::nullopt);
-        else
+        } else {
             fail(InvalidBlock);
+        }
     } else if (isDigit(byte)) {
         m_lengthDigits = static_cast<unsigned>(byte - '0');
         m_blockSize = 0;
@@ -117,10 +122,11 @@ void ScpiParser::takeLengthByte(char byte)
     const bool bracket = m_state == State::LengthBracket;
     if (isDigit(byte)) {
         m_blockSize = m_blockSize * 10 + static_cast<unsigned>(byte - '0');
-        if (bracket && ++m_bracketDigits > MaxBracketDigits)
+        if (bracket && ++m_bracketDigits > MaxBracketDigits) {
             fail(InvalidBlock);
-        else if (!bracket && --m_lengthDigits == 0)
+        } else if (!bracket && --m_lengthDigits == 0) {
             beginBlock(m_blockSize);
+        }
     } else if (bracket && byte == ')' && m_bracketDigits > 0) {
         beginBlock(m_blockSize);
     } else {
@@ -133,8 +139,9 @@ std::size_t ScpiParser::takeBlock(std::span<const char> bytes)
     const auto taken = static_cast<std::size_t>(std::min<std::uint64_t>(m_blockSize, bytes.size()));
     m_handler.onBlockData(bytes.first(taken));
     m_blockSize -= taken;
-    if (m_blockSize == 0)
+    if (m_blockSize == 0) {
         endBlock(true);
+    }
     return taken;
 }
 
@@ -142,12 +149,14 @@ std::size_t ScpiParser::takeBlock(std::span<const char> bytes)
 // IEEE 488.2 puts there, and no data.
 std::size_t ScpiParser::takeIndefinite(std::span<const char> bytes, bool end)
 {
-    if (m_heldLineFeed)
+    if (m_heldLineFeed) {
         m_handler.onBlockData(std::span<const char>("\n", 1));
+    }
     m_heldLineFeed = bytes.back() == '\n';
     m_handler.onBlockData(bytes.first(bytes.size() - (m_heldLineFeed ? 1 : 0)));
-    if (end)
+    if (end) {
         endMessage();
+    }
     return bytes.size();
 }
 
@@ -157,10 +166,12 @@ void ScpiParser::append(char byte)
         fail(InputBufferOverrun);
         return;
     }
-    if (m_unit.empty() && isWhite(byte))
+    if (m_unit.empty() && isWhite(byte)) {
         return;
-    if (isWhite(byte) && m_state == State::Text)
+    }
+    if (isWhite(byte) && m_state == State::Text) {
         m_inParameters = true;
+    }
     m_unit.push_back(byte);
 }
 
@@ -181,8 +192,9 @@ void ScpiParser::beginBlock(std::optional<std::uint64_t> size)
     m_heldLineFeed = false;
     m_blockSize = size.value_or(0);
     m_state = size ? State::Block : State::IndefiniteBlock;
-    if (size && *size == 0)
+    if (size && *size == 0) {
         endBlock(true);
+    }
 }
 
 void ScpiParser::endBlock(bool complete)
@@ -194,8 +206,9 @@ void ScpiParser::endBlock(bool complete)
 
 void ScpiParser::endUnit()
 {
-    if (!m_unit.empty())
+    if (!m_unit.empty()) {
         m_handler.onUnit(m_unit, m_hasBlock);
+    }
     m_unit.clear();
     m_hasBlock = false;
     m_inParameters = false;
@@ -224,8 +237,9 @@ void ScpiParser::endMessage()
     case State::Skip:
         break;
     }
-    if (m_state == State::Text)
+    if (m_state == State::Text) {
         endUnit();
+    }
     m_state = State::Text;
     m_started = false;
     m_inParameters = false;
@@ -234,8 +248,9 @@ void ScpiParser::endMessage()
 
 void ScpiParser::clear()
 {
-    if (m_blockOpen)
+    if (m_blockOpen) {
         endBlock(false);
+    }
     m_unit.clear();
     m_state = State::Text;
     m_hasBlock = false;

@@ -25,15 +25,18 @@ bool Simulator::start(const std::vector<InstrumentPlace> &places, std::string &e
     for (const InstrumentPlace &place : places) {
         m_instruments.push_back(std::make_unique<Instrument>(place.instrument));
         Instrument &instrument = *m_instruments.back();
-        if (!instrument.start(error))
+        if (!instrument.start(error)) {
             return false;
+        }
         const bool added = place.gateway ? addToGateway(place, instrument, error)
                                          : addHost(place.address, instrument, error);
-        if (!added)
+        if (!added) {
             return false;
+        }
     }
-    for (const auto &[port, gateway] : m_gateways)
+    for (const auto &[port, gateway] : m_gateways) {
         gateway->start("gateway " + std::to_string(gateway->corePort()));
+    }
     return true;
 }
 
@@ -63,8 +66,9 @@ bool Simulator::addHost(const std::string &address, Instrument &instrument, std:
         host.mapper.start({{Vxi11CoreProgram, Vxi11Version, host.vxi11.corePort()},
                            {Vxi11AbortProgram, Vxi11Version, host.vxi11.abortPort()}});
     }
-    if (!instrument.faults().has("no-raw"))
+    if (!instrument.faults().has("no-raw")) {
         host.raw.start(instrument, address + ":" + std::to_string(RawSocketServer::Port));
+    }
     m_readyLines.push_back("ready " + address);
     return true;
 }
@@ -90,15 +94,17 @@ bool Simulator::addToGateway(const InstrumentPlace &place, Instrument &instrumen
 
 void Simulator::stop()
 {
-    for (const auto &instrument : m_instruments)
+    for (const auto &instrument : m_instruments) {
         instrument->stop();
+    }
     for (const auto &host : m_hosts) {
         host->mapper.stop();
         host->vxi11.stop();
         host->raw.stop();
     }
-    for (const auto &[port, gateway] : m_gateways)
+    for (const auto &[port, gateway] : m_gateways) {
         gateway->stop();
+    }
     m_hosts.clear();
     m_gateways.clear();
     m_instruments.clear();

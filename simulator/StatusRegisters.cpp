@@ -28,31 +28,38 @@ void StatusGroup::preset()
 void StatusRegisters::noteError(int number)
 {
     // SCPI-99, volume 2, 21.8: each class of errors has its bit.
-    if (number <= -400 && number > -500)
+    if (number <= -400 && number > -500) {
         events |= QueryError;
-    else if (number <= -200 && number > -300)
+    } else if (number <= -200 && number > -300) {
         events |= ExecutionErrorBit;
-    else if (number <= -100 && number > -200)
+    } else if (number <= -100 && number > -200) {
         events |= CommandErrorBit;
-    else
+    } else {
         events |= DeviceError;
+    }
 }
 
 unsigned StatusRegisters::statusByte(bool errorAvailable, bool messageAvailable) const
 {
     unsigned status = 0;
-    if (errorAvailable)
+    if (errorAvailable) {
         status |= ErrorAvailable;
-    if (messageAvailable)
+    }
+    if (messageAvailable) {
         status |= MessageAvailable;
-    if (questionable.summary())
+    }
+    if (questionable.summary()) {
         status |= QuestionableSummary;
-    if (operation.summary())
+    }
+    if (operation.summary()) {
         status |= OperationSummary;
-    if ((events & eventEnable) != 0)
+    }
+    if ((events & eventEnable) != 0) {
         status |= EventSummary;
-    if ((status & serviceEnable) != 0)
+    }
+    if ((status & serviceEnable) != 0) {
         status |= MasterSummary;
+    }
     return status;
 }
 

@@ -50,8 +50,9 @@ void TcpServer::stop()
     m_listener.reset();
     {
         const std::lock_guard lock(m_mutex);
-        for (const Connection &connection : m_connections)
+        for (const Connection &connection : m_connections) {
             ::shutdown(connection.fd.get(), SHUT_RDWR);
+        }
     }
     join(true);
 }
@@ -67,30 +68,35 @@ void TcpServer::accept()
     constexpr int RetryMilliseconds = 50;
     for (;;) {
         std::array<pollfd, 2> events{{{m_wake.get(), POLLIN, 0}, {m_listener.get(), POLLIN, 0}}};
-        if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR)
+        if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR) {
             return;
-        if (m_stopping)
+        }
+        if (m_stopping) {
             return;
+        }
         if (events[0].revents != 0) {
             std::uint64_t count = 0;
             (void)!::read(m_wake.get(), &count, sizeof(count));
             join(false);
         }
-        if (events[1].revents == 0)
+        if (events[1].revents == 0) {
             continue;
+        }
         UniqueFd fd(::accept4(m_listener.get(), nullptr, nullptr, SOCK_CLOEXEC));
         if (!fd.isValid()) {
             // Out of descriptors: the waiting connection would keep poll awake all the time.
-            if (errno == EMFILE || errno == ENFILE || errno == ENOMEM || errno == ENOBUFS)
+            if (errno == EMFILE || errno == ENFILE || errno == ENOMEM || errno == ENOBUFS) {
                 (void)::poll(events.data(), 1, RetryMilliseconds);
+            }
             continue;
         }
         const int on = 1;
         (void)::setsockopt(fd.get(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof(on));
         (void)::setsockopt(fd.get(), SOL_SOCKET, SO_KEEPALIVE, &on, sizeof(on));
         const std::lock_guard lock(m_mutex);
-        if (m_connections.size() >= MaxConnections)
+        if (m_connections.size() >= MaxConnections) {
             continue;
+        }
         Connection &connection = m_connections.emplace_back();
         connection.fd = std::move(fd);
         try {
@@ -119,13 +125,15 @@ void TcpServer::join(bool all)
         const std::lock_guard lock(m_mutex);
         for (auto it = m_connections.begin(); it != m_connections.end();) {
             const auto next = std::next(it);
-            if (all || it->finished)
+            if (all || it->finished) {
                 ended.splice(ended.end(), m_connections, it);
+            }
             it = next;
         }
     }
-    for (Connection &connection : ended)
+    for (Connection &connection : ended) {
         connection.thread.join();
+    }
 }
 
 } // namespace simulator

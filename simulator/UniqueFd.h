@@ -40,8 +40,9 @@ public:
 
     void reset()
     {
-        if (m_fd >= 0)
+        if (m_fd >= 0) {
             ::close(std::exchange(m_fd, -1));
+        }
     }
 
 private:

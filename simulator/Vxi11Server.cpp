@@ -63,8 +63,9 @@ Instrument *Vxi11Server::findDevice(std::string_view name) const
 std::uint32_t Vxi11Server::registerLink(const std::shared_ptr<Link> &link, Instrument &instrument)
 {
     const std::lock_guard lock(m_mutex);
-    if (m_links.size() >= MaxLinks)
+    if (m_links.size() >= MaxLinks) {
         return 0;
+    }
     // Link numbers are signed on the wire.
     do {
         m_lastLink = (m_lastLink + 1) & 0x7FFFFFFFU;
@@ -84,17 +85,20 @@ void Vxi11Server::serveAbort(int fd)
     const std::array programs{
         RpcProgram{Vxi11AbortProgram, Vxi11Version,
                    [this](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
-                       if (procedure != DeviceAbort)
+                       if (procedure != DeviceAbort) {
                            return RpcStatus::ProcedureUnavailable;
+                       }
                        const std::uint32_t id = arguments.number();
-                       if (!arguments.isGood())
+                       if (!arguments.isGood()) {
                            return RpcStatus::GarbageArguments;
+                       }
                        Entry entry;
                        {
                            const std::lock_guard lock(m_mutex);
                            const auto found = m_links.find(id);
-                           if (found != m_links.end())
+                           if (found != m_links.end()) {
                                entry = found->second;
+                           }
                        }
                        if (entry.link) {
                            // With the mutex held the waiting thread cannot be between its look and

@@ -56,8 +56,9 @@ TimePoint after(std::uint32_t milliseconds)
 
 Vxi11Session::~Vxi11Session()
 {
-    for (const auto &[id, device] : m_devices)
+    for (const auto &[id, device] : m_devices) {
         release(device, id);
+    }
 }
 
 RpcStatus Vxi11Session::call(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results)
@@ -129,8 +130,9 @@ void Vxi11Session::release(const Device &device, std::uint32_t id)
 {
     m_server.unregisterLink(id);
     const std::lock_guard lock(device.instrument->mutex());
-    if (device.instrument->access() == device.link.get())
+    if (device.instrument->access() == device.link.get()) {
         device.instrument->releaseAccess();
+    }
     device.link->clear();
 }
 
@@ -140,8 +142,9 @@ RpcStatus Vxi11Session::createLink(XdrReader &arguments, XdrWriter &results)
     const bool lockDevice = arguments.boolean();
     const std::uint32_t lockTimeoutMs = arguments.number();
     const std::string_view name = arguments.text();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     Vxi11Error error = Vxi11Error::None;
     std::uint32_t id = 0;
@@ -156,13 +159,15 @@ RpcStatus Vxi11Session::createLink(XdrReader &arguments, XdrWriter &results)
             if (lockDevice) {
                 std::unique_lock lock(instrument->mutex());
                 error = access(lock, device, WaitLock, lockTimeoutMs);
-                if (error == Vxi11Error::None)
+                if (error == Vxi11Error::None) {
                     instrument->setAccess(device.link.get());
+                }
             }
-            if (error == Vxi11Error::None)
+            if (error == Vxi11Error::None) {
                 m_devices[id] = device;
-            else
+            } else {
                 m_server.unregisterLink(id);
+            }
         }
     } else {
         error = Vxi11Error::NotAccessible;
@@ -181,8 +186,9 @@ RpcStatus Vxi11Session::write(XdrReader &arguments, XdrWriter &results)
     const std::uint32_t lockTimeoutMs = arguments.number();
     const std::uint32_t flags = arguments.number();
     const std::span<const char> data = arguments.opaque();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     Vxi11Error error = Vxi11Error::InvalidLink;
     std::size_t taken = 0;
@@ -210,8 +216,9 @@ RpcStatus Vxi11Session::read(XdrReader &arguments, XdrWriter &results)
     const std::uint32_t lockTimeoutMs = arguments.number();
     const std::uint32_t flags = arguments.number();
     const std::uint32_t termChar = arguments.number();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     const std::size_t errorPlace = results.size();
     results.number(0);
@@ -231,16 +238,20 @@ RpcStatus Vxi11Session::read(XdrReader &arguments, XdrWriter &results)
                 lock, link, after(ioTimeoutMs), [this] { return isPeerGone(m_fd); });
             if (waited == Instrument::Wait::Ready) {
                 std::optional<char> last;
-                if ((flags & TermCharSet) != 0)
+                if ((flags & TermCharSet) != 0) {
                     last = static_cast<char>(termChar & 0xFFU);
+                }
                 const OutputQueue::ReadResult result = link.read(buffer, last);
                 count = result.count;
-                if (count == requested)
+                if (count == requested) {
                     reason |= RequestCount;
-                if (result.termChar)
+                }
+                if (result.termChar) {
                     reason |= TermCharSeen;
-                if (result.messageEnd)
+                }
+                if (result.messageEnd) {
                     reason |= EndSeen;
+                }
             } else if (waited == Instrument::Wait::TimedOut) {
                 link.noteUnterminated();
                 error = Vxi11Error::Timeout;
@@ -266,8 +277,9 @@ RpcStatus Vxi11Session::generic(std::uint32_t procedure, XdrReader &arguments, X
     parameters.flags = arguments.number();
     parameters.lockTimeoutMs = arguments.number();
     parameters.ioTimeoutMs = arguments.number();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     Vxi11Error error = Vxi11Error::InvalidLink;
     unsigned statusByte = 0;
@@ -286,8 +298,9 @@ RpcStatus Vxi11Session::generic(std::uint32_t procedure, XdrReader &arguments, X
         }
     }
     putError(results, error);
-    if (procedure == DeviceReadStb)
+    if (procedure == DeviceReadStb) {
         results.number(statusByte);
+    }
     return RpcStatus::Success;
 }
 
@@ -296,8 +309,9 @@ RpcStatus Vxi11Session::lock(XdrReader &arguments, XdrWriter &results)
     const std::uint32_t id = arguments.number();
     const std::uint32_t flags = arguments.number();
     const std::uint32_t timeoutMs = arguments.number();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     Vxi11Error error = Vxi11Error::InvalidLink;
     if (Device *device = find(id)) {
@@ -306,8 +320,9 @@ RpcStatus Vxi11Session::lock(XdrReader &arguments, XdrWriter &results)
         error = device->instrument->access() == device->link.get()
                     ? Vxi11Error::Locked
                     : access(lock, *device, flags, timeoutMs);
-        if (error == Vxi11Error::None)
+        if (error == Vxi11Error::None) {
             device->instrument->setAccess(device->link.get());
+        }
     }
     putError(results, error);
     return RpcStatus::Success;
@@ -316,15 +331,17 @@ RpcStatus Vxi11Session::lock(XdrReader &arguments, XdrWriter &results)
 RpcStatus Vxi11Session::unlock(XdrReader &arguments, XdrWriter &results)
 {
     const std::uint32_t id = arguments.number();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
 
     Vxi11Error error = Vxi11Error::InvalidLink;
     if (Device *device = find(id)) {
         const std::lock_guard lock(device->instrument->mutex());
         const bool held = device->instrument->access() == device->link.get();
-        if (held)
+        if (held) {
             device->instrument->releaseAccess();
+        }
         error = held ? Vxi11Error::None : Vxi11Error::NoLock;
     }
     putError(results, error);
@@ -334,8 +351,9 @@ RpcStatus Vxi11Session::unlock(XdrReader &arguments, XdrWriter &results)
 RpcStatus Vxi11Session::destroyLink(XdrReader &arguments, XdrWriter &results)
 {
     const std::uint32_t id = arguments.number();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
     const auto found = m_devices.find(id);
     if (found != m_devices.end()) {
         release(found->second, id);

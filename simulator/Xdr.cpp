@@ -24,8 +24,9 @@ std::uint32_t XdrReader::number()
         return 0;
     }
     std::uint32_t value = 0;
-    for (const char byte : m_bytes.first(Unit))
+    for (const char byte : m_bytes.first(Unit)) {
         value = value << 8U | static_cast<unsigned char>(byte);
+    }
     m_bytes = m_bytes.subspan(Unit);
     return value;
 }
@@ -76,14 +77,16 @@ void XdrWriter::closeOpaque(std::size_t size)
 
 void XdrWriter::patch(std::size_t place, std::uint32_t value)
 {
-    for (std::size_t i = 0; i < Unit; ++i)
+    for (std::size_t i = 0; i < Unit; ++i) {
         m_buffer[place + i] = static_cast<char>(value >> (8U * (Unit - 1 - i)) & 0xFFU);
+    }
 }
 
 void XdrWriter::reserve(std::size_t size)
 {
-    if (m_buffer.size() - m_size < size)
+    if (m_buffer.size() - m_size < size) {
         m_buffer.resize(std::max(m_size + size, 2 * m_buffer.size()));
+    }
 }
 
 } // namespace simulator

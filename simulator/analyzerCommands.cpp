@@ -26,8 +26,9 @@ constexpr std::string_view IfPowerLevel = "TRIGger[:SEQuence]:LEVel:IFPower";
 
 void setIqMode(CommandContext &context)
 {
-    if (const std::optional<bool> on = context.boolean(0))
+    if (const std::optional<bool> on = context.boolean(0)) {
         context.instrument.analyzer.setIqMode(*on, context.now);
+    }
 }
 
 void queryIqMode(CommandContext &context)
@@ -39,8 +40,9 @@ void queryIqMode(CommandContext &context)
 void setInput(CommandContext &context)
 {
     const auto word = context.choice(0, {"RF", "AIQ", "DIQ"});
-    if (!word)
+    if (!word) {
         return;
+    }
     constexpr std::array<std::string_view, 3> Options{"", "PAX600-A1", "PAX600-D1"};
     Instrument &instrument = context.instrument;
     if (instrument.setup().options.find(Options.at(*word)) == std::string::npos) {
@@ -61,8 +63,9 @@ void queryInput(CommandContext &context)
 void setRecord(CommandContext &context)
 {
     const auto filterType = context.choice(0, {"NORMal"});
-    if (!filterType)
+    if (!filterType) {
         return;
+    }
     const auto filter = context.number(1, FilterRange);
     const auto rate = filter ? context.number(2, SampleRateRange) : std::nullopt;
     const auto trigger =
@@ -70,8 +73,9 @@ void setRecord(CommandContext &context)
     const auto slope = trigger ? context.choice(4, {"NEGative", "POSitive"}) : std::nullopt;
     const auto pretrigger = slope ? context.integer(5, MinPretrigger, MaxPretrigger) : std::nullopt;
     const auto samples = pretrigger ? context.integer(6, 1, MaxSamples) : std::nullopt;
-    if (!samples)
+    if (!samples) {
         return;
+    }
     IqSettings settings;
     settings.filterHz = *filter;
     settings.sampleRateHz = *rate;
@@ -146,12 +150,14 @@ void respondText(CommandContext &context, std::uint64_t first, std::uint64_t cou
 void respondRecord(CommandContext &context, std::uint64_t first, std::uint64_t count)
 {
     Analyzer &analyzer = context.instrument.analyzer;
-    if (analyzer.isPending(context.now))
+    if (analyzer.isPending(context.now)) {
         context.link.awaitOperation();
-    if (analyzer.binary)
+    }
+    if (analyzer.binary) {
         context.link.respondBlock(analyzer.record(first, count), count * SampleSize);
-    else
+    } else {
         respondText(context, first, count);
+    }
 }
 
 void queryMemory(CommandContext &context)
@@ -169,15 +175,17 @@ void queryMemory(CommandContext &context)
     std::int64_t first = 0;
     if (context.parameterCount() > 0) {
         const auto given = context.integer(0, 0, total - 1);
-        if (!given)
+        if (!given) {
             return;
+        }
         first = *given;
     }
     std::int64_t count = total - first;
     if (context.parameterCount() > 1) {
         const auto given = context.integer(1, 1, total - first);
-        if (!given)
+        if (!given) {
             return;
+        }
         count = *given;
     }
     respondRecord(context, static_cast<std::uint64_t>(first), static_cast<std::uint64_t>(count));
@@ -197,8 +205,9 @@ void queryData(CommandContext &context)
 
 void setDataFormat(CommandContext &context)
 {
-    if (const auto word = context.choice(0, {"IQPair", "IQBLock", "COMPatible"}))
+    if (const auto word = context.choice(0, {"IQPair", "IQBLock", "COMPatible"})) {
         context.instrument.analyzer.format = *word == 0 ? IqFormat::Pairs : IqFormat::Blocks;
+    }
 }
 
 void queryDataFormat(CommandContext &context)
@@ -209,12 +218,14 @@ void queryDataFormat(CommandContext &context)
 void setFormat(CommandContext &context)
 {
     const auto word = context.choice(0, {"ASCii", "REAL"});
-    if (!word)
+    if (!word) {
         return;
+    }
     if (context.parameterCount() > 1) {
         const auto bits = context.integer(1, 0, 64);
-        if (!bits)
+        if (!bits) {
             return;
+        }
         if (*bits != (*word == 1 ? 32 : 0)) {
             context.error(IllegalParameterValue);
             return;
@@ -237,8 +248,9 @@ void queryWord(CommandContext &context, std::string_view preset)
 
 void setMode(CommandContext &context)
 {
-    if (context.choice(0, {"SANalyzer"}))
+    if (context.choice(0, {"SANalyzer"})) {
         context.instrument.words[context.command.pattern] = "SAN";
+    }
 }
 
 void queryMode(CommandContext &context)
@@ -249,8 +261,9 @@ void queryMode(CommandContext &context)
 void setPowerUnit(CommandContext &context)
 {
     constexpr std::array<const char *, 3> Words{"DBM", "V", "W"};
-    if (const auto word = context.choice(0, {"DBM", "V", "W"}))
+    if (const auto word = context.choice(0, {"DBM", "V", "W"})) {
         context.instrument.words[context.command.pattern] = Words.at(*word);
+    }
 }
 
 void queryPowerUnit(CommandContext &context)
@@ -260,8 +273,9 @@ void queryPowerUnit(CommandContext &context)
 
 void setContinuous(CommandContext &context)
 {
-    if (const std::optional<bool> on = context.boolean(0))
+    if (const std::optional<bool> on = context.boolean(0)) {
         context.instrument.words[context.command.pattern] = numberText(*on ? 1 : 0);
+    }
 }
 
 void queryContinuous(CommandContext &context)

@@ -21,8 +21,9 @@ void clearStatus(CommandContext &context)
 
 void setEventEnable(CommandContext &context)
 {
-    if (const auto value = context.integer(0, 0, MaxByte))
+    if (const auto value = context.integer(0, 0, MaxByte)) {
         context.instrument.status.eventEnable = static_cast<unsigned>(*value);
+    }
 }
 
 void queryEventEnable(CommandContext &context)
@@ -47,8 +48,9 @@ void completeOperation(CommandContext &context)
 
 void queryOperationComplete(CommandContext &context)
 {
-    if (context.instrument.isOperationPending(context.now))
+    if (context.instrument.isOperationPending(context.now)) {
         context.link.awaitOperation();
+    }
     context.respond(context.instrument.faults().has("opc-zero") ? "0" : "1");
 }
 
@@ -66,9 +68,10 @@ void reset(CommandContext &context)
 // Bit 6 has no enable bit: the master summary would depend on itself.
 void setServiceEnable(CommandContext &context)
 {
-    if (const auto value = context.integer(0, 0, MaxByte))
+    if (const auto value = context.integer(0, 0, MaxByte)) {
         context.instrument.status.serviceEnable =
             static_cast<unsigned>(*value) & ~static_cast<unsigned>(MasterSummary);
+    }
 }
 
 void queryServiceEnable(CommandContext &context)

@@ -13,8 +13,9 @@ namespace {
 void selectWaveform(CommandContext &context)
 {
     const std::optional<std::string> path = context.string(0);
-    if (!path)
+    if (!path) {
         return;
+    }
     Instrument &instrument = context.instrument;
     UniqueFd fd;
     std::uint64_t size = 0;
@@ -33,12 +34,14 @@ void querySelection(CommandContext &context)
 void setState(CommandContext &context)
 {
     const std::optional<bool> on = context.boolean(0);
-    if (!on)
+    if (!on) {
         return;
-    if (*on && context.instrument.arb.selection().empty())
+    }
+    if (*on && context.instrument.arb.selection().empty()) {
         context.error(SettingsConflict);
-    else
+    } else {
         context.instrument.arb.setOn(*on);
+    }
 }
 
 void queryState(CommandContext &context)

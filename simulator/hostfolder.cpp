@@ -28,8 +28,9 @@ Directory openDirectory(int folder)
 {
     UniqueFd fd(::openat(folder, ".", FolderFlags));
     Directory directory(fd.isValid() ? ::fdopendir(fd.get()) : nullptr);
-    if (directory)
+    if (directory) {
         (void)fd.release();
+    }
     return directory;
 }
 
@@ -63,25 +64,29 @@ int scpiErrorOf(int systemError)
 void forEachName(int folder, const std::function<void(std::string_view name)> &visitor)
 {
     const Directory directory = openDirectory(folder);
-    if (!directory)
+    if (!directory) {
         return;
+    }
     while (const dirent *entry = ::readdir(directory.get())) {
         const std::string_view name = entry->d_name;
-        if (name != "." && name != "..")
+        if (name != "." && name != "..") {
             visitor(name);
+        }
     }
 }
 
 int openRegular(int folder, const std::string &name, int flags, UniqueFd &fd)
 {
     UniqueFd opened(::openat(folder, name.c_str(), flags | FileFlags, 0666));
-    if (!opened.isValid())
+    if (!opened.isValid()) {
         return scpiErrorOf(errno);
+    }
     struct stat status
     {
     };
-    if (::fstat(opened.get(), &status) != 0 || !S_ISREG(status.st_mode))
+    if (::fstat(opened.get(), &status) != 0 || !S_ISREG(status.st_mode)) {
         return FileNameError;
+    }
     fd = std::move(opened);
     return NoError;
 }

@@ -58,8 +58,9 @@ int main(int argc, char **argv)
         simulator::Log::error(error);
         return EXIT_FAILURE;
     }
-    for (const std::string &line : instruments.readyLines())
+    for (const std::string &line : instruments.readyLines()) {
         print(line + '\n');
+    }
 
     int received = 0;
     (void)sigwait(&signals, &received);

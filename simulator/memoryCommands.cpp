@@ -13,17 +13,19 @@ namespace {
 
 void report(CommandContext &context, int error)
 {
-    if (error != NoError)
+    if (error != NoError) {
         context.error(error);
+    }
 }
 
 // The fault that stands for an instrument which fails only after all bytes have moved.
 void reportAfterTransfer(CommandContext &context)
 {
     const Faults &faults = context.instrument.faults();
-    if (faults.has("error-after-transfer"))
+    if (faults.has("error-after-transfer")) {
         context.error(
             static_cast<int>(faults.number("error-after-transfer").value_or(SystemError)));
+    }
 }
 
 std::string entryText(std::string_view name, std::string_view type, std::uint64_t size)
@@ -40,26 +42,30 @@ void queryCatalog(CommandContext &context)
     std::string path;
     if (context.parameterCount() > 0) {
         const std::optional<std::string> given = context.string(0);
-        if (!given)
+        if (!given) {
             return;
+        }
         path = *given;
     }
     Instrument &instrument = context.instrument;
     MassMemory::Catalog catalog;
     int error = instrument.memory.catalog(path, catalog);
     if (instrument.faults().has("empty-dir-469") &&
-        (error == FileNameNotFound || (error == NoError && catalog.entries.empty())))
+        (error == FileNameNotFound || (error == NoError && catalog.entries.empty()))) {
         error = DirectoryEmpty;
+    }
     if (error != NoError) {
         context.error(error);
         context.respond(std::string());
         return;
     }
     std::string text = std::to_string(catalog.usedBytes) + ',' + std::to_string(catalog.freeBytes);
-    if (!catalog.filtered)
+    if (!catalog.filtered) {
         text += ",\".,DIR,0\",\"..,DIR,0\"";
-    for (const MassMemory::Entry &entry : catalog.entries)
+    }
+    for (const MassMemory::Entry &entry : catalog.entries) {
         text += ',' + entryText(entry.name, entry.type, entry.size);
+    }
     context.respond(text);
 }
 
@@ -71,8 +77,9 @@ void storeData(CommandContext &context)
         return;
     }
     report(context, context.link.transferError());
-    if (context.link.transferError() == NoError)
+    if (context.link.transferError() == NoError) {
         reportAfterTransfer(context);
+    }
 }
 
 void queryData(CommandContext &context)
@@ -82,8 +89,9 @@ void queryData(CommandContext &context)
         return;
     }
     const std::optional<std::string> path = context.string(0);
-    if (!path)
+    if (!path) {
         return;
+    }
     UniqueFd fd;
     std::uint64_t size = 0;
     if (const int error = context.instrument.memory.openForReading(*path, fd, size);
@@ -97,26 +105,30 @@ void queryData(CommandContext &context)
 
 void deleteFile(CommandContext &context)
 {
-    if (const std::optional<std::string> path = context.string(0))
+    if (const std::optional<std::string> path = context.string(0)) {
         report(context, context.instrument.memory.remove(*path));
+    }
 }
 
 void makeDirectory(CommandContext &context)
 {
-    if (const std::optional<std::string> path = context.string(0))
+    if (const std::optional<std::string> path = context.string(0)) {
         report(context, context.instrument.memory.makeDirectory(*path));
+    }
 }
 
 void removeDirectory(CommandContext &context)
 {
-    if (const std::optional<std::string> path = context.string(0))
+    if (const std::optional<std::string> path = context.string(0)) {
         report(context, context.instrument.memory.removeDirectory(*path));
+    }
 }
 
 void changeDirectory(CommandContext &context)
 {
-    if (const std::optional<std::string> path = context.string(0))
+    if (const std::optional<std::string> path = context.string(0)) {
         report(context, context.instrument.memory.changeDirectory(*path));
+    }
 }
 
 void queryDirectory(CommandContext &context)
@@ -128,16 +140,18 @@ void moveFile(CommandContext &context)
 {
     const std::optional<std::string> from = context.string(0);
     const std::optional<std::string> to = from ? context.string(1) : std::nullopt;
-    if (to)
+    if (to) {
         report(context, context.instrument.memory.move(*from, *to));
+    }
 }
 
 void copyFile(CommandContext &context)
 {
     const std::optional<std::string> from = context.string(0);
     const std::optional<std::string> to = from ? context.string(1) : std::nullopt;
-    if (to)
+    if (to) {
         report(context, context.instrument.memory.copy(*from, *to));
+    }
 }
 
 constexpr Command pathCommand(std::string_view pattern, CommandHandler set)

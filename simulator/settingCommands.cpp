@@ -48,8 +48,9 @@ constexpr std::array Settings{
 constexpr auto numberCommands()
 {
     std::array<Command, Settings.size() + 1> commands{};
-    for (std::size_t i = 0; i < Settings.size(); ++i)
+    for (std::size_t i = 0; i < Settings.size(); ++i) {
         commands[i] = Settings[i].command;
+    }
     commands.back() = {.pattern = "OUTPut#[:STATe]",
                        .applies = ToGenerators,
                        .set = setSwitch,
@@ -73,24 +74,27 @@ const NumberRange &rangeOf(std::string_view pattern)
 void setNumber(CommandContext &context)
 {
     const std::string_view pattern = context.command.pattern;
-    if (const std::optional<double> value = context.number(0, rangeOf(pattern)))
+    if (const std::optional<double> value = context.number(0, rangeOf(pattern))) {
         context.instrument.numbers[pattern] = *value;
+    }
 }
 
 // A query may ask for a limit or the preset by its word.
 void queryNumber(CommandContext &context)
 {
     const std::string_view pattern = context.command.pattern;
-    if (context.parameterCount() == 0)
+    if (context.parameterCount() == 0) {
         context.respond(settingValue(context.instrument, pattern));
-    else if (const std::optional<double> value = context.number(0, rangeOf(pattern)))
+    } else if (const std::optional<double> value = context.number(0, rangeOf(pattern))) {
         context.respond(*value);
+    }
 }
 
 void setSwitch(CommandContext &context)
 {
-    if (const std::optional<bool> on = context.boolean(0))
+    if (const std::optional<bool> on = context.boolean(0)) {
         context.instrument.numbers[context.command.pattern] = *on ? 1 : 0;
+    }
 }
 
 void querySwitch(CommandContext &context)

@@ -54,8 +54,9 @@ std::uint16_t localPort(int fd)
 {
     sockaddr_in name{};
     socklen_t length = sizeof(name);
-    if (::getsockname(fd, reinterpret_cast<sockaddr *>(&name), &length) != 0)
+    if (::getsockname(fd, reinterpret_cast<sockaddr *>(&name), &length) != 0) {
         return 0;
+    }
     return ntohs(name.sin_port);
 }
 
@@ -63,10 +64,11 @@ bool sendAll(int fd, std::span<const char> bytes)
 {
     while (!bytes.empty()) {
         const ssize_t count = ::send(fd, bytes.data(), bytes.size(), MSG_NOSIGNAL);
-        if (count > 0)
+        if (count > 0) {
             bytes = bytes.subspan(static_cast<std::size_t>(count));
-        else if (count == 0 || errno != EINTR)
+        } else if (count == 0 || errno != EINTR) {
             return false;
+        }
     }
     return true;
 }

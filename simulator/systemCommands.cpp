@@ -24,8 +24,9 @@ void queryAllErrors(CommandContext &context)
 {
     ErrorQueue &errors = context.instrument.errors;
     std::string text = errors.take();
-    while (!errors.isEmpty())
+    while (!errors.isEmpty()) {
         text += ',' + errors.take();
+    }
     context.respond(text);
 }
 
@@ -41,8 +42,9 @@ void preset(CommandContext &context)
 
 void setTerminator(CommandContext &context)
 {
-    if (const auto word = context.choice(0, {"STANdard", "EOI"}))
+    if (const auto word = context.choice(0, {"STANdard", "EOI"})) {
         context.instrument.setEndsOnEoiOnly(*word == 1);
+    }
 }
 
 void queryTerminator(CommandContext &context)
@@ -53,8 +55,9 @@ void queryTerminator(CommandContext &context)
 void setFault(CommandContext &context)
 {
     const std::optional<std::string> name = context.string(0);
-    if (!name)
+    if (!name) {
         return;
+    }
     std::string value;
     if (context.parameterCount() > 1) {
         const Parameter &parameter = context.unit.parameters[1];
@@ -68,8 +71,9 @@ void setFault(CommandContext &context)
         return;
     }
     if (*name == "queue") {
-        for (std::int64_t i = instrument.faults().number("queue").value_or(0); i > 0; --i)
+        for (std::int64_t i = instrument.faults().number("queue").value_or(0); i > 0; --i) {
             context.error(SystemError);
+        }
     }
 }
 
@@ -80,10 +84,11 @@ void queryFaults(CommandContext &context)
 
 void clearFaults(CommandContext &context)
 {
-    if (context.parameterCount() == 0)
+    if (context.parameterCount() == 0) {
         context.instrument.faults().clear();
-    else if (const std::optional<std::string> name = context.string(0))
+    } else if (const std::optional<std::string> name = context.string(0)) {
         context.instrument.faults().clear(*name);
+    }
 }
 
 StatusGroup &group(CommandContext &context)
@@ -106,8 +111,9 @@ void queryEvents(CommandContext &context)
 template <unsigned StatusGroup::*Register>
 void setRegister(CommandContext &context)
 {
-    if (const auto value = context.integer(0, 0, 65535))
+    if (const auto value = context.integer(0, 0, 65535)) {
         group(context).*Register = static_cast<unsigned>(*value) & StatusGroup::Mask;
+    }
 }
 
 template <unsigned StatusGroup::*Register>

@@ -16,8 +16,9 @@ char fold(char byte, bool caseSensitive)
 
 bool matchesWildcard(std::string_view name, std::string_view pattern, bool caseSensitive)
 {
-    if (pattern == "*.*")
+    if (pattern == "*.*") {
         return true;
+    }
     // Greedy with one way back: on a mismatch the last `*` takes one byte more.
     std::size_t at = 0;
     std::size_t p = 0;
@@ -38,8 +39,9 @@ bool matchesWildcard(std::string_view name, std::string_view pattern, bool caseS
             return false;
         }
     }
-    while (p < pattern.size() && pattern[p] == '*')
+    while (p < pattern.size() && pattern[p] == '*') {
         ++p;
+    }
     return p == pattern.size();
 }
 

@@ -36,8 +36,9 @@ ViStatus withSession(ViObject handle, Function function) noexcept
 {
     return guarded([&]() -> ViStatus {
         const auto object = objectTable().findObject(handle);
-        if (!object)
+        if (!object) {
             return VI_ERROR_INV_OBJECT;
+        }
         const auto session = std::dynamic_pointer_cast<Session>(object);
         return session ? function(*session) : VI_ERROR_NSUP_OPER;
     });
@@ -54,8 +55,9 @@ void copyText(const std::string &text, ViChar *buffer)
 ViStatus viOpenDefaultRM(ViSession *manager)
 {
     return guarded([&]() -> ViStatus {
-        if (manager == nullptr)
+        if (manager == nullptr) {
             return VI_ERROR_USER_BUF;
+        }
         *manager = VI_NULL;
         std::string error;
         auto configuration = loadConfiguration(error);
@@ -63,8 +65,9 @@ ViStatus viOpenDefaultRM(ViSession *manager)
             const std::lock_guard lock(configurationErrorMutex);
             configurationError = error;
         }
-        if (!configuration)
+        if (!configuration) {
             return VI_ERROR_INV_SETUP;
+        }
         *manager = objectTable().add(std::make_shared<ResourceManager>(std::move(*configuration)),
                                      VI_NULL);
         return VI_SUCCESS;
@@ -75,8 +78,9 @@ ViStatus viClose(ViObject object)
 {
     return guarded([&]() -> ViStatus {
         const auto removed = objectTable().remove(object);
-        for (const auto &entry : removed)
+        for (const auto &entry : removed) {
             entry->close();
+        }
         return removed.empty() ? VI_ERROR_INV_OBJECT : VI_SUCCESS;
     });
 }
@@ -86,13 +90,15 @@ ViStatus viStatusDesc(ViObject object, ViStatus status, ViChar description[])
     // The text does not depend on the session, and a session that failed to open has none.
     (void)object;
     return guarded([&]() -> ViStatus {
-        if (description == nullptr)
+        if (description == nullptr) {
             return VI_ERROR_USER_BUF;
+        }
         std::string text = statusText(status);
         if (status == VI_ERROR_INV_SETUP) {
             const std::lock_guard lock(configurationErrorMutex);
-            if (!configurationError.empty())
+            if (!configurationError.empty()) {
                 text = configurationError;
+            }
         }
         if (!text.empty()) {
             copyText(text, description);
@@ -108,21 +114,26 @@ ViStatus viOpen(ViSession manager, const ViChar *name, ViAccessMode mode, ViUInt
                 ViSession *session)
 {
     return guarded([&]() -> ViStatus {
-        if (name == nullptr || session == nullptr)
+        if (name == nullptr || session == nullptr) {
             return VI_ERROR_USER_BUF;
+        }
         *session = VI_NULL;
         const auto owner = objectTable().find<ResourceManager>(manager);
-        if (!owner)
+        if (!owner) {
             return VI_ERROR_INV_OBJECT;
-        if (mode != VI_NO_LOCK)
+        }
+        if (mode != VI_NO_LOCK) {
             return VI_ERROR_INV_ACC_MODE;
+        }
         const auto resource = parseResourceName(name);
-        if (!resource)
+        if (!resource) {
             return VI_ERROR_INV_RSRC_NAME;
+        }
         std::unique_ptr<Transport> transport;
         if (const ViStatus status = owner->open(*resource, openTimeout, transport);
-            status != VI_SUCCESS)
+            status != VI_SUCCESS) {
             return status;
+        }
         *session =
             objectTable().add(std::make_shared<Session>(*resource, std::move(transport)), manager);
         return *session == VI_NULL ? VI_ERROR_INV_OBJECT : VI_SUCCESS;
@@ -133,23 +144,30 @@ ViStatus viFindRsrc(ViSession manager, const ViChar *expression, ViFindList *fin
                     ViUInt32 *count, ViChar first[])
 {
     return guarded([&]() -> ViStatus {
-        if (expression == nullptr || first == nullptr)
+        if (expression == nullptr || first == nullptr) {
             return VI_ERROR_USER_BUF;
+        }
         const auto owner = objectTable().find<ResourceManager>(manager);
-        if (!owner)
+        if (!owner) {
             return VI_ERROR_INV_OBJECT;
-        if (findList != nullptr)
+        }
+        if (findList != nullptr) {
             *findList = VI_NULL;
-        if (count != nullptr)
+        }
+        if (count != nullptr) {
             *count = 0;
+        }
         std::vector<std::string> resources;
-        if (const ViStatus status = owner->find(expression, resources); status != VI_SUCCESS)
+        if (const ViStatus status = owner->find(expression, resources); status != VI_SUCCESS) {
             return status;
-        if (count != nullptr)
+        }
+        if (count != nullptr) {
             *count = static_cast<ViUInt32>(resources.size());
+        }
         copyText(resources.front(), first);
-        if (findList == nullptr)
+        if (findList == nullptr) {
             return VI_SUCCESS;
+        }
         resources.erase(resources.begin());
         *findList = objectTable().add(std::make_shared<FindList>(std::move(resources)), manager);
         return *findList == VI_NULL ? VI_ERROR_INV_OBJECT : VI_SUCCESS;
@@ -159,15 +177,18 @@ ViStatus viFindRsrc(ViSession manager, const ViChar *expression, ViFindList *fin
 ViStatus viFindNext(ViFindList findList, ViChar next[])
 {
     return guarded([&]() -> ViStatus {
-        if (next == nullptr)
+        if (next == nullptr) {
             return VI_ERROR_USER_BUF;
+        }
         const auto list = objectTable().find<FindList>(findList);
-        if (!list)
+        if (!list) {
             return VI_ERROR_INV_OBJECT;
+        }
         std::string resource;
         const ViStatus status = list->next(resource);
-        if (status == VI_SUCCESS)
+        if (status == VI_SUCCESS) {
             copyText(resource, next);
+        }
         return status;
     });
 }
@@ -180,8 +201,9 @@ ViStatus viSetAttribute(ViObject object, ViAttr attribute, ViAttrState state)
 
 ViStatus viGetAttribute(ViObject object, ViAttr attribute, void *state)
 {
-    if (state == nullptr)
+    if (state == nullptr) {
         return VI_ERROR_USER_BUF;
+    }
     return withSession(object,
                        [&](Session &session) { return session.getAttribute(attribute, state); });
 }
@@ -203,8 +225,9 @@ ViStatus viSetBuf(ViSession session, ViUInt16 mask, ViUInt32 size)
 
 ViStatus viPrintf(ViSession session, const ViChar *format, ...)
 {
-    if (format == nullptr)
+    if (format == nullptr) {
         return VI_ERROR_INV_FMT;
+    }
     return withSession(session, [&](Session &opened) { return opened.print(format); });
 }
 
@@ -217,8 +240,9 @@ ViStatus viRead(ViSession session, ViByte *buffer, ViUInt32 size, ViUInt32 *coun
             return opened.read(std::span(buffer, size), received);
         });
     }
-    if (count != nullptr)
+    if (count != nullptr) {
         *count = static_cast<ViUInt32>(received);
+    }
     return status;
 }
 
@@ -230,7 +254,8 @@ ViStatus viWrite(ViSession session, const ViByte *buffer, ViUInt32 size, ViUInt3
         status = withSession(
             session, [&](Session &opened) { return opened.write(std::span(buffer, size), sent); });
     }
-    if (count != nullptr)
+    if (count != nullptr) {
         *count = static_cast<ViUInt32>(sent);
+    }
     return status;
 }

@@ -18,8 +18,9 @@ std::string_view trimmed(std::string_view text)
 {
     constexpr std::string_view Blank = " \t\r";
     const std::size_t begin = text.find_first_not_of(Blank);
-    if (begin == std::string_view::npos)
+    if (begin == std::string_view::npos) {
         return {};
+    }
     return text.substr(begin, text.find_last_not_of(Blank) - begin + 1);
 }
 
@@ -38,10 +39,12 @@ std::optional<std::vector<ViUInt16>> parseAddresses(std::string_view text)
         const std::vector<std::string> ends = split(part, "-");
         const auto first = parseNumber(trimmed(ends.front()), LargestPrimaryAddress);
         const auto last = parseNumber(trimmed(ends.back()), LargestPrimaryAddress);
-        if (ends.size() > 2 || !first || !last || *first > *last)
+        if (ends.size() > 2 || !first || !last || *first > *last) {
             return std::nullopt;
-        for (ViUInt16 address = *first; address <= *last; ++address)
+        }
+        for (ViUInt16 address = *first; address <= *last; ++address) {
             addresses.push_back(address);
+        }
     }
     std::sort(addresses.begin(), addresses.end());
     addresses.erase(std::unique(addresses.begin(), addresses.end()), addresses.end());
@@ -55,16 +58,19 @@ public:
     std::string readLine(std::string_view line)
     {
         line = trimmed(line.substr(0, std::min(line.find(" ;"), line.find("\t;"))));
-        if (line.empty() || line.front() == ';' || line.front() == '#')
+        if (line.empty() || line.front() == ';' || line.front() == '#') {
             return {};
+        }
         if (line.front() == '[') {
-            if (line.back() != ']')
+            if (line.back() != ']') {
                 return quoted(line) + " lacks its closing bracket.";
+            }
             return beginSection(trimmed(line.substr(1, line.size() - 2)));
         }
         const std::size_t equals = line.find('=');
-        if (equals == std::string_view::npos)
+        if (equals == std::string_view::npos) {
             return quoted(line) + " is neither a [section] nor a key = value.";
+        }
         const std::string key = upperCase(trimmed(line.substr(0, equals)));
         const std::string_view value = trimmed(line.substr(equals + 1));
         switch (m_section) {
@@ -83,8 +89,9 @@ public:
     // What can only be seen once the section is complete.
     [[nodiscard]] std::string endSection() const
     {
-        if (m_section == Section::Gateway && m_gateway->host.empty())
+        if (m_section == Section::Gateway && m_gateway->host.empty()) {
             return "section " + quoted(m_title) + " names no host.";
+        }
         return {};
     }
 
@@ -95,8 +102,9 @@ private:
 
     std::string beginSection(std::string_view title)
     {
-        if (std::string error = endSection(); !error.empty())
+        if (std::string error = endSection(); !error.empty()) {
             return error;
+        }
         m_title = title;
         const std::string word = upperCase(title);
         if (word == "GENERAL") {
@@ -106,11 +114,13 @@ private:
         if (word.starts_with("GPIB") && word.find(':') == std::string::npos) {
             const auto board = word.size() == 4 ? std::optional<ViUInt16>(ViUInt16{0})
                                                 : parseNumber(std::string_view(word).substr(4));
-            if (!board)
+            if (!board) {
                 return quoted(title) + " is no GPIB board such as 'GPIB0'.";
+            }
             const auto [entry, isNew] = m_result.gateways.try_emplace(*board);
-            if (!isNew)
+            if (!isNew) {
                 return "section " + quoted(title) + " stands twice.";
+            }
             m_gateway = &entry->second;
             m_section = Section::Gateway;
             return {};
@@ -121,8 +131,9 @@ private:
                    " is none of 'general', a GPIB board such as 'GPIB0' or a TCPIP resource.";
         }
         const auto isSame = [&](const NetworkInstrument &other) { return other.name == *name; };
-        if (std::any_of(m_result.instruments.begin(), m_result.instruments.end(), isSame))
+        if (std::any_of(m_result.instruments.begin(), m_result.instruments.end(), isSame)) {
             return "section " + quoted(title) + " stands twice.";
+        }
         m_result.instruments.push_back({*name, 0});
         m_section = Section::Instrument;
         return {};
@@ -130,14 +141,16 @@ private:
 
     std::string readGeneral(const std::string &key, std::string_view value)
     {
-        if (key != "OPEN_TIMEOUT_MS")
+        if (key != "OPEN_TIMEOUT_MS") {
             return unknownKey(key, "'open_timeout_ms'");
+        }
         ViUInt32 timeout = 0;
         const auto [end, error] =
             std::from_chars(value.data(), value.data() + value.size(), timeout);
         if (error != std::errc() || end != value.data() + value.size() || timeout == 0 ||
-            timeout > LongestOpenTimeoutMs)
+            timeout > LongestOpenTimeoutMs) {
             return "open time-out " + quoted(value) + " is not 1 to 600000 ms.";
+        }
         m_result.openTimeoutMs = timeout;
         return {};
     }
@@ -149,13 +162,15 @@ private:
         } else if (key == "PORT") {
             return readPort(value, m_gateway->port);
         } else if (key == "INTERFACE") {
-            if (value.empty())
+            if (value.empty()) {
                 return "the interface has no name.";
+            }
             m_gateway->interface = value;
         } else if (key == "ADDRESSES") {
             auto addresses = parseAddresses(value);
-            if (!addresses)
+            if (!addresses) {
                 return "addresses " + quoted(value) + " are no list of 0 to 30 such as '5, 20-22'.";
+            }
             m_gateway->addresses = std::move(*addresses);
         } else {
             return unknownKey(key, "'host', 'port', 'interface', 'addresses'");
@@ -166,16 +181,18 @@ private:
     std::string readInstrument(const std::string &key, std::string_view value)
     {
         NetworkInstrument &instrument = m_result.instruments.back();
-        if (key != "PORT" || instrument.name.kind != ResourceKind::Vxi11)
+        if (key != "PORT" || instrument.name.kind != ResourceKind::Vxi11) {
             return unknownKey(key, "'port' of an INSTR resource");
+        }
         return readPort(value, instrument.port);
     }
 
     static std::string readPort(std::string_view value, ViUInt16 &port)
     {
         const auto number = parseNumber(value);
-        if (!number || *number == 0)
+        if (!number || *number == 0) {
             return "port " + quoted(value) + " is not 1 to 65535.";
+        }
         port = *number;
         return {};
     }
@@ -197,8 +214,9 @@ private:
 ViUInt16 Configuration::fixedPort(const ResourceName &name) const
 {
     for (const NetworkInstrument &instrument : instruments) {
-        if (instrument.name == name)
+        if (instrument.name == name) {
             return instrument.port;
+        }
     }
     return 0;
 }
@@ -210,11 +228,13 @@ std::optional<Configuration> parseConfiguration(std::string_view text, std::stri
     for (const std::string &line : split(text, "\n")) {
         ++lineNumber;
         error = reader.readLine(line);
-        if (!error.empty())
+        if (!error.empty()) {
             break;
+        }
     }
-    if (error.empty())
+    if (error.empty()) {
         error = reader.endSection();
+    }
     if (!error.empty()) {
         error.insert(0, "line " + std::to_string(lineNumber) + ": ");
         return std::nullopt;
@@ -237,8 +257,9 @@ std::optional<Configuration> loadConfiguration(std::string &error)
 
     std::ifstream file(path, std::ios::binary);
     if (!file) {
-        if (!isNamed)
+        if (!isNamed) {
             return Configuration();
+        }
         error = "The configuration file '" + path + "' cannot be read.";
         return std::nullopt;
     }
@@ -251,8 +272,9 @@ std::optional<Configuration> loadConfiguration(std::string &error)
         return std::nullopt;
     }
     auto configuration = parseConfiguration(text, error);
-    if (!configuration)
+    if (!configuration) {
         error.insert(0, "The configuration file '" + path + "' has a fault in ");
+    }
     return configuration;
 }
 

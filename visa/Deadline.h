@@ -18,16 +18,18 @@ public:
     [[nodiscard]] static Deadline after(ViUInt32 milliseconds)
     {
         Deadline deadline;
-        if (milliseconds != VI_TMO_INFINITE)
+        if (milliseconds != VI_TMO_INFINITE) {
             deadline.m_end = Clock::now() + std::chrono::milliseconds(milliseconds);
+        }
         return deadline;
     }
 
     [[nodiscard]] Deadline extendedBy(ViUInt32 milliseconds) const
     {
         Deadline deadline = *this;
-        if (!isInfinite())
+        if (!isInfinite()) {
             deadline.m_end += std::chrono::milliseconds(milliseconds);
+        }
         return deadline;
     }
 
@@ -45,8 +47,9 @@ public:
     /// What is left in ms, rounded up; VI_TMO_INFINITE for no end.
     [[nodiscard]] ViUInt32 remainingMs() const
     {
-        if (isInfinite())
+        if (isInfinite()) {
             return VI_TMO_INFINITE;
+        }
         const auto left = std::chrono::ceil<std::chrono::milliseconds>(m_end - Clock::now());
         return static_cast<ViUInt32>(
             std::clamp<decltype(left.count())>(left.count(), 0, VI_TMO_INFINITE - 1));
@@ -55,8 +58,9 @@ public:
     /// The same as an argument of poll(2): -1 for no end.
     [[nodiscard]] int pollMs() const
     {
-        if (isInfinite())
+        if (isInfinite()) {
             return -1;
+        }
         constexpr ViUInt32 Largest = std::numeric_limits<int>::max();
         return static_cast<int>(std::min(remainingMs(), Largest));
     }

@@ -12,10 +12,12 @@ constexpr std::size_t LongestExpression = 1024;
 
 char otherCase(char c)
 {
-    if (c >= 'a' && c <= 'z')
+    if (c >= 'a' && c <= 'z') {
         return static_cast<char>(c - 'a' + 'A');
-    if (c >= 'A' && c <= 'Z')
+    }
+    if (c >= 'A' && c <= 'Z') {
         return static_cast<char>(c - 'A' + 'a');
+    }
     return c;
 }
 
@@ -39,8 +41,9 @@ public:
     std::optional<FindExpression> parse()
     {
         FindExpression expression;
-        if (!alternatives(expression.m_root, 0) || !m_text.empty())
+        if (!alternatives(expression.m_root, 0) || !m_text.empty()) {
             return std::nullopt;
+        }
         return expression;
     }
 
@@ -52,10 +55,12 @@ private:
     {
         node.kind = Kind::Alternatives;
         for (;;) {
-            if (!sequence(node.children.emplace_back(), depth))
+            if (!sequence(node.children.emplace_back(), depth)) {
                 return false;
-            if (m_text.empty() || m_text.front() != '|')
+            }
+            if (m_text.empty() || m_text.front() != '|') {
                 return true;
+            }
             m_text.remove_prefix(1);
         }
     }
@@ -65,16 +70,17 @@ private:
         node.kind = Kind::Sequence;
         while (!m_text.empty() && m_text.front() != '|' && m_text.front() != ')') {
             Node next;
-            if (!atom(next, depth))
+            if (!atom(next, depth)) {
                 return false;
+            }
             while (!m_text.empty() && (m_text.front() == '*' || m_text.front() == '+')) {
                 Node repeat;
                 repeat.kind = Kind::Repeat;
                 repeat.mayBeAbsent = take() == '*';
                 // A repetition of a repetition adds nothing but depth.
-                if (next.kind == Kind::Repeat)
+                if (next.kind == Kind::Repeat) {
                     next.mayBeAbsent = next.mayBeAbsent || repeat.mayBeAbsent;
-                else {
+                } else {
                     repeat.children.push_back(std::move(next));
                     next = std::move(repeat);
                 }
@@ -95,12 +101,14 @@ private:
         case '[':
             return list(node);
         case '(':
-            if (depth == DeepestGroup || !alternatives(node, depth + 1) || m_text.empty())
+            if (depth == DeepestGroup || !alternatives(node, depth + 1) || m_text.empty()) {
                 return false;
+            }
             return take() == ')';
         case '\\':
-            if (m_text.empty())
+            if (m_text.empty()) {
                 return false;
+            }
             include(node.characters, take());
             return true;
         case '*':
@@ -118,43 +126,52 @@ private:
     bool list(Node &node)
     {
         const bool isNegated = !m_text.empty() && m_text.front() == '^';
-        if (isNegated)
+        if (isNegated) {
             m_text.remove_prefix(1);
+        }
         bool isEmpty = true;
         while (!m_text.empty() && m_text.front() != ']') {
             const auto first = listMember();
-            if (!first)
+            if (!first) {
                 return false;
+            }
             char last = *first;
             if (m_text.size() >= 2 && m_text[0] == '-' && m_text[1] != ']') {
                 m_text.remove_prefix(1);
                 const auto end = listMember();
-                if (!end)
+                if (!end) {
                     return false;
+                }
                 last = *end;
             }
-            if (static_cast<unsigned char>(*first) > static_cast<unsigned char>(last))
+            if (static_cast<unsigned char>(*first) > static_cast<unsigned char>(last)) {
                 return false;
+            }
             for (int c = static_cast<unsigned char>(*first); c <= static_cast<unsigned char>(last);
-                 ++c)
+                 ++c) {
                 include(node.characters, static_cast<char>(c));
+            }
             isEmpty = false;
         }
-        if (m_text.empty() || isEmpty)
+        if (m_text.empty() || isEmpty) {
             return false;
+        }
         m_text.remove_prefix(1);
-        if (isNegated)
+        if (isNegated) {
             node.characters.flip();
+        }
         return true;
     }
 
     std::optional<char> listMember()
     {
         const char c = take();
-        if (c != '\\')
+        if (c != '\\') {
             return c;
-        if (m_text.empty())
+        }
+        if (m_text.empty()) {
             return std::nullopt;
+        }
         return take();
     }
 
@@ -170,8 +187,9 @@ private:
 
 std::optional<FindExpression> FindExpression::parse(std::string_view text)
 {
-    if (text.size() > LongestExpression)
+    if (text.size() > LongestExpression) {
         return std::nullopt;
+    }
     return FindExpressionParser(text).parse();
 }
 
@@ -188,25 +206,29 @@ FindExpression::Places FindExpression::advance(const Node &node, const Places &f
     Places to(from.size(), false);
     switch (node.kind) {
     case Kind::Characters:
-        for (std::size_t i = 0; i < text.size(); ++i)
+        for (std::size_t i = 0; i < text.size(); ++i) {
             to[i + 1] = from[i] && node.characters.test(static_cast<unsigned char>(text[i]));
+        }
         break;
     case Kind::Sequence:
         to = from;
-        for (const Node &child : node.children)
+        for (const Node &child : node.children) {
             to = advance(child, to, text);
+        }
         break;
     case Kind::Alternatives:
         for (const Node &child : node.children) {
             const Places reached = advance(child, from, text);
-            for (std::size_t i = 0; i < to.size(); ++i)
+            for (std::size_t i = 0; i < to.size(); ++i) {
                 to[i] = to[i] || reached[i];
+            }
         }
         break;
     case Kind::Repeat: {
         Places front = from;
-        if (node.mayBeAbsent)
+        if (node.mayBeAbsent) {
             to = from;
+        }
         for (bool hasGrown = true; hasGrown;) {
             front = advance(node.children.front(), front, text);
             hasGrown = false;

@@ -15,8 +15,9 @@ bool isOctal(char c)
 // Takes what follows a backslash off `rest` and returns what it stands for.
 std::string takeEscape(std::string_view &rest)
 {
-    if (rest.empty())
+    if (rest.empty()) {
         return "\\";
+    }
     if (isOctal(rest.front())) {
         unsigned value = 0;
         for (int digits = 0; digits < 3 && !rest.empty() && isOctal(rest.front()); ++digits) {
@@ -53,18 +54,20 @@ std::optional<std::vector<std::string>> formatMessages(std::string_view format)
         const char c = format.front();
         format.remove_prefix(1);
         if (c == '%') {
-            if (format.empty() || format.front() != '%')
+            if (format.empty() || format.front() != '%') {
                 return std::nullopt;
+            }
             format.remove_prefix(1);
             message += '%';
         } else if (c == '\\' && quote == '\0') {
             message += takeEscape(format);
         } else {
-            if (c == quote)
+            if (c == quote) {
                 quote = '\0';
-            else if (quote == '\0' && (c == '\'' || c == '"') &&
-                     format.find(c) != std::string_view::npos)
+            } else if (quote == '\0' && (c == '\'' || c == '"') &&
+                       format.find(c) != std::string_view::npos) {
                 quote = c;
+            }
             message += c;
         }
         if (!message.empty() && message.back() == '\n') {
@@ -72,8 +75,9 @@ std::optional<std::vector<std::string>> formatMessages(std::string_view format)
             message.clear();
         }
     }
-    if (!message.empty())
+    if (!message.empty()) {
         messages.push_back(std::move(message));
+    }
     return messages;
 }
 

@@ -22,8 +22,9 @@ std::vector<HostAddress> resolve(const std::string &host, int flags)
     hints.ai_flags = flags;
     addrinfo *list = nullptr;
     std::vector<HostAddress> addresses;
-    if (getaddrinfo(host.c_str(), nullptr, &hints, &list) != 0)
+    if (getaddrinfo(host.c_str(), nullptr, &hints, &list) != 0) {
         return addresses;
+    }
     for (const addrinfo *entry = list; entry != nullptr; entry = entry->ai_next) {
         HostAddress &address = addresses.emplace_back();
         std::memcpy(&address.storage, entry->ai_addr, entry->ai_addrlen);
@@ -47,8 +48,9 @@ ViStatus lookUpHost(const std::string &host, const Deadline &deadline,
                     std::vector<HostAddress> &addresses)
 {
     addresses = resolve(host, AI_NUMERICHOST);
-    if (!addresses.empty())
+    if (!addresses.empty()) {
         return VI_SUCCESS;
+    }
 
     const auto lookup = std::make_shared<Lookup>();
     try {
@@ -70,8 +72,9 @@ ViStatus lookUpHost(const std::string &host, const Deadline &deadline,
 
     std::unique_lock lock(lookup->mutex);
     while (!lookup->isFinished) {
-        if (deadline.isOver())
+        if (deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
         lookup->finished.wait_for(lock,
                                   std::chrono::milliseconds(deadline.atMost(1000).remainingMs()));
     }

@@ -32,12 +32,14 @@ std::size_t MessageTracker::advance(std::span<const std::uint8_t> bytes)
                 static_cast<std::size_t>(std::min<std::uint64_t>(rest.size(), m_blockLeft));
             m_blockLeft -= skipped;
             done += skipped;
-            if (m_blockLeft == 0)
+            if (m_blockLeft == 0) {
                 m_state = State::Text;
+            }
         } else if (m_state == State::Text) {
             const void *end = std::memchr(rest.data(), LineFeed, rest.size());
-            if (end == nullptr)
+            if (end == nullptr) {
                 return bytes.size();
+            }
             m_state = State::Start;
             return done +
                    static_cast<std::size_t>(static_cast<const std::uint8_t *>(end) - rest.data()) +
@@ -45,8 +47,9 @@ std::size_t MessageTracker::advance(std::span<const std::uint8_t> bytes)
         } else {
             advance(rest.front());
             ++done;
-            if (m_state == State::Start)
+            if (m_state == State::Start) {
                 return done;
+            }
         }
     }
     return done;
@@ -65,8 +68,9 @@ void MessageTracker::advance(std::uint8_t byte)
         m_blockLeft = 0;
     } else if (m_state == State::Length && isDigit(byte)) {
         m_blockLeft = m_blockLeft * 10 + (byte - unsigned{'0'});
-        if (--m_digitsLeft == 0)
+        if (--m_digitsLeft == 0) {
             m_state = m_blockLeft > 0 ? State::Block : State::Text;
+        }
     } else {
         m_state = State::Text;
     }

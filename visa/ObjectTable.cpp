@@ -6,11 +6,12 @@ namespace visa {
 ViObject ObjectTable::add(std::shared_ptr<Object> object, ViObject parent)
 {
     const std::lock_guard lock(m_mutex);
-    if (parent != VI_NULL && !m_entries.contains(parent))
+    if (parent != VI_NULL && !m_entries.contains(parent)) {
         return VI_NULL;
-    do
+    }
+    do {
         ++m_lastHandle;
-    while (m_lastHandle == VI_NULL || m_entries.contains(m_lastHandle));
+    } while (m_lastHandle == VI_NULL || m_entries.contains(m_lastHandle));
     m_entries[m_lastHandle] = {std::move(object), parent};
     return m_lastHandle;
 }
@@ -27,8 +28,9 @@ std::vector<std::shared_ptr<Object>> ObjectTable::remove(ViObject handle)
     const std::lock_guard lock(m_mutex);
     std::vector<std::shared_ptr<Object>> removed;
     const auto own = m_entries.find(handle);
-    if (handle == VI_NULL || own == m_entries.end())
+    if (handle == VI_NULL || own == m_entries.end()) {
         return removed;
+    }
     for (auto entry = m_entries.begin(); entry != m_entries.end();) {
         if (entry->second.parent == handle) {
             removed.push_back(std::move(entry->second.object));

@@ -29,18 +29,21 @@ ViStatus ResourceManager::open(const ResourceName &name, ViUInt32 timeoutMs,
         return SocketTransport::open(name.host, name.port, deadline, transport);
     case ResourceKind::Usb: {
         const std::string path = findUsbtmcPath(findUsbtmcDevices(), name);
-        if (path.empty())
+        if (path.empty()) {
             return VI_ERROR_RSRC_NFOUND;
+        }
         return UsbtmcTransport::open(path, std::make_unique<UsbtmcKernel>(), transport);
     }
     case ResourceKind::Gpib: {
         const auto entry = m_configuration.gateways.find(name.board);
-        if (entry == m_configuration.gateways.end())
+        if (entry == m_configuration.gateways.end()) {
             return VI_ERROR_INTF_NUM_NCONFIG;
+        }
         const Gateway &gateway = entry->second;
         std::string device = gateway.interface + "," + std::to_string(name.primary);
-        if (name.secondary)
+        if (name.secondary) {
             device.append(",").append(std::to_string(*name.secondary));
+        }
         const Vxi11Address address{gateway.host, gateway.port, device, VI_INTF_GPIB};
         return Vxi11Transport::open(address, deadline, transport);
     }
@@ -53,13 +56,15 @@ ViStatus ResourceManager::find(const std::string &expression,
 {
     resources.clear();
     const auto pattern = FindExpression::parse(expression);
-    if (!pattern)
+    if (!pattern) {
         return VI_ERROR_INV_EXPR;
+    }
     const auto add = [&](const ResourceName &name) {
         std::string text = resourceText(name);
         // Callers hand in buffers of this size.
-        if (text.size() < VI_FIND_BUFLEN && pattern->matches(text))
+        if (text.size() < VI_FIND_BUFLEN && pattern->matches(text)) {
             resources.push_back(std::move(text));
+        }
     };
     for (const auto &[board, gateway] : m_configuration.gateways) {
         ResourceName name;
@@ -70,10 +75,12 @@ ViStatus ResourceManager::find(const std::string &expression,
             add(name);
         }
     }
-    for (const NetworkInstrument &instrument : m_configuration.instruments)
+    for (const NetworkInstrument &instrument : m_configuration.instruments) {
         add(instrument.name);
-    for (const UsbtmcDevice &device : findUsbtmcDevices())
+    }
+    for (const UsbtmcDevice &device : findUsbtmcDevices()) {
         add(device.name);
+    }
     return resources.empty() ? VI_ERROR_RSRC_NFOUND : VI_SUCCESS;
 }
 
@@ -85,8 +92,9 @@ FindList::FindList(std::vector<std::string> resources)
 ViStatus FindList::next(std::string &resource)
 {
     const std::lock_guard lock(m_mutex);
-    if (m_next == m_resources.size())
+    if (m_next == m_resources.size()) {
         return VI_ERROR_RSRC_NFOUND;
+    }
     resource = m_resources[m_next++];
     return VI_SUCCESS;
 }

@@ -22,13 +22,16 @@ bool isPlain(std::string_view text)
 // "TCPIP2" with the word "TCPIP" is 2, without digits 0.
 std::optional<ViUInt16> boardNumber(std::string_view section, std::string_view word)
 {
-    if (!section.starts_with(word))
+    if (!section.starts_with(word)) {
         return std::nullopt;
+    }
     section.remove_prefix(word.size());
-    if (section.empty())
+    if (section.empty()) {
         return ViUInt16{0};
-    if (section.starts_with("0X"))
+    }
+    if (section.starts_with("0X")) {
         return std::nullopt;
+    }
     return parseNumber(section);
 }
 
@@ -37,8 +40,9 @@ using Sections = std::vector<std::string>;
 // Takes a trailing "INSTR" off, which every instrument name may go without.
 void dropClass(Sections &sections)
 {
-    if (upperCase(sections.back()) == "INSTR")
+    if (upperCase(sections.back()) == "INSTR") {
         sections.pop_back();
+    }
 }
 
 std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
@@ -47,34 +51,40 @@ std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
     name.board = board;
     if (sections.size() == 4 && upperCase(sections[3]) == "SOCKET") {
         const auto port = parseNumber(sections[2]);
-        if (!port || *port == 0)
+        if (!port || *port == 0) {
             return std::nullopt;
+        }
         name.kind = ResourceKind::Socket;
         name.port = *port;
     } else {
         dropClass(sections);
-        if (sections.size() < 2 || sections.size() > 3)
+        if (sections.size() < 2 || sections.size() > 3) {
             return std::nullopt;
+        }
         name.kind = ResourceKind::Vxi11;
         name.device = sections.size() == 3 ? sections[2] : "inst0";
-        if (!isPlain(name.device))
+        if (!isPlain(name.device)) {
             return std::nullopt;
+        }
     }
     name.host = sections[1];
-    if (!isPlain(name.host))
+    if (!isPlain(name.host)) {
         return std::nullopt;
+    }
     return name;
 }
 
 std::optional<ResourceName> parseUsb(Sections sections, ViUInt16 board)
 {
     dropClass(sections);
-    if (sections.size() < 4 || sections.size() > 5)
+    if (sections.size() < 4 || sections.size() > 5) {
         return std::nullopt;
+    }
     const auto vendor = parseNumber(sections[1]);
     const auto product = parseNumber(sections[2]);
-    if (!vendor || !product || sections[3].empty())
+    if (!vendor || !product || sections[3].empty()) {
         return std::nullopt;
+    }
     ResourceName name;
     name.kind = ResourceKind::Usb;
     name.board = board;
@@ -83,8 +93,9 @@ std::optional<ResourceName> parseUsb(Sections sections, ViUInt16 board)
     name.serial = sections[3];
     if (sections.size() == 5) {
         name.usbInterface = parseNumber(sections[4], 0xFF);
-        if (!name.usbInterface)
+        if (!name.usbInterface) {
             return std::nullopt;
+        }
     }
     return name;
 }
@@ -92,19 +103,22 @@ std::optional<ResourceName> parseUsb(Sections sections, ViUInt16 board)
 std::optional<ResourceName> parseGpib(Sections sections, ViUInt16 board)
 {
     dropClass(sections);
-    if (sections.size() < 2 || sections.size() > 3)
+    if (sections.size() < 2 || sections.size() > 3) {
         return std::nullopt;
+    }
     const auto primary = parseNumber(sections[1], LargestPrimaryAddress);
-    if (!primary)
+    if (!primary) {
         return std::nullopt;
+    }
     ResourceName name;
     name.kind = ResourceKind::Gpib;
     name.board = board;
     name.primary = *primary;
     if (sections.size() == 3) {
         name.secondary = parseNumber(sections[2], LargestSecondaryAddress);
-        if (!name.secondary)
+        if (!name.secondary) {
             return std::nullopt;
+        }
     }
     return name;
 }
@@ -117,8 +131,9 @@ std::vector<std::string> split(std::string_view text, std::string_view separator
     for (;;) {
         const std::size_t end = text.find(separator);
         parts.emplace_back(text.substr(0, end));
-        if (end == std::string_view::npos)
+        if (end == std::string_view::npos) {
             return parts;
+        }
         text.remove_prefix(end + separator.size());
     }
 }
@@ -127,8 +142,9 @@ std::string upperCase(std::string_view text)
 {
     std::string result(text);
     for (char &c : result) {
-        if (c >= 'a' && c <= 'z')
+        if (c >= 'a' && c <= 'z') {
             c = static_cast<char>(c - 'a' + 'A');
+        }
     }
     return result;
 }
@@ -142,8 +158,9 @@ std::optional<ViUInt16> parseNumber(std::string_view text, ViUInt16 largest)
     }
     unsigned value = 0;
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value, base);
-    if (error != std::errc() || end != text.data() + text.size() || value > largest)
+    if (error != std::errc() || end != text.data() + text.size() || value > largest) {
         return std::nullopt;
+    }
     return static_cast<ViUInt16>(value);
 }
 
@@ -155,18 +172,21 @@ std::optional<ResourceName> parseResourceName(std::string_view text)
     const auto hasColon = [](const std::string &section) {
         return section.find(':') != std::string::npos;
     };
-    if (sections.size() < 2 || std::any_of(sections.begin(), sections.end(), hasColon))
+    if (sections.size() < 2 || std::any_of(sections.begin(), sections.end(), hasColon)) {
         return std::nullopt;
+    }
     std::optional<ResourceName> name;
-    if (const auto tcpip = boardNumber(interface, "TCPIP"))
+    if (const auto tcpip = boardNumber(interface, "TCPIP")) {
         name = parseTcpip(std::move(sections), *tcpip);
-    else if (const auto usb = boardNumber(interface, "USB"))
+    } else if (const auto usb = boardNumber(interface, "USB")) {
         name = parseUsb(std::move(sections), *usb);
-    else if (const auto gpib = boardNumber(interface, "GPIB"))
+    } else if (const auto gpib = boardNumber(interface, "GPIB")) {
         name = parseGpib(std::move(sections), *gpib);
+    }
     // A longer one would not fit the buffers that callers hand in for it.
-    if (name && resourceText(*name).size() >= VI_FIND_BUFLEN)
+    if (name && resourceText(*name).size() >= VI_FIND_BUFLEN) {
         return std::nullopt;
+    }
     return name;
 }
 
@@ -183,14 +203,16 @@ std::string resourceText(const ResourceName &name)
         std::snprintf(ids.data(), ids.size(), "0x%04X::0x%04X::", unsigned{name.vendorId},
                       unsigned{name.productId});
         std::string text = "USB" + board + ids.data() + name.serial;
-        if (name.usbInterface)
+        if (name.usbInterface) {
             text.append("::").append(std::to_string(*name.usbInterface));
+        }
         return text + "::INSTR";
     }
     case ResourceKind::Gpib: {
         std::string text = "GPIB" + board + std::to_string(name.primary);
-        if (name.secondary)
+        if (name.secondary) {
             text.append("::").append(std::to_string(*name.secondary));
+        }
         return text + "::INSTR";
     }
     }

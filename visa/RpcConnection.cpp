@@ -56,30 +56,35 @@ std::size_t RpcConnection::beginCall(const RpcProcedure &procedure)
     m_call.clear();
     append(m_call, 0); // the record mark, once the size is known
     for (const std::uint32_t word : {m_transaction, MessageCall, RpcVersion, procedure.program,
-                                     procedure.version, procedure.number})
+                                     procedure.version, procedure.number}) {
         append(m_call, word);
+    }
     // Credential and verifier: no authentication, no bytes.
-    for (int i = 0; i < 4; ++i)
+    for (int i = 0; i < 4; ++i) {
         append(m_call, 0);
+    }
     return m_call.size();
 }
 
 ViStatus RpcConnection::exchange(const Deadline &deadline)
 {
     const auto mark = static_cast<std::uint32_t>(m_call.size() - MarkSize) | LastFragmentBit;
-    for (unsigned i = 0; i < MarkSize; ++i)
+    for (unsigned i = 0; i < MarkSize; ++i) {
         m_call[i] = static_cast<std::uint8_t>(mark >> (24 - 8 * i));
+    }
 
     std::size_t sent = 0;
     if (const ViStatus status = m_socket.send(m_call, deadline, sent); status != VI_SUCCESS) {
         // The peer would take the next call for the rest of this one.
-        if (sent > 0 || status == VI_ERROR_CONN_LOST)
+        if (sent > 0 || status == VI_ERROR_CONN_LOST) {
             close();
+        }
         return status;
     }
     for (;;) {
-        if (const ViStatus status = receiveRecord(deadline); status != VI_SUCCESS)
+        if (const ViStatus status = receiveRecord(deadline); status != VI_SUCCESS) {
             return status;
+        }
         const RpcReply reply = parseRpcReply(m_reader.record(), m_transaction);
         switch (reply.kind) {
         case RpcReplyKind::Accepted:
@@ -87,8 +92,9 @@ ViStatus RpcConnection::exchange(const Deadline &deadline)
             return VI_SUCCESS;
         case RpcReplyKind::OtherCall:
             // Even a peer that floods us with stale replies must not hold the call.
-            if (deadline.isOver())
+            if (deadline.isOver()) {
                 return VI_ERROR_TMO;
+            }
             break;
         case RpcReplyKind::Unavailable:
             return VI_ERROR_NSUP_OPER;
@@ -103,25 +109,29 @@ ViStatus RpcConnection::exchange(const Deadline &deadline)
 
 ViStatus RpcConnection::receiveRecord(const Deadline &deadline)
 {
-    if (m_reader.state() == RpcRecordReader::State::Complete)
+    if (m_reader.state() == RpcRecordReader::State::Complete) {
         m_reader.next();
+    }
     for (;;) {
         m_inputBegin +=
             m_reader.feed(std::span(m_input).subspan(m_inputBegin, m_inputEnd - m_inputBegin));
-        if (m_reader.state() == RpcRecordReader::State::Complete)
+        if (m_reader.state() == RpcRecordReader::State::Complete) {
             return VI_SUCCESS;
+        }
         if (m_reader.state() == RpcRecordReader::State::TooLong) {
             close();
             return VI_ERROR_IO;
         }
         // A peer that trickles, or sends empty fragments for ever, never leaves receive() waiting.
-        if (deadline.isOver())
+        if (deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
         m_inputBegin = m_inputEnd = 0;
         if (const ViStatus status = m_socket.receive(m_input, deadline, m_inputEnd);
             status != VI_SUCCESS) {
-            if (status == VI_ERROR_CONN_LOST)
+            if (status == VI_ERROR_CONN_LOST) {
                 close();
+            }
             return status;
         }
     }

@@ -48,13 +48,16 @@ public:
         const std::size_t room = LargestFixedArguments + dataSize;
         m_call.resize(headerSize + room);
         const auto size = encodeXdr(encode, arguments, std::span(m_call).subspan(headerSize));
-        if (!size)
+        if (!size) {
             return VI_ERROR_IO;
+        }
         m_call.resize(headerSize + *size);
-        if (const ViStatus status = exchange(deadline); status != VI_SUCCESS)
+        if (const ViStatus status = exchange(deadline); status != VI_SUCCESS) {
             return status;
-        if (results.decode(m_results))
+        }
+        if (results.decode(m_results)) {
             return VI_SUCCESS;
+        }
         close();
         return VI_ERROR_IO;
     }

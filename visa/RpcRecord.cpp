@@ -27,8 +27,9 @@ std::uint32_t bigEndian(std::span<const std::uint8_t, 4> bytes)
 
 std::optional<std::uint32_t> takeWord(std::span<const std::uint8_t> &rest)
 {
-    if (rest.size() < 4)
+    if (rest.size() < 4) {
         return std::nullopt;
+    }
     const std::uint32_t word = bigEndian(rest.first<4>());
     rest = rest.subspan(4);
     return word;
@@ -47,22 +48,25 @@ std::size_t RpcRecordReader::feed(std::span<const std::uint8_t> bytes)
     while (m_state == State::Incomplete && taken < bytes.size()) {
         if (m_headerSize < m_header.size()) {
             m_header[m_headerSize++] = bytes[taken++];
-            if (m_headerSize == m_header.size())
+            if (m_headerSize == m_header.size()) {
                 beginFragment();
+            }
         } else {
             const auto part = bytes.subspan(taken, std::min(bytes.size() - taken, m_fragmentLeft));
-            if (m_isLastFragment && m_record.empty() && part.size() == m_fragmentLeft)
+            if (m_isLastFragment && m_record.empty() && part.size() == m_fragmentLeft) {
                 m_whole = part;
-            else
+            } else {
                 m_record.insert(m_record.end(), part.begin(), part.end());
+            }
             m_fragmentLeft -= part.size();
             taken += part.size();
         }
         if (m_state == State::Incomplete && m_headerSize == m_header.size() &&
             m_fragmentLeft == 0) {
             m_headerSize = 0;
-            if (m_isLastFragment)
+            if (m_isLastFragment) {
                 m_state = State::Complete;
+            }
         }
     }
     return taken;
@@ -73,8 +77,9 @@ void RpcRecordReader::beginFragment()
     const std::uint32_t word = bigEndian(m_header);
     m_isLastFragment = (word & LastFragmentBit) != 0;
     m_fragmentLeft = word & ~LastFragmentBit;
-    if (m_fragmentLeft > m_limit - m_record.size())
+    if (m_fragmentLeft > m_limit - m_record.size()) {
         m_state = State::TooLong;
+    }
 }
 
 void RpcRecordReader::next()
@@ -97,29 +102,36 @@ RpcReply parseRpcReply(std::span<const std::uint8_t> record, std::uint32_t trans
     constexpr RpcReply Malformed{RpcReplyKind::Malformed, {}};
     const auto number = takeWord(record);
     const auto direction = takeWord(record);
-    if (direction != MessageReply)
+    if (direction != MessageReply) {
         return Malformed;
-    if (number != transaction)
+    }
+    if (number != transaction) {
         return {RpcReplyKind::OtherCall, {}};
+    }
 
     const auto replyStatus = takeWord(record);
-    if (replyStatus == ReplyDenied)
+    if (replyStatus == ReplyDenied) {
         return {RpcReplyKind::Refused, {}};
-    if (replyStatus != ReplyAccepted)
+    }
+    if (replyStatus != ReplyAccepted) {
         return Malformed;
+    }
 
     const auto verifierFlavor = takeWord(record);
     const auto verifierSize = takeWord(record);
-    if (!verifierFlavor || !verifierSize || *verifierSize > LargestVerifier)
+    if (!verifierFlavor || !verifierSize || *verifierSize > LargestVerifier) {
         return Malformed;
+    }
     const std::size_t padded = (std::size_t{*verifierSize} + 3) / 4 * 4;
-    if (record.size() < padded)
+    if (record.size() < padded) {
         return Malformed;
+    }
     record = record.subspan(padded);
 
     const auto acceptStatus = takeWord(record);
-    if (!acceptStatus || *acceptStatus > AcceptSystemError)
+    if (!acceptStatus || *acceptStatus > AcceptSystemError) {
         return Malformed;
+    }
     switch (*acceptStatus) {
     case AcceptSuccess:
         return {RpcReplyKind::Accepted, record};

@@ -18,16 +18,18 @@ ViUInt32 lowWord(ViAttrState state)
 
 ViStatus setFlag(bool &flag, ViUInt32 state)
 {
-    if (state > 1)
+    if (state > 1) {
         return VI_ERROR_NSUP_ATTR_STATE;
+    }
     flag = state == 1;
     return VI_SUCCESS;
 }
 
 ViStatus setMode(ViUInt16 &mode, ViUInt32 state, ViUInt16 otherThanOnAccess)
 {
-    if (state != VI_FLUSH_ON_ACCESS && state != otherThanOnAccess)
+    if (state != VI_FLUSH_ON_ACCESS && state != otherThanOnAccess) {
         return VI_ERROR_NSUP_ATTR_STATE;
+    }
     mode = static_cast<ViUInt16>(state);
     return VI_SUCCESS;
 }
@@ -81,8 +83,9 @@ ViStatus Session::setAttribute(ViAttr attribute, ViAttrState state)
     case VI_ATTR_TERMCHAR_EN:
         return setFlag(m_attributes.hasTerminator, value & 0xFFFFU);
     case VI_ATTR_TERMCHAR:
-        if (value > 0xFF)
+        if (value > 0xFF) {
             return VI_ERROR_NSUP_ATTR_STATE;
+        }
         m_attributes.terminator = static_cast<ViUInt8>(value);
         return VI_SUCCESS;
     case VI_ATTR_RD_BUF_OPER_MODE:
@@ -136,12 +139,14 @@ ViStatus Session::getAttribute(ViAttr attribute, void *state) const
     case VI_ATTR_INTF_NUM:
         return deliver<ViUInt16>(state, m_name.board);
     case VI_ATTR_GPIB_PRIMARY_ADDR:
-        if (m_name.kind != ResourceKind::Gpib)
+        if (m_name.kind != ResourceKind::Gpib) {
             return VI_ERROR_NSUP_ATTR;
+        }
         return deliver<ViUInt16>(state, m_name.primary);
     case VI_ATTR_TCPIP_PORT:
-        if (m_name.kind != ResourceKind::Socket)
+        if (m_name.kind != ResourceKind::Socket) {
             return VI_ERROR_NSUP_ATTR;
+        }
         return deliver<ViUInt16>(state, m_name.port);
     default:
         return VI_ERROR_NSUP_ATTR;
@@ -152,14 +157,17 @@ ViStatus Session::setBuffer(ViUInt16 mask, ViUInt32 size)
 {
     constexpr unsigned ReadMask = VI_READ_BUF | VI_IO_IN_BUF;
     constexpr unsigned WriteMask = VI_WRITE_BUF | VI_IO_OUT_BUF;
-    if (mask == 0 || (mask & ~(ReadMask | WriteMask)) != 0)
+    if (mask == 0 || (mask & ~(ReadMask | WriteMask)) != 0) {
         return VI_ERROR_INV_MASK;
+    }
     // Data go straight from and to the caller's memory, so the sizes are only kept for asking.
     const std::lock_guard lock(m_attributesMutex);
-    if ((mask & VI_READ_BUF) != 0)
+    if ((mask & VI_READ_BUF) != 0) {
         m_attributes.readBufferSize = size;
-    if ((mask & VI_WRITE_BUF) != 0)
+    }
+    if ((mask & VI_WRITE_BUF) != 0) {
         m_attributes.writeBufferSize = size;
+    }
     return VI_SUCCESS;
 }
 
@@ -168,11 +176,13 @@ ViStatus Session::perform(Transfer transfer)
 {
     const Attributes current = attributes();
     const Deadline deadline = Deadline::after(current.timeoutMs);
-    if (!m_turnstile.enter(deadline))
+    if (!m_turnstile.enter(deadline)) {
         return VI_ERROR_TMO;
+    }
     const Turnstile::Passage passage(m_turnstile);
-    if (!m_transport)
+    if (!m_transport) {
         return VI_ERROR_INV_OBJECT;
+    }
     return transfer(*m_transport, current, deadline);
 }
 
@@ -180,8 +190,9 @@ ViStatus Session::write(std::span<const std::uint8_t> data, std::size_t &count)
 {
     count = 0;
     return perform([&](Transport &transport, const Attributes &current, const Deadline &deadline) {
-        if (data.empty())
+        if (data.empty()) {
             return ViStatus{VI_SUCCESS};
+        }
         return transport.write(data, current.sendsEnd, deadline, count);
     });
 }
@@ -190,11 +201,13 @@ ViStatus Session::read(std::span<std::uint8_t> buffer, std::size_t &count)
 {
     count = 0;
     return perform([&](Transport &transport, const Attributes &current, const Deadline &deadline) {
-        if (buffer.empty())
+        if (buffer.empty()) {
             return ViStatus{VI_SUCCESS};
+        }
         ReadOptions options;
-        if (current.hasTerminator)
+        if (current.hasTerminator) {
             options.terminator = current.terminator;
+        }
         options.stopsAtEnd = !current.suppressesEnd;
         return transport.read(buffer, options, deadline, count);
     });
@@ -203,16 +216,18 @@ ViStatus Session::read(std::span<std::uint8_t> buffer, std::size_t &count)
 ViStatus Session::print(std::string_view format)
 {
     const auto messages = formatMessages(format);
-    if (!messages)
+    if (!messages) {
         return VI_ERROR_INV_FMT;
+    }
     return perform([&](Transport &transport, const Attributes &current, const Deadline &deadline) {
         for (const std::string &message : *messages) {
             const auto *bytes = reinterpret_cast<const std::uint8_t *>(message.data());
             std::size_t count = 0;
             const ViStatus status = transport.write(std::span(bytes, message.size()),
                                                     current.sendsEnd, deadline, count);
-            if (status != VI_SUCCESS)
+            if (status != VI_SUCCESS) {
                 return status;
+            }
         }
         return ViStatus{VI_SUCCESS};
     });
@@ -227,8 +242,9 @@ ViStatus Session::clear()
 
 ViStatus Session::controlRemote(ViUInt16 mode)
 {
-    if (mode > VI_GPIB_REN_ADDRESS_GTL)
+    if (mode > VI_GPIB_REN_ADDRESS_GTL) {
         return VI_ERROR_INV_MODE;
+    }
     return perform([mode](Transport &transport, const Attributes &, const Deadline &deadline) {
         return transport.controlRemote(mode, deadline);
     });

@@ -28,11 +28,13 @@ ViStatus SocketTransport::open(const std::string &host, ViUInt16 port, const Dea
                                std::unique_ptr<Transport> &transport)
 {
     std::vector<HostAddress> addresses;
-    if (const ViStatus status = lookUpHost(host, deadline, addresses); status != VI_SUCCESS)
+    if (const ViStatus status = lookUpHost(host, deadline, addresses); status != VI_SUCCESS) {
         return status;
+    }
     std::unique_ptr<SocketTransport> opened(new SocketTransport(std::move(addresses), port));
-    if (const ViStatus status = opened->connect(deadline); status != VI_SUCCESS)
+    if (const ViStatus status = opened->connect(deadline); status != VI_SUCCESS) {
         return status;
+    }
     transport = std::move(opened);
     return VI_SUCCESS;
 }
@@ -55,8 +57,9 @@ ViStatus SocketTransport::write(std::span<const std::uint8_t> data, bool end,
         m_isMidMessage || std::find(data.begin(), data.end(), std::uint8_t{'#'}) != data.end();
     const bool needsLineFeed = end && (mayHoldBlock || data.back() != LineFeed);
     m_output.assign(data.begin(), data.end());
-    if (needsLineFeed)
+    if (needsLineFeed) {
         m_output.push_back(LineFeed);
+    }
     m_wasUsed = true;
     m_isMidMessage = !end;
     const ViStatus status = m_socket.send(m_output, deadline, count);
@@ -69,14 +72,17 @@ ViStatus SocketTransport::read(std::span<std::uint8_t> buffer, const ReadOptions
 {
     count = 0;
     for (;;) {
-        if (const ViStatus status = takeBuffered(buffer, options, count); status != NeedsMore)
+        if (const ViStatus status = takeBuffered(buffer, options, count); status != NeedsMore) {
             return status;
-        if (count > 0 && deadline.isOver())
+        }
+        if (count > 0 && deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
         m_inputBegin = m_inputEnd = 0;
         if (const ViStatus status = m_socket.receive(m_input, deadline, m_inputEnd);
-            status != VI_SUCCESS)
+            status != VI_SUCCESS) {
             return status;
+        }
         m_wasUsed = true;
     }
 }
@@ -91,26 +97,30 @@ ViStatus SocketTransport::takeBuffered(std::span<std::uint8_t> buffer, const Rea
         if (options.terminator) {
             const auto found = std::find(part.begin(), part.end(), *options.terminator);
             isTerminated = found != part.end();
-            if (isTerminated)
+            if (isTerminated) {
                 part = part.first(static_cast<std::size_t>(found - part.begin()) + 1);
+            }
         }
         const std::size_t size = m_tracker.advance(part);
         std::memcpy(buffer.data() + count, part.data(), size);
         count += size;
         m_inputBegin += size;
         // No END came over this wire, so the terminator that was asked for goes first.
-        if (isTerminated && size == part.size())
+        if (isTerminated && size == part.size()) {
             return VI_SUCCESS_TERM_CHAR;
-        if (m_tracker.endedMessage() && options.stopsAtEnd)
+        }
+        if (m_tracker.endedMessage() && options.stopsAtEnd) {
             return VI_SUCCESS;
+        }
     }
     return count == buffer.size() ? VI_SUCCESS_MAX_CNT : NeedsMore;
 }
 
 ViStatus SocketTransport::clear(const Deadline &deadline)
 {
-    if (m_socket.isOpen() && !m_wasUsed)
+    if (m_socket.isOpen() && !m_wasUsed) {
         return VI_SUCCESS;
+    }
     m_socket.close();
     const ViStatus status = connect(deadline);
     return status == VI_ERROR_RSRC_NFOUND ? VI_ERROR_CONN_LOST : status;

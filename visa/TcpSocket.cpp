@@ -60,8 +60,9 @@ TcpSocket::~TcpSocket()
 
 void TcpSocket::close()
 {
-    if (m_descriptor >= 0)
+    if (m_descriptor >= 0) {
         ::close(m_descriptor);
+    }
     m_descriptor = -1;
 }
 
@@ -74,8 +75,9 @@ ViStatus TcpSocket::connect(const std::vector<HostAddress> &addresses, std::uint
         const Deadline share =
             attemptsLeft > 1 ? deadline.atMost(deadline.remainingMs() / attemptsLeft) : deadline;
         status = connectTo(addresses[i], port, share);
-        if (status == VI_SUCCESS || status == VI_ERROR_ABORT)
+        if (status == VI_SUCCESS || status == VI_ERROR_ABORT) {
             return status;
+        }
         close();
     }
     return status;
@@ -86,8 +88,9 @@ ViStatus TcpSocket::connectTo(HostAddress address, std::uint16_t port, const Dea
     close();
     m_descriptor = ::socket(address.storage.ss_family, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC,
                             IPPROTO_TCP);
-    if (m_descriptor < 0)
+    if (m_descriptor < 0) {
         return VI_ERROR_ALLOC;
+    }
     // Commands are short and waited for, so holding them back to fill a packet only delays.
     setOption(m_descriptor, IPPROTO_TCP, TCP_NODELAY, 1);
     setOption(m_descriptor, SOL_SOCKET, SO_KEEPALIVE, 1);
@@ -97,16 +100,20 @@ ViStatus TcpSocket::connectTo(HostAddress address, std::uint16_t port, const Dea
 
     setPort(address, port);
     if (::connect(m_descriptor, reinterpret_cast<const sockaddr *>(&address.storage),
-                  address.length) == 0)
+                  address.length) == 0) {
         return VI_SUCCESS;
-    if (errno != EINPROGRESS && errno != EINTR)
+    }
+    if (errno != EINPROGRESS && errno != EINTR) {
         return VI_ERROR_RSRC_NFOUND;
-    if (const ViStatus status = waitFor(POLLOUT, deadline); status != VI_SUCCESS)
+    }
+    if (const ViStatus status = waitFor(POLLOUT, deadline); status != VI_SUCCESS) {
         return status;
+    }
     int error = 0;
     socklen_t length = sizeof error;
-    if (getsockopt(m_descriptor, SOL_SOCKET, SO_ERROR, &error, &length) != 0 || error != 0)
+    if (getsockopt(m_descriptor, SOL_SOCKET, SO_ERROR, &error, &length) != 0 || error != 0) {
         return VI_ERROR_RSRC_NFOUND;
+    }
     return VI_SUCCESS;
 }
 
@@ -116,14 +123,18 @@ ViStatus TcpSocket::waitFor(short events, const Deadline &deadline) const
         std::array<pollfd, 2> entries{
             {{m_descriptor, events, 0}, {m_waker.descriptor(), POLLIN, 0}}};
         const int ready = ::poll(entries.data(), entries.size(), deadline.pollMs());
-        if (ready < 0 && errno != EINTR)
+        if (ready < 0 && errno != EINTR) {
             return VI_ERROR_CONN_LOST;
-        if (ready > 0 && (entries[1].revents & POLLIN) != 0)
+        }
+        if (ready > 0 && (entries[1].revents & POLLIN) != 0) {
             return VI_ERROR_ABORT;
-        if (ready > 0 && entries[0].revents != 0)
+        }
+        if (ready > 0 && entries[0].revents != 0) {
             return VI_SUCCESS;
-        if (deadline.isOver())
+        }
+        if (deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
     }
 }
 
@@ -131,22 +142,26 @@ ViStatus TcpSocket::send(std::span<const std::uint8_t> data, const Deadline &dea
                          std::size_t &sent)
 {
     sent = 0;
-    if (!isOpen())
+    if (!isOpen()) {
         return VI_ERROR_CONN_LOST;
+    }
     while (sent < data.size()) {
         const ssize_t count = ::send(m_descriptor, data.data() + sent, data.size() - sent,
                                      MSG_NOSIGNAL | MSG_DONTWAIT);
         if (count >= 0) {
             sent += static_cast<std::size_t>(count);
             // A peer that takes a byte now and then must not hold the call for ever.
-            if (sent < data.size() && deadline.isOver())
+            if (sent < data.size() && deadline.isOver()) {
                 return VI_ERROR_TMO;
+            }
             continue;
         }
-        if (!isTransient(errno))
+        if (!isTransient(errno)) {
             return VI_ERROR_CONN_LOST;
-        if (const ViStatus status = waitFor(POLLOUT, deadline); status != VI_SUCCESS)
+        }
+        if (const ViStatus status = waitFor(POLLOUT, deadline); status != VI_SUCCESS) {
             return status;
+        }
     }
     return VI_SUCCESS;
 }
@@ -155,18 +170,21 @@ ViStatus TcpSocket::receive(std::span<std::uint8_t> buffer, const Deadline &dead
                             std::size_t &received)
 {
     received = 0;
-    if (!isOpen())
+    if (!isOpen()) {
         return VI_ERROR_CONN_LOST;
+    }
     for (;;) {
         const ssize_t count = ::recv(m_descriptor, buffer.data(), buffer.size(), MSG_DONTWAIT);
         if (count > 0) {
             received = static_cast<std::size_t>(count);
             return VI_SUCCESS;
         }
-        if (count == 0 || !isTransient(errno))
+        if (count == 0 || !isTransient(errno)) {
             return VI_ERROR_CONN_LOST;
-        if (const ViStatus status = waitFor(POLLIN, deadline); status != VI_SUCCESS)
+        }
+        if (const ViStatus status = waitFor(POLLIN, deadline); status != VI_SUCCESS) {
             return status;
+        }
     }
 }
 

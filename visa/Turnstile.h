@@ -17,8 +17,9 @@ public:
     {
         std::unique_lock lock(m_mutex);
         while (m_isTaken) {
-            if (deadline.isOver())
+            if (deadline.isOver()) {
                 return false;
+            }
             // Without end in pieces, as the clock has no value for it.
             m_freed.wait_for(lock, std::chrono::milliseconds(deadline.atMost(1000).remainingMs()));
         }

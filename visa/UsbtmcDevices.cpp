@@ -36,8 +36,9 @@ std::optional<UsbtmcDevice> readDevice(const std::string &root, const std::strin
     std::error_code error;
     const fs::path interface =
         fs::canonical(root + "/sys/class/usbmisc/" + node + "/device", error);
-    if (error)
+    if (error) {
         return std::nullopt;
+    }
     const fs::path device = interface.parent_path();
     const auto vendor = readHexadecimal(device / "idVendor");
     const auto product = readHexadecimal(device / "idProduct");
@@ -45,8 +46,9 @@ std::optional<UsbtmcDevice> readDevice(const std::string &root, const std::strin
     UsbtmcDevice result;
     result.name.kind = ResourceKind::Usb;
     result.name.serial = readAttribute(device / "serial");
-    if (!vendor || !product || !number || result.name.serial.empty())
+    if (!vendor || !product || !number || result.name.serial.empty()) {
         return std::nullopt;
+    }
     result.name.vendorId = *vendor;
     result.name.productId = *product;
     result.interface = *number;
@@ -57,8 +59,9 @@ std::optional<UsbtmcDevice> readDevice(const std::string &root, const std::strin
 std::optional<ViUInt16> nodeNumber(const std::string &node)
 {
     constexpr std::string_view Prefix = "usbtmc";
-    if (!node.starts_with(Prefix) || node.starts_with("usbtmc0x"))
+    if (!node.starts_with(Prefix) || node.starts_with("usbtmc0x")) {
         return std::nullopt;
+    }
     return parseNumber(std::string_view(node).substr(Prefix.size()));
 }
 
@@ -71,23 +74,27 @@ std::vector<UsbtmcDevice> findUsbtmcDevices(const std::string &root)
     fs::directory_iterator entry(root + "/sys/class/usbmisc", error);
     for (; !error && entry != fs::directory_iterator(); entry.increment(error)) {
         const std::string node = entry->path().filename().string();
-        if (const auto number = nodeNumber(node))
+        if (const auto number = nodeNumber(node)) {
             nodes.emplace_back(*number, node);
+        }
     }
     std::sort(nodes.begin(), nodes.end());
 
     std::vector<UsbtmcDevice> devices;
     for (const auto &[number, node] : nodes) {
-        if (auto device = readDevice(root, node))
+        if (auto device = readDevice(root, node)) {
             devices.push_back(std::move(*device));
+        }
     }
     std::vector<ResourceName> names;
     names.reserve(devices.size());
-    for (const UsbtmcDevice &device : devices)
+    for (const UsbtmcDevice &device : devices) {
         names.push_back(device.name);
+    }
     for (UsbtmcDevice &device : devices) {
-        if (std::count(names.begin(), names.end(), device.name) > 1)
+        if (std::count(names.begin(), names.end(), device.name) > 1) {
             device.name.usbInterface = device.interface;
+        }
     }
     return devices;
 }
@@ -97,8 +104,9 @@ std::string findUsbtmcPath(const std::vector<UsbtmcDevice> &devices, const Resou
     for (const UsbtmcDevice &device : devices) {
         if (device.name.vendorId == name.vendorId && device.name.productId == name.productId &&
             device.name.serial == name.serial &&
-            name.usbInterface.value_or(device.interface) == device.interface)
+            name.usbInterface.value_or(device.interface) == device.interface) {
             return device.path;
+        }
     }
     return {};
 }

@@ -100,8 +100,9 @@ ViStatus UsbtmcTransport::open(const std::string &devicePath, std::unique_ptr<Us
                                std::unique_ptr<Transport> &transport)
 {
     const int descriptor = kernel->open(devicePath);
-    if (descriptor < 0)
+    if (descriptor < 0) {
         return statusOf(errno);
+    }
     transport.reset(new UsbtmcTransport(descriptor, std::move(kernel)));
     return VI_SUCCESS;
 }
@@ -119,13 +120,15 @@ ViStatus UsbtmcTransport::setTimeout(const Deadline &deadline)
 
 ViStatus UsbtmcTransport::setTerminator(std::optional<std::uint8_t> terminator)
 {
-    if (terminator == m_terminator)
+    if (terminator == m_terminator) {
         return VI_SUCCESS;
+    }
     usbtmc_termchar setting{terminator.value_or('\n'),
                             static_cast<__u8>(terminator.has_value() ? 1 : 0)};
     const ViStatus status = control(USBTMC_IOCTL_CONFIG_TERMCHAR, &setting);
-    if (status == VI_SUCCESS)
+    if (status == VI_SUCCESS) {
         m_terminator = terminator;
+    }
     return status;
 }
 
@@ -138,26 +141,32 @@ ViStatus UsbtmcTransport::write(std::span<const std::uint8_t> data, bool end,
         const auto part = data.subspan(count, std::min(data.size() - count, LargestTransfer));
         __u8 setsEnd = end && count + part.size() == data.size() ? 1 : 0;
         ViStatus status = control(USBTMC_IOCTL_EOM_ENABLE, &setsEnd);
-        if (status == VI_SUCCESS)
+        if (status == VI_SUCCESS) {
             status = setTimeout(deadline);
-        if (status != VI_SUCCESS)
+        }
+        if (status != VI_SUCCESS) {
             return status;
+        }
         const ssize_t written = m_kernel->write(m_descriptor, part.data(), part.size());
         if (written < 0) {
             const int error = errno;
-            if (error == EINTR && !deadline.isOver())
+            if (error == EINTR && !deadline.isOver()) {
                 continue;
+            }
             // Leaves the endpoint ready for the next command; the write has failed either way.
-            if (error == ETIMEDOUT)
+            if (error == ETIMEDOUT) {
                 (void)control(USBTMC_IOCTL_ABORT_BULK_OUT);
+            }
             return error == EINTR ? VI_ERROR_TMO : statusOf(error);
         }
         count += std::min(static_cast<std::size_t>(written), part.size());
         idleWrites = written == 0 ? idleWrites + 1 : 0;
-        if (idleWrites > MostIdleReads)
+        if (idleWrites > MostIdleReads) {
             return VI_ERROR_IO;
-        if (count < data.size() && deadline.isOver())
+        }
+        if (count < data.size() && deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
     }
     return VI_SUCCESS;
 }
@@ -167,53 +176,65 @@ ViStatus UsbtmcTransport::read(std::span<std::uint8_t> buffer, const ReadOptions
 {
     count = 0;
     int idleReads = 0;
-    if (const ViStatus status = setTerminator(options.terminator); status != VI_SUCCESS)
+    if (const ViStatus status = setTerminator(options.terminator); status != VI_SUCCESS) {
         return status;
+    }
     for (;;) {
         const auto part = buffer.subspan(count, std::min(buffer.size() - count, LargestTransfer));
-        if (const ViStatus status = setTimeout(deadline); status != VI_SUCCESS)
+        if (const ViStatus status = setTimeout(deadline); status != VI_SUCCESS) {
             return status;
+        }
         const ssize_t received = m_kernel->read(m_descriptor, part.data(), part.size());
         if (received < 0) {
             const int error = errno;
-            if (error == EINTR && !deadline.isOver())
+            if (error == EINTR && !deadline.isOver()) {
                 continue;
-            if (error == ETIMEDOUT)
+            }
+            if (error == ETIMEDOUT) {
                 (void)control(USBTMC_IOCTL_ABORT_BULK_IN);
+            }
             return error == EINTR ? VI_ERROR_TMO : statusOf(error);
         }
         const std::size_t size = std::min(static_cast<std::size_t>(received), part.size());
         count += size;
         __u8 attributes = 0;
         // Drivers before Linux 4.20 don't tell; a short answer was the last one there.
-        if (control(USBTMC_IOCTL_MSG_IN_ATTR, &attributes) != VI_SUCCESS)
+        if (control(USBTMC_IOCTL_MSG_IN_ATTR, &attributes) != VI_SUCCESS) {
             attributes = size < part.size() ? AttributeEnd : 0;
-        if ((attributes & AttributeEnd) != 0 && options.stopsAtEnd)
+        }
+        if ((attributes & AttributeEnd) != 0 && options.stopsAtEnd) {
             return VI_SUCCESS;
-        if ((attributes & AttributeTerminator) != 0 && options.terminator)
+        }
+        if ((attributes & AttributeTerminator) != 0 && options.terminator) {
             return VI_SUCCESS_TERM_CHAR;
-        if (count == buffer.size())
+        }
+        if (count == buffer.size()) {
             return VI_SUCCESS_MAX_CNT;
+        }
         idleReads = size == 0 ? idleReads + 1 : 0;
-        if (idleReads > MostIdleReads)
+        if (idleReads > MostIdleReads) {
             return VI_ERROR_IO;
-        if (deadline.isOver())
+        }
+        if (deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
     }
 }
 
 ViStatus UsbtmcTransport::clear(const Deadline &deadline)
 {
-    if (const ViStatus status = setTimeout(deadline); status != VI_SUCCESS)
+    if (const ViStatus status = setTimeout(deadline); status != VI_SUCCESS) {
         return status;
+    }
     return control(USBTMC_IOCTL_CLEAR);
 }
 
 ViStatus UsbtmcTransport::controlRemote(ViUInt16 mode, const Deadline &deadline)
 {
     ViStatus status = setTimeout(deadline);
-    if (status != VI_SUCCESS)
+    if (status != VI_SUCCESS) {
         return status;
+    }
     switch (mode) {
     case VI_GPIB_REN_DEASSERT:
         return controlRemoteEnable(false);

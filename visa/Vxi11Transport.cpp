@@ -69,8 +69,9 @@ Vxi11Transport::Vxi11Transport(const Vxi11Address &address)
 
 Vxi11Transport::~Vxi11Transport()
 {
-    if (!m_hasLink || !m_core.isOpen())
+    if (!m_hasLink || !m_core.isOpen()) {
         return;
+    }
     // Waits for the answer, so that who opens the instrument again at once finds it free. An
     // interrupted session does not wait; the end of the connection frees the link then.
     const Deadline deadline = Deadline::after(m_isSilent ? AbortMs : DestroyLinkMs);
@@ -83,10 +84,12 @@ ViStatus Vxi11Transport::open(const Vxi11Address &address, const Deadline &deadl
                               std::unique_ptr<Transport> &transport)
 {
     std::unique_ptr<Vxi11Transport> opened(new Vxi11Transport(address));
-    if (const ViStatus status = opened->connect(deadline); status != VI_SUCCESS)
+    if (const ViStatus status = opened->connect(deadline); status != VI_SUCCESS) {
         return status;
-    if (const ViStatus status = opened->createLink(deadline); status != VI_SUCCESS)
+    }
+    if (const ViStatus status = opened->createLink(deadline); status != VI_SUCCESS) {
         return status;
+    }
     transport = std::move(opened);
     return VI_SUCCESS;
 }
@@ -94,14 +97,16 @@ ViStatus Vxi11Transport::open(const Vxi11Address &address, const Deadline &deadl
 ViStatus Vxi11Transport::connect(const Deadline &deadline)
 {
     if (const ViStatus status = lookUpHost(m_address.host, deadline, m_hostAddresses);
-        status != VI_SUCCESS)
+        status != VI_SUCCESS) {
         return status;
+    }
     std::uint16_t port = m_address.port;
     if (port == 0) {
         const ViStatus status =
             findRpcPort(m_hostAddresses, DEVICE_CORE, DEVICE_CORE_VERSION, m_waker, deadline, port);
-        if (status != VI_SUCCESS)
+        if (status != VI_SUCCESS) {
             return status;
+        }
     }
     return m_core.connect(m_hostAddresses, port, deadline);
 }
@@ -115,8 +120,9 @@ ViStatus Vxi11Transport::createLink(const Deadline &deadline)
     const ViStatus status = m_core.call<Create_LinkParms, Create_LinkResp>(
         coreProcedure(create_link), xdr_Create_LinkParms, arguments, m_address.device.size() + 4,
         reply, deadline);
-    if (status != VI_SUCCESS)
+    if (status != VI_SUCCESS) {
         return status;
+    }
     if (reply->error != DEVICE_ERROR_NONE) {
         const ViStatus refusal = statusOf(reply->error);
         return refusal == VI_ERROR_INV_PARAMETER ? VI_ERROR_RSRC_NFOUND : refusal;
@@ -139,10 +145,12 @@ ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, XdrCode<Arguments> 
         m_core.call<Arguments, Results>(coreProcedure(procedure), encode, arguments, dataSize,
                                         results, deadline.extendedBy(ReplyGraceMs));
     m_isSilent = status == VI_ERROR_TMO;
-    if (status == VI_ERROR_TMO || status == VI_ERROR_ABORT)
+    if (status == VI_ERROR_TMO || status == VI_ERROR_ABORT) {
         abortRunningCall();
-    if (status != VI_SUCCESS)
+    }
+    if (status != VI_SUCCESS) {
         return status;
+    }
     return statusOf(results->error);
 }
 
@@ -165,16 +173,20 @@ ViStatus Vxi11Transport::write(std::span<const std::uint8_t> data, bool end,
         XdrValue<Device_WriteResp> reply(xdr_Device_WriteResp);
         const ViStatus status = callDevice<Device_WriteParms, Device_WriteResp>(
             device_write, xdr_Device_WriteParms, arguments, part.size() + 4, reply, deadline);
-        if (reply->size > part.size())
+        if (reply->size > part.size()) {
             return VI_ERROR_IO;
+        }
         count += reply->size;
-        if (status != VI_SUCCESS)
+        if (status != VI_SUCCESS) {
             return status;
+        }
         idleReplies = reply->size == 0 ? idleReplies + 1 : 0;
-        if (idleReplies > MostIdleReplies)
+        if (idleReplies > MostIdleReplies) {
             return VI_ERROR_IO;
-        if (count < data.size() && deadline.isOver())
+        }
+        if (count < data.size() && deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
     }
     return VI_SUCCESS;
 }
@@ -197,22 +209,29 @@ ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions 
         XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
         const ViStatus status = callDevice<Device_ReadParms, ReadReply>(
             device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
-        if (reply->size > target.size())
+        if (reply->size > target.size()) {
             return VI_ERROR_IO;
+        }
         count += reply->size;
-        if (status != VI_SUCCESS)
+        if (status != VI_SUCCESS) {
             return status;
-        if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd)
+        }
+        if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd) {
             return VI_SUCCESS;
-        if ((reply->reason & DEVICE_REASON_CHR) != 0 && options.terminator)
+        }
+        if ((reply->reason & DEVICE_REASON_CHR) != 0 && options.terminator) {
             return VI_SUCCESS_TERM_CHAR;
-        if (count == buffer.size())
+        }
+        if (count == buffer.size()) {
             return VI_SUCCESS_MAX_CNT;
+        }
         idleReplies = reply->size == 0 ? idleReplies + 1 : 0;
-        if (idleReplies > MostIdleReplies)
+        if (idleReplies > MostIdleReplies) {
             return VI_ERROR_IO;
-        if (deadline.isOver())
+        }
+        if (deadline.isOver()) {
             return VI_ERROR_TMO;
+        }
     }
 }
 
@@ -246,13 +265,15 @@ ViStatus Vxi11Transport::controlRemote(ViUInt16 mode, const Deadline &deadline)
 
 void Vxi11Transport::abortRunningCall()
 {
-    if (m_abortPort == 0 || !m_core.isOpen())
+    if (m_abortPort == 0 || !m_core.isOpen()) {
         return;
+    }
     const Deadline deadline = Deadline::after(AbortMs);
     const Waker ownWaker; // the session's may be what ended the call
     RpcConnection connection(ownWaker);
-    if (connection.connect(m_hostAddresses, m_abortPort, deadline) != VI_SUCCESS)
+    if (connection.connect(m_hostAddresses, m_abortPort, deadline) != VI_SUCCESS) {
         return;
+    }
     const RpcProcedure abort{DEVICE_ASYNC, DEVICE_ASYNC_VERSION, device_abort};
     XdrValue<Device_Error> reply(xdr_Device_Error);
     // The call that was aborted has failed already; that its end could not be told is no news.

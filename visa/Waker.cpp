@@ -13,14 +13,16 @@ Waker::Waker()
 
 Waker::~Waker()
 {
-    if (m_descriptor >= 0)
+    if (m_descriptor >= 0) {
         ::close(m_descriptor);
+    }
 }
 
 void Waker::wake() noexcept
 {
-    if (m_descriptor >= 0)
+    if (m_descriptor >= 0) {
         eventfd_write(m_descriptor, 1);
+    }
 }
 
 } // namespace visa

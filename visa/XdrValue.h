@@ -20,13 +20,15 @@ template <typename T>
 [[nodiscard]] std::optional<std::size_t> encodeXdr(XdrCode<T> *code, T &value,
                                                    std::span<std::uint8_t> buffer)
 {
-    if (buffer.size() > std::numeric_limits<unsigned>::max())
+    if (buffer.size() > std::numeric_limits<unsigned>::max()) {
         return std::nullopt;
+    }
     XDR stream{};
     xdrmem_create(&stream, reinterpret_cast<char *>(buffer.data()),
                   static_cast<unsigned>(buffer.size()), XDR_ENCODE);
-    if (!code(&stream, &value))
+    if (!code(&stream, &value)) {
         return std::nullopt;
+    }
     return std::size_t{xdr_getpos(&stream)};
 }
 
@@ -50,15 +52,17 @@ public:
     [[nodiscard]] bool decode(std::span<const std::uint8_t> bytes)
     {
         release();
-        if (bytes.size() > std::numeric_limits<unsigned>::max())
+        if (bytes.size() > std::numeric_limits<unsigned>::max()) {
             return false;
+        }
         XDR stream{};
         // Decoding only reads, the signature is shared with encoding.
         auto *begin = const_cast<std::uint8_t *>(bytes.data());
         xdrmem_create(&stream, reinterpret_cast<char *>(begin), static_cast<unsigned>(bytes.size()),
                       XDR_DECODE);
-        if (m_code(&stream, &m_value))
+        if (m_code(&stream, &m_value)) {
             return true;
+        }
         // Half a value is worse than none: it may have a length without the bytes.
         release();
         return false;

@@ -14,8 +14,9 @@ ViStatus findRpcPort(const std::vector<HostAddress> &addresses, std::uint32_t pr
 {
     RpcConnection connection(waker);
     ViStatus status = connection.connect(addresses, PMAPPORT, deadline);
-    if (status != VI_SUCCESS)
+    if (status != VI_SUCCESS) {
         return status;
+    }
     const RpcProcedure getPort{PMAPPROG, PMAPVERS, PMAPPROC_GETPORT};
     pmap wanted{};
     wanted.pm_prog = program;
@@ -23,14 +24,18 @@ ViStatus findRpcPort(const std::vector<HostAddress> &addresses, std::uint32_t pr
     wanted.pm_prot = IPPROTO_TCP;
     XdrValue<unsigned> found(xdr_u_int);
     status = connection.call<pmap, unsigned>(getPort, xdr_pmap, wanted, 0, found, deadline);
-    if (status == VI_ERROR_NSUP_OPER)
+    if (status == VI_ERROR_NSUP_OPER) {
         return VI_ERROR_RSRC_NFOUND;
-    if (status != VI_SUCCESS)
+    }
+    if (status != VI_SUCCESS) {
         return status;
-    if (*found == 0)
+    }
+    if (*found == 0) {
         return VI_ERROR_RSRC_NFOUND;
-    if (*found > 0xFFFF)
+    }
+    if (*found > 0xFFFF) {
         return VI_ERROR_IO;
+    }
     port = static_cast<std::uint16_t>(*found);
     return VI_SUCCESS;
 }
