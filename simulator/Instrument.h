@@ -7,7 +7,7 @@
 #include "ErrorQueue.h"
 #include "Faults.h"
 #include "MassMemory.h"
-#include "ModelTable.h"
+#include "modeltable.h"
 #include "StatusRegisters.h"
 
 #include <condition_variable>

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ResourceManager.h"
 #include "Session.h"
-#include "StatusText.h"
+#include "statustext.h"
 #include "visa.h"
 
 #include <cstdio>

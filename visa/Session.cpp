@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Session.h"
 
-#include "FormatText.h"
+#include "formattext.h"
 
 #include <cstring>
 

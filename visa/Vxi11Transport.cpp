@@ -2,7 +2,7 @@
 #include "Vxi11Transport.h"
 
 #include "ReadReply.h"
-#include "portMapper.h"
+#include "portmapper.h"
 
 #include <unistd.h>
 #include <vxi11.h>

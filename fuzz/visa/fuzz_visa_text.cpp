@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
-#include "visa/FormatText.h"
+#include "visa/formattext.h"
 #include "visa/ResourceName.h"
 
 #include <cstdlib>

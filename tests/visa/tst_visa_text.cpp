@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
-#include "visa/FormatText.h"
+#include "visa/formattext.h"
 #include "visa/ResourceName.h"
-#include "visa/StatusText.h"
+#include "visa/statustext.h"
 
 #include <QElapsedTimer>
 #include <QFile>

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "Deadline.h"
-#include "HostLookup.h"
+#include "hostlookup.h"
 #include "Waker.h"
 
 #include <cstdint>

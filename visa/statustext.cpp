@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "StatusText.h"
+#include "statustext.h"
 
 namespace visa {
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "portMapper.h"
+#include "portmapper.h"
 
 #include "RpcConnection.h"
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "HostLookup.h"
+#include "hostlookup.h"
 
 #include <netdb.h>
 

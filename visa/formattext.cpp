@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "FormatText.h"
+#include "formattext.h"
 
 #include <cstddef>
 

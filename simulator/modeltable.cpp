@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "ModelTable.h"
+#include "modeltable.h"
 
 #include <algorithm>
 #include <array>
