@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Resample.h"
 
+#include "windows.h"
+
 #include "LoopedInput.h"
 #include "TapGeometry.h"
 #include "base/ProgressClock.h"
@@ -281,6 +283,15 @@ void Resample::setFilterLength(int length)
     m_settings.length = length;
 }
 
+bool Resample::configure(const FilterSettings &settings)
+{
+    if (settings.window < 0 || settings.window >= NamedWindowCount) {
+        return false;
+    }
+    m_settings = settings;
+    return true;
+}
+
 bool Resample::setFilterType(int kind, double parameter)
 {
     if (kind < 0 || kind > static_cast<int>(FilterKind::Custom)) {
@@ -293,7 +304,7 @@ bool Resample::setFilterType(int kind, double parameter)
 
 bool Resample::setWindowType(int kind)
 {
-    if (kind < 0 || kind > 6) {
+    if (kind < 0 || kind >= NamedWindowCount) {
         return false;
     }
     m_settings.window = kind;

@@ -33,6 +33,9 @@ class Resample : public QObject
 public:
     explicit Resample(QObject *parent = nullptr);
 
+    /// Sets the whole filter. False, without a change, if its window isn't 0 to 6.
+    [[nodiscard]] bool configure(const FilterSettings &settings);
+
     /// The sample rate of the input and the filter's edge, in the same unit. A Gauss filter takes
     /// no edge. The gain isn't corrected: an edge below half the rate raises the level.
     void setFilterFrequency(double rate, double cutoff);

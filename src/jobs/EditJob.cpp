@@ -3,8 +3,10 @@
 
 #include "ReportText.h"
 
+#include "dsp/Resample.h"
 #include "log/Tracer.h"
 
+#include <cmath>
 #include <utility>
 
 EditJob::EditJob(const QString &inputFile, OutputOptions output, Reading reading, QObject *parent)
@@ -17,8 +19,8 @@ EditJob::EditJob(const QString &inputFile, OutputOptions output, Reading reading
 
 bool EditJob::work()
 {
-    if (m_output.fileName().isEmpty()) {
-        return refuse(emptyFileNameText());
+    if (const QString reason = refusal(); !reason.isEmpty()) {
+        return refuse(reason);
     }
     if (!read()) {
         return false;
@@ -42,13 +44,40 @@ bool EditJob::read()
     return false;
 }
 
+QString EditJob::refusal() const
+{
+    return m_output.fileName().isEmpty() ? emptyFileNameText() : QString();
+}
+
+bool EditJob::rescaleToSourcePeak(BufferedIO &data, int samples, double peakOffset,
+                                  double rmsOffset)
+{
+    WvWriteJob &record = m_output.record();
+    const double change = peakOffset - source().info().peakOffset;
+    Resample scaler;
+    const JobStep step(*this, "Rescaling...", scaler);
+    if (!scaler.rescale(samples, std::pow(10.0, change / 20), &data) || isCancelled()) {
+        return Tracer::fail("Rescaling of the waveform failed.");
+    }
+    record.peakOffset = source().info().peakOffset;
+    record.rmsOffset = rmsOffset - change;
+    return true;
+}
+
 void EditJob::reportSource()
 {
     reportAll(waveformRows(m_inputFile, source().writeJob()));
 }
 
-bool EditJob::stopWith(const QString &reportText, const QString &logText)
+std::optional<double> EditJob::clockOr(std::optional<double> wantedHz)
 {
-    setFailureText(reportText);
-    return Tracer::fail(logText);
+    const double clockHz = wantedHz.value_or(source().info().clock);
+    if (!(clockHz > 0)) {
+        Tracer::Trace(Tracer::Error,
+                      QString("The waveform \"%1\" states no clock rate. Give the clock rate of "
+                              "the result.")
+                          .arg(m_inputFile));
+        return std::nullopt;
+    }
+    return clockHz;
 }

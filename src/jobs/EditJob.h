@@ -5,6 +5,8 @@
 #include "ToolJob.h"
 #include "WaveformOutput.h"
 
+#include <optional>
+
 /// The road of the tools that make one waveform out of another: source, work, output. Reads the
 /// source; the derived job works on it in edit() and saves its output there.
 class EditJob : public ToolJob
@@ -23,7 +25,11 @@ public:
     void useSource(SourceWaveform &loaded) { m_loaded = &loaded; }
 
 protected:
-    /// Makes and saves the result. An empty output name has been refused; the source has been read;
+    /// Why the request can't be met whatever the source holds, such as an empty output name; empty
+    /// if it may. Asked before the source is read.
+    [[nodiscard]] virtual QString refusal() const;
+
+    /// Makes and saves the result. The request has not been refused; the source has been read;
     /// the record of the output holds what the source says: type, clock, sample count, measured
     /// levels, comment, copyright.
     [[nodiscard]] virtual bool edit() = 0;
@@ -35,8 +41,15 @@ protected:
     /// Reports file, clock, samples and levels of the source.
     void reportSource();
 
-    /// Ends with another last line than usual, and the reason in the log.
-    [[nodiscard]] bool stopWith(const QString &reportText, const QString &logText);
+    /// Brings `samples` samples of a stream to the peak level of the source, as a step
+    /// "Rescaling...", and sets the level offsets of the output. The arguments are the offsets (dB)
+    /// that the stream has now.
+    [[nodiscard]] bool rescaleToSourcePeak(BufferedIO &data, int samples, double peakOffset,
+                                           double rmsOffset);
+
+    /// The clock (Hz) for the file to be written: the one wanted, else that of the source. Nothing,
+    /// with the reason logged, if neither is stated.
+    [[nodiscard]] std::optional<double> clockOr(std::optional<double> wantedHz);
 
 private:
     [[nodiscard]] bool work() final;

@@ -5,7 +5,6 @@
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
 
-#include <cmath>
 #include <utility>
 
 void ResampleTarget::follow(double sourceClockHz, qint64 sourceSamples)
@@ -90,17 +89,12 @@ bool ResampleJob::convert()
 bool ResampleJob::rescale()
 {
     emit report(ReportLine::heading("Rescaling to same peak level"));
-    WvWriteJob &record = output().record();
-    const double change = m_runPeakOffset - record.peakOffset;
-    Resample scaler;
-    const JobStep step(*this, "Rescaling...", scaler);
-    if (!scaler.rescale(static_cast<int>(m_request.target.samples), std::pow(10.0, change / 20),
-                        m_data.stream()) ||
-        isCancelled()) {
-        return stopWith("Rescaling failed", "Rescaling of the waveform failed.");
+    if (!rescaleToSourcePeak(*m_data.stream(), static_cast<int>(m_request.target.samples),
+                             m_runPeakOffset, m_runRmsOffset)) {
+        setFailureText("Rescaling failed");
+        return false;
     }
     output().setLength(m_request.target.clockHz, m_request.target.samples);
-    record.rmsOffset = m_runRmsOffset - change;
     return true;
 }
 

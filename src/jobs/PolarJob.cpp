@@ -1,0 +1,82 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "PolarJob.h"
+
+#include "RangeMeter.h"
+
+#include "dsp/Resample.h"
+#include "log/Tracer.h"
+
+#include <utility>
+
+PolarJob::PolarJob(PolarRequest request, QObject *parent)
+    : EditJob(request.inputFile, request.phase, Reading::Reported, parent)
+    , m_request(std::move(request))
+    , m_amplitudeOutput(*this, m_request.amplitude)
+{
+    setEnding({"Plar conversion completed", "Polar conversion failed"});
+}
+
+QString PolarJob::refusal() const
+{
+    if (m_request.offset + m_request.gain > 1.0 || m_request.offset - m_request.gain < -1.0) {
+        return "Invalid amplitude level settings.";
+    }
+    if (m_request.phase.fileName.isEmpty()) {
+        return "Output file name for phase is empty.";
+    }
+    if (m_request.amplitude.fileName.isEmpty()) {
+        return "Output file name for amplitude is empty.";
+    }
+    return {};
+}
+
+bool PolarJob::edit()
+{
+    const std::optional<double> clock = clockOr(m_request.clockHz);
+    if (!clock) {
+        return false;
+    }
+    reportSource();
+    output().setLength(*clock, source().info().samples);
+    m_amplitudeOutput.record() = output().record();
+    return split() && save(output(), *m_phase.stream(), "Phase") &&
+           save(m_amplitudeOutput, *m_amplitude.stream(), "Amplitude");
+}
+
+bool PolarJob::split()
+{
+    const int samples = source().info().samples;
+    emit report(ReportLine::heading("Converting"));
+    emit report(
+        ReportLine::row("IN-samples", QString::number(samples), ReportLine::LabelWidth + 1));
+    if (!m_phase.open()) {
+        return Tracer::fail("Cannot create temporary data buffer for phase data.");
+    }
+    if (!m_amplitude.open()) {
+        return Tracer::fail("Cannot create temporary data buffer for amplitude data.");
+    }
+    Resample splitter;
+    const JobStep step(*this, "Converting...", splitter);
+    return (splitter.polarSplit(samples, source().data(), m_phase.stream(), m_amplitude.stream(),
+                                m_request.offset, m_request.gain) &&
+            !isCancelled()) ||
+           Tracer::fail("Polar conversion of the waveform failed.");
+}
+
+bool PolarJob::save(WaveformOutput &file, BufferedIO &data, const QString &part)
+{
+    const int samples = source().info().samples;
+    {
+        RangeMeter meter;
+        const JobStep step(*this, "Calculating...", meter);
+        const std::optional<LevelSums> levels = meter.measure(data, 0, samples);
+        if (!levels) {
+            return false;
+        }
+        file.setLevels(levels->peakLevel(), levels->rmsLevel(samples));
+    }
+    emit report(ReportLine::heading("Saving " + part));
+    file.reportWaveform();
+    const WvStreams streams{&data, source().markers(), source().tags()};
+    return file.save(streams, QString("Saving %1 File...").arg(part));
+}
