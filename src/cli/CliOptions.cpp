@@ -100,6 +100,11 @@ CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional
     return addParsed(command, name, range, false, help, [&value](double v) { value = v; });
 }
 
+qint64 takeInteger(const std::string &name, const std::string &text, const NumberRange &range)
+{
+    return static_cast<qint64>(parse(name, text, range, true));
+}
+
 CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<qint64> &value,
                         const NumberRange &range, const std::string &help)
 {
@@ -150,8 +155,13 @@ CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string 
 
 void addOutputArguments(CLI::App &command, OutputArguments &arguments)
 {
+    addOutputFile(command, arguments.options.fileName, "Waveform file to write")->required();
+    addOutputTexts(command, arguments);
+}
+
+void addOutputTexts(CLI::App &command, OutputArguments &arguments)
+{
     OutputOptions &options = arguments.options;
-    addOutputFile(command, options.fileName, "Waveform file to write")->required();
     const auto addTag = [&](const std::string &name, std::optional<QString> &tag,
                             const std::string &help) {
         command

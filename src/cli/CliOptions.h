@@ -31,6 +31,11 @@ CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional
 CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<qint64> &value,
                         const NumberRange &range, const std::string &help);
 
+/// The whole number in the text of an option; an error of the parser names the option, the value
+/// and what is permitted.
+[[nodiscard]] qint64 takeInteger(const std::string &name, const std::string &text,
+                                 const NumberRange &range);
+
 /// As above, for a number of which only whole values make sense.
 CLI::Option *addInteger(CLI::App &command, const std::string &name, std::optional<double> &value,
                         const NumberRange &range, const std::string &help);
@@ -53,6 +58,9 @@ struct OutputArguments
     bool force = false;
 };
 void addOutputArguments(CLI::App &command, OutputArguments &arguments);
+
+/// The same without the file name, for commands that name their files otherwise.
+void addOutputTexts(CLI::App &command, OutputArguments &arguments);
 
 /// Whether the file may be written: it isn't there, or `force` is set. A folder never may. Logs the
 /// reason if not.

@@ -19,14 +19,25 @@ void addRange(CLI::App &command, SampleRange &range)
                "Number of samples (default: up to the end)");
 }
 
-bool rangeFits(Console &console, const SampleRange &range, int &exitCode)
+std::optional<WvFileSummary> scanned(const QString &fileName)
 {
     WvFileSummary summary;
-    if ((!range.from && !range.count) || !QFile::exists(range.fileName) ||
-        !HvFileIO().readWaveformInfo(range.fileName, &summary) || summary.samples < 1) {
+    if (!QFile::exists(fileName) || !HvFileIO().readWaveformInfo(fileName, &summary)) {
+        return std::nullopt;
+    }
+    return summary;
+}
+
+bool rangeFits(Console &console, const SampleRange &range, int &exitCode)
+{
+    if (!range.from && !range.count) {
         return true;
     }
-    const QString problem = rangeProblem(range, summary.samples);
+    const std::optional<WvFileSummary> summary = scanned(range.fileName);
+    if (!summary || summary->samples < 1) {
+        return true;
+    }
+    const QString problem = rangeProblem(range, summary->samples);
     if (!problem.isEmpty()) {
         exitCode = console.wrongUsage(problem);
     }

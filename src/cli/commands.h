@@ -20,5 +20,7 @@ void addFileCommands(CommandSet &commands);
 void addPlotCommand(CommandSet &commands);
 void addCreateCommands(CommandSet &commands);
 void addEditCommands(CommandSet &commands);
+void addFilterCommands(CommandSet &commands);
+void addMarkerCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);

@@ -92,6 +92,8 @@ int run(int argc, char **argv)
     addPlotCommand(commands);
     addCreateCommands(commands);
     addEditCommands(commands);
+    addFilterCommands(commands);
+    addMarkerCommands(commands);
     addImportCommands(commands);
     addInstrumentCommands(commands);
     try {
