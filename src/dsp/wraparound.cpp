@@ -5,6 +5,7 @@
 #include "windows.h"
 
 #include <cstddef>
+#include <numeric>
 
 namespace {
 
@@ -39,4 +40,11 @@ Joint smoothedJoint(std::span<const std::complex<double>> joint, double cutoff, 
         edge[i] += faded[i];
     }
     return result;
+}
+
+double jointGain(double cutoff)
+{
+    const std::vector<double> taps = sincFir(TapCount, cutoff);
+    constexpr double FadeInTop = 2;
+    return FadeInTop * std::accumulate(taps.begin(), taps.end(), 0.0) / TapCount;
 }

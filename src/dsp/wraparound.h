@@ -18,3 +18,6 @@ using Joint = std::vector<std::complex<double>>;
 /// to JointHalf - 31.
 [[nodiscard]] Joint smoothedJoint(std::span<const std::complex<double>> joint, double cutoff,
                                   int range);
+
+/// The level of a slow signal at the joint point after smoothedJoint, as a part of what it was.
+[[nodiscard]] double jointGain(double cutoff);

@@ -7,6 +7,7 @@
 #include "streams/samplestream.h"
 
 #include <algorithm>
+#include <cmath>
 #include <utility>
 #include <vector>
 
@@ -123,6 +124,12 @@ bool WrapJob::edit()
     emit report(ReportLine::plain("Corrected Waveform"));
     reportRow("Peak/RMS", record.rmsOffset - record.peakOffset);
     reportRow("Peak Offset", record.peakOffset);
+    if (const double change = -levelOffset(jointGain(cutoff)); std::abs(change) > 1) {
+        emit report(ReportLine::warning(
+            QString("The correction changes the level at the loop point by %1 dB. A lower cutoff "
+                    "frequency and a smaller correction range change less.")
+                .arg(change, 0, 'f', 1)));
+    }
     emit report(ReportLine::plain("Creating waveform..."));
     emit report(ReportLine::heading("Saving"));
     output().reportFile();
