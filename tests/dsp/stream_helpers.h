@@ -1,36 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "log/Tracer.h"
 #include "streams/TempStream.h"
+#include "support/logreader.h"
+#include "support/seed.h"
 
 #include <QIODevice>
-#include <QStringList>
 
 #include <algorithm>
-#include <cmath>
 #include <complex>
 #include <cstring>
 #include <limits>
-#include <random>
 #include <vector>
 
 using Samples = std::vector<std::complex<float>>;
-
-/// Samples spread evenly over the unit square, the same for a seed on every machine.
-inline Samples randomSamples(int count, unsigned seed = 1)
-{
-    std::mt19937 generator(seed);
-    Samples samples(static_cast<size_t>(count));
-    for (std::complex<float> &sample : samples) {
-        const auto draw = [&generator] {
-            return static_cast<float>(generator()) / 2147483648.0F - 1.0F;
-        };
-        const float inPhase = draw();
-        sample = {inPhase, draw()};
-    }
-    return samples;
-}
 
 [[nodiscard]] inline bool writeStream(BufferedIO &stream, const Samples &samples)
 {
@@ -48,18 +31,6 @@ inline Samples randomSamples(int count, unsigned seed = 1)
     Samples samples(static_cast<size_t>((stream.deviceSize() - 3) / 8));
     const int bytes = static_cast<int>(samples.size() * 8);
     return stream.readBlock(bytes, samples.data()) == bytes ? samples : Samples{};
-}
-
-/// The messages since the last call, without their time stamps, of the levels in the mask.
-[[nodiscard]] inline QStringList takeMessages(int levels = Tracer::Error | Tracer::Warning)
-{
-    QStringList texts;
-    for (const Tracer::Entry &entry : Tracer::takeEntries()) {
-        if ((entry.second & levels) != 0) {
-            texts << entry.first.mid(entry.first.indexOf("  ") + 2);
-        }
-    }
-    return texts;
 }
 
 /// The 16-bit word of a file for a sample of a stream.

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dsp/CreateSignal.h"
+#include "support/rows.h"
 
 #include "dsp/Resample.h"
 #include "literal_resample.h"
@@ -15,13 +16,11 @@ std::vector<Case> functionCases()
     std::vector<Case> cases;
     const char *names[] = {"sine", "square", "triangular", "sawtooth"};
     for (int kind = 0; kind < 4; ++kind) {
-        cases.push_back(functionCase(names[kind], {static_cast<FunctionKind>(kind), 10000, 0.707,
-                                                   0.707, 0, 0, 90, false, 100}));
         cases.push_back(functionCase(names[kind], {static_cast<FunctionKind>(kind), 333, 1.0, 0.5,
                                                    -0.25, 0.5, -137.5, true, 99991}));
-        cases.push_back(functionCase(
-            names[kind], {static_cast<FunctionKind>(kind), 1000, 0.5, 1.0, 0.5, 0, 180, true, 12}));
     }
+    cases.push_back(functionCase("sawtooth, 12",
+                                 {FunctionKind::Sawtooth, 1000, 0.5, 1.0, 0.5, 0, 180, true, 12}));
     cases.push_back(functionCase("sine, repeated", {FunctionKind::Sine, 1e6}));
     return cases;
 }
@@ -30,7 +29,6 @@ std::vector<Case> allCases()
 {
     std::vector<Case> cases = functionCases();
     cases.push_back(fmCase("fm", {FmKind::SingleTone, 1000, 10000, 0, 0}));
-    cases.push_back(fmCase("fm, long", {FmKind::SingleTone, 100, 24999900, 0, 0}));
     cases.push_back(fmCase("fm, fraction", {FmKind::SingleTone, 1000.7, 10000.2, 0, 0}));
     cases.push_back(fmCase("fm, two tones", {FmKind::TwoTone, 1000, 10000, 2500, 33300}));
     const char *amNames[] = {"am",    "lsb",     "usb",    "lsb+c",
@@ -38,9 +36,7 @@ std::vector<Case> allCases()
     for (int kind = 0; kind < 8; ++kind) {
         cases.push_back(amCase(amNames[kind], {static_cast<AmKind>(kind), 10000, 83, 15000, 47}));
     }
-    cases.push_back(amCase("2-tone, long", {AmKind::TwoTone, 100007, 100, 150013, 100}));
     cases.push_back(sweepCase("sweep", {SweepKind::Linear, 1e5, 0.01, 0, 360}));
-    cases.push_back(sweepCase("sweep, long", {SweepKind::Linear, 12.5e6, 0.01, 0, 360}));
     cases.push_back(sweepCase("sweep, sine", {SweepKind::Sine, 1e5, 0.02, -45, 720}));
     cases.push_back(sweepCase("sweep, triangular", {SweepKind::Triangular, 1e5, 0.02, -360, 500}));
     const auto pmCase = [](const char *name, const PmSettings &s) {
@@ -51,11 +47,9 @@ std::vector<Case> allCases()
     cases.push_back(carrierCase("carriers", {10000, 100, 0, true}));
     cases.push_back(carrierCase("carriers, in phase", {10000, 101, 0.25, false}));
     cases.push_back(carrierCase("carriers, one row", {100000, 128, 0, true}));
-    cases.push_back(carrierCase("carriers, rows", {5000, 1000, -0.125, true}));
     cases.push_back(carrierCase("one carrier", {10000, 2, 0, true}));
     cases.push_back(pulseCase("pulse", {1e-5, 1e-4, 1e-5, 1e-4, RampKind::Linear, 1e-7}));
     cases.push_back(pulseCase("pulse, cosine", {1e-5, 0, 2e-4, 0, RampKind::RaisedCosine, 1e-8}));
-    cases.push_back(pulseCase("pulse, no ramps", {0, 1e-4, 0, 1e-4, RampKind::Linear, 1e-7}));
     cases.push_back(chirpCase("chirp", {{1e-5, 1e-4, 1e-5, 1e-4, RampKind::Linear, 1e-7}, 1e6}));
     cases.push_back(
         chirpCase("chirp, cosine", {{1e-3, 4e-3, 2e-3, 1e-3, RampKind::RaisedCosine, 1e-7}, 2e7}));
@@ -69,76 +63,90 @@ class TestCreateSignal : public QObject
     Q_OBJECT
 
 private slots:
-    void init() { (void)Tracer::takeEntries(); }
-    void wordsEqualLiteral_data();
+    void init() { (void)takeMessages(); }
     void wordsEqualLiteral();
+    void refusals();
     void manyCarriersEqualLiteral();
-    void noiseEqualsLiteral_data();
     void noiseEqualsLiteral();
     void shortSignalsRepeat();
-    void orderOfCalls();
-    void unknownKinds();
     void seeds();
-    void cancel_data();
     void cancel();
     void fullDisk();
-
-private:
-    void compare(const Case &test);
 };
-
-void TestCreateSignal::wordsEqualLiteral_data()
-{
-    QTest::addColumn<int>("index");
-    const std::vector<Case> cases = allCases();
-    for (size_t i = 0; i < cases.size(); ++i) {
-        QTest::addRow("%s #%d", cases[i].name, static_cast<int>(i)) << static_cast<int>(i);
-    }
-}
 
 void TestCreateSignal::wordsEqualLiteral()
 {
-    QFETCH(int, index);
-    compare(allCases()[static_cast<size_t>(index)]);
+    constexpr unsigned seed = 4711;
+    forRows(allCases(), [&](const Case &test) {
+        TempStream stream;
+        QVERIFY(stream.open());
+        CreateSignal signal;
+        signal.setSeed(seed);
+        signal.setSignalType(test.type);
+        QVERIFY(test.configure(signal));
+        signal.setOutput(stream.stream());
+        QVERIFY(signal.generate());
+        int written = 0;
+        double rms = 0;
+        double peak = 0;
+        QVERIFY(signal.statistics(&written, &rms, &peak));
+        const Samples samples = readStream(*stream.stream());
+        QCOMPARE(samples.size(), static_cast<size_t>(written));
+
+        std::srand(seed);
+        const Literal::Vectors expected = test.literal(ClockLimits{});
+        QCOMPARE(expected.size(), static_cast<size_t>(signal.sampleCount()));
+        double literalPeak = 0;
+        double literalSum = 0;
+        const auto gain = static_cast<float>(1 / peak);
+        for (size_t i = 0; i < samples.size(); ++i) {
+            const std::complex<double> vector = expected[i % expected.size()];
+            literalPeak = std::max(literalPeak, std::norm(vector));
+            literalSum += std::norm(vector);
+            const std::complex<float> sample(vector);
+            const bool same =
+                fileWord(samples[i].real()) == fileWord(sample.real()) &&
+                fileWord(samples[i].imag()) == fileWord(sample.imag()) &&
+                fileWord(samples[i].real() * gain) == fileWord(sample.real() * gain) &&
+                fileWord(samples[i].imag() * gain) == fileWord(sample.imag() * gain);
+            QVERIFY2(same, qPrintable(QString("sample %1").arg(i)));
+        }
+        QVERIFY(std::abs(peak - std::sqrt(literalPeak)) < 1e-12);
+        QVERIFY(std::abs(rms - std::sqrt(literalSum / written)) < 1e-12);
+    });
 }
 
-void TestCreateSignal::compare(const Case &test)
+void TestCreateSignal::refusals()
 {
-    constexpr unsigned seed = 4711;
     TempStream stream;
     QVERIFY(stream.open());
     CreateSignal signal;
-    signal.setSeed(seed);
-    signal.setSignalType(test.type);
-    QVERIFY(test.configure(signal));
-    signal.setOutput(stream.stream());
-    QVERIFY(signal.generate());
     int written = 0;
     double rms = 0;
     double peak = 0;
+    QVERIFY(!signal.generate());
+    signal.setOutput(stream.stream());
+    QVERIFY(!signal.generate());
+    QCOMPARE(takeMessages(),
+             (QStringList{"*** No output device set.", "*** Waveform not yet configured."}));
+    QVERIFY(signal.configureFunction({}));
+    QVERIFY(!signal.statistics(&written, &rms, &peak));
+    QVERIFY(signal.generate());
     QVERIFY(signal.statistics(&written, &rms, &peak));
-    const Samples samples = readStream(*stream.stream());
-    QCOMPARE(samples.size(), static_cast<size_t>(written));
-
-    std::srand(seed);
-    const Literal::Vectors expected = test.literal(ClockLimits{});
-    QCOMPARE(expected.size(), static_cast<size_t>(signal.sampleCount()));
-    double literalPeak = 0;
-    double literalSum = 0;
-    const auto gain = static_cast<float>(1 / peak);
-    for (size_t i = 0; i < samples.size(); ++i) {
-        const std::complex<double> vector = expected[i % expected.size()];
-        literalPeak = std::max(literalPeak, std::norm(vector));
-        literalSum += std::norm(vector);
-        const std::complex<float> sample(vector);
-        const bool same = fileWord(samples[i].real()) == fileWord(sample.real()) &&
-                          fileWord(samples[i].imag()) == fileWord(sample.imag()) &&
-                          fileWord(samples[i].real() * gain) == fileWord(sample.real() * gain) &&
-                          fileWord(samples[i].imag() * gain) == fileWord(sample.imag() * gain);
-        QVERIFY2(same, qPrintable(QString("sample %1").arg(i)));
-    }
-    QVERIFY(std::abs(peak - std::sqrt(literalPeak)) < 1e-12);
-    QVERIFY(std::abs(rms - std::sqrt(literalSum / written)) < 1e-12);
+    // A failed configuration takes the old one away, and so does another kind.
+    QVERIFY(!signal.configureFunction({.frequency = 99e6}));
+    QVERIFY(!signal.statistics(&written, &rms, &peak));
+    QCOMPARE(signal.clockRate(), 0.0);
+    QVERIFY(signal.configureFunction({}));
+    signal.setSignalType(SignalType::Function);
+    QVERIFY(!signal.generate());
+    (void)takeMessages();
+    QVERIFY(signal.configureFunction({.kind = static_cast<FunctionKind>(4)}));
+    QVERIFY(!signal.generate());
+    signal.setSignalType(SignalType::Fm);
+    QVERIFY(!signal.configureFm({.kind = static_cast<FmKind>(2)}));
+    QCOMPARE(takeMessages(),
+             (QStringList{"*** Invalid signal type.", "Invalid FM configuration."}));
 }
 
 void TestCreateSignal::manyCarriersEqualLiteral()
@@ -174,56 +182,49 @@ void TestCreateSignal::manyCarriersEqualLiteral()
     }
 }
 
-void TestCreateSignal::noiseEqualsLiteral_data()
-{
-    QTest::addColumn<int>("kind");
-    QTest::newRow("white") << 0;
-    QTest::newRow("pink") << 1;
-    QTest::newRow("brown") << 2;
-}
-
 void TestCreateSignal::noiseEqualsLiteral()
 {
-    QFETCH(int, kind);
-    const NoiseSettings settings{static_cast<NoiseKind>(kind), 1e6, 0.01};
-    TempStream stream;
-    QVERIFY(stream.open());
-    CreateSignal signal;
-    signal.setSeed(7);
-    signal.setSignalType(SignalType::Noise);
-    QVERIFY(signal.configureNoise(settings));
-    QCOMPARE(signal.sampleCount(), 15000);
-    QCOMPARE(signal.clockRate(), 1.5e6);
-    signal.setOutput(stream.stream());
-    QVERIFY(signal.generate());
-    int written = 0;
-    double rms = 0;
-    double peak = 0;
-    QVERIFY(signal.statistics(&written, &rms, &peak));
-    QCOMPARE(written, 15000);
+    forRows({{"white", 0}, {"pink", 1}, {"brown", 2}}, [&](int kind) {
+        const NoiseSettings settings{static_cast<NoiseKind>(kind), 1e6, 0.01};
+        TempStream stream;
+        QVERIFY(stream.open());
+        CreateSignal signal;
+        signal.setSeed(7);
+        signal.setSignalType(SignalType::Noise);
+        QVERIFY(signal.configureNoise(settings));
+        QCOMPARE(signal.sampleCount(), 15000);
+        QCOMPARE(signal.clockRate(), 1.5e6);
+        signal.setOutput(stream.stream());
+        QVERIFY(signal.generate());
+        int written = 0;
+        double rms = 0;
+        double peak = 0;
+        QVERIFY(signal.statistics(&written, &rms, &peak));
+        QCOMPARE(written, 15000);
 
-    std::srand(7);
-    Samples raw;
-    for (const std::complex<double> &value :
-         Literal::noise(settings, *fitNoise(settings, ClockLimits{}))) {
-        raw.emplace_back(value);
-    }
-    const auto expected =
-        literalResample({.length = 101, .rate = 1.5e6, .cutoff = 0.5e6}, raw, 15000);
-    const Samples samples = readStream(*stream.stream());
-    QCOMPARE(samples.size(), size_t{15000});
-    double highest = 0;
-    double sum = 0;
-    for (size_t i = 0; i < samples.size(); ++i) {
-        // Brown noise goes beyond full scale before it is scaled.
-        QVERIFY(std::abs(std::complex<double>(samples[i]) - (*expected)[i]) <
-                3e-6 * std::max(1.0, peak));
-        highest = std::max(highest, std::norm((*expected)[i]));
-        sum += std::norm((*expected)[i]);
-    }
-    // The level of the filtered noise, not of what went in.
-    QVERIFY(std::abs(peak - std::sqrt(highest)) < 3e-6 * std::max(1.0, peak));
-    QVERIFY(std::abs(rms - std::sqrt(sum / 15000)) < 1e-6);
+        std::srand(7);
+        Samples raw;
+        for (const std::complex<double> &value :
+             Literal::noise(settings, *fitNoise(settings, ClockLimits{}))) {
+            raw.emplace_back(value);
+        }
+        const auto expected =
+            literalResample({.length = 101, .rate = 1.5e6, .cutoff = 0.5e6}, raw, 15000);
+        const Samples samples = readStream(*stream.stream());
+        QCOMPARE(samples.size(), size_t{15000});
+        double highest = 0;
+        double sum = 0;
+        for (size_t i = 0; i < samples.size(); ++i) {
+            // Brown noise goes beyond full scale before it is scaled.
+            QVERIFY(std::abs(std::complex<double>(samples[i]) - (*expected)[i]) <
+                    3e-6 * std::max(1.0, peak));
+            highest = std::max(highest, std::norm((*expected)[i]));
+            sum += std::norm((*expected)[i]);
+        }
+        // The level of the filtered noise, not of what went in.
+        QVERIFY(std::abs(peak - std::sqrt(highest)) < 3e-6 * std::max(1.0, peak));
+        QVERIFY(std::abs(rms - std::sqrt(sum / 15000)) < 1e-6);
+    });
 }
 
 void TestCreateSignal::shortSignalsRepeat()
@@ -253,56 +254,6 @@ void TestCreateSignal::shortSignalsRepeat()
     QCOMPARE(peak, 1.0);
 }
 
-void TestCreateSignal::orderOfCalls()
-{
-    TempStream stream;
-    QVERIFY(stream.open());
-    CreateSignal signal;
-    int written = 0;
-    double rms = 0;
-    double peak = 0;
-    signal.setOutput(nullptr);
-    QVERIFY(!signal.generate());
-    signal.setOutput(stream.stream());
-    signal.setOutput(nullptr); // leaves the stream
-    QVERIFY(!signal.generate());
-    QCOMPARE(takeMessages(),
-             (QStringList{"*** No output device set.", "*** Waveform not yet configured."}));
-    QVERIFY(signal.configureFunction({}));
-    QVERIFY(!signal.statistics(&written, &rms, &peak));
-    QVERIFY(signal.generate());
-    QVERIFY(signal.statistics(&written, &rms, &peak));
-    QVERIFY(!signal.statistics(nullptr, &rms, &peak));
-    // A failed configuration takes the old one away.
-    QVERIFY(!signal.configureFunction({.frequency = 99e6}));
-    QVERIFY(!signal.statistics(&written, &rms, &peak));
-    QCOMPARE(signal.clockRate(), 0.0);
-    QVERIFY(signal.configureFunction({}));
-    signal.setSignalType(SignalType::Function);
-    QVERIFY(!signal.generate());
-}
-
-void TestCreateSignal::unknownKinds()
-{
-    TempStream stream;
-    QVERIFY(stream.open());
-    CreateSignal signal;
-    signal.setOutput(stream.stream());
-    QVERIFY(signal.configureFunction({.kind = static_cast<FunctionKind>(4)}));
-    QVERIFY(!signal.generate());
-    signal.setSignalType(static_cast<SignalType>(8));
-    QVERIFY(signal.configureFunction({}));
-    QVERIFY(!signal.generate());
-    signal.setSignalType(SignalType::Am);
-    QVERIFY(signal.configureAm({.kind = static_cast<AmKind>(8)}));
-    QVERIFY(!signal.generate());
-    signal.setSignalType(SignalType::Fm);
-    QVERIFY(!signal.configureFm({.kind = static_cast<FmKind>(2)}));
-    QCOMPARE(takeMessages(),
-             (QStringList{"*** Invalid signal type.", "*** Invalid signal type.",
-                          "*** Invalid AM signal type.", "Invalid FM configuration."}));
-}
-
 void TestCreateSignal::seeds()
 {
     const auto make = [](std::optional<unsigned> seed, bool noise) {
@@ -325,45 +276,39 @@ void TestCreateSignal::seeds()
     }
 }
 
-void TestCreateSignal::cancel_data()
-{
-    QTest::addColumn<int>("type");
-    QTest::newRow("function") << 0;
-    QTest::newRow("multi carrier") << 1;
-}
-
 void TestCreateSignal::cancel()
 {
-    QFETCH(int, type);
-    // As many samples as can be asked for: nobody waits for their end.
-    EndlessDevice device;
-    BufferedIO stream;
-    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
-    CreateSignal signal;
-    signal.setMaxClock(1e12);
-    signal.setSignalType(static_cast<SignalType>(type));
-    QVERIFY(type == 0
-                ? signal.configureFunction(
-                      {.frequency = 1, .customOversampling = true, .oversampling = 0x7fffffff})
-                : signal.configureMultiCarrier({.spacing = 1, .carriers = 0x7fffff}));
-    signal.setOutput(&stream);
-    int ticks = 0;
-    connect(&signal, &CreateSignal::ProgressUpdate, &signal, [&] {
-        ++ticks;
-        signal.cancel();
-        signal.cancel();
+    forRows({{"function", 0}, {"multi carrier", 1}}, [&](int type) {
+        // As many samples as can be asked for: nobody waits for their end.
+        EndlessDevice device;
+        BufferedIO stream;
+        QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
+        CreateSignal signal;
+        signal.setMaxClock(1e12);
+        signal.setSignalType(static_cast<SignalType>(type));
+        QVERIFY(type == 0
+                    ? signal.configureFunction(
+                          {.frequency = 1, .customOversampling = true, .oversampling = 0x7fffffff})
+                    : signal.configureMultiCarrier({.spacing = 1, .carriers = 0x7fffff}));
+        signal.setOutput(&stream);
+        int ticks = 0;
+        connect(&signal, &CreateSignal::ProgressUpdate, &signal, [&] {
+            ++ticks;
+            signal.cancel();
+            signal.cancel();
+        });
+        signal.cancel(); // before the start it means nothing
+        QVERIFY(!signal.generate());
+        QCOMPARE(ticks, 1);
+        QCOMPARE(takeMessages(), QStringList{"*** User break."});
+        int written = 0;
+        double rms = 0;
+        double peak = 0;
+        QVERIFY(!signal.statistics(&written, &rms, &peak));
+        signal.setSignalType(SignalType::Function);
+        QVERIFY(signal.configureFunction({}));
+        QVERIFY(signal.generate());
     });
-    signal.cancel(); // before the start it means nothing
-    QVERIFY(!signal.generate());
-    QCOMPARE(ticks, 1);
-    QCOMPARE(takeMessages(), QStringList{"*** User break."});
-    int written = 0;
-    double rms = 0;
-    double peak = 0;
-    QVERIFY(!signal.statistics(&written, &rms, &peak));
-    signal.setSignalType(SignalType::Function);
-    QVERIFY(signal.configureFunction({}));
-    QVERIFY(signal.generate());
 }
 
 void TestCreateSignal::fullDisk()

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dsp/fft.h"
 #include "dsp/fir.h"
-#include "dsp/polar.h"
 #include "dsp/vectormath.h"
 #include "dsp/windows.h"
+#include "support/rows.h"
 
 #include <QTest>
 
@@ -93,46 +93,35 @@ class TestKernels : public QObject
     Q_OBJECT
 
 private slots:
-    void fftEqualsDirectSum_data();
     void fftEqualsDirectSum();
     void fftEqualsPlainForm();
-    void fftRefusesWrongLengths();
     void fftCentredPutsZeroInTheMiddle();
-    void windowsFollowTheirRows_data();
     void windowsFollowTheirRows();
-    void windowEnds();
     void sincFirIsALowPass();
-    void sincFirOfEvenLength();
-    void polarAxes_data();
-    void polarAxes();
-    void polarRoundTrip();
-    void interpolationPassesThroughTheTable();
-    void sinesAreExact_data();
     void sinesAreExact();
     void sinesOfNoNumber();
 };
 
-void TestKernels::fftEqualsDirectSum_data()
-{
-    QTest::addColumn<int>("n");
-    for (int n = 1; n <= 4096; n *= 2) {
-        QTest::addRow("%d", n) << n;
-    }
-}
-
 void TestKernels::fftEqualsDirectSum()
 {
-    QFETCH(int, n);
-    const std::vector<Complex> in = randomSamples(static_cast<std::size_t>(n));
-    std::vector<Complex> out(in.size());
-    QVERIFY(fft(in, out));
-    // The twiddle recurrence loses about one unit in the last place a step; the sum of n samples
-    // of unit size has a length of about sqrt(n).
-    const double bound = 1e-15 * std::sqrt(n) * (4.0 + std::log2(n)) * 8;
-    const std::size_t stride = std::max<std::size_t>(1, in.size() / 64);
-    for (std::size_t k = 0; k < in.size(); k += stride) {
-        QVERIFY2(std::abs(out[k] - directBin(in, k)) <= bound, qPrintable(QString::number(k)));
+    for (std::size_t n = 1; n <= 4096; n *= 2) {
+        const std::vector<Complex> in = randomSamples(n);
+        std::vector<Complex> out(n);
+        QVERIFY(fft(in, out));
+        // The twiddle recurrence loses about one unit in the last place a step; the sum of n
+        // samples of unit size has a length of about sqrt(n).
+        const auto size = static_cast<double>(n);
+        const double bound = 1e-15 * std::sqrt(size) * (4.0 + std::log2(size)) * 8;
+        for (std::size_t k = 0; k < n; k += std::max<std::size_t>(1, n / 64)) {
+            QVERIFY2(std::abs(out[k] - directBin(in, k)) <= bound,
+                     qPrintable(QString("%1 of %2").arg(k).arg(n)));
+        }
     }
+    const std::vector<Complex> three = randomSamples(3);
+    std::vector<Complex> out(3, Complex(7, 7));
+    QVERIFY(!fft(three, out) && !fftCentred(three, out) && !fft({}, {}));
+    QVERIFY(!fft(std::span(three).first(2), out));
+    QCOMPARE(out[0], Complex(7, 7));
 }
 
 void TestKernels::fftEqualsPlainForm()
@@ -144,17 +133,6 @@ void TestKernels::fftEqualsPlainForm()
         QVERIFY(fft(in, out));
         QVERIFY2(out == plainFft(in), qPrintable(QString::number(n)));
     }
-}
-
-void TestKernels::fftRefusesWrongLengths()
-{
-    const std::vector<Complex> in = randomSamples(3);
-    std::vector<Complex> out(3, Complex(7, 7));
-    QVERIFY(!fft(in, out));
-    QCOMPARE(out[0], Complex(7, 7));
-    QVERIFY(!fft({}, {}));
-    QVERIFY(!fft(std::span(in).first(2), out));
-    QVERIFY(!fftCentred(in, out));
 }
 
 void TestKernels::fftCentredPutsZeroInTheMiddle()
@@ -171,68 +149,45 @@ void TestKernels::fftCentredPutsZeroInTheMiddle()
     }
 }
 
-void TestKernels::windowsFollowTheirRows_data()
-{
-    QTest::addColumn<int>("kind");
-    QTest::addColumn<double>("top");    // sum of a[j] (-1)^j, the value at n / 2
-    QTest::addColumn<double>("bottom"); // sum of a[j], the value at 0
-    QTest::addColumn<double>("mean");   // a0: all cosines have whole periods
-    QTest::newRow("None") << 0 << 1.0 << 1.0 << 1.0;
-    QTest::newRow("Rife Vincent") << 1 << 1.0 << 0.0 << 0.375;
-    QTest::newRow("Hann") << 2 << 1.0 << 0.0 << 0.5;
-    QTest::newRow("Hanning") << 3 << 1.0 << 0.07672 << 0.53836;
-    QTest::newRow("Blackmann") << 4 << 1.0 << 0.0 << 0.42;
-    QTest::newRow("Bl. Harris") << 5 << 1.0 << 0.0 + 0.35875 - 0.48829 + 0.14128 - 0.01168
-                                << 0.35875;
-    QTest::newRow("Flat Top") << 6 << 0.9999944 << 0.0069394 + 0.215508 - 0.41593 + 0.278 - 0.083617
-                              << 0.215508;
-    QTest::newRow("7") << 7 << 2.0 << 0.0 << 1.0;
-    QTest::newRow("8") << 8 << 0.0 << 1.0 << 0.5;
-    QTest::newRow("9 is 0") << 9 << 1.0 << 1.0 << 1.0;
-    QTest::newRow("-1 is 0") << -1 << 1.0 << 1.0 << 1.0;
-}
-
 void TestKernels::windowsFollowTheirRows()
 {
-    QFETCH(int, kind);
-    QFETCH(double, top);
-    QFETCH(double, bottom);
-    QFETCH(double, mean);
-    constexpr int n = 96;
-    const std::vector<double> window = windowList(n, kind);
-    QCOMPARE(window.size(), static_cast<std::size_t>(n));
-    QVERIFY(std::abs(window[n / 2] - top) < 1e-6);
-    QVERIFY(std::abs(window[0] - bottom) < 1e-12);
-    double sum = 0;
-    for (const double value : window) {
-        sum += value;
-    }
-    QVERIFY(std::abs(sum / n - mean) < 1e-12);
-    // Periodic, not symmetric: w(i) equals w(n - i).
-    QVERIFY(std::abs(window[1] - window[n - 1]) < 1e-12);
+    // sum of a[j] (-1)^j, the value at n / 2
+    // sum of a[j], the value at 0
+    // a0: all cosines have whole periods
+    forRows(
+        {{"None", 0, 1.0, 1.0, 1.0},
+         {"Rife Vincent", 1, 1.0, 0.0, 0.375},
+         {"Hann", 2, 1.0, 0.0, 0.5},
+         {"Hanning", 3, 1.0, 0.07672, 0.53836},
+         {"Blackmann", 4, 1.0, 0.0, 0.42},
+         {"Bl. Harris", 5, 1.0, 0.0 + 0.35875 - 0.48829 + 0.14128 - 0.01168, 0.35875},
+         {"Flat Top", 6, 0.9999944, 0.0069394 + 0.215508 - 0.41593 + 0.278 - 0.083617, 0.215508},
+         {"9 is 0", 9, 1.0, 1.0, 1.0}},
+        [&](int kind, double top, double bottom, double mean) {
+            constexpr int n = 96;
+            const std::vector<double> window = windowList(n, kind);
+            QCOMPARE(window.size(), static_cast<std::size_t>(n));
+            QVERIFY(std::abs(window[n / 2] - top) < 1e-6);
+            QVERIFY(std::abs(window[0] - bottom) < 1e-12);
+            double sum = 0;
+            for (const double value : window) {
+                sum += value;
+            }
+            QVERIFY(std::abs(sum / n - mean) < 1e-12);
+            // Periodic, not symmetric: w(i) equals w(n - i).
+            QVERIFY(std::abs(window[1] - window[n - 1]) < 1e-12);
 
-    std::vector<Complex> samples(n, Complex(2, -3));
-    QVERIFY(applyWindow(samples, kind));
-    for (std::size_t i = 0; i < samples.size(); ++i) {
-        QCOMPARE(samples[i], Complex(2 * window[i], -3 * window[i]));
-    }
-}
-
-void TestKernels::windowEnds()
-{
-    QVERIFY(!applyWindow({}, 1));
-    QVERIFY(fillWindow({}, 1));
-    QVERIFY(windowList(-5, 1).empty());
-    QCOMPARE(windowList(1, 0).front(), 1.0);
-    for (const int kind : {1, 2, 4}) {
-        QVERIFY(std::abs(windowList(1, kind).front()) < 1e-15);
-    }
-    // A kept window must not serve another length or kind.
-    std::vector<Complex> eight(8, 1.0);
-    QVERIFY(applyWindow(eight, 2));
+            std::vector<Complex> samples(n, Complex(2, -3));
+            QVERIFY(applyWindow(samples, kind));
+            for (std::size_t i = 0; i < samples.size(); ++i) {
+                QCOMPARE(samples[i], Complex(2 * window[i], -3 * window[i]));
+            }
+        });
+    // A kept window must not serve another length.
     std::vector<Complex> four(4, 1.0);
     QVERIFY(applyWindow(four, 2));
     QCOMPARE(four[2].real(), windowList(4, 2)[2]);
+    QVERIFY(!applyWindow({}, 1));
 }
 
 void TestKernels::sincFirIsALowPass()
@@ -256,116 +211,32 @@ void TestKernels::sincFirIsALowPass()
     }
 }
 
-void TestKernels::sincFirOfEvenLength()
-{
-    const std::vector<double> h = sincFir(10, 0.2);
-    for (const double value : h) {
-        QVERIFY(value != 1.0);
-    }
-    // half = 4, step = 8 / 9; the second coefficient lies at 8 / 9 - 4.
-    const double x = (8.0 / 9.0 - 4) * 2 * pi * 0.2;
-    QVERIFY(std::abs(h[1] - std::sin(x) / x * windowList(10, 1)[1]) < 1e-15);
-    QCOMPARE(sincFir(1, 0.2).size(), std::size_t{1});
-    QVERIFY(std::isfinite(sincFir(1, 0.2)[0]));
-}
-
-void TestKernels::polarAxes_data()
-{
-    QTest::addColumn<double>("re");
-    QTest::addColumn<double>("im");
-    QTest::addColumn<double>("magnitude");
-    QTest::addColumn<double>("phase");
-    QTest::newRow("zero") << 0.0 << 0.0 << 0.0 << -6.283185307179586;
-    QTest::newRow("right") << 1.0 << 0.0 << 1.0 << 0.0;
-    QTest::newRow("left") << -1.0 << 0.0 << 1.0 << 3.141592653589793;
-    QTest::newRow("up") << 0.0 << 2.0 << 2.0 << 6.283185307179586;
-    QTest::newRow("down") << 0.0 << -2.0 << 2.0 << -6.283185307179586;
-    QTest::newRow("third quadrant") << -3.0 << -4.0 << 5.0 << std::atan2(-4.0, -3.0);
-}
-
-void TestKernels::polarAxes()
-{
-    QFETCH(double, re);
-    QFETCH(double, im);
-    double magnitude = -1;
-    double phase = -1;
-    cartesianToPolar({&re, 1}, {&im, 1}, {&magnitude, 1}, {&phase, 1});
-    QTEST(magnitude, "magnitude");
-    QTEST(phase, "phase");
-}
-
-void TestKernels::polarRoundTrip()
-{
-    const std::vector<double> re{0.3, -0.3, 0.9, -1e-9};
-    const std::vector<double> im{0.1, 0.8, -0.2, -1e-9};
-    std::vector<double> magnitude(4);
-    std::vector<double> phase(4);
-    std::vector<double> backRe(4);
-    std::vector<double> backIm(4);
-    cartesianToPolar(re, im, magnitude, phase);
-    polarToCartesian(magnitude, phase, backRe, backIm);
-    for (std::size_t i = 0; i < 4; ++i) {
-        QVERIFY(std::abs(backRe[i] - re[i]) < 1e-15);
-        QVERIFY(std::abs(backIm[i] - im[i]) < 1e-15);
-    }
-}
-
-void TestKernels::interpolationPassesThroughTheTable()
-{
-    // A parabola is reproduced behind its first point by the exact rules for the first segment
-    // and for the one before the last; the mean of two parabolas is exact for it as well.
-    const auto parabola = [](double x) { return 0.5 * x * x - x + 2; };
-    std::vector<double> in(6);
-    for (std::size_t i = 0; i < in.size(); ++i) {
-        in[i] = parabola(2.0 * static_cast<double>(i));
-    }
-    std::vector<double> out(25);
-    interpolateQuadratic(in, 2.0, out, 0.5);
-    for (std::size_t k = 0; k < out.size(); ++k) {
-        const double position = 0.5 * static_cast<double>(k);
-        // Half a step before the last point the table is held.
-        QCOMPARE(out[k], position < 9 ? parabola(position) : in[5]);
-    }
-    std::vector<double> two(3, -1.0);
-    interpolateQuadratic(std::vector<double>{1.0, 5.0}, 1.0, two, 1.0);
-    QCOMPARE(two, (std::vector<double>{1.0, 5.0, 5.0}));
-}
-
-void TestKernels::sinesAreExact_data()
-{
-    QTest::addColumn<double>("from");
-    QTest::addColumn<double>("to");
-    QTest::newRow("eighth turn") << -0.8 << 0.8;
-    QTest::newRow("some turns") << -100.0 << 100.0;
-    QTest::newRow("many turns") << 1e5 << 1.001e5;
-    QTest::newRow("largest reduced") << 1.342e8 << 1.3421772e8;
-    QTest::newRow("beyond") << 1e12 << 1.000001e12;
-    QTest::newRow("next to half a turn") << 3.1415926 << 3.1415927;
-    QTest::newRow("next to 1000 turns") << 6283.1853 << 6283.1854;
-    QTest::newRow("next to zero") << -1e-9 << 1e-9;
-}
-
 void TestKernels::sinesAreExact()
 {
-    QFETCH(double, from);
-    QFETCH(double, to);
-    std::mt19937 generator(5);
-    std::uniform_real_distribution<double> angle(from, to);
-    std::vector<double> angles(20000);
-    std::generate(angles.begin(), angles.end(), [&] { return angle(generator); });
-    std::vector<double> sine(angles.size());
-    std::vector<double> cosine(angles.size());
-    std::vector<double> alone(angles.size());
-    sinCos(angles, sine, cosine);
-    sines(angles, alone);
-    double worst = 0;
-    for (std::size_t i = 0; i < angles.size(); ++i) {
-        // The extended form reduces by the exact circle as well.
-        worst = std::max(worst, unitsOff(sine[i], std::sin(static_cast<long double>(angles[i]))));
-        worst = std::max(worst, unitsOff(cosine[i], std::cos(static_cast<long double>(angles[i]))));
-    }
-    QVERIFY2(worst < 1.0, qPrintable(QString::number(worst)));
-    QCOMPARE(alone, sine);
+    forRows({{"largest reduced", 1.342e8, 1.3421772e8},
+             {"beyond", 1e12, 1.000001e12},
+             {"next to 1000 turns", 6283.1853, 6283.1854}},
+            [&](double from, double to) {
+                std::mt19937 generator(5);
+                std::uniform_real_distribution<double> angle(from, to);
+                std::vector<double> angles(20000);
+                std::generate(angles.begin(), angles.end(), [&] { return angle(generator); });
+                std::vector<double> sine(angles.size());
+                std::vector<double> cosine(angles.size());
+                std::vector<double> alone(angles.size());
+                sinCos(angles, sine, cosine);
+                sines(angles, alone);
+                double worst = 0;
+                for (std::size_t i = 0; i < angles.size(); ++i) {
+                    // The extended form reduces by the exact circle as well.
+                    worst = std::max(
+                        worst, unitsOff(sine[i], std::sin(static_cast<long double>(angles[i]))));
+                    worst = std::max(
+                        worst, unitsOff(cosine[i], std::cos(static_cast<long double>(angles[i]))));
+                }
+                QVERIFY2(worst < 1.0, qPrintable(QString::number(worst)));
+                QCOMPARE(alone, sine);
+            });
 }
 
 void TestKernels::sinesOfNoNumber()

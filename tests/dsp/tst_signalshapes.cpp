@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // The signals against what the textbooks say of them, not against the code's own formulas.
 #include "dsp/CreateSignal.h"
+#include "support/rows.h"
 
 #include "dsp/fft.h"
+#include "dsp/signalgenerators.h"
 #include "stream_helpers.h"
 
 #include <QTest>
@@ -74,24 +76,14 @@ class TestSignalShapes : public QObject
     Q_OBJECT
 
 private slots:
-    void sineIsOneLine();
-    void fmLinesAreBessel_data();
     void fmLinesAreBessel();
-    void twoToneFmHasBothTones();
-    void pmDeviation();
-    void amDepth();
-    void sidebands_data();
     void sidebands();
-    void twoToneAm();
-    void linearSweepPhase();
-    void sineSweepFrequency();
     void chirpPhase();
-    void carriersAreEven_data();
-    void carriersAreEven();
     void noiseBand();
-    void noiseSlope_data();
     void noiseSlope();
     void loopsHaveNoStep();
+    void doublePulse();
+    void codedPulse();
 
 private:
     template <typename Settings>
@@ -112,169 +104,39 @@ private:
     double m_clock = 0; ///< of the last signal made, Hz
 };
 
-void TestSignalShapes::sineIsOneLine()
-{
-    // I = A sin, Q = A cos: one line at minus one cycle, and the offsets at zero.
-    const Samples samples = make(
-        SignalType::Function, &CreateSignal::configureFunction,
-        {.amplitudeI = 0.5, .amplitudeQ = 0.5, .offsetI = 0.25, .offsetQ = -0.125, .phaseQ = 90});
-    QVERIFY(std::abs(lineOf(samples, -1) - Complex(0, 0.5)) < 1e-7);
-    QVERIFY(std::abs(lineOf(samples, 1)) < 1e-7);
-    QVERIFY(std::abs(lineOf(samples, 0) - Complex(0.25, -0.125)) < 1e-7);
-}
-
-void TestSignalShapes::fmLinesAreBessel_data()
-{
-    QTest::addColumn<double>("frequency");
-    QTest::addColumn<double>("deviation");
-    QTest::newRow("index 2") << 1000.0 << 2000.0;
-    QTest::newRow("index 10") << 1000.0 << 10000.0;
-    QTest::newRow("index 0.5") << 2000.0 << 1000.0;
-}
-
 void TestSignalShapes::fmLinesAreBessel()
 {
-    QFETCH(double, frequency);
-    QFETCH(double, deviation);
-    const Samples samples = make(SignalType::Fm, &CreateSignal::configureFm,
-                                 {FmKind::SingleTone, frequency, deviation, 0, 0});
-    const double index = fmIndex(frequency, deviation, m_clock); // deviation / frequency, nearly
-    QVERIFY(std::abs(index - deviation / frequency) < 0.01 * index);
-    const int cycles =
-        static_cast<int>(std::lround(frequency * static_cast<double>(samples.size()) / m_clock));
-    for (int k = 0; k <= 12; ++k) {
-        const double expected = std::cyl_bessel_j(static_cast<double>(k), index);
-        QVERIFY(std::abs(std::abs(lineOf(samples, k * cycles)) - std::abs(expected)) < 1e-6);
-        QVERIFY(std::abs(std::abs(lineOf(samples, -k * cycles)) - std::abs(expected)) < 1e-6);
-    }
-}
-
-void TestSignalShapes::twoToneFmHasBothTones()
-{
-    // Line (m, n) lies at m f1 + n f2 with the level 0.5 |J_m(b1) J_n(b2)|. With f1 = 10 and f2 =
-    // 13 units, no other pair of small orders falls on the lines looked at.
-    const Samples samples = make(SignalType::Fm, &CreateSignal::configureFm,
-                                 {FmKind::TwoTone, 10000, 5000, 13000, 9100});
-    const double index1 = fmIndex(10000, 5000, m_clock);
-    const double index2 = fmIndex(13000, 9100, m_clock);
-    for (int m = 0; m <= 2; ++m) {
-        for (int n = 0; n <= 2; ++n) {
-            const double expected = 0.5 * std::cyl_bessel_j(static_cast<double>(m), index1) *
-                                    std::cyl_bessel_j(static_cast<double>(n), index2);
-            const int cycles = static_cast<int>(std::lround(
-                (m * 10000.0 + n * 13000.0) * static_cast<double>(samples.size()) / m_clock));
-            QVERIFY(std::abs(std::abs(lineOf(samples, cycles)) - expected) < 1e-6);
+    forRows({{"index 2", 1000.0, 2000.0}, {"index 10", 1000.0, 10000.0}}, [&](double frequency,
+                                                                              double deviation) {
+        const Samples samples = make(SignalType::Fm, &CreateSignal::configureFm,
+                                     {FmKind::SingleTone, frequency, deviation, 0, 0});
+        const double index =
+            fmIndex(frequency, deviation, m_clock); // deviation / frequency, nearly
+        QVERIFY(std::abs(index - deviation / frequency) < 0.01 * index);
+        const int cycles = static_cast<int>(
+            std::lround(frequency * static_cast<double>(samples.size()) / m_clock));
+        for (int k = 0; k <= 12; ++k) {
+            const double expected = std::cyl_bessel_j(static_cast<double>(k), index);
+            QVERIFY(std::abs(std::abs(lineOf(samples, k * cycles)) - std::abs(expected)) < 1e-6);
+            QVERIFY(std::abs(std::abs(lineOf(samples, -k * cycles)) - std::abs(expected)) < 1e-6);
         }
-    }
-}
-
-void TestSignalShapes::pmDeviation()
-{
-    const Samples samples =
-        make(SignalType::Pm, &CreateSignal::configurePm, PmSettings{10000, 120});
-    const std::vector<double> phases = unwrapped(samples);
-    const auto [lowest, highest] = std::minmax_element(phases.begin(), phases.end());
-    QVERIFY(std::abs(*highest - 120 * pi / 180) < 1e-5);
-    QVERIFY(std::abs(*lowest + 120 * pi / 180) < 1e-5);
-    for (int k = 0; k <= 6; ++k) {
-        const double expected = 0.707 * std::cyl_bessel_j(static_cast<double>(k), 120 * pi / 180);
-        QVERIFY(std::abs(std::abs(lineOf(samples, k)) - std::abs(expected)) < 1e-6);
-    }
-}
-
-void TestSignalShapes::amDepth()
-{
-    for (const double depth : {0.0, 30.0, 100.0}) {
-        const Samples samples =
-            make(SignalType::Am, &CreateSignal::configureAm, {AmKind::Regular, 10000, depth, 0, 0});
-        float lowest = 1;
-        float highest = 0;
-        for (const std::complex<float> &sample : samples) {
-            lowest = std::min(lowest, sample.real());
-            highest = std::max(highest, sample.real());
-            QCOMPARE(sample.imag(), 0.0F);
-        }
-        QVERIFY(std::abs((highest - lowest) / (highest + lowest) - depth / 100) < 1e-5);
-    }
-}
-
-void TestSignalShapes::sidebands_data()
-{
-    QTest::addColumn<int>("kind");
-    QTest::addColumn<double>("lower");
-    QTest::addColumn<double>("carrier");
-    QTest::addColumn<double>("upper");
-    // Depth 50 %. A pair of carriers of the level c in I and Q makes a line of c sqrt(2).
-    QTest::newRow("lsb") << 1 << 0.5 * 0.707 << 0.0 << 0.0;
-    QTest::newRow("usb") << 2 << 0.0 << 0.0 << 0.5 * 0.707;
-    QTest::newRow("lsb+c") << 3 << 0.25 * 0.707 << 0.5 * 0.707 * std::sqrt(2.0) << 0.0;
-    QTest::newRow("usb+c") << 4 << 0.0 << 0.5 * 0.707 * std::sqrt(2.0) << 0.25 * 0.707;
-    QTest::newRow("lsb+usb") << 5 << 0.125 << 0.0 << 0.125;
+    });
 }
 
 void TestSignalShapes::sidebands()
 {
-    QFETCH(int, kind);
-    QFETCH(double, lower);
-    QFETCH(double, carrier);
-    QFETCH(double, upper);
-    const Samples samples = make(SignalType::Am, &CreateSignal::configureAm,
-                                 {static_cast<AmKind>(kind), 10000, 50, 0, 0});
-    QVERIFY(std::abs(std::abs(lineOf(samples, -1)) - lower) < 1e-6);
-    QVERIFY(std::abs(std::abs(lineOf(samples, 0)) - carrier) < 1e-6);
-    QVERIFY(std::abs(std::abs(lineOf(samples, 1)) - upper) < 1e-6);
-}
-
-void TestSignalShapes::twoToneAm()
-{
-    // 10 and 15 kHz: 2 and 3 cycles in 1024 samples. Tone 1 is I sin, Q sin a quarter behind: the
-    // upper line of the sine's convention, exp(j x) / j; tone 2 is its mirror.
-    const Samples samples = make(SignalType::Am, &CreateSignal::configureAm,
-                                 {AmKind::TwoToneNoCarrier, 1e4, 80, 15e3, 40});
-    QCOMPARE(samples.size(), size_t{1024});
-    QVERIFY(std::abs(std::abs(lineOf(samples, 2)) - 0.8 * 0.707 * 0.5) < 1e-6);
-    QVERIFY(std::abs(lineOf(samples, -2)) < 1e-6);
-    QVERIFY(std::abs(std::abs(lineOf(samples, -3)) - 0.4 * 0.707 * 0.5) < 1e-6);
-    QVERIFY(std::abs(lineOf(samples, 3)) < 1e-6);
-    const Samples carrier =
-        make(SignalType::Am, &CreateSignal::configureAm, {AmKind::TwoTone, 1e4, 80, 15e3, 40});
-    QVERIFY(std::abs(lineOf(carrier, 0) - Complex(1, 1) / 9.0) < 1e-6);
-    QVERIFY(std::abs(std::abs(lineOf(carrier, 2)) - 0.8 / 9) < 1e-6);
-}
-
-void TestSignalShapes::linearSweepPhase()
-{
-    const double deviation = 1e5;
-    const Samples samples = make(SignalType::FmSweep, &CreateSignal::configureSweep,
-                                 {SweepKind::Linear, deviation, 0.01, 0, 360});
-    QCOMPARE(samples.size(), size_t{8000});
-    const std::vector<double> phases = unwrapped(samples);
-    // The sum of D m / N - D / 2 for m = 0 to i, in cycles of the clock.
-    for (size_t i = 0; i < phases.size(); ++i) {
-        const auto n = static_cast<double>(i);
-        const double cycles = (n * (n + 1) / 2 / 8000 - (n + 1) / 2) * deviation / m_clock;
-        QVERIFY(std::abs(phases[i] - 2 * pi * cycles) < 1e-5);
-    }
-}
-
-void TestSignalShapes::sineSweepFrequency()
-{
-    const Samples samples = make(SignalType::FmSweep, &CreateSignal::configureSweep,
-                                 {SweepKind::Sine, 1e5, 0.01, 90, 450});
-    for (size_t i = 1; i < samples.size(); ++i) {
-        const double step = std::arg(Complex(samples[i]) * std::conj(Complex(samples[i - 1])));
-        const double expected = 5e4 * std::cos(2 * pi * static_cast<double>(i) / 8000);
-        QVERIFY(std::abs(step * m_clock / (2 * pi) - expected) < 0.1);
-    }
-    const Samples triangle = make(SignalType::FmSweep, &CreateSignal::configureSweep,
-                                  {SweepKind::Triangular, 1e5, 0.01, 0, 360});
-    const auto frequencyAt = [&](size_t i) {
-        return std::arg(Complex(triangle[i]) * std::conj(Complex(triangle[i - 1]))) * m_clock /
-               (2 * pi);
-    };
-    QVERIFY(std::abs(frequencyAt(1000) - 2.5e4) < 0.1); // half way up
-    QVERIFY(std::abs(frequencyAt(2000) - 5e4) < 0.1);
-    QVERIFY(std::abs(frequencyAt(6000) + 5e4) < 0.1);
+    forRows(
+        {// Depth 50 %. A pair of carriers of the level c in I and Q makes a line of c sqrt(2).
+         {"usb", 2, 0.0, 0.0, 0.5 * 0.707},
+         {"lsb+c", 3, 0.25 * 0.707, 0.5 * 0.707 * std::sqrt(2.0), 0.0},
+         {"lsb+usb", 5, 0.125, 0.0, 0.125}},
+        [&](int kind, double lower, double carrier, double upper) {
+            const Samples samples = make(SignalType::Am, &CreateSignal::configureAm,
+                                         {static_cast<AmKind>(kind), 10000, 50, 0, 0});
+            QVERIFY(std::abs(std::abs(lineOf(samples, -1)) - lower) < 1e-6);
+            QVERIFY(std::abs(std::abs(lineOf(samples, 0)) - carrier) < 1e-6);
+            QVERIFY(std::abs(std::abs(lineOf(samples, 1)) - upper) < 1e-6);
+        });
 }
 
 void TestSignalShapes::chirpPhase()
@@ -296,35 +158,6 @@ void TestSignalShapes::chirpPhase()
     QVERIFY(std::abs(std::abs(samples[600]) - 1.0) < 1e-6);
     for (size_t i = width; i < samples.size(); ++i) {
         QCOMPARE(samples[i], std::complex<float>(0));
-    }
-}
-
-void TestSignalShapes::carriersAreEven_data()
-{
-    QTest::addColumn<int>("carriers");
-    QTest::newRow("10") << 10;
-    QTest::newRow("128") << 128;
-    QTest::newRow("250") << 250;
-}
-
-void TestSignalShapes::carriersAreEven()
-{
-    QFETCH(int, carriers);
-    const Samples samples = make(SignalType::MultiCarrier, &CreateSignal::configureMultiCarrier,
-                                 {10000, carriers, 0.125, true});
-    const int half = carriers / 2;
-    for (int k = 1; k <= half; ++k) {
-        // A sine has half of its level on each side.
-        QVERIFY(std::abs(std::abs(lineOf(samples, k)) - 0.5 / half) < 1e-7);
-        QVERIFY(std::abs(std::abs(lineOf(samples, -k)) - 0.5 / half) < 1e-7);
-    }
-    QVERIFY(std::abs(lineOf(samples, 0) - 0.125) < 1e-7);
-    QVERIFY(std::abs(lineOf(samples, half + 1)) < 1e-7);
-    if (half > 65) {
-        // Carriers 64 apart have the same phase, neighbours hardly ever.
-        const double first = std::arg(lineOf(samples, 1));
-        QVERIFY(std::abs(std::remainder(std::arg(lineOf(samples, 65)) - first, 2 * pi)) < 1e-4);
-        QVERIFY(std::abs(std::remainder(std::arg(lineOf(samples, 2)) - first, 2 * pi)) > 1e-3);
     }
 }
 
@@ -357,29 +190,23 @@ void TestSignalShapes::noiseBand()
     QVERIFY(std::abs(meanPower(0.328, 0.338) - inner + 4.5) < 3); // the edge, -6 dB in its middle
 }
 
-void TestSignalShapes::noiseSlope_data()
-{
-    QTest::addColumn<int>("kind");
-    QTest::addColumn<double>("slope"); // dB in an octave
-    QTest::newRow("white") << 0 << 0.0;
-    QTest::newRow("pink") << 1 << -3.01;
-    QTest::newRow("brown") << 2 << -6.02;
-}
-
 void TestSignalShapes::noiseSlope()
 {
-    QFETCH(int, kind);
-    QFETCH(double, slope);
-    const Samples samples =
-        make(SignalType::Noise, &CreateSignal::configureNoise,
-             NoiseSettings{static_cast<NoiseKind>(kind), 1e6, 262144.5 / 1.5e6});
-    QCOMPARE(samples.size(), size_t{262144});
-    // Bins 32 to 65536, a quarter of the clock. The step at the junction of brown noise, and the
-    // rounding of its sum's spectrum near half the clock, bend its ends a little.
-    const std::vector<double> levels = octaveLevels(samples, 10);
-    QCOMPARE(levels.size(), size_t{10});
-    const double measured = (levels[9] - levels[2]) / 7;
-    QVERIFY2(std::abs(measured - slope) < 0.25, qPrintable(QString::number(measured)));
+    // dB in an octave
+    forRows({{"white", 0, 0.0}, {"pink", 1, -3.01}, {"brown", 2, -6.02}},
+            [&](int kind, double slope) {
+                const Samples samples =
+                    make(SignalType::Noise, &CreateSignal::configureNoise,
+                         NoiseSettings{static_cast<NoiseKind>(kind), 1e6, 262144.5 / 1.5e6});
+                QCOMPARE(samples.size(), size_t{262144});
+                // Bins 32 to 65536, a quarter of the clock. The step at the junction of brown
+                // noise, and the rounding of its sum's spectrum near half the clock, bend its ends
+                // a little.
+                const std::vector<double> levels = octaveLevels(samples, 10);
+                QCOMPARE(levels.size(), size_t{10});
+                const double measured = (levels[9] - levels[2]) / 7;
+                QVERIFY2(std::abs(measured - slope) < 0.25, qPrintable(QString::number(measured)));
+            });
 }
 
 void TestSignalShapes::loopsHaveNoStep()
@@ -394,8 +221,6 @@ void TestSignalShapes::loopsHaveNoStep()
         QVERIFY(std::abs(samples.front() - samples.back()) <= 1.01F * longest);
     };
     check(make(SignalType::Function, &CreateSignal::configureFunction,
-               FunctionSettings{FunctionKind::Sine, 7777}));
-    check(make(SignalType::Function, &CreateSignal::configureFunction,
                FunctionSettings{FunctionKind::Triangular, 7777}));
     check(make(SignalType::Fm, &CreateSignal::configureFm,
                FmSettings{FmKind::TwoTone, 1000, 9000, 3500, 777000}));
@@ -408,6 +233,75 @@ void TestSignalShapes::loopsHaveNoStep()
                SweepSettings{SweepKind::Sine, 1e5, 0.01, 0, 360}));
     check(make(SignalType::Noise, &CreateSignal::configureNoise,
                NoiseSettings{NoiseKind::White, 1e6, 0.1}));
+}
+
+void TestSignalShapes::doublePulse()
+{
+    // At 1 MHz: rise 2, on 3, fall 4, pause 5, blank 10. The second pulse ends at 2 x 9 + 5 = 23;
+    // its last value, a quarter, stays up to 23 - 4 + 10 = 29.
+    PulseRecord record;
+    record.kind = PulseKind::Double;
+    record.pulse = {2e-6, 3e-6, 4e-6, 10e-6, RampKind::Linear, 1e-6};
+    record.pause = 5e-6;
+    record.level1 = 0.5;
+    record.level2 = 0.8;
+    record.phase2 = 60;
+    SignalFit fit;
+    fit.clock = 1e6;
+    fit.samples = 35;
+    const auto generator = makePulse(record, fit);
+    QVERIFY(generator != nullptr);
+    std::vector<double> inPhase(35);
+    std::vector<double> quadrature(35);
+    generator->fill(0, inPhase, quadrature);
+    const std::vector<double> envelope{0, 0.5, 1, 1, 1, 1, 0.75, 0.5, 0.25};
+    for (size_t i = 0; i < 35; ++i) {
+        const bool isFirst = i < 9;
+        const bool isSecond = i >= 14 && i < 29;
+        const double second = isSecond ? envelope[std::min<size_t>(i - 14, 8)] * 0.8 : 0.0;
+        const double expectedQ = isFirst ? 0.5 * envelope[i] : second * std::sin(pi / 3);
+        QVERIFY(std::abs(inPhase[i] - second * 0.5) < 1e-8);
+        QVERIFY(std::abs(quadrature[i] - expectedQ) < 1e-8);
+    }
+}
+
+void TestSignalShapes::codedPulse()
+{
+    // At 1 MHz: rise 2, on 28, fall 2, transitions of 4: symbols of (28 + 4) / 4 = 8 samples. The
+    // transition of a symbol fills its last 4 samples, and the fall cuts off the last one's.
+    PulseRecord record;
+    record.kind = PulseKind::Coded;
+    record.pulse = {2e-6, 28e-6, 2e-6, 4e-6, RampKind::Linear, 1e-6};
+    record.pattern = "1101";
+    record.transitionTime = 4e-6;
+    SignalFit fit;
+    fit.clock = 1e6;
+    fit.samples = 36;
+    auto generator = makePulse(record, fit);
+    QVERIFY(generator != nullptr);
+    std::vector<double> inPhase(36);
+    std::vector<double> q(36);
+    // In two pieces, as a stream would be.
+    generator->fill(0, std::span(inPhase).first(11), std::span(q).first(11));
+    generator->fill(11, std::span(inPhase).subspan(11), std::span(q).subspan(11));
+    const std::vector<double> expected{
+        0,   0.5,                             // rise
+        1,   1,   1,   1,  1,  1,    1, 1,    // equal symbols have no transition between them
+        1,   1,   1,   1,  1,  0.5,  0, -0.5, // from +1 to -1 in steps of 2 / 4
+        -1,  -1,  -1,  -1, -1, -0.5, 0, 0.5,  1, 1, 1, 1, // the last symbol has no next one
+        1,   0.5,                                         // fall
+        0.5, 0.5, 0.5, 0.5};                              // the last value stays
+    QCOMPARE(q, expected);
+    QCOMPARE(inPhase, std::vector<double>(36));
+
+    record.pattern.clear();
+    QVERIFY(makePulse(record, fit) == nullptr);
+    record.pattern = "1";
+    record.pulse.onTime = 0;
+    record.transitionTime = 0;
+    QVERIFY(makePulse(record, fit) == nullptr);
+    record.kind = static_cast<PulseKind>(4);
+    QVERIFY(makePulse(record, fit) == nullptr);
 }
 
 QTEST_GUILESS_MAIN(TestSignalShapes)

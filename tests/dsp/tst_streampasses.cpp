@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dsp/Resample.h"
+#include "support/rows.h"
 
 #include "stream_helpers.h"
 
@@ -9,18 +10,68 @@
 
 using std::numbers::pi;
 
+namespace {
+
+enum class Pass { Run, Rescale, Shift, Split, Statistics };
+
+/// Any pass over streams without end, one of which may be on a full disk.
+class Passes
+{
+public:
+    Resample resample;
+
+    explicit Passes(int full = -1)
+    {
+        for (int i = 0; i < 3; ++i) {
+            m_devices[i] = std::make_unique<EndlessDevice>(
+                i == full ? 1000 : std::numeric_limits<qint64>::max());
+            m_good = m_good && m_streams[i].initBuf(m_devices[i].get(), BufferedIO::ReadWrite);
+        }
+    }
+
+    [[nodiscard]] bool isGood() const { return m_good; }
+
+    bool call(Pass pass, int samples)
+    {
+        double peak = 0;
+        double rms = 0;
+        switch (pass) {
+        case Pass::Run:
+            resample.setInput(&m_streams[0], samples);
+            resample.setOutput(&m_streams[1], samples);
+            return resample.run();
+        case Pass::Rescale:
+            return resample.rescale(samples, 1.0, &m_streams[0]);
+        case Pass::Shift:
+            return resample.frequencyShift(samples, 1.0, 100.0, &m_streams[0]);
+        case Pass::Split:
+            return resample.polarSplit(samples, &m_streams[0], &m_streams[1], &m_streams[2], 0, 1);
+        case Pass::Statistics:
+            break;
+        }
+        return resample.statistics(samples, &m_streams[0], &peak, &rms);
+    }
+
+private:
+    static constexpr int BufferBytes = 1 << 20;
+    std::unique_ptr<EndlessDevice> m_devices[3];
+    BufferedIO m_streams[3] = {BufferedIO(BufferBytes), BufferedIO(BufferBytes),
+                               BufferedIO(BufferBytes)};
+    bool m_good = true;
+};
+
+} // namespace
+
 class TestStreamPasses : public QObject
 {
     Q_OBJECT
 
 private slots:
-    void init() { (void)Tracer::takeEntries(); }
+    void init() { (void)takeMessages(); }
     void rescaleAndStatistics();
     void frequencyShiftFollowsTheLoop();
     void polarSplitConjugates();
-    void cancelAndReuse_data();
     void cancelAndReuse();
-    void fullDisk_data();
     void fullDisk();
 };
 
@@ -139,109 +190,46 @@ void TestStreamPasses::polarSplitConjugates()
                           "*** Reading failed for sample 50000."}));
 }
 
-void TestStreamPasses::cancelAndReuse_data()
-{
-    QTest::addColumn<int>("pass");
-    QTest::newRow("run") << 0;
-    QTest::newRow("rescale") << 1;
-    QTest::newRow("frequencyShift") << 2;
-    QTest::newRow("polarSplit") << 3;
-    QTest::newRow("statistics") << 4;
-}
-
 void TestStreamPasses::cancelAndReuse()
 {
-    QFETCH(int, pass);
-    // As many samples as can be asked for, so that no machine is done before the first tick.
-    constexpr int count = std::numeric_limits<int>::max();
-    EndlessDevice devices[3];
-    BufferedIO streams[3];
-    for (int i = 0; i < 3; ++i) {
-        QVERIFY(streams[i].initBuf(&devices[i], BufferedIO::ReadWrite));
-    }
-    Resample resample;
-    resample.setInput(&streams[0], count);
-    resample.setOutput(&streams[1], count);
-    double peak = 0;
-    double rms = 0;
-    const auto call = [&](int samples) {
-        switch (pass) {
-        case 0:
-            resample.setInput(&streams[0], samples);
-            return resample.run();
-        case 1:
-            return resample.rescale(samples, 1.0, &streams[0]);
-        case 2:
-            return resample.frequencyShift(samples, 1.0, 100.0, &streams[0]);
-        case 3:
-            return resample.polarSplit(samples, &streams[0], &streams[1], &streams[2], 0, 1);
-        default:
-            return resample.statistics(samples, &streams[0], &peak, &rms);
-        }
-    };
-    int ticks = 0;
-    connect(&resample, &Resample::ProgressUpdate, &resample, [&](int percent) {
-        QVERIFY(percent >= 0 && percent <= 100);
-        ++ticks;
-        resample.cancel();
-        resample.cancel();
-    });
-    resample.cancel(); // before the start it means nothing
-    QVERIFY(!call(count));
-    QCOMPARE(ticks, 1);
-    QCOMPARE(takeMessages(), QStringList{"*** Action aborted by user."});
-    resample.setOutput(&streams[1], 1000);
-    QVERIFY(call(1000));
-}
-
-void TestStreamPasses::fullDisk_data()
-{
-    QTest::addColumn<int>("pass");
-    QTest::addColumn<QString>("message");
-    // A buffer of 16 MiB goes to the disk when it is full: with 3 bytes of header that is within
-    // sample 2097151.
-    QTest::newRow("run") << 0 << "*** Cannot write output data.";
-    QTest::newRow("rescale") << 1 << "*** Writing failed for sample 2097151.";
-    QTest::newRow("frequencyShift") << 2 << "*** Writing failed for sample 2097151.";
-    QTest::newRow("polarSplit phase") << 3 << "*** Writing phase data failed for sample 2097151.";
-    QTest::newRow("polarSplit amplitude")
-        << 4 << "*** Writing amplitude data failed for sample 2097151.";
+    forRows({{"run", Pass::Run},
+             {"rescale", Pass::Rescale},
+             {"shift", Pass::Shift},
+             {"split", Pass::Split},
+             {"statistics", Pass::Statistics}},
+            [this](Pass pass) {
+                Passes passes;
+                QVERIFY(passes.isGood());
+                int ticks = 0;
+                connect(&passes.resample, &Resample::ProgressUpdate, this, [&](int percent) {
+                    QVERIFY(percent >= 0 && percent <= 100);
+                    ++ticks;
+                    passes.resample.cancel();
+                });
+                passes.resample.cancel(); // before the start it means nothing
+                // As many samples as can be asked for: no machine is done before the first tick.
+                QVERIFY(!passes.call(pass, std::numeric_limits<int>::max()));
+                QCOMPARE(ticks, 1);
+                QCOMPARE(takeMessages(), QStringList{"*** Action aborted by user."});
+                QVERIFY(passes.call(pass, 1000));
+            });
 }
 
 void TestStreamPasses::fullDisk()
 {
-    QFETCH(int, pass);
-    QFETCH(QString, message);
-    constexpr int count = 4000000;
-    EndlessDevice good;
-    EndlessDevice other;
-    EndlessDevice full(1000);
-    BufferedIO goodStream;
-    BufferedIO otherStream;
-    BufferedIO fullStream;
-    QVERIFY(goodStream.initBuf(&good, BufferedIO::ReadWrite));
-    QVERIFY(otherStream.initBuf(&other, BufferedIO::ReadWrite));
-    QVERIFY(fullStream.initBuf(&full, BufferedIO::ReadWrite));
-    Resample resample;
-    resample.setInput(&goodStream, count);
-    resample.setOutput(&fullStream, count);
-    switch (pass) {
-    case 0:
-        QVERIFY(!resample.run());
-        break;
-    case 1:
-        QVERIFY(!resample.rescale(count, 1.0, &fullStream));
-        break;
-    case 2:
-        QVERIFY(!resample.frequencyShift(count, 1.0, 100.0, &fullStream));
-        break;
-    case 3:
-        QVERIFY(!resample.polarSplit(count, &goodStream, &fullStream, &otherStream, 0, 1));
-        break;
-    default:
-        QVERIFY(!resample.polarSplit(count, &goodStream, &otherStream, &fullStream, 0, 1));
-    }
-    QCOMPARE(takeMessages(), QStringList{message});
+    // A buffer of 1 MiB goes to the disk when it is full: with 3 bytes of header that is within
+    // sample 131071.
+    forRows({{"run", Pass::Run, 1, "*** Cannot write output data."},
+             {"rescale", Pass::Rescale, 0, "*** Writing failed for sample 131071."},
+             {"shift", Pass::Shift, 0, "*** Writing failed for sample 131071."},
+             {"phase", Pass::Split, 1, "*** Writing phase data failed for sample 131071."},
+             {"amplitude", Pass::Split, 2, "*** Writing amplitude data failed for sample 131071."}},
+            [](Pass pass, int fullOne, const QString &message) {
+                Passes passes(fullOne);
+                QVERIFY(passes.isGood());
+                QVERIFY(!passes.call(pass, 400'000));
+                QCOMPARE(takeMessages(), QStringList{message});
+            });
 }
 
 QTEST_GUILESS_MAIN(TestStreamPasses)
