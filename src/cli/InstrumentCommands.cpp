@@ -361,4 +361,6 @@ void addInstrumentCommands(CommandSet &commands)
     constexpr double maxSeconds = 86400;
     addInteger(start, "--timeout", started.seconds, {"s", 1, maxSeconds},
                "Longest wait for the instrument to load it (default: 100 s)");
+
+    addCaptureCommand(*instr, commands);
 }

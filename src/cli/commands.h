@@ -24,3 +24,4 @@ void addFilterCommands(CommandSet &commands);
 void addMarkerCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);
+void addCaptureCommand(CLI::App &instr, CommandSet &commands);

@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "CaptureSaveJob.h"
+
+#include "CaptureJob.h"
+
+#include "dsp/Resample.h"
+#include "log/Tracer.h"
+
+#include <cmath>
+#include <utility>
+
+namespace {
+
+double decibels(double level)
+{
+    constexpr double silence = 1e-12;
+    return 20 * std::log10(level + silence);
+}
+
+} // namespace
+
+CaptureSaveJob::CaptureSaveJob(Capture &capture, OutputOptions output, double clockHz,
+                               ImportScaling scaling, QObject *parent)
+    : ToolJob(parent)
+    , m_capture(capture)
+    , m_clockHz(clockHz)
+    , m_scaling(scaling)
+    , m_output(*this, std::move(output))
+{
+    setEnding({"Waveform File Created", "Creation failed"});
+}
+
+bool CaptureSaveJob::work()
+{
+    if (m_output.fileName().isEmpty()) {
+        return refuse("Output file name is empty.");
+    }
+    if (!scale() || !mayProceed()) {
+        return false;
+    }
+    emit report(ReportLine::heading("Signal statistics"));
+    const auto row = [this](const QString &label, const QString &value) {
+        emit report(ReportLine::row(label, value));
+    };
+    row("Samples", QString::number(m_capture.samples));
+    row("Clock", QString::number(m_clockHz, 'g', 12));
+    row("Peak Offset", QString::asprintf("%4.2f dB", decibels(m_capture.peak)));
+    row("Peak/RMS",
+        QString::asprintf("%4.2f dB", decibels(m_capture.peak) - decibels(m_capture.rms)));
+    emit report(ReportLine::heading("Saving file"));
+    m_output.setLength(m_clockHz, m_capture.samples);
+    m_output.setLevels(m_capture.peak, m_capture.rms);
+    m_output.record().comment = m_capture.comment;
+    return m_output.save({.data = m_capture.data.stream()}, "Saving file...");
+}
+
+bool CaptureSaveJob::scale()
+{
+    if (m_scaling != ImportScaling::Auto || !(m_capture.peak > 0)) {
+        return true;
+    }
+    emit report(ReportLine::heading("Level scaling"));
+    Resample levels;
+    const JobStep step(*this, "Scaling...", levels);
+    if (!levels.rescale(m_capture.samples, 1 / m_capture.peak, m_capture.data.stream())) {
+        return Tracer::fail("Cannot rescale waveform data.");
+    }
+    m_capture.rms /= m_capture.peak;
+    m_capture.peak = 1;
+    return true;
+}
