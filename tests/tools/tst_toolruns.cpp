@@ -7,6 +7,7 @@
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
 #include "tools/DlgWvCreate.h"
+#include "tools/ViewFrame.h"
 
 #include <QComboBox>
 #include <QDeadlineTimer>
@@ -272,7 +273,7 @@ void TestToolRuns::viewForgetsTheFileBefore()
     DlgView view;
     QVERIFY(view.startModule(path("tone.wv")));
     view.show();
-    view.set_csr_data(100, 0.5, 0.5);
+    child<ViewFrame>(view, "w_view")->set_csr_data(100, 0.5, 0.5);
     view.fix_ref_csr(true);
     const auto *timeline = child<CWidgetTimeline>(view, "w_timeline");
     QCOMPARE(timeline->scene().cursors, (std::array<qint64, 2>{100, 100}));
@@ -293,7 +294,7 @@ void TestToolRuns::viewPlaysToTheEnd()
     view.show();
     click(view, "pb_play");
     QTRY_COMPARE(view.window().first(), 600); // 250, 500, and what is left
-    view.slot_playstep();
+    child<ViewFrame>(view, "w_view")->slot_playstep();
     QCOMPARE(view.window().first(), 600);
     QVERIFY(takeLog(Tracer::Error).isEmpty());
 }

@@ -4,6 +4,7 @@
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
 #include "tools/DlgWvCreate.h"
+#include "tools/ViewFrame.h"
 
 #include "display/CWidgetIQTrace.h"
 #include "display/QtNumericEdit.h"
@@ -169,9 +170,9 @@ private slots:
         view.resize(1000, 720);
         view.show();
         QCOMPARE(child<QLabel>(view, "l_csr_time")->text(), QString("---"));
-        view.set_csr_data(1000, 0.7, 0);
+        child<ViewFrame>(view, "w_view")->set_csr_data(1000, 0.7, 0);
         click(view, "pb_fix_ref");
-        view.set_csr_data(3000, 0, 0.7);
+        child<ViewFrame>(view, "w_view")->set_csr_data(3000, 0, 0.7);
         QCOMPARE(child<QLabel>(view, "l_csr_sample")->text(), QString("3000"));
         QCOMPARE(child<QLabel>(view, "l_csr_time")->text(), QString("3 ms"));
         QCOMPARE(child<QLabel>(view, "l_csr_mag")->text(), QString("-3.10 dB"));

@@ -1,0 +1,295 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "ViewFrame.h"
+
+#include "display/CWidgetIQTrace.h"
+#include "display/CWidgetTimeline.h"
+#include "log/Tracer.h"
+
+#include <QElapsedTimer>
+#include <QHBoxLayout>
+#include <QToolButton>
+#include <QVBoxLayout>
+
+#include <algorithm>
+#include <cmath>
+
+ViewFrame::ViewFrame(QWidget *parent)
+    : QWidget(parent)
+    , m_trace(new CWidgetIQTrace)
+    , m_timeline(new CWidgetTimeline)
+    , m_column(new QVBoxLayout(this))
+    , m_buttons(new QHBoxLayout)
+{
+    m_trace->setObjectName("w_iqtrace");
+    m_trace->setMinimumSize(200, 160);
+    m_trace->setShowMarkers(true);
+    m_timeline->setObjectName("w_timeline");
+    m_timeline->setToolTip("The whole waveform; drag the visible range");
+    m_column->setContentsMargins(0, 0, 0, 0);
+    m_column->addWidget(m_trace, 3);
+    m_column->addWidget(m_timeline);
+    m_column->addLayout(m_buttons);
+    addNavigation();
+    connect(&m_playTimer, &QTimer::timeout, this, &ViewFrame::slot_playstep);
+    connect(m_timeline, &CWidgetTimeline::mouse_xpos, this, &ViewFrame::update_position);
+    connect(m_timeline, &CWidgetTimeline::state_xpos, this, &ViewFrame::state_position);
+    connect(m_trace, &CWidgetIQTrace::mouseCsrData, this, &ViewFrame::set_csr_data);
+    connect(m_trace, &CWidgetIQTrace::mouseZoomSet, this, &ViewFrame::set_zoom_position);
+    connect(m_trace, &CWidgetIQTrace::zoom_in, this, &ViewFrame::slot_zoomin);
+    connect(m_trace, &CWidgetIQTrace::zoom_out, this, &ViewFrame::slot_zoomout);
+}
+
+void ViewFrame::addNavigation()
+{
+    struct Button
+    {
+        const char *name;
+        QString text;
+        const char *toolTip;
+        const char *shortcut;
+        void (ViewFrame::*slot)();
+    };
+    const Button buttons[] = {
+        {"pb_start", "|<", "Move to Beginning", "Home", &ViewFrame::slot_move_start},
+        {"pb_reverse", "<<", "Move Backwards", "PgUp", &ViewFrame::slot_reverse},
+        {"pb_reverse_little", "<", "Step Backwards", "Left", &ViewFrame::slot_reverse_little},
+        {"pb_play", QChar(0x25B6), "Start Playback", "Space", &ViewFrame::slot_play},
+        {"pb_stop", QChar(0x25A0), "Stop Playback", "S", &ViewFrame::slot_stop},
+        {"pb_forward_little", ">", "Step Forward", "Right", &ViewFrame::slot_forward_little},
+        {"pb_forward", ">>", "Move Forward", "PgDown", &ViewFrame::slot_forward},
+        {"pb_end", ">|", "Move to End", "End", &ViewFrame::slot_move_end},
+        {"pb_zoomin", "X+", "X Zoom In", "+", &ViewFrame::slot_zoomin},
+        {"pb_zoomout", QString("X") + QChar(0x2212), "X Zoom Out", "-", &ViewFrame::slot_zoomout},
+        {"pb_zoomin_y", "Y+", "Y Zoom In", "Ctrl++", &ViewFrame::slot_zoomin_y},
+        {"pb_zoomout_y", QString("Y") + QChar(0x2212), "Y Zoom Out", "Ctrl+-",
+         &ViewFrame::slot_zoomout_y},
+    };
+    constexpr int side = 30;
+    constexpr int gap = 12;
+    for (const Button &button : buttons) {
+        if (button.slot == &ViewFrame::slot_zoomin) {
+            m_buttons->addSpacing(gap);
+        }
+        auto *made = new QToolButton;
+        made->setObjectName(button.name);
+        made->setText(button.text);
+        made->setToolTip(button.toolTip);
+        made->setShortcut(QKeySequence(button.shortcut));
+        made->setMinimumSize(side, side);
+        connect(made, &QToolButton::clicked, this, button.slot);
+        m_buttons->addWidget(made);
+    }
+    m_buttons->addStretch();
+}
+
+void ViewFrame::addPlots(QWidget *plots)
+{
+    m_column->insertWidget(1, plots, 2);
+}
+
+void ViewFrame::addButton(QWidget *button)
+{
+    m_buttons->addWidget(button);
+}
+
+bool ViewFrame::setWaveform(BufferedIO *iqStream, BufferedIO *markerStream, qint64 samples,
+                            double clockHz)
+{
+    clear();
+    m_clockHz = clockHz;
+    m_window.setSource(iqStream, markerStream, samples);
+    m_trace->setClock(clockHz);
+    m_timeline->setWaveform(samples, clockHz);
+    if (!m_window.show(0)) {
+        clear();
+        return false;
+    }
+    refresh();
+    return true;
+}
+
+void ViewFrame::clear()
+{
+    slot_stop();
+    m_window.release();
+    m_clockHz = 0;
+    m_cursors.fill(NoSample);
+    m_trace->clear();
+    m_timeline->setWaveform(0, 0);
+    placeCursors();
+}
+
+void ViewFrame::reload()
+{
+    m_window.invalidate();
+    if (!isEmpty() && m_window.show(m_window.first())) {
+        refresh();
+    }
+}
+
+qint64 ViewFrame::cursor(Cursor which) const
+{
+    return m_cursors.at(static_cast<size_t>(which - 1));
+}
+
+void ViewFrame::setCursor(Cursor which, qint64 sample)
+{
+    m_cursors.at(static_cast<size_t>(which - 1)) = sample;
+    placeCursors();
+}
+
+void ViewFrame::placeCursors()
+{
+    const qint64 first = m_window.first();
+    for (const Cursor which : {Measuring, Reference}) {
+        const qint64 sample = cursor(which);
+        const bool visible = sample >= first && sample < first + m_window.points();
+        m_trace->setCursor(which, visible ? static_cast<int>(sample - first) : -1);
+        m_timeline->setCursor(which, sample);
+    }
+}
+
+void ViewFrame::hideEvent(QHideEvent *event)
+{
+    slot_stop();
+    QWidget::hideEvent(event);
+}
+
+void ViewFrame::moveTo(qint64 first)
+{
+    Tracer::Trace(Tracer::Information, QString("New start sample: %1").arg(first));
+    if (m_window.show(first)) {
+        refresh();
+    }
+}
+
+void ViewFrame::refresh()
+{
+    m_trace->setFirstSample(m_window.first());
+    m_trace->setData(m_window.samples(), m_window.markers());
+    m_timeline->setRange(m_window.first(), m_window.points());
+    placeCursors();
+    emit windowChanged();
+}
+
+void ViewFrame::slot_reverse()
+{
+    moveTo(m_window.reverse());
+}
+
+void ViewFrame::slot_forward()
+{
+    moveTo(m_window.forward());
+}
+
+void ViewFrame::slot_reverse_little()
+{
+    moveTo(m_window.reverseLittle());
+}
+
+void ViewFrame::slot_forward_little()
+{
+    moveTo(m_window.forwardLittle());
+}
+
+void ViewFrame::slot_move_start()
+{
+    moveTo(0);
+}
+
+void ViewFrame::slot_move_end()
+{
+    moveTo(m_window.end());
+}
+
+void ViewFrame::slot_play()
+{
+    if (!isEmpty()) {
+        m_playInterval.reset();
+        m_playTimer.start(m_playInterval.milliseconds());
+    }
+}
+
+void ViewFrame::slot_stop()
+{
+    m_playTimer.stop();
+}
+
+void ViewFrame::slot_playstep()
+{
+    QElapsedTimer timer;
+    timer.start();
+    const qint64 next = m_window.playTarget();
+    if (next == m_window.first() || !m_window.show(next)) {
+        slot_stop();
+        return;
+    }
+    refresh();
+    if (m_playInterval.fit(timer.elapsed())) {
+        m_playTimer.setInterval(m_playInterval.milliseconds());
+    }
+}
+
+void ViewFrame::slot_zoomin()
+{
+    if (!isEmpty() && m_window.zoomIn()) {
+        refresh();
+    }
+}
+
+void ViewFrame::slot_zoomout()
+{
+    if (!isEmpty() && m_window.zoomOut()) {
+        refresh();
+    }
+}
+
+void ViewFrame::slot_zoomin_y()
+{
+    m_trace->zoomInY();
+    emit zoomedInY();
+}
+
+void ViewFrame::slot_zoomout_y()
+{
+    m_trace->zoomOutY();
+    emit zoomedOutY();
+}
+
+void ViewFrame::update_position(double firstSample)
+{
+    const qint64 first = std::clamp<qint64>(std::llround(firstSample), 0, m_window.end());
+    if (!isEmpty() && m_window.show(first)) {
+        refresh();
+    }
+}
+
+void ViewFrame::set_position(double firstSample)
+{
+    m_timeline->set_xpos(firstSample);
+    update_position(firstSample);
+}
+
+void ViewFrame::state_position(bool dragging)
+{
+    if (dragging) {
+        m_resumePlayback = m_playTimer.isActive();
+        slot_stop();
+    } else if (m_resumePlayback) {
+        slot_play();
+    }
+}
+
+void ViewFrame::set_csr_data(qlonglong sample, double i, double q)
+{
+    setCursor(Measuring, m_window.first() + sample);
+    emit cursorMoved(cursor(Measuring), i, q);
+}
+
+void ViewFrame::set_zoom_position(int sample)
+{
+    const qint64 centre = m_window.first() + sample;
+    if (!isEmpty() && m_window.show(m_window.centredOn(centre)) && m_window.zoomIn()) {
+        refresh();
+    }
+}

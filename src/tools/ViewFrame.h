@@ -1,0 +1,111 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "view/PlayInterval.h"
+#include "view/ViewWindow.h"
+
+#include <QTimer>
+#include <QWidget>
+
+#include <array>
+
+class BufferedIO;
+class CWidgetIQTrace;
+class CWidgetTimeline;
+class QHBoxLayout;
+class QVBoxLayout;
+
+/// The frame in which tools look at a whole waveform: a trace "w_iqtrace" of the window's samples,
+/// the overview bar "w_timeline", and the buttons that move, zoom and play. Keeps the window and
+/// the two cursors; places of cursors are samples of the waveform, counted from 0.
+class ViewFrame : public QWidget
+{
+    Q_OBJECT
+
+public:
+    enum Cursor { Measuring = 1, Reference = 2 };
+    static constexpr qint64 NoSample = -1;
+
+    explicit ViewFrame(QWidget *parent = nullptr);
+
+    /// Shows a waveform from its start, with no cursors. The streams aren't owned and stay until
+    /// clear() or the next waveform. False, with the reason logged, if they can't be read; the
+    /// frame is then empty.
+    [[nodiscard]] bool setWaveform(BufferedIO *iqStream, BufferedIO *markerStream, qint64 samples,
+                                   double clockHz);
+    void clear();
+
+    /// Reads the shown samples and markers anew, after their streams were written.
+    void reload();
+
+    /// Places a widget between trace and overview bar, for displays that follow the window.
+    void addPlots(QWidget *plots);
+
+    /// Appends a widget to the row of buttons.
+    void addButton(QWidget *button);
+
+    [[nodiscard]] const ViewWindow &window() const { return m_window; }
+    [[nodiscard]] double clockHz() const { return m_clockHz; }
+    [[nodiscard]] CWidgetIQTrace &trace() { return *m_trace; }
+
+    /// NoSample where there is none.
+    [[nodiscard]] qint64 cursor(Cursor which) const;
+
+    /// Puts a cursor on a sample; NoSample takes it away. Sends nothing.
+    void setCursor(Cursor which, qint64 sample);
+    using QWidget::setCursor;
+
+public slots:
+    void slot_reverse();
+    void slot_forward();
+    void slot_reverse_little();
+    void slot_forward_little();
+    void slot_play();
+    void slot_stop();
+    void slot_playstep();
+    void slot_zoomin();
+    void slot_zoomout();
+    void slot_zoomin_y();
+    void slot_zoomout_y();
+    void slot_move_start();
+    void slot_move_end();
+    /// Moves the view to a first sample, as the overview bar asks.
+    void update_position(double firstSample);
+    /// The same from elsewhere; the bar follows.
+    void set_position(double firstSample);
+    /// A drag on the bar begins or ends; playback pauses meanwhile.
+    void state_position(bool dragging);
+    /// The measuring cursor went to a sample of the view.
+    void set_csr_data(qlonglong sample, double i, double q);
+    /// Zooms in about a sample of the view.
+    void set_zoom_position(int sample);
+
+signals:
+    /// The window holds other samples.
+    void windowChanged();
+    /// The user moved the measuring cursor.
+    void cursorMoved(qlonglong sample, double i, double q);
+    void zoomedInY();
+    void zoomedOutY();
+
+protected:
+    void hideEvent(QHideEvent *event) override;
+
+private:
+    void addNavigation();
+    void moveTo(qint64 first);
+    void refresh();
+    void placeCursors();
+    [[nodiscard]] bool isEmpty() const { return m_window.sampleCount() == 0; }
+
+    CWidgetIQTrace *m_trace = nullptr;
+    CWidgetTimeline *m_timeline = nullptr;
+    QVBoxLayout *m_column = nullptr;
+    QHBoxLayout *m_buttons = nullptr;
+    ViewWindow m_window;
+    QTimer m_playTimer;
+    PlayInterval m_playInterval;
+    double m_clockHz = 0;
+    std::array<qint64, 2> m_cursors{NoSample, NoSample};
+    bool m_resumePlayback = false;
+};
