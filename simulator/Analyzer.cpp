@@ -5,6 +5,24 @@
 #include <cmath>
 
 namespace simulator {
+namespace {
+
+// The signal at the RF input: two tones beside the centre frequency, whatever that is.
+constexpr double CarrierHz = 62.5e3;
+constexpr double CarrierDbm = -16;
+constexpr double SpurHz = -93.75e3;
+constexpr double SpurDbm = -36;
+
+// The same at the I/Q inputs, which know no reference level.
+constexpr double IqCarrier = 0.5;
+constexpr double IqSpur = 0.05;
+
+constexpr double NoiseDeviation = 0.001;
+
+// A record shows this share of its sample rate, its filter takes the rest away.
+constexpr double UsableShare = 0.8;
+
+} // namespace
 
 Analyzer::Analyzer(bool steppedSampleRate, std::uint64_t seed)
     : m_steppedSampleRate(steppedSampleRate)
@@ -32,17 +50,53 @@ void Analyzer::setIqMode(bool on, TimePoint now)
     m_iqMode = on;
 }
 
-void Analyzer::start(TimePoint now, bool ifPowerFires)
+void Analyzer::start(TimePoint now, const Sweep &sweep)
 {
     abort(now);
     m_hasRecord = true;
+    m_sweepDelay = sweep.delay;
+    m_signal = signalAt(sweep.referenceDbm);
+    const bool reachesTrigger = m_signal.carrier.amplitude != 0 && CarrierDbm >= sweep.triggerDbm;
     const bool fires = m_settings.trigger == IqSettings::Trigger::Immediate ||
-                       (m_settings.trigger == IqSettings::Trigger::IfPower && ifPowerFires);
+                       (m_settings.trigger == IqSettings::Trigger::IfPower && reachesTrigger);
     if (fires) {
         begin(now);
     } else {
         m_waiting = true;
     }
+}
+
+// What lies at the input that is chosen, as the record's rate and the reference level let it in.
+SyntheticSignal::Settings Analyzer::signalAt(double referenceDbm) const
+{
+    const auto tone = [&](double frequencyHz, double amplitude) {
+        const bool isInside = std::abs(frequencyHz) <= UsableShare / 2 * m_settings.sampleRateHz;
+        return SyntheticSignal::Tone{frequencyHz, isInside ? amplitude : 0};
+    };
+    const auto amplitude = [&](double dbm) { return std::pow(10, (dbm - referenceDbm) / 20); };
+    SyntheticSignal::Settings signal;
+    signal.seed = m_seed;
+    signal.sampleRateHz = m_settings.sampleRateHz;
+    switch (input) {
+    case AnalyzerInput::Rf:
+        signal.carrier = tone(CarrierHz, amplitude(CarrierDbm));
+        signal.spur = tone(SpurHz, amplitude(SpurDbm));
+        signal.noiseDeviation = NoiseDeviation;
+        break;
+    case AnalyzerInput::AnalogIq:
+        signal.carrier = tone(-CarrierHz, IqCarrier);
+        signal.spur = tone(-SpurHz, IqSpur);
+        signal.noiseDeviation = NoiseDeviation;
+        break;
+    case AnalyzerInput::DigitalIq:
+        signal.carrier = tone(CarrierHz, IqCarrier);
+        break;
+    }
+    if (m_settings.trigger == IqSettings::Trigger::IfPower) {
+        signal.isSilentBefore = m_settings.positiveSlope;
+        signal.isSilentAfter = !m_settings.positiveSlope;
+    }
+    return signal;
 }
 
 void Analyzer::abort(TimePoint now)
@@ -71,10 +125,12 @@ TimePoint Analyzer::sweepEnd() const
     return m_waiting ? TimePoint::max() : m_sweepEnd;
 }
 
-std::unique_ptr<DataSource> Analyzer::record(std::uint64_t firstSample,
-                                             std::uint64_t sampleCount) const
+std::unique_ptr<IqSource> Analyzer::record(std::uint64_t firstSample,
+                                           std::uint64_t sampleCount) const
 {
-    return std::make_unique<IqSource>(m_seed, firstSample, sampleCount, format);
+    const std::int64_t first =
+        static_cast<std::int64_t>(firstSample) - m_settings.pretriggerSamples;
+    return std::make_unique<IqSource>(SyntheticSignal(m_signal), first, sampleCount, format);
 }
 
 void Analyzer::reset()
@@ -88,7 +144,7 @@ void Analyzer::begin(TimePoint now)
     m_waiting = false;
     const double seconds = static_cast<double>(m_settings.sampleCount) / m_settings.sampleRateHz;
     m_sweepEnd =
-        now + std::chrono::milliseconds(20) +
+        now + std::chrono::milliseconds(20) + m_sweepDelay +
         std::chrono::duration_cast<Clock::duration>(std::chrono::duration<double>(seconds));
 }
 

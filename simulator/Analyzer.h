@@ -3,6 +3,7 @@
 
 #include "IqSource.h"
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -29,8 +30,6 @@ enum class AnalyzerInput { Rf, AnalogIq, DigitalIq };
 class Analyzer
 {
 public:
-    static constexpr double CarrierBelowReferenceDb = 6.0; ///< of the synthetic signal
-
     /// `steppedSampleRate`: only 32 MHz divided by powers of two can be had.
     Analyzer(bool steppedSampleRate, std::uint64_t seed);
 
@@ -43,9 +42,16 @@ public:
     void setIqMode(bool on, TimePoint now);
     [[nodiscard]] bool isIqMode() const { return m_iqMode; }
 
-    /// Starts a sweep; it begins at once or waits for its trigger. `ifPowerFires`: the signal is
-    /// above the level of the IF power trigger.
-    void start(TimePoint now, bool ifPowerFires);
+    /// What a sweep goes by besides the settings of its record.
+    struct Sweep
+    {
+        double referenceDbm = -10;         ///< power of a tone with the amplitude 1
+        double triggerDbm = -20;           ///< level of the IF power trigger
+        std::chrono::milliseconds delay{}; ///< that it takes longer than its samples last
+    };
+
+    /// Starts a sweep; it begins at once or waits for its trigger.
+    void start(TimePoint now, const Sweep &sweep);
 
     /// Ends a sweep; a record that was not complete is lost.
     void abort(TimePoint now);
@@ -63,12 +69,9 @@ public:
     /// A sweep was started with these settings, and not aborted.
     [[nodiscard]] bool hasRecord() const { return m_hasRecord; }
 
-    /// Part of the record.
-    [[nodiscard]] std::unique_ptr<DataSource> record(std::uint64_t firstSample,
-                                                     std::uint64_t sampleCount) const;
-
-    /// The first samples of the record, for answers as text.
-    [[nodiscard]] SyntheticSignal signal() const { return SyntheticSignal(m_seed); }
+    /// Part of the record of the last sweep.
+    [[nodiscard]] std::unique_ptr<IqSource> record(std::uint64_t firstSample,
+                                                   std::uint64_t sampleCount) const;
 
     void reset();
 
@@ -78,6 +81,7 @@ public:
 
 private:
     void begin(TimePoint now);
+    [[nodiscard]] SyntheticSignal::Settings signalAt(double referenceDbm) const;
 
     bool m_steppedSampleRate;
     std::uint64_t m_seed;
@@ -86,6 +90,8 @@ private:
     bool m_waiting = false;
     bool m_hasRecord = false;
     TimePoint m_sweepEnd;
+    std::chrono::milliseconds m_sweepDelay{};
+    SyntheticSignal::Settings m_signal; ///< of the last sweep
 };
 
 } // namespace simulator

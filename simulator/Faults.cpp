@@ -22,7 +22,7 @@ struct Spec
 
 constexpr std::int64_t MaxBytes = std::int64_t{1} << 40;
 
-constexpr std::array<Spec, 12> Specs{{
+constexpr std::array<Spec, 15> Specs{{
     {"busy", Value::Required, 0, 86400, "busy=SECONDS",
      "loading a waveform keeps the instrument busy that long"},
     {"drop-after", Value::Required, 0, MaxBytes, "drop-after=BYTES",
@@ -32,6 +32,8 @@ constexpr std::array<Spec, 12> Specs{{
     {"error-after-transfer", Value::Optional, -999, 32767, "error-after-transfer[=NUMBER]",
      "an error (-310) waits in the queue after each file transfer"},
     {"idn", Value::Text, 0, 0, "idn=TEXT", "another answer to *IDN?"},
+    {"long-block", Value::Optional, 1, 1'000'000, "long-block[=BYTES]",
+     "a binary block holds so many bytes, or 8, more than were asked for"},
     {"no-portmapper", Value::None, 0, 0, "no-portmapper", "port 111 stays closed"},
     {"no-raw", Value::None, 0, 0, "no-raw", "port 5025 stays closed"},
     {"no-terminator", Value::None, 0, 0, "no-terminator",
@@ -40,8 +42,12 @@ constexpr std::array<Spec, 12> Specs{{
     {"queue", Value::Required, 0, 1000, "queue=N", "N entries stand in the error queue"},
     {"short-block", Value::Optional, 1, MaxBytes, "short-block[=BYTES]",
      "so many bytes, or half of it, are missing at the end of a binary block"},
+    {"small-block", Value::Optional, 1, MaxBytes, "small-block[=BYTES]",
+     "a binary block is whole, but holds so many bytes, or 8, less than were asked for"},
     {"slow-answer", Value::Required, 0, 86400000, "slow-answer=MS",
      "each answer comes that many milliseconds late"},
+    {"slow-sweep", Value::Required, 0, 86400000, "slow-sweep=MS",
+     "each sweep takes that much longer than its samples last"},
 }};
 
 std::optional<std::int64_t> parseNumber(std::string_view text)

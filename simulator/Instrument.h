@@ -7,8 +7,8 @@
 #include "ErrorQueue.h"
 #include "Faults.h"
 #include "MassMemory.h"
-#include "modeltable.h"
 #include "StatusRegisters.h"
+#include "modeltable.h"
 
 #include <condition_variable>
 #include <functional>

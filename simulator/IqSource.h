@@ -2,42 +2,13 @@
 #pragma once
 
 #include "OutputQueue.h"
+#include "SyntheticSignal.h"
 
 #include <array>
 #include <cstdint>
+#include <limits>
 
 namespace simulator {
-
-/// One complex sample in units of the reference level.
-struct IqSample
-{
-    float i = 0;
-    float q = 0;
-};
-
-/// The signal at the input of every simulated analyzer: a carrier of half the reference level at
-/// 1/16 of the sample rate above the centre, a second one of 1/20 at 3/32 below it, and white
-/// Gaussian noise of 1/1000 in each of I and Q.
-///
-/// Each sample depends on the seed and its number alone, so that any part of a record can be made
-/// at any time and is always the same.
-class SyntheticSignal
-{
-public:
-    explicit SyntheticSignal(std::uint64_t seed);
-
-    [[nodiscard]] IqSample sample(std::uint64_t index) const;
-
-    static constexpr double CarrierAmplitude = 0.5;
-    static constexpr double SpurAmplitude = 0.05;
-    static constexpr double NoiseDeviation = 0.001;
-
-private:
-    static constexpr unsigned Period = 32; ///< samples after which both carriers repeat
-
-    std::uint64_t m_seed;
-    std::array<IqSample, Period> m_carriers{};
-};
 
 /// The order of the values in a record.
 enum class IqFormat {
@@ -49,18 +20,26 @@ enum class IqFormat {
 class IqSource final : public DataSource
 {
 public:
-    IqSource(std::uint64_t seed, std::uint64_t firstSample, std::uint64_t sampleCount,
+    static constexpr std::uint64_t SampleSize = 8; ///< bytes
+
+    /// `firstSample` counts from the trigger on.
+    IqSource(const SyntheticSignal &signal, std::int64_t firstSample, std::uint64_t sampleCount,
              IqFormat format);
 
     [[nodiscard]] std::size_t read(std::uint64_t offset, std::span<char> buffer) override;
 
+    /// One sample of the record, by its place there.
+    [[nodiscard]] const IqSample &sample(std::uint64_t place);
+
 private:
-    [[nodiscard]] float value(std::uint64_t number) const;
+    [[nodiscard]] std::size_t loadBlockOf(std::uint64_t place);
 
     SyntheticSignal m_signal;
-    std::uint64_t m_firstSample;
+    std::int64_t m_firstSample;
     std::uint64_t m_sampleCount;
     IqFormat m_format;
+    std::array<IqSample, SyntheticSignal::BlockSize> m_block{};
+    std::int64_t m_blockNumber = std::numeric_limits<std::int64_t>::min();
 };
 
 } // namespace simulator

@@ -96,9 +96,18 @@ void Link::respond(std::string text)
 
 void Link::respondBlock(std::unique_ptr<DataSource> source, std::uint64_t size)
 {
+    constexpr std::int64_t WrongBytes = 8;
     const Faults &faults = m_instrument.faults();
     beginAnswer();
-    m_response.push_back({.text = blockHead(size)});
+    std::uint64_t surplus = 0;
+    if (faults.has("small-block")) {
+        const std::int64_t missing = faults.number("small-block").value_or(WrongBytes);
+        size -= std::min(static_cast<std::uint64_t>(missing), size);
+    } else if (faults.has("long-block")) {
+        const std::int64_t more = faults.number("long-block").value_or(WrongBytes);
+        surplus = static_cast<std::uint64_t>(more);
+    }
+    m_response.push_back({.text = blockHead(size + surplus)});
     std::uint64_t sent = size;
     if (faults.has("short-block")) {
         const auto missing = static_cast<std::uint64_t>(
@@ -110,6 +119,11 @@ void Link::respondBlock(std::unique_ptr<DataSource> source, std::uint64_t size)
         m_withoutTerminator = true;
     }
     m_response.push_back({.text = {}, .source = std::move(source), .size = sent, .isBlock = true});
+    if (surplus > 0) {
+        m_response.push_back({.text = std::string(static_cast<std::size_t>(surplus), '\0'),
+                              .size = surplus,
+                              .isBlock = true});
+    }
     m_blockBytes = 0;
     countBlockBytes(0);
 }

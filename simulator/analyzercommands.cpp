@@ -17,7 +17,7 @@ constexpr NumberRange FilterRange{"HZ", 300e3, 50e6, 10e6};
 constexpr NumberRange SampleRateRange{"HZ", 10e3, 326e6, 32e6};
 constexpr std::int64_t MinPretrigger = -16'776'703;
 constexpr std::int64_t MaxPretrigger = 65'023;
-constexpr std::uint64_t SampleSize = 8;
+constexpr std::uint64_t SampleSize = IqSource::SampleSize;
 constexpr std::int64_t MaxSamples = 999'999'999 / static_cast<std::int64_t>(SampleSize);
 constexpr std::uint64_t MaxTextSamples = 100'000;
 
@@ -115,9 +115,11 @@ void querySampleRate(CommandContext &context)
 void initiate(CommandContext &context)
 {
     Instrument &instrument = context.instrument;
-    const double signalDbm =
-        settingValue(instrument, ReferenceLevel) - Analyzer::CarrierBelowReferenceDb;
-    instrument.analyzer.start(context.now, signalDbm >= settingValue(instrument, IfPowerLevel));
+    instrument.analyzer.start(
+        context.now,
+        {.referenceDbm = settingValue(instrument, ReferenceLevel),
+         .triggerDbm = settingValue(instrument, IfPowerLevel),
+         .delay = std::chrono::milliseconds(instrument.faults().number("slow-sweep").value_or(0))});
 }
 
 void abortSweep(CommandContext &context)
@@ -132,12 +134,12 @@ void respondText(CommandContext &context, std::uint64_t first, std::uint64_t cou
         return;
     }
     const Analyzer &analyzer = context.instrument.analyzer;
-    const SyntheticSignal signal = analyzer.signal();
+    const std::unique_ptr<IqSource> record = analyzer.record(first, count);
     std::string text;
     std::string second;
     const bool pairs = analyzer.format == IqFormat::Pairs;
-    for (std::uint64_t i = first; i < first + count; ++i) {
-        const IqSample sample = signal.sample(i);
+    for (std::uint64_t place = 0; place < count; ++place) {
+        const IqSample sample = record->sample(place);
         text += numberText(sample.i) + ',';
         (pairs ? text : second) += numberText(sample.q) + ',';
     }

@@ -128,6 +128,14 @@ quint32 Vxi11Client::linkOnly(quint32 procedure)
     return firstNumber(call(CoreProgram, procedure, XdrArguments().number(m_link).bytes()));
 }
 
+int Vxi11Client::statusByte()
+{
+    XdrArguments arguments;
+    arguments.number(m_link).number(0).number(0).number(0);
+    const auto reply = call(CoreProgram, DeviceReadStb, arguments.bytes());
+    return firstNumber(reply) == 0 ? static_cast<int>(numberAt(*reply, 4)) : -1;
+}
+
 QByteArray Vxi11Client::readArguments(quint32 link, quint32 count, quint32 timeoutMs)
 {
     XdrArguments arguments;

@@ -66,6 +66,9 @@ public:
     quint32 lock(quint32 flags = 0, quint32 timeoutMs = 0);
     quint32 linkOnly(quint32 procedure);
 
+    /// The status byte; -1 when it could not be had.
+    [[nodiscard]] int statusByte();
+
     [[nodiscard]] ReadResult read(quint32 count, quint32 timeoutMs = 5000,
                                   std::optional<char> termChar = std::nullopt);
     [[nodiscard]] static QByteArray readArguments(quint32 link, quint32 count, quint32 timeoutMs);
