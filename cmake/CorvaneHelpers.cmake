@@ -109,11 +109,13 @@ function(corvane_add_program name)
   target_link_libraries(${name} PRIVATE ${arg_LINK} corvane_settings)
 endfunction()
 
-# corvane_add_test(NAME LABEL unit|gui|instrument|e2e SOURCES ... LINK ... [ENVIRONMENT ...]):
-# a Qt Test program with tests/support, run without a display and with settings and temporary files
-# of its own. What drives modal windows comes with the label gui; others link corvane_test_windows.
+# corvane_add_test(NAME LABEL unit|gui|instrument|e2e [THREADED] SOURCES ... LINK ...
+# [ENVIRONMENT ...]): a Qt Test program with tests/support, run without a display and with settings
+# and temporary files of its own. What drives modal windows comes with the label gui; others link
+# corvane_test_windows. THREADED: several threads work in it or in the programs that it starts, so
+# that it is run under the thread sanitizer as well.
 function(corvane_add_test name)
-  cmake_parse_arguments(arg "" "LABEL" "SOURCES;LINK;ENVIRONMENT" ${ARGN})
+  cmake_parse_arguments(arg "THREADED" "LABEL" "SOURCES;LINK;ENVIRONMENT" ${ARGN})
   set(support corvane_test_support)
   if(arg_LABEL STREQUAL "gui")
     list(PREPEND support corvane_test_windows)
@@ -122,9 +124,16 @@ function(corvane_add_test name)
   target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/tests")
   set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests")
   add_test(NAME ${name} COMMAND ${name})
+  if(CORVANE_SANITIZE STREQUAL "thread")
+    target_link_libraries(${name} PRIVATE $<TARGET_OBJECTS:corvane_tsan_qt>)
+  endif()
+  if(arg_THREADED)
+    list(APPEND arg_LABEL threads)
+    add_dependencies(threaded_tests ${name})
+  endif()
   set_tests_properties(${name} PROPERTIES
     LABELS "${arg_LABEL}"
-    ENVIRONMENT "QT_QPA_PLATFORM=offscreen;CORVANE_BIN=${CMAKE_BINARY_DIR}/bin;LC_ALL=C.UTF-8;UBSAN_OPTIONS=print_stacktrace=1;${arg_ENVIRONMENT}")
+    ENVIRONMENT "QT_QPA_PLATFORM=offscreen;CORVANE_BIN=${CMAKE_BINARY_DIR}/bin;LC_ALL=C.UTF-8;UBSAN_OPTIONS=print_stacktrace=1;TSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/tsan/suppressions.txt die_after_fork=0;${arg_ENVIRONMENT}")
 endfunction()
 
 # corvane_add_bench(NAME SOURCES ... LINK ...): a Google Benchmark program; never part of ctest.

@@ -1,0 +1,90 @@
+// SPDX-License-Identifier: Apache-2.0
+// Qt as packaged is not built for the thread sanitizer, which therefore doesn't see what its
+// semaphores, recursive mutexes and thread pools put in order, and would report all that they
+// guard. These functions stand in the place of Qt's, call them, and tell the sanitizer.
+#include <QRecursiveMutex>
+#include <QRunnable>
+#include <QSemaphore>
+#include <QThreadPool>
+
+#include <atomic>
+#include <functional>
+#include <utility>
+
+#include <dlfcn.h>
+#include <sanitizer/tsan_interface.h>
+
+namespace {
+
+/// Qt's own function behind that of this file.
+template <typename Function>
+Function next(const char *name)
+{
+    return reinterpret_cast<Function>(dlsym(RTLD_NEXT, name));
+}
+
+/// Work for a thread of a pool. Its maker is done with it before it runs.
+class Task : public QRunnable
+{
+public:
+    explicit Task(std::function<void()> work)
+        : m_work(std::move(work))
+    {
+        m_isMade.store(true, std::memory_order_release);
+    }
+
+    void run() override
+    {
+        if (m_isMade.load(std::memory_order_acquire)) {
+            m_work();
+        }
+    }
+
+private:
+    std::function<void()> m_work;
+    std::atomic<bool> m_isMade{false};
+};
+
+} // namespace
+
+void QSemaphore::acquire(int n)
+{
+    static const auto original = next<void (*)(QSemaphore *, int)>("_ZN10QSemaphore7acquireEi");
+    original(this, n);
+    __tsan_acquire(this);
+}
+
+void QSemaphore::release(int n)
+{
+    static const auto original = next<void (*)(QSemaphore *, int)>("_ZN10QSemaphore7releaseEi");
+    __tsan_release(this);
+    original(this, n);
+}
+
+bool QRecursiveMutex::tryLock(int timeout)
+{
+    static const auto original =
+        next<bool (*)(QRecursiveMutex *, int)>("_ZN15QRecursiveMutex7tryLockEi");
+    const bool locked = original(this, timeout);
+    if (locked) {
+        __tsan_acquire(this);
+    }
+    return locked;
+}
+
+void QRecursiveMutex::unlock() noexcept
+{
+    static const auto original = next<void (*)(QRecursiveMutex *)>("_ZN15QRecursiveMutex6unlockEv");
+    __tsan_release(this);
+    original(this);
+}
+
+bool QThreadPool::tryStart(std::function<void()> functionToRun)
+{
+    auto *task = new Task(std::move(functionToRun));
+    if (tryStart(task)) {
+        return true;
+    }
+    delete task;
+    return false;
+}
