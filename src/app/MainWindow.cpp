@@ -7,7 +7,6 @@
 #include "devicechoice.h"
 #include "instrument/ui/DlgInstrConfig.h"
 #include "mnemonics.h"
-#include "processage.h"
 #include "settingsstores.h"
 #include "splittersettings.h"
 #include "toolframe/QtProgressDialog.h"
@@ -22,7 +21,6 @@
 #include <QPointer>
 #include <QShortcut>
 #include <QSignalBlocker>
-#include <QTimer>
 
 namespace {
 
@@ -283,25 +281,6 @@ void MainWindow::saveSettings()
     if (settings->status() != QSettings::NoError) {
         QMessageBox::critical(nullptr, windowTitle(), "The settings file cannot be written.\n");
     }
-}
-
-bool MainWindow::event(QEvent *event)
-{
-    const bool handled = QMainWindow::event(event);
-    if (event->type() == QEvent::Paint && !m_paintSeen) {
-        m_paintSeen = true;
-        // The children are painted within the same pass, before the next turn of the event loop.
-        QTimer::singleShot(0, this, &MainWindow::noteFirstPaint);
-    }
-    return handled;
-}
-
-void MainWindow::noteFirstPaint()
-{
-    m_firstPaintMs = processAgeMs();
-    Tracer::Trace(Tracer::Debug,
-                  QString("First paint %1 ms after the start of the process").arg(m_firstPaintMs));
-    emit firstPainted();
 }
 
 void MainWindow::closeEvent(QCloseEvent *event)

@@ -38,16 +38,7 @@ public:
 
     [[nodiscard]] ModulesDb &modules() { return m_modules; }
 
-    /// Milliseconds from the start of the process to the first complete paint of this window; -1
-    /// before it. The start is known to 10 ms.
-    [[nodiscard]] qint64 firstPaintMs() const { return m_firstPaintMs; }
-
-signals:
-    /// The window has been painted for the first time.
-    void firstPainted();
-
 protected:
-    bool event(QEvent *event) override;
     void closeEvent(QCloseEvent *event) override;
     void hideEvent(QHideEvent *event) override;
     void showEvent(QShowEvent *event) override;
@@ -97,7 +88,6 @@ private:
     [[nodiscard]] Pane &otherPane(const Pane &pane);
     void loadSettings();
     void saveSettings();
-    void noteFirstPaint();
 
     ModulesDb m_modules;
     Tracer m_tracer;
@@ -107,7 +97,5 @@ private:
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;
-    qint64 m_firstPaintMs = -1;
-    bool m_paintSeen = false;
     bool m_noVisa = false;
 };

@@ -9,17 +9,17 @@
 
 namespace {
 
-/// Runs the program with a home and settings of its own.
+/// Runs a program with a home and settings of its own.
 struct Run
 {
-    Run(const QStringList &arguments, const QString &home)
+    Run(const QString &program, const QStringList &arguments, const QString &home)
     {
         QProcess process;
         QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
         environment.insert("HOME", home);
         environment.insert("XDG_CONFIG_HOME", home + "/config");
         process.setProcessEnvironment(environment);
-        process.start(qEnvironmentVariable("CORVANE_BIN") + "/corvane", arguments);
+        process.start(qEnvironmentVariable("CORVANE_BIN") + "/" + program, arguments);
         finished = process.waitForFinished(60000) && process.exitStatus() == QProcess::NormalExit;
         status = process.exitCode();
         output = QString::fromLocal8Bit(process.readAllStandardOutput());
@@ -54,7 +54,7 @@ void TestProgram::startsAndQuits()
     const QString file = m_home.filePath("tone.wv");
     QVERIFY(writeTone(file));
     const QDir pictures(m_home.filePath("pictures"));
-    const Run run({"--screenshot", pictures.path(), file, "--unknown"}, m_home.path());
+    const Run run("corvane-pictures", {pictures.path(), file}, m_home.path());
     QVERIFY2(run.finished && run.status == 0, qPrintable(run.errors));
     const QImage window(pictures.filePath("main-window.png"));
     QVERIFY(window.width() >= 700 && window.height() >= 500);
@@ -71,7 +71,7 @@ void TestProgram::offersNoInstrumentWithoutVisa()
                       "[InstrConfig]\nen0=true\nmodel0=TGX-870\nserial0=100001\n"
                       "instr0=GPIB0::28::INSTR\nintf0=GPIB0\ninstr1=\n"));
     const QDir pictures(m_home.filePath("no-visa"));
-    const Run run({"--no-visa", "--screenshot", pictures.path()}, m_home.path());
+    const Run run("corvane-pictures", {"--no-visa", pictures.path()}, m_home.path());
     QVERIFY2(run.finished && run.status == 0, qPrintable(run.errors));
     // The instruments are pictured when the panes offer one.
     QCOMPARE(pictures.entryList(QDir::Files), QStringList("main-window.png"));
@@ -79,7 +79,7 @@ void TestProgram::offersNoInstrumentWithoutVisa()
 
 void TestProgram::complainsAboutAMissingFile()
 {
-    const Run run({"--screenshot", m_home.filePath("none"), "/no/such.wv"}, m_home.path());
+    const Run run("corvane-pictures", {m_home.filePath("none"), "/no/such.wv"}, m_home.path());
     QVERIFY(run.finished);
     QCOMPARE(run.status, 1);
     QVERIFY(run.errors.contains("there is no file '/no/such.wv'"));
@@ -92,7 +92,7 @@ void TestProgram::answersWithoutADisplay_data()
     QTest::newRow("version") << "--version"
                              << "corvane ";
     QTest::newRow("help") << "--help"
-                          << "Usage: corvane ";
+                          << "Usage: ";
 }
 
 void TestProgram::answersWithoutADisplay()
@@ -100,7 +100,7 @@ void TestProgram::answersWithoutADisplay()
     QFETCH(QString, argument);
     QFETCH(QString, answer);
     qputenv("QT_QPA_PLATFORM", "xcb");
-    const Run run({argument}, m_home.path());
+    const Run run("corvane", {"--unknown", argument, "file"}, m_home.path());
     qputenv("QT_QPA_PLATFORM", "offscreen");
     QVERIFY(run.finished);
     QCOMPARE(run.status, 0);

@@ -1,13 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "processage.h"
+#include "FirstPaint.h"
 
 #include <QByteArray>
+#include <QEvent>
 #include <QFile>
 #include <QList>
+#include <QTimer>
+#include <QWidget>
 
 #include <ctime>
 #include <unistd.h>
 
+namespace {
+
+/// Milliseconds since the system started this process; -1 if it can't be told.
 qint64 processAgeMs()
 {
     // proc(5): behind the name in parentheses, which may hold blanks, field 22 of the line is the
@@ -26,4 +32,21 @@ qint64 processAgeMs()
     }
     const qint64 startMs = fields.at(StartField).toLongLong() * 1000 / ticksPerSecond;
     return now.tv_sec * 1000 + now.tv_nsec / 1000000 - startMs;
+}
+
+} // namespace
+
+FirstPaint::FirstPaint(QWidget &window)
+{
+    window.installEventFilter(this);
+}
+
+bool FirstPaint::eventFilter(QObject *watched, QEvent *event)
+{
+    if (event->type() == QEvent::Paint && !m_seen) {
+        m_seen = true;
+        // The children are painted within the same pass, before the next turn of the event loop.
+        QTimer::singleShot(0, this, [this] { m_ageMs = processAgeMs(); });
+    }
+    return QObject::eventFilter(watched, event);
 }

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ScreenshotRun.h"
 
-#include "MainWindow.h"
-#include "QCustomTreeView.h"
-#include "settingsstores.h"
+#include "app/MainWindow.h"
+#include "app/QCustomTreeView.h"
+#include "app/settingsstores.h"
 #include "toolframe/DlgBase.h"
 #include "toolframe/QtProgressDialog.h"
 
@@ -31,13 +31,14 @@ constexpr QSize PictureSize(1060, 640);
 
 void complain(const QString &text)
 {
-    std::fprintf(stderr, "corvane: %s\n", qPrintable(text));
+    std::fprintf(stderr, "corvane-pictures: %s\n", qPrintable(text));
 }
 
 } // namespace
 
 ScreenshotRun::ScreenshotRun(MainWindow &window, QString folder, const QString &file)
     : m_window(window)
+    , m_firstPaint(window)
     , m_folder(std::move(folder))
     , m_file(file.isEmpty() ? QString() : QFileInfo(file).absoluteFilePath())
 {
@@ -139,7 +140,7 @@ void ScreenshotRun::takePictures()
         done = saveInstruments() && done;
     }
     std::printf("first paint %lld ms after the start\n",
-                static_cast<long long>(m_window.firstPaintMs()));
+                static_cast<long long>(m_firstPaint.ageMs()));
     finish(done ? 0 : 1);
 }
 

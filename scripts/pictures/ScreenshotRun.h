@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "FirstPaint.h"
+
 #include <QFile>
 #include <QObject>
 #include <QPair>
@@ -12,8 +14,8 @@ class MainWindow;
 class QCustomTreeView;
 class QPixmap;
 
-/// Shows a file in the main window, leaves pictures of the window and of the tools in a folder and
-/// ends the program, for documentation and for machines without a display.
+/// Shows a file in the main window, leaves pictures of the window and of the tools in a folder,
+/// says on standard output how long the window took to appear, and ends the program.
 class ScreenshotRun : public QObject
 {
     Q_OBJECT
@@ -46,6 +48,7 @@ private:
     void finish(int status);
 
     MainWindow &m_window;
+    FirstPaint m_firstPaint;
     QString m_folder;
     QString m_file;                                          ///< absolute, empty for none
     QSet<QPair<const QCustomTreeView *, QString>> m_arrived; ///< folders that the panes know
