@@ -8,7 +8,9 @@
 #include <QThread>
 #include <QTime>
 
+#include <algorithm>
 #include <utility>
+#include <vector>
 
 namespace {
 
@@ -22,7 +24,7 @@ struct LogState
     QList<Tracer::Entry> pending;
     // Recursive, since a slot that runs at once in the logging thread may log itself.
     QRecursiveMutex listenerMutex;
-    QList<Tracer *> listeners;
+    std::vector<Tracer *> listeners;
 };
 
 LogState &state()
@@ -37,13 +39,13 @@ Tracer::Tracer(QObject *parent)
     : QObject(parent)
 {
     const QMutexLocker locker(&state().listenerMutex);
-    state().listeners.append(this);
+    state().listeners.push_back(this);
 }
 
 Tracer::~Tracer()
 {
     const QMutexLocker locker(&state().listenerMutex);
-    state().listeners.removeOne(this);
+    std::erase(state().listeners, this);
 }
 
 bool Tracer::isEnabled(int level)
@@ -73,7 +75,8 @@ void Tracer::Trace(int level, const QString &text)
         }
         pending.append({line, level});
     }
-    QList<Tracer *> listeners;
+    // No QList, whose copy would share its block with the list that other threads change.
+    std::vector<Tracer *> listeners;
     {
         const QMutexLocker locker(&state().listenerMutex);
         listeners = state().listeners;
@@ -81,7 +84,7 @@ void Tracer::Trace(int level, const QString &text)
     for (Tracer *listener : listeners) {
         QMutexLocker locker(&state().listenerMutex);
         // A slot or another thread may have destroyed a listener that the copy still names.
-        if (!state().listeners.contains(listener)) {
+        if (std::ranges::find(state().listeners, listener) == state().listeners.end()) {
             continue;
         }
         if (listener->thread() == QThread::currentThread()) {
