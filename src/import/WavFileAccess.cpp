@@ -1,13 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WavFileAccess.h"
 
-#include "base/ProgressClock.h"
+#include "pcmwords.h"
+
 #include "log/Tracer.h"
 #include "streams/BufferedIO.h"
 
 #include <QDataStream>
-#include <QFileInfo>
-#include <QtEndian>
 
 #include <algorithm>
 #include <vector>
@@ -26,59 +25,43 @@ double WavHeader::playTime() const
 }
 
 WavFileAccess::WavFileAccess(QObject *parent)
-    : QObject(parent)
+    : FileAccess(parent)
 {
 }
 
-bool WavFileAccess::open(const QString &fileName)
+void WavFileAccess::forget()
 {
-    close();
-    if (!fileName.isEmpty()) {
-        m_file.setFileName(fileName);
-        m_header = WavHeader();
-    }
-    // A pipe or a device may never end; a chunk walk needs a file that can be searched.
-    return QFileInfo(m_file.fileName()).isFile() && m_file.open(QIODevice::ReadOnly);
-}
-
-void WavFileAccess::close()
-{
-    m_file.close();
-}
-
-void WavFileAccess::cancel()
-{
-    m_cancelled = true;
+    m_header = WavHeader();
 }
 
 bool WavFileAccess::readHeader()
 {
-    Tracer::Trace(Tracer::Information, "Reading header data from file " + m_file.fileName());
+    Tracer::Trace(Tracer::Information, "Reading header data from file " + fileName());
     m_header = WavHeader();
-    return m_file.isOpen() ? checkHeader() : Tracer::fail("File is not open.");
+    return isOpen() ? checkHeader() : Tracer::fail("File is not open.");
 }
 
 bool WavFileAccess::checkHeader()
 {
     Tracer::Trace(Tracer::Debug, "Checking .wav file header.");
-    if (!m_file.seek(0) || m_file.read(chunkIdSize) != "RIFF") {
+    if (!device()->seek(0) || device()->read(chunkIdSize) != "RIFF") {
         return Tracer::fail("This is not a valid RIFF waveform file.");
     }
-    QDataStream stream(&m_file);
+    QDataStream stream(device());
     stream.setByteOrder(QDataStream::LittleEndian);
     quint32 fileSize = 0;
     stream >> fileSize;
     if (stream.status() != QDataStream::Ok || fileSize < 8) {
         return Tracer::fail("The file size seems to be invalid.");
     }
-    if (m_file.read(chunkIdSize) != "WAVE") {
+    if (device()->read(chunkIdSize) != "WAVE") {
         return Tracer::fail("This is not a valid WAVE waveform file.");
     }
     Tracer::Trace(Tracer::Debug, "Evaluating chunks...");
     bool formatFound = false;
     bool dataFound = false;
     for (;;) {
-        const QByteArray id = m_file.read(chunkIdSize);
+        const QByteArray id = device()->read(chunkIdSize);
         if (id.size() < chunkIdSize) {
             Tracer::Trace(Tracer::Debug, "No more header signatures available in .wav file.");
             break;
@@ -88,7 +71,7 @@ bool WavFileAccess::checkHeader()
         if (stream.status() != QDataStream::Ok || length <= 8) {
             return Tracer::fail("No chunk length available in .wav file.");
         }
-        const qint64 position = m_file.pos();
+        const qint64 position = device()->pos();
         if (id == "fmt ") {
             Tracer::Trace(
                 Tracer::Debug,
@@ -108,8 +91,13 @@ bool WavFileAccess::checkHeader()
             logUnknownChunk(id, length);
         }
         // A length that leads beyond the end leaves nothing to walk on to.
-        if (!m_file.seek(position + length)) {
+        if (!device()->seek(position + length)) {
             break;
+        }
+        // Most programs fill a chunk of odd length up by a zero that the length doesn't count; no
+        // chunk's name begins with one.
+        if (length % 2 == 1 && device()->peek(1) == QByteArray(1, '\0')) {
+            static_cast<void>(device()->skip(1));
         }
     }
     m_header.valid = formatFound && dataFound;
@@ -123,7 +111,7 @@ bool WavFileAccess::checkFormatChunk(quint32 length)
     if (length != pcmChunkSize) {
         return Tracer::fail("Format chunk has invalid length.");
     }
-    QDataStream stream(&m_file);
+    QDataStream stream(device());
     stream.setByteOrder(QDataStream::LittleEndian);
     stream >> m_header.formatTag;
     if (m_header.formatTag != pcm) {
@@ -151,16 +139,15 @@ void WavFileAccess::logUnknownChunk(const QByteArray &id, quint32 length) const
 {
     Tracer::Trace(
         Tracer::Debug,
-        QString("  Found unknown chunk at position %1.").arg(m_file.pos() - chunkHeadSize));
+        QString("  Found unknown chunk at position %1.").arg(device()->pos() - chunkHeadSize));
     Tracer::Trace(Tracer::Debug, "  - ID is '" + QString::fromLatin1(id) + "'.");
     Tracer::Trace(Tracer::Debug, QString("  - Chunk Length is %1 bytes.").arg(length));
 }
 
 bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
 {
-    m_cancelled = false;
     Tracer::Trace(Tracer::Information, "Reading data from WAV file.");
-    if (!m_file.isOpen()) {
+    if (!isOpen()) {
         return Tracer::fail("File is not open.");
     }
     if (!stream->writeHeader(BufferedIO::DataHeader)) {
@@ -169,11 +156,10 @@ bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
     const qint64 total = limit > 0 ? std::min(limit, m_header.samples()) : m_header.samples();
     Tracer::Trace(Tracer::Information, QString("  Start position : %1").arg(m_header.dataPosition));
     Tracer::Trace(Tracer::Information, QString("  Samples to read : %1").arg(total));
-    if (!m_file.seek(m_header.dataPosition)) {
+    if (!device()->seek(m_header.dataPosition)) {
         return Tracer::fail("Cannot set start position data section.");
     }
-    ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, m_cancelled);
-    constexpr float scale = 1.0F / 32768.0F;
+    ProgressClock progress = startProgress();
     std::vector<qint16> words(2 * static_cast<size_t>(std::min<qint64>(total, blockSamples)));
     std::vector<float> values(words.size());
     for (qint64 done = 0; done < total;) {
@@ -181,12 +167,9 @@ bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
             return Tracer::fail("*** Action aborted by user.");
         }
         const qint64 wanted = std::min<qint64>(total - done, blockSamples);
-        const qint64 got = m_file.read(reinterpret_cast<char *>(words.data()), 4 * wanted);
+        const qint64 got = device()->read(reinterpret_cast<char *>(words.data()), 4 * wanted);
         const auto count = static_cast<size_t>(std::max<qint64>(got, 0) / 4);
-        qFromLittleEndian<qint16>(words.data(), static_cast<qsizetype>(2 * count), words.data());
-        for (size_t i = 0; i < 2 * count; ++i) {
-            values[i] = static_cast<float>(words[i]) * scale;
-        }
+        convertWords(std::span(words).first(2 * count), true, values.data());
         if (count > 0 &&
             !stream->writeBytes(static_cast<int>(count) * BufferedIO::RecordSize, values.data())) {
             return Tracer::fail("Cannot write to temporary file.");

@@ -1,11 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include <QFile>
-#include <QObject>
-#include <QString>
-
-#include <atomic>
+#include "FileAccess.h"
 
 class BufferedIO;
 
@@ -28,19 +24,13 @@ struct WavHeader
     [[nodiscard]] double playTime() const;
 };
 
-/// Reads stereo 16-bit PCM WAVE files into sample streams. One file at a time; calls are
-/// synchronous and let the event loop run every 100 ms.
-class WavFileAccess : public QObject
+/// Reads stereo 16-bit PCM WAVE files into sample streams.
+class WavFileAccess : public FileAccess
 {
     Q_OBJECT
 
 public:
     explicit WavFileAccess(QObject *parent = nullptr);
-
-    /// Closes an open file, then opens this one, with an empty name the one before, for reading.
-    /// Only regular files are opened.
-    [[nodiscard]] bool open(const QString &fileName);
-    void close();
 
     /// Checks the open file and fills the header. False with the reason logged if a test fails; a
     /// file that lacks a chunk gives true with a header that isn't valid.
@@ -51,18 +41,13 @@ public:
     /// Writes "IQF" and the samples, at most `limit` if that is above 0, into the stream.
     [[nodiscard]] bool readSamples(BufferedIO *stream, qint64 limit);
 
-public slots:
-    void cancel();
-
-signals:
-    void ProgressUpdate(int iPercentage);
+protected:
+    void forget() override;
 
 private:
     [[nodiscard]] bool checkHeader();
     [[nodiscard]] bool checkFormatChunk(quint32 length);
     void logUnknownChunk(const QByteArray &id, quint32 length) const;
 
-    QFile m_file;
     WavHeader m_header;
-    std::atomic<bool> m_cancelled{false};
 };

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WavImportJob.h"
 
-#include "base/EngineeringNumber.h"
 #include "log/Tracer.h"
 #include "streams/TempStream.h"
 
@@ -30,44 +29,22 @@ std::optional<WavHeader> WavImportJob::readHeader(WavFileAccess &file, const QSt
     return file.header();
 }
 
-double WavImportJob::clockFor(const WavHeader &header) const
+std::optional<qint64> WavImportJob::readInput(TempStream &data, qint64 limit)
 {
-    if (!m_request.clockFromFile) {
-        return m_request.target.clockHz;
-    }
-    const double clock = std::clamp(static_cast<double>(header.sampleRate),
-                                    ImportTarget::MinClockHz, ImportTarget::MaxClockHz);
-    if (clock != header.sampleRate) {
-        Tracer::Trace(Tracer::Warning,
-                      QString("The file's sample rate of %1 Hz is no permitted clock; using %2.")
-                          .arg(header.sampleRate)
-                          .arg(engineeringText(clock, "Hz")));
-    }
-    return clock;
-}
-
-bool WavImportJob::work()
-{
-    if (target().output.fileName.isEmpty()) {
-        return Tracer::fail(emptyFileNameText());
-    }
     emit report(ReportLine::heading("Reading directory entry from cache."));
     emit report(ReportLine::heading("Opening file."));
     WavFileAccess file;
     const std::optional<WavHeader> header = readHeader(file, m_request.inputFile);
     if (!header) {
-        return false;
+        return std::nullopt;
     }
-    TempStream data;
-    if (!data.open()) {
-        return Tracer::fail("Cannot create temporary data buffer.");
+    if (m_request.clockFromFile) {
+        setClock(permittedClock(header->sampleRate));
     }
     emit report(ReportLine::heading("Reading WAV-file data"));
-    {
-        const JobStep step(*this, "Reading WAV-File Data...", file);
-        if (!file.readSamples(data.stream(), 0)) {
-            return false;
-        }
+    const JobStep step(*this, "Reading WAV-File Data...", file);
+    if (!file.readSamples(data.stream(), limit)) {
+        return std::nullopt;
     }
-    return scaleAndSave(data, header->samples(), clockFor(*header));
+    return limit > 0 ? std::min(limit, header->samples()) : header->samples();
 }

@@ -27,8 +27,7 @@ public:
                                                              const QString &fileName);
 
 private:
-    [[nodiscard]] bool work() override;
-    [[nodiscard]] double clockFor(const WavHeader &header) const;
+    [[nodiscard]] std::optional<qint64> readInput(TempStream &data, qint64 limit) override;
 
     WavImportRequest m_request;
 };

@@ -72,6 +72,8 @@ bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
     if (!file.writeWaveform(m_record, fileName(), streams.data, streams.markers, streams.tags)) {
         return Tracer::fail("Waveform generation failed.");
     }
+    m_record.clippedValues += m_clipped.values;
+    m_record.largestValue = std::max(m_record.largestValue, m_clipped.largest);
     if (m_record.clippedValues > 0) {
         emit m_job.report(ReportLine::warning(clippingText(m_record)));
     }

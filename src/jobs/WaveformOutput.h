@@ -3,6 +3,7 @@
 
 #include "OutputOptions.h"
 
+#include "wvfile/SampleCoding.h"
 #include "wvfile/WvTypes.h"
 
 class ToolJob;
@@ -36,6 +37,9 @@ public:
     /// Reports the rows on file, clock, samples and levels.
     void reportWaveform();
 
+    /// Adds values that were clipped before the file is written to those that save() tells of.
+    void addClipped(const ClipCount &clipped) { m_clipped = clipped; }
+
     /// Writes the file as a step of this label. Tells in the report how many values lay beyond full
     /// scale. False, with the reason logged, if it fails or the job is cancelled; a file that stood
     /// there is then left as it was.
@@ -45,6 +49,7 @@ private:
     ToolJob &m_job;
     OutputOptions m_options;
     WvWriteJob m_record;
+    ClipCount m_clipped; ///< before the writing
 };
 
 /// The reason that jobs log when no file name was given.

@@ -274,7 +274,12 @@ void TestCliResults::listsWavFiles()
     QVERIFY(store(path("in.wav"),
                   wavFile(formatChunk(1, 2, 192000) + chunk("data", QByteArray(384000, '\0')))));
     QCOMPARE(json(run("import wav in.wav --list --json")).object(),
-             (QJsonObject{{"sampleRate", 192000}, {"samples", 96000}, {"playTime", 0.5}}));
+             (QJsonObject{{"sampleRate", 192000},
+                          {"samples", 96000},
+                          {"playTime", 0.5},
+                          {"channels", 2},
+                          {"bits", 16},
+                          {"float", false}}));
     const QByteArray text = run("import wav --list in.wav").output;
     QCOMPARE(text.simplified(), "Sample Rate: 192 kHz Samples: 96000 Play Time: 500 ms");
 }

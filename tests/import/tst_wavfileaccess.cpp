@@ -82,9 +82,8 @@ void TestWavFileAccess::checksHeader_data()
     row("LIST before fmt", wavFile(list + formatChunk() + data), true, "");
     row("odd chunk, not padded", wavFile(formatChunk() + chunk("LIST", "123456789") + data), true,
         "");
-    // The padding byte shifts the next head: its length then reads 0x1000 bytes and more.
     row("odd chunk, padded", wavFile(chunk("LIST", "123456789") + '\0' + formatChunk() + data),
-        false, "");
+        true, "");
     row("data length beyond the end", wavFile(formatChunk() + chunk("data", fourSamples, 1 << 30)),
         true, "");
     row("data of 4 GiB", wavFile(formatChunk() + chunk("data", fourSamples, 0xFFFFFFFF)), true, "");
