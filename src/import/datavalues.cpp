@@ -51,8 +51,11 @@ bool readReal(std::string_view text, double &value)
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
     if (error == std::errc::result_out_of_range) {
         // Too small is 0 as in any other reader; too large is no number to go on with.
-        value = QByteArray(text.data(), static_cast<qsizetype>(text.size())).toDouble();
-        return end == text.data() + text.size() && std::isfinite(value);
+        long double wide = 0;
+        const auto result = std::from_chars(text.data(), text.data() + text.size(), wide);
+        value = static_cast<double>(wide);
+        return result.ec == std::errc() && result.ptr == text.data() + text.size() &&
+               std::isfinite(value);
     }
     return error == std::errc() && end == text.data() + text.size() && std::isfinite(value);
 }
