@@ -3,6 +3,7 @@
 
 #include "DlgInfo.h"
 #include "instrument/remotepaths.h"
+#include "instrument/ui/DlgSpaImport.h"
 #include "log/Tracer.h"
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
@@ -39,6 +40,7 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),
         toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}),
         toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
+        toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
     };
 }

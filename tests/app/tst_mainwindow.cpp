@@ -123,7 +123,7 @@ void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
             keys.insert(key);
         }
     }
-    QCOMPARE(titles, QStringList({"File", "Analyze", "Edit", "Instrument", "Help"}));
+    QCOMPARE(titles, QStringList({"File", "Analyze", "Import", "Edit", "Instrument", "Help"}));
     QVERIFY(findEntry(*desk.window(), "File", "Exit"));
     QVERIFY(findEntry(*desk.window(), "Analyze", "File Info"));
     QVERIFY(findEntry(*desk.window(), "Help", "About"));

@@ -48,6 +48,7 @@ struct Capture
     double clockHz = 0; ///< the sample rate that the analyzer reported
     double peak = 0;    ///< linear, of full scale 1
     double rms = 0;     ///< likewise
+    double gain = 1;    ///< by which a scaling has multiplied the samples since
     QString comment;    ///< how the analyzer was set
 };
 

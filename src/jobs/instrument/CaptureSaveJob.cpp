@@ -56,16 +56,21 @@ bool CaptureSaveJob::work()
 
 bool CaptureSaveJob::scale()
 {
-    if (m_scaling != ImportScaling::Auto || !(m_capture.peak > 0)) {
+    const double recorded = m_capture.peak / m_capture.gain;
+    const bool isAuto = m_scaling == ImportScaling::Auto && recorded > 0;
+    const double gain = isAuto ? 1 / recorded : 1;
+    const double factor = gain / m_capture.gain;
+    if (factor == 1) {
         return true;
     }
     emit report(ReportLine::heading("Level scaling"));
     Resample levels;
     const JobStep step(*this, "Scaling...", levels);
-    if (!levels.rescale(m_capture.samples, 1 / m_capture.peak, m_capture.data.stream())) {
+    if (!levels.rescale(m_capture.samples, factor, m_capture.data.stream())) {
         return Tracer::fail("Cannot rescale waveform data.");
     }
-    m_capture.rms /= m_capture.peak;
-    m_capture.peak = 1;
+    m_capture.gain = gain;
+    m_capture.rms *= factor;
+    m_capture.peak = isAuto ? 1 : recorded;
     return true;
 }

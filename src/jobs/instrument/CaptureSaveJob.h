@@ -12,8 +12,8 @@ class CaptureSaveJob final : public ToolJob
 
 public:
     /// The capture isn't owned; with ImportScaling::Auto its samples are scaled in place, so that
-    /// their peak is 1. ImportScaling::Down writes them as they are, like ImportScaling::None.
-    /// The clock is that of the waveform, Hz.
+    /// their peak is 1, and back again for another run. ImportScaling::Down writes them as they
+    /// are, like ImportScaling::None. The clock is that of the waveform, Hz.
     CaptureSaveJob(Capture &capture, OutputOptions output, double clockHz, ImportScaling scaling,
                    QObject *parent = nullptr);
 
