@@ -105,15 +105,12 @@ void TestQtNumericEdit::typing()
                 QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
 
                 typeText(w.field, typed);
-                QCOMPARE(w.field->property("edit_mode").toString(), "true");
-                QVERIFY(w.field->font().bold());
+                QVERIFY(w.field->property("edit_mode").toBool() && w.field->font().bold());
                 QCOMPARE(updates.count(), 0);
-
                 QTest::keyClick(w.field, Qt::Key_Return);
                 QCOMPARE(w.field->getVal(), value);
                 QCOMPARE(w.field->text(), shown);
-                QCOMPARE(w.field->property("edit_mode").toString(), "false");
-                QVERIFY(!w.field->font().bold());
+                QVERIFY(!w.field->property("edit_mode").toBool() && !w.field->font().bold());
                 QCOMPARE(updates.count(), 1);
                 QCOMPARE(updates.at(0).at(0).toDouble(), value);
                 const QString words = QString("  'le_freq' >> %1 %2 , value update!")
@@ -200,30 +197,25 @@ void TestQtNumericEdit::stepping()
     forRows({{"up", 10.0, 1, 12.0},
              {"up onto the bound", 18.0, 1, 20.0},
              {"no clamp below", 1.0, -1, 1.0}},
-            [&](double start, int direction, double result) {
+            [](double start, int direction, double result) {
                 Window w;
                 w.field->setMin(0);
                 w.field->setMax(20);
-                w.field->setVal(start);
                 w.show();
                 QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
-                const bool taken = result != start;
-
+                const auto key = direction > 0 ? Qt::Key_Up : Qt::Key_Down;
                 // Without a step neither key nor wheel changes anything.
-                QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
-                QVERIFY(!turnWheel(w.field, 120 * direction));
-                QCOMPARE(w.field->getVal(), start);
-
-                w.field->setStep(-2);
-                w.field->setStep(2);
-                QTest::keyClick(w.field, direction > 0 ? Qt::Key_Up : Qt::Key_Down);
-                QCOMPARE(w.field->getVal(), result);
-                QCOMPARE(updates.count(), taken ? 1 : 0);
-
-                w.field->setVal(start);
-                QCOMPARE(turnWheel(w.field, 120 * direction), taken);
-                QCOMPARE(w.field->getVal(), result);
-                QCOMPARE(updates.count(), taken ? 2 : 0);
+                for (const double step : {0.0, 2.0}) {
+                    w.field->setStep(step);
+                    const double expected = step > 0 ? result : start;
+                    w.field->setVal(start);
+                    QTest::keyClick(w.field, key);
+                    QCOMPARE(w.field->getVal(), expected);
+                    w.field->setVal(start);
+                    QCOMPARE(turnWheel(w.field, 120 * direction), expected != start);
+                    QCOMPARE(w.field->getVal(), expected);
+                }
+                QCOMPARE(updates.count(), result != start ? 2 : 0);
             });
 }
 
@@ -285,23 +277,21 @@ void TestQtNumericEdit::contextMenu()
 
 void TestQtNumericEdit::cursorStep()
 {
-    forRows({{"point counts left", "-1.25 kHz", 2, "1 kHz"},
-             {"fraction", "-1.25 kHz", 4, "10 Hz"},
-             {"sign has no weight", "-1.25 kHz", 0, {}}},
-            [&](const QString &text, int position, const QString &tip) {
-                Window w;
-                w.show();
-                typeText(w.field, text);
-                w.field->setCursorPosition(position == 0 ? 1 : 0);
-                w.field->setCursorPosition(position);
-                const QString line = "\n Step = " + tip + " (at the cursor)";
-                QCOMPARE(w.field->toolTip().contains("Step"), !tip.isEmpty());
-                QVERIFY2(tip.isEmpty() || w.field->toolTip().endsWith(line),
-                         qPrintable(w.field->toolTip()));
-                w.other->setFocus();
-                QTRY_VERIFY(w.other->hasFocus());
-                QVERIFY(!w.field->toolTip().contains("Step"));
-            });
+    Window w;
+    w.show();
+    typeText(w.field, "-1.25 kHz");
+    // The sign has no weight, the point counts to the left.
+    for (const auto &[place, step] : {std::pair(0, ""), {2, "1 kHz"}, {4, "10 Hz"}}) {
+        w.field->setCursorPosition(place == 0 ? 1 : 0);
+        w.field->setCursorPosition(place);
+        const QString tip = w.field->toolTip();
+        QVERIFY2(*step == '\0' ? !tip.contains("Step")
+                               : tip.endsWith(QString("\n Step = %1 (at the cursor)").arg(step)),
+                 qPrintable(tip));
+    }
+    w.other->setFocus();
+    QTRY_VERIFY(w.other->hasFocus());
+    QVERIFY(!w.field->toolTip().contains("Step"));
 }
 
 QTEST_MAIN(TestQtNumericEdit)

@@ -74,7 +74,6 @@ private slots:
     void traceCursors();
     void traceKeepsNothingOfTheFormerData();
     void spectrumReadOut();
-    void spectrumCache();
     void colorModesFromTheMenu();
     void constellationValueBox();
     void savedPicturesAndData();
@@ -227,35 +226,12 @@ void TestDisplayWidgets::spectrumReadOut()
         QVERIFY(painter.readOut(QPointF(2, 2), plot).isEmpty());
 
         const QImage before = spectrum.picture();
-        QTest::mouseMove(&spectrum, place.toPoint());
         moveTo(spectrum, place);
         QVERIFY(spectrum.picture() != before);
         QEvent leave(QEvent::Leave);
         QApplication::sendEvent(&spectrum, &leave);
         QCOMPARE(spectrum.picture(), before);
     }
-}
-
-void TestDisplayWidgets::spectrumCache()
-{
-    CWidgetSpectrum spectrum;
-    spectrum.resize(500, 300);
-    const IqList all = toneSamples(20000, 0.01);
-    spectrum.setData(all.mid(0, 5120), 0, 5119);
-    (void)spectrum.picture();
-    const qint64 made = spectrum.scene().lines.transformCount();
-    spectrum.col_blue();
-    spectrum.resize(700, 400);
-    spectrum.setView(0);
-    (void)spectrum.picture();
-    QCOMPARE(spectrum.scene().lines.transformCount(), made);
-    spectrum.setData(all.mid(256, 5120), 256, 5375);
-    QCOMPARE(spectrum.scene().lines.transformCount(), made + 1);
-    spectrum.setData(all.mid(256, 5120)); // replaces everything
-    QCOMPARE(spectrum.scene().lines.transformCount(), 2 * made + 1);
-    QCOMPARE(spectrum.scene().lines.lines().front().position, 0);
-    spectrum.clear();
-    QVERIFY(spectrum.scene().lines.lines().empty());
 }
 
 void TestDisplayWidgets::colorModesFromTheMenu()
@@ -300,14 +276,6 @@ void TestDisplayWidgets::constellationValueBox()
     QVERIFY(std::fabs(value->i - 1) < 1e-9);
     QVERIFY(std::fabs(value->q) < 1e-9);
     QVERIFY(!painter.valueAt({square.left() - 3, square.center().y()}, area).has_value());
-
-    const QImage before = constellation.picture();
-    const QPointF place = square.center() + QPointF(20, -20);
-    moveTo(constellation, place);
-    QVERIFY(constellation.picture() != before);
-    QEvent leave(QEvent::Leave);
-    QApplication::sendEvent(&constellation, &leave);
-    QCOMPARE(constellation.picture(), before);
 }
 
 void TestDisplayWidgets::savedPicturesAndData()

@@ -65,3 +65,9 @@ inline Case chirpCase(const char *name, const ChirpSettings &s)
     return makeCase(name, SignalType::Pulse, s, &CreateSignal::configureChirp, fitChirp,
                     Literal::chirp);
 }
+
+inline Case noiseCase(const char *name, const NoiseSettings &s)
+{
+    return makeCase(name, SignalType::Noise, s, &CreateSignal::configureNoise, fitNoise,
+                    Literal::noise);
+}

@@ -68,10 +68,9 @@ private slots:
     void refusals();
     void manyCarriersEqualLiteral();
     void noiseEqualsLiteral();
-    void shortSignalsRepeat();
-    void seeds();
-    void cancel();
-    void fullDisk();
+    void fits();
+    void anyNumber();
+    void cancelAndFullDisk();
 };
 
 void TestCreateSignal::wordsEqualLiteral()
@@ -92,6 +91,9 @@ void TestCreateSignal::wordsEqualLiteral()
         QVERIFY(signal.statistics(&written, &rms, &peak));
         const Samples samples = readStream(*stream.stream());
         QCOMPARE(samples.size(), static_cast<size_t>(written));
+        // Short loops are repeated, a pulse isn't.
+        QVERIFY(written == signal.sampleCount() ||
+                (written >= 512 && test.type != SignalType::Pulse));
 
         std::srand(seed);
         const Literal::Vectors expected = test.literal(ClockLimits{});
@@ -227,99 +229,157 @@ void TestCreateSignal::noiseEqualsLiteral()
     });
 }
 
-void TestCreateSignal::shortSignalsRepeat()
+/// Each kind makes its count of samples at its clock, or says why it can't.
+void TestCreateSignal::fits()
 {
-    TempStream stream;
-    QVERIFY(stream.open());
-    CreateSignal signal;
-    signal.setSignalType(SignalType::Function);
-    QVERIFY(signal.configureFunction({.frequency = 1e6}));
-    QCOMPARE(signal.sampleCount(), 100);
-    signal.setOutput(stream.stream());
-    QVERIFY(signal.generate());
-    const Samples samples = readStream(*stream.stream());
-    QCOMPARE(samples.size(), size_t{600});
-    for (size_t i = 100; i < samples.size(); ++i) {
-        QVERIFY(samples[i] == samples[i - 100]);
-    }
-    // A pulse isn't repeated.
-    signal.setSignalType(SignalType::Pulse);
-    QVERIFY(signal.configurePulse({1e-6, 1e-5, 1e-6, 1e-5, RampKind::Linear, 1e-7}));
-    QVERIFY(signal.generate());
-    int written = 0;
-    double rms = 0;
-    double peak = 0;
-    QVERIFY(signal.statistics(&written, &rms, &peak));
-    QCOMPARE(written, 220);
-    QCOMPARE(peak, 1.0);
-}
-
-void TestCreateSignal::seeds()
-{
-    const auto make = [](std::optional<unsigned> seed, bool noise) {
-        TempStream stream;
-        CreateSignal signal;
-        signal.setSeed(seed);
-        signal.setSignalType(noise ? SignalType::Noise : SignalType::MultiCarrier);
-        const bool configured =
-            noise ? signal.configureNoise({}) : signal.configureMultiCarrier({});
-        signal.setOutput(stream.stream());
-        return stream.open() && configured && signal.generate() ? readStream(*stream.stream())
-                                                                : Samples{};
+    const QString upper = "The required ARB clock rate exceeds the upper limit. Check settings.";
+    const QString lower = "The required ARB clock rate exceeds the lower limit. Check settings.";
+    const QString exceeds = "The number of samples exceeds 1e+06. Check settings.";
+    const auto function = [](double frequency, bool custom = false, int count = 100) {
+        FunctionSettings settings;
+        settings.frequency = frequency;
+        settings.customOversampling = custom;
+        settings.oversampling = count;
+        return functionCase("", settings);
     };
-    for (const bool noise : {false, true}) {
-        const Samples first = make(1, noise);
-        QVERIFY(!first.empty());
-        QVERIFY(make(1, noise) == first);
-        QVERIFY(make(2, noise) != first);
-        QCOMPARE(make({}, noise).size(), first.size());
+    const auto pmCase = [](double frequency) {
+        return makeCase("", SignalType::Pm, PmSettings{frequency, 10}, &CreateSignal::configurePm,
+                        fitPm, Literal::pm);
+    };
+    const auto fm = [](double f, double d) { return fmCase("", {FmKind::SingleTone, f, d, 0, 0}); };
+    const auto pulse = [](double rise, double resolution) {
+        return pulseCase("", {rise, 1e-4, 1e-5, 1e-4, RampKind::Linear, resolution});
+    };
+    forRows(
+        {{"function", function(10e3), 1000, 10e6, ""},
+         {"function, limited", function(1e6), 100, 1e8,
+          "The number of samples is less than 100. Check settings."},
+         {"function, raised", function(100, true, 10), 1000, 1e5, ""},
+         {"function, 7 samples", function(12.6e6), 0, 0, upper},
+         {"function, no count", function(1e6, true, 0), 0, 0,
+          "The signal is shorter than one sample. Check settings."},
+         {"carriers", carrierCase("", {10000, 100, 0, true}), 10000, 1e8, ""},
+         {"many carriers", carrierCase("", {10, 10000, 0, true}), 2560000, 25.6e6, ""},
+         {"pm", pmCase(1e4), 1024, 10.24e6, ""},
+         {"pm, too long", pmCase(0.05), 0, 0, exceeds},
+         // gcd 5000, 2 and 3 cycles; 1024 samples: periods 512 and 341.33, clock 512 x 10 kHz.
+         {"am, two tones", amCase("", {AmKind::TwoTone, 1e4, 100, 15e3, 100}), 1024, 5.12e6, ""},
+         {"fm", fm(1000, 10000), 1024, 1.024e6, ""},
+         // gcd 100, 4 x 99999 samples.
+         {"fm, long", fm(100, 9999900), 399996, 39999600, ""},
+         {"fm, no deviation", fm(0.5, 0.5), 0, 0, "Invalid FM configuration."},
+         // gcd(gcd(1000, 2000), gcd(10000, 7500)) = 500; 4 x 20 samples at least.
+         {"fm, two tones", fmCase("", {FmKind::TwoTone, 1000, 10000, 2000, 7500}), 1024, 512e3, ""},
+         {"sweep", sweepCase("", {SweepKind::Linear, 1e5, 0.01, 0, 360}), 8000, 8e5, ""},
+         {"pulse", pulse(1e-5, 1e-7), 2200, 1e7, ""},
+         {"pulse, too fine", pulse(0, 1e-9), 0, 0, upper},
+         {"pulse, too coarse", pulse(0, 1e-4), 0, 0, lower}},
+        [](const Case &test, int samples, double clock, const QString &message) {
+            CreateSignal signal;
+            signal.setMinClock(1e5);
+            signal.setMaxClock(1e8);
+            QCOMPARE(test.configure(signal), samples > 0);
+            QCOMPARE(signal.sampleCount(), samples);
+            QVERIFY(std::abs(signal.clockRate() - clock) <= 1e-9 * clock);
+            QCOMPARE(takeMessages().join('|'), message);
+        });
+}
+
+/// Where a value makes no signal, one message says so; where it does, the signal can be made.
+void TestCreateSignal::anyNumber()
+{
+    for (const double value : {0.0, -1000.0, std::nan(""), HUGE_VAL, 1e300, 1e-300}) {
+        const std::vector<Case> cases{functionCase("", {.frequency = value}),
+                                      functionCase("", {.amplitudeI = value}),
+                                      functionCase("", {.offsetQ = value}),
+                                      functionCase("", {.phaseQ = value}),
+                                      carrierCase("", {.spacing = value}),
+                                      carrierCase("", {.offsetI = value}),
+                                      carrierCase("", {.carriers = -7}),
+                                      carrierCase("", {.carriers = 0x7fffffff}),
+                                      pulseCase("", {.riseTime = value}),
+                                      pulseCase("", {.onTime = value}),
+                                      pulseCase("", {.fallTime = value}),
+                                      pulseCase("", {.blankTime = value}),
+                                      pulseCase("", {.timeResolution = value}),
+                                      chirpCase("", {PulseSettings{}, value}),
+                                      fmCase("", {.frequency1 = value}),
+                                      fmCase("", {.deviation1 = value}),
+                                      fmCase("", {FmKind::TwoTone, 1000, 1000, value, 1000}),
+                                      fmCase("", {FmKind::TwoTone, 1000, 1000, 1000, value}),
+                                      amCase("", {.frequency1 = value}),
+                                      amCase("", {.depth1 = value}),
+                                      amCase("", {AmKind::TwoTone, 1000, 100, value, 100}),
+                                      amCase("", {AmKind::TwoTone, 1000, 100, 1000, value}),
+                                      sweepCase("", {.deviation = value}),
+                                      sweepCase("", {.sweepTime = value}),
+                                      sweepCase("", {SweepKind::Sine, 1e5, 0.01, value, 0}),
+                                      noiseCase("", {NoiseKind::White, value, 0.01}),
+                                      noiseCase("", {NoiseKind::White, 1e6, value})};
+        TempStream stream;
+        QVERIFY(stream.open());
+        int refused = 0;
+        int made = 0;
+        const auto check = [&](CreateSignal &signal, const Case &test) {
+            signal.setOutput(stream.stream());
+            signal.setSignalType(test.type);
+            if (!test.configure(signal)) {
+                QCOMPARE(takeMessages(Tracer::Error).size(), 1);
+                QCOMPARE(signal.sampleCount(), 0);
+                ++refused;
+            } else if (signal.sampleCount() <= 1000000) {
+                QVERIFY(signal.generate());
+                ++made;
+            }
+            (void)takeMessages();
+        };
+        for (const Case &test : cases) {
+            CreateSignal signal;
+            check(signal, test);
+        }
+        CreateSignal lowest;
+        lowest.setMinClock(value);
+        check(lowest, functionCase("", {}));
+        CreateSignal highest;
+        highest.setMaxClock(value);
+        check(highest, functionCase("", {}));
+        QVERIFY(refused > 5);
+        QCOMPARE(made > 2, std::isfinite(value));
     }
 }
 
-void TestCreateSignal::cancel()
+void TestCreateSignal::cancelAndFullDisk()
 {
-    forRows({{"function", 0}, {"multi carrier", 1}}, [&](int type) {
-        // As many samples as can be asked for: nobody waits for their end.
+    // As many samples as can be asked for: nobody waits for their end.
+    for (const bool carriers : {false, true}) {
         EndlessDevice device;
         BufferedIO stream;
         QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
         CreateSignal signal;
         signal.setMaxClock(1e12);
-        signal.setSignalType(static_cast<SignalType>(type));
-        QVERIFY(type == 0
-                    ? signal.configureFunction(
-                          {.frequency = 1, .customOversampling = true, .oversampling = 0x7fffffff})
-                    : signal.configureMultiCarrier({.spacing = 1, .carriers = 0x7fffff}));
+        signal.setSignalType(carriers ? SignalType::MultiCarrier : SignalType::Function);
+        QVERIFY(carriers ? signal.configureMultiCarrier({.spacing = 1, .carriers = 0x7fffff})
+                         : signal.configureFunction({.frequency = 1,
+                                                     .customOversampling = true,
+                                                     .oversampling = 0x7fffffff}));
         signal.setOutput(&stream);
         int ticks = 0;
         connect(&signal, &CreateSignal::ProgressUpdate, &signal, [&] {
             ++ticks;
-            signal.cancel();
             signal.cancel();
         });
         signal.cancel(); // before the start it means nothing
         QVERIFY(!signal.generate());
         QCOMPARE(ticks, 1);
         QCOMPARE(takeMessages(), QStringList{"*** User break."});
-        int written = 0;
-        double rms = 0;
-        double peak = 0;
-        QVERIFY(!signal.statistics(&written, &rms, &peak));
-        signal.setSignalType(SignalType::Function);
-        QVERIFY(signal.configureFunction({}));
-        QVERIFY(signal.generate());
-    });
-}
-
-void TestCreateSignal::fullDisk()
-{
+    }
     EndlessDevice device(1000);
-    BufferedIO stream;
+    BufferedIO stream(100'000);
     QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
     CreateSignal signal;
     signal.setOutput(&stream);
     QVERIFY(signal.configureFunction(
-        {.frequency = 10, .customOversampling = true, .oversampling = 5000000}));
+        {.frequency = 10, .customOversampling = true, .oversampling = 50'000}));
     QVERIFY(!signal.generate());
     QCOMPARE(takeMessages(), QStringList{"*** Cannot write to output file."});
 }

@@ -77,13 +77,10 @@ private slots:
     void equalsLiteral();
     void longRunsKeepTheirPlace();
     void threadsDontChangeTheResult();
-    void loopHasNoStep();
     void filterMask();
     void evenLengthLeadsByOneSample();
-    void levelOffsets();
     void markers();
     void failures();
-    void settersRefuseUnknownKinds();
     void stepBeyondTheFilterFails();
 };
 
@@ -91,10 +88,8 @@ void TestResample::equalsLiteral()
 {
     // window, filter, length, cut-off, parameter; samples in and out
     forRows({{"tool 3:2", 1, 0, 50, 0.45, 0.5, 6000, 9000},
-             {"tool prime", 1, 0, 50, 0.45, 0.5, 5000, 7919},
              {"tool prime down", 1, 0, 50, 0.45, 0.5, 9973, 4999},
              {"tool 1.0009", 1, 0, 50, 0.45, 0.5, 10000, 10009},
-             {"integer down", 1, 0, 50, 0.45, 0.5, 9000, 3000},
              {"odd, no window, rounded positions", 0, 0, 201, 0.3, 0.5, 4900, 2300},
              {"even, no window, prime", 0, 0, 200, 0.3, 0.5, 4900, 5003},
              {"upsampled, first positions", 0, 0, 201, 0.3, 0.5, 600, 4998},
@@ -102,11 +97,8 @@ void TestResample::equalsLiteral()
              {"root cosine", 2, 1, 101, 0.25, 0.35, 3000, 4500},
              {"cosine", 4, 2, 101, 0.25, 0.35, 3000, 4507},
              {"gauss", 5, 3, 41, 0.25, 0.3, 3000, 2999},
-             {"flat top", 6, 0, 101, 0.2, 0.3, 3000, 3600},
              {"high gain, prime", 1, 0, 201, 0.004, 0.5, 3000, 4001},
-             {"shorter than the filter", 1, 0, 201, 0.4, 0.5, 100, 150},
              {"one sample", 1, 0, 201, 0.4, 0.5, 1, 64},
-             {"two samples", 0, 0, 50, 0.4, 0.5, 2, 3},
              {"longest", 1, 0, 4999, 0.4, 0.5, 12000, 12500},
              {"shortest even", 0, 0, 4, 0.4, 0.5, 3000, 4001},
              {"largest step", 1, 0, 50, 0.45, 0.5, 48 * 500, 500},
@@ -146,6 +138,8 @@ void TestResample::longRunsKeepTheirPlace()
             worst = std::max(worst, std::abs(std::complex<double>(result[i]) - expected));
         }
         QVERIFY2(worst < 1e-4, qPrintable(QString::number(worst)));
+        QVERIFY(std::abs(run.resample.peakOffset() - 20 * std::log10(0.9)) < 1e-3);
+        QVERIFY(std::abs(run.resample.rmsOffset() - 20 * std::log10(0.9)) < 1e-3);
     }
 }
 
@@ -165,17 +159,6 @@ void TestResample::threadsDontChangeTheResult()
     }
     QVERIFY(results[0] == results[1]);
     QCOMPARE(offsets[0], offsets[1]);
-}
-
-void TestResample::loopHasNoStep()
-{
-    Run run;
-    QVERIFY(run.prepare(tone(1000, 10), 1500));
-    run.apply({.length = 101});
-    QVERIFY(run.resample.run());
-    const Samples result = readStream(*run.output.stream());
-    const double step = 2 * std::sin(pi * 10 / 1500) / 0.9; // chord from sample to sample
-    QVERIFY(std::abs(std::abs(result.front() - result.back()) - step) < 1e-4);
 }
 
 void TestResample::filterMask()
@@ -220,17 +203,6 @@ void TestResample::evenLengthLeadsByOneSample()
                                           [](auto a, auto b) { return std::abs(a) < std::abs(b); });
         QCOMPARE(top - result.begin(), length == 51 ? 100 : 99);
     }
-}
-
-void TestResample::levelOffsets()
-{
-    Run run;
-    QVERIFY(run.prepare(tone(5000, 100), 7500));
-    run.apply({.length = 101});
-    QVERIFY(run.resample.run());
-    const double expected = 20 * std::log10(0.9); // level 1 / 0.9
-    QVERIFY(std::abs(run.resample.peakOffset() - expected) < 1e-3);
-    QVERIFY(std::abs(run.resample.rmsOffset() - expected) < 1e-3);
 }
 
 void TestResample::markers()
@@ -294,23 +266,6 @@ void TestResample::failures()
             });
 }
 
-void TestResample::settersRefuseUnknownKinds()
-{
-    Resample resample;
-    QVERIFY(!resample.setFilterType(5, 0.5));
-    QVERIFY(!resample.setWindowType(7));
-    resample.setInput(nullptr, 10);
-    resample.setOutput(nullptr, 10);
-    QVERIFY(!resample.run());
-    QCOMPARE(takeMessages(), QStringList{"*** Invalid data buffer."});
-
-    Run run;
-    QVERIFY(run.prepare(randomSamples(10), 10));
-    QVERIFY(run.input->writeHeader("XYZ"));
-    QVERIFY(!run.resample.run());
-    QCOMPARE(takeMessages(), QStringList{"*** Cannot reset read buffer."});
-}
-
 void TestResample::stepBeyondTheFilterFails()
 {
     // A step beyond the reach of 48 taps.
@@ -320,6 +275,11 @@ void TestResample::stepBeyondTheFilterFails()
     QVERIFY(!run.resample.run());
     QCOMPARE(takeMessages(), QStringList{"*** Missed input sample."});
     QVERIFY(!literalResample({.length = 50}, randomSamples(50000), 1000).has_value());
+    QVERIFY(!run.resample.setFilterType(5, 0.5));
+    QVERIFY(!run.resample.setWindowType(7));
+    QVERIFY(run.input->writeHeader("XYZ"));
+    QVERIFY(!run.resample.run());
+    QCOMPARE(takeMessages(), QStringList{"*** Cannot reset read buffer."});
 }
 
 QTEST_GUILESS_MAIN(TestResample)

@@ -81,8 +81,6 @@ private slots:
     void chirpPhase();
     void noiseBand();
     void noiseSlope();
-    void loopsHaveNoStep();
-    void doublePulse();
     void codedPulse();
 
 private:
@@ -209,62 +207,6 @@ void TestSignalShapes::noiseSlope()
             });
 }
 
-void TestSignalShapes::loopsHaveNoStep()
-{
-    // The step over the junction is no longer than the longest one inside.
-    const auto check = [](const Samples &samples) {
-        QVERIFY(samples.size() > 100);
-        float longest = 0;
-        for (size_t i = 1; i < samples.size(); ++i) {
-            longest = std::max(longest, std::abs(samples[i] - samples[i - 1]));
-        }
-        QVERIFY(std::abs(samples.front() - samples.back()) <= 1.01F * longest);
-    };
-    check(make(SignalType::Function, &CreateSignal::configureFunction,
-               FunctionSettings{FunctionKind::Triangular, 7777}));
-    check(make(SignalType::Fm, &CreateSignal::configureFm,
-               FmSettings{FmKind::TwoTone, 1000, 9000, 3500, 777000}));
-    check(make(SignalType::Pm, &CreateSignal::configurePm, PmSettings{12345, 90}));
-    check(make(SignalType::Am, &CreateSignal::configureAm,
-               AmSettings{AmKind::TwoTone, 10000, 100, 15000, 100}));
-    check(make(SignalType::MultiCarrier, &CreateSignal::configureMultiCarrier,
-               MultiCarrierSettings{10000, 333, 0, true}));
-    check(make(SignalType::FmSweep, &CreateSignal::configureSweep,
-               SweepSettings{SweepKind::Sine, 1e5, 0.01, 0, 360}));
-    check(make(SignalType::Noise, &CreateSignal::configureNoise,
-               NoiseSettings{NoiseKind::White, 1e6, 0.1}));
-}
-
-void TestSignalShapes::doublePulse()
-{
-    // At 1 MHz: rise 2, on 3, fall 4, pause 5, blank 10. The second pulse ends at 2 x 9 + 5 = 23;
-    // its last value, a quarter, stays up to 23 - 4 + 10 = 29.
-    PulseRecord record;
-    record.kind = PulseKind::Double;
-    record.pulse = {2e-6, 3e-6, 4e-6, 10e-6, RampKind::Linear, 1e-6};
-    record.pause = 5e-6;
-    record.level1 = 0.5;
-    record.level2 = 0.8;
-    record.phase2 = 60;
-    SignalFit fit;
-    fit.clock = 1e6;
-    fit.samples = 35;
-    const auto generator = makePulse(record, fit);
-    QVERIFY(generator != nullptr);
-    std::vector<double> inPhase(35);
-    std::vector<double> quadrature(35);
-    generator->fill(0, inPhase, quadrature);
-    const std::vector<double> envelope{0, 0.5, 1, 1, 1, 1, 0.75, 0.5, 0.25};
-    for (size_t i = 0; i < 35; ++i) {
-        const bool isFirst = i < 9;
-        const bool isSecond = i >= 14 && i < 29;
-        const double second = isSecond ? envelope[std::min<size_t>(i - 14, 8)] * 0.8 : 0.0;
-        const double expectedQ = isFirst ? 0.5 * envelope[i] : second * std::sin(pi / 3);
-        QVERIFY(std::abs(inPhase[i] - second * 0.5) < 1e-8);
-        QVERIFY(std::abs(quadrature[i] - expectedQ) < 1e-8);
-    }
-}
-
 void TestSignalShapes::codedPulse()
 {
     // At 1 MHz: rise 2, on 28, fall 2, transitions of 4: symbols of (28 + 4) / 4 = 8 samples. The
@@ -293,15 +235,6 @@ void TestSignalShapes::codedPulse()
         0.5, 0.5, 0.5, 0.5};                              // the last value stays
     QCOMPARE(q, expected);
     QCOMPARE(inPhase, std::vector<double>(36));
-
-    record.pattern.clear();
-    QVERIFY(makePulse(record, fit) == nullptr);
-    record.pattern = "1";
-    record.pulse.onTime = 0;
-    record.transitionTime = 0;
-    QVERIFY(makePulse(record, fit) == nullptr);
-    record.kind = static_cast<PulseKind>(4);
-    QVERIFY(makePulse(record, fit) == nullptr);
 }
 
 QTEST_GUILESS_MAIN(TestSignalShapes)

@@ -19,13 +19,6 @@ const QString oneSample = "1|Reading 1 samples @ 16 bit from waveform...";
 const QString disagree = "2|Number of samples from xWAVEFORM tag and SAMPLES tag disagree";
 const QString takesBlock = "2|Using data from xWAVEFORM tag.";
 
-QString finalizing(int position, int value)
-{
-    return QString("1|Finalizing marker stream up to position %1 using value 0x%2")
-        .arg(position)
-        .arg(value, 0, 16);
-}
-
 double offsetOf(double level)
 {
     return 20 * std::log10(1 / (level + 1e-7));
@@ -47,7 +40,6 @@ private slots:
     void levelsAreMeasured();
     void unknownTagsAreKept();
     void badCalls();
-    void failingStreams();
     void progressAndCancel();
 };
 
@@ -64,15 +56,9 @@ void TestWvReader::accepted()
           "{SAMPLES:7}{CONTROL LENGTH:1}" + block,
           {disagree, takesBlock}},
          {"bytes between tags", "\r\n" + one + "{SAMPLES:x", {}},
-         {"numbers in blanks", "{SAMPLES:  1 }{CONTROL LENGTH:   1}" + block, {}},
-         {"any name with WAVEFORM", "{SAMPLES:1}{CONTROL LENGTH:1}{EmptyWaveForm-5: #abcd", {}},
          {"skipped tags", "{CRESTFACTOR:x\x01y}{SI COMPENSATED: 1}{SYSTEM:}{FREE: {}" + one, {}},
-         {"clock at its upper limit", "{CLOCK:600000000}" + one, {}},
          {"longest name and text",
           '{' + QByteArray(99, 'x') + ":}{COMMENT:" + QByteArray(1024, 'x') + '}' + one,
-          {}},
-         {"CONTROL LENGTH of a quarter of the size",
-          "{SAMPLES:1}{CONTROL LENGTH:0016}" + block,
           {}},
          {"CONTROL LENGTH 0 counts as absent",
           "{SAMPLES:1}{CONTROL LENGTH:0}" + block,
@@ -102,29 +88,17 @@ void TestWvReader::refused()
          {"no type", one, "4|Unsupported waveform file type!"},
          {"name of 100 characters", '{' + QByteArray(100, 'x') + ":}" + tgx + one,
           "4|Tag name '" + QString(100, 'x') + "' is invalid."},
-         {"name without end", "{TYPE", "4|Tag name 'TYPE' is invalid."},
          {"other type", "{TYPE: tgx-mwv , 0}" + one,
           "4|File is not a valid waveform file (TGX-MWV) !"},
-         {"endless type", "{TYPE:" + QByteArray(1025, 'x') + "}", "4|Invalid TYPE tag."},
-         {"clock too low", tgx + "{CLOCK:0.001}" + one, clock},
          {"clock too high", tgx + "{CLOCK:600000000.1}" + one, clock},
          {"clock no number", tgx + "{CLOCK:nan}" + one, clock},
-         {"clock with a unit", tgx + "{CLOCK:1 MHz}" + one, clock},
-         {"no samples", tgx + "{SAMPLES:0}" + one, samples},
-         {"a fraction of samples", tgx + "{SAMPLES:1.5}" + one, samples},
          {"more than any number", tgx + "{SAMPLES:99999999999999999999}" + one, samples},
          {"samples beyond the limit", tgx + "{SAMPLES:2147483648}" + one, tooMany},
          {"a block beyond it", tgx + "{SAMPLES:1}{WAVEFORM-8589934593: #", tooMany},
-         {"one level", tgx + "{LEVEL OFFS:3,}" + one, "4|LEVEL OFFS tag is invalid ('3,')."},
          {"no level", tgx + "{LEVEL OFFS:nan,0}" + one, "4|LEVEL OFFS tag is invalid ('nan,0')."},
          {"control length beyond the file", tgx + "{CONTROL LENGTH:100}" + one,
           "4|CONTROL LENGTH tag is invalid ('100')."},
-         {"no control length", tgx + "{CONTROL LENGTH:}" + one,
-          "4|CONTROL LENGTH tag is invalid ('')."},
-         {"known tag without end", tgx + "{CRESTFACTOR:1", "4|Invalid tag. '}' is missing."},
-         {"no mark before the samples", tgx + "{SAMPLES:1}{WAVEFORM-5:}", noBlock},
          {"endless prefix", tgx + "{SAMPLES:1}{WAVEFORM-5:" + QByteArray(1025, '1') + '#', noBlock},
-         {"block without length", tgx + "{SAMPLES:1}{WAVEFORM: #abcd}", block},
          {"block of negative length", tgx + "{SAMPLES:1}{WAVEFORM--5: #abcd}", block},
          {"block of 4 bytes", tgx + "{SAMPLES:1}{WAVEFORM-4: #abcd}",
           "4|Invalid number of samples in WAVEFORM tag."},
@@ -154,13 +128,10 @@ void TestWvReader::codings()
     const QList<float> d{-32768.5F / 32000, -0.5F / 32000, -4.5F / 32000, -16384.5F / 32000};
     forRows(
         {{"TGX", "{TYPE: TGX-WV,0}", 2, "TGX", a},
-         {"TBX", "{TYPE:TBX-WV}", 3, "TBX", a},
          {"TVX", "{TYPE: tvx-wv ,77}", 5, "TVX", a},
          {"TQX-130", "{TYPE:TQX-130-WV,0}", 4, "TQX-130", b},
          {"TQX-110", "{TYPE:WV,0}{RESOLUTION: 16 bit}", 1, "TQX-110", c},
-         {"added", "{TYPE:WV-ADD,0}", 1, "TQX-110", c},
-         {"14 bit", "{RESOLUTION:14}{TYPE:WV-ADD,0}", 1, "TQX-110", d},
-         {"14 bit elsewhere", "{TYPE:TGX-WV,0}{RESOLUTION:14}", 2, "TGX", a}},
+         {"14 bit", "{RESOLUTION:14}{TYPE:WV-ADD,0}", 1, "TQX-110", d}},
         [](const QByteArray &head, int format, const QString &name, const QList<float> &values) {
             ReadRun run(head + sampleBlock(words({0, 0x8000, 0x7FFF, 0x4003})));
             QVERIFY(run.read().ok);
@@ -236,14 +207,10 @@ void TestWvReader::textTags()
              {"cut at a tilde", "a~b", "a"},
              {"the last character that counts", "a|b", "a|b"}},
             [&](const QByteArray &content, const QString &text) {
-                for (const auto &[tag, field] : {std::pair{"COMMENT", &WvFileInfo::comment},
-                                                 {"COPYRIGHT", &WvFileInfo::copyright},
-                                                 {"SYSTEM", &WvFileInfo::system},
-                                                 {"DATE", &WvFileInfo::date}}) {
-                    ReadRun run(tgx + '{' + tag + ':' + content + '}' + one);
-                    QVERIFY(run.read().ok);
-                    QCOMPARE(run.info.*field, text);
-                }
+                ReadRun run(tgx + "{COMMENT:" + content + "}{DATE:" + content + '}' + one);
+                QVERIFY(run.read().ok);
+                QCOMPARE(run.info.comment, text);
+                QCOMPARE(run.info.date, text);
             });
 }
 
@@ -262,7 +229,6 @@ void TestWvReader::levelsAreMeasured()
         const double gain = std::pow(10, gainDb / 20);
         QVERIFY(std::fabs(run.values().at(0) - high * gain) < 1e-7);
         QVERIFY(std::fabs(run.info.rmsOffset - offsetOf(level * gain)) < 1e-5);
-        QVERIFY(std::fabs(run.info.peakOffset - offsetOf(level * gain)) < 1e-5);
         QCOMPARE(run.info.rmsOffsetTag, 3.5);
         QCOMPARE(run.info.peakOffsetTag, -1.25);
     }
@@ -299,46 +265,21 @@ void TestWvReader::unknownTagsAreKept()
 void TestWvReader::badCalls()
 {
     CapturedLog log;
-    HvFileIO io;
-    QVERIFY(!io.readWaveform(nullptr));
     WvFileInfo info;
-    QVERIFY(!io.readWaveform(&info));
     BufferedIO notReady;
-    info.dataStream = &notReady;
-    QVERIFY(!io.readWaveform(&info));
-    info.markerStream = &notReady;
-    QVERIFY(!io.readWaveform(&info));
-    QCOMPARE(log.take(),
-             QStringList({"4|Invalid input parameter.", "4|No temporary data storage available.",
-                          "4|No temporary data storage available.", "4|Library not initialized.",
-                          "4|Temporary marker storage not accessible."}));
-    ReadRun run(tgx);
-    run.info.fileName += ".none";
-    QVERIFY(!run.read().ok);
-    QCOMPARE(run.log, QStringList("4|Cannot open waveform input file."));
-}
-
-void TestWvReader::failingStreams()
-{
-    forRows({{"data disk full at the samples", "data",
-              QStringList({oneSample, "4|Cannot write to temporary file!"})},
-             {"data device that doesn't seek",
-              "data seek",
-              {"4|Writing to temporary waveform storage failed."}},
-             {"marker disk full at the end", "markers",
-              QStringList({oneSample, "4|Writing to temporary data storage failed."})}},
-            [&](const QString &fault, const QStringList &log) {
-                ReadRun run(tgx + one);
-                if (fault == "data") {
-                    run.dataDevice.capacity = 0;
-                } else if (fault == "data seek") {
-                    run.dataDevice.canSeek = false;
-                } else {
-                    run.markerDevice.capacity = 0;
-                }
-                QVERIFY(!run.read().ok);
-                QCOMPARE(run.log, QStringList({tgxLine, finalizing(1, 0)}) + log);
-            });
+    info.dataStream = info.markerStream = &notReady;
+    QVERIFY(!HvFileIO().readWaveform(nullptr));
+    QVERIFY(!HvFileIO().readWaveform(&info));
+    QCOMPARE(log.take(), QStringList({"4|Invalid input parameter.", "4|Library not initialized.",
+                                      "4|Temporary marker storage not accessible."}));
+    ReadRun full(tgx + one);
+    full.dataDevice.capacity = 0;
+    QVERIFY(!full.read().ok);
+    QCOMPARE(full.log.last(), QString("4|Cannot write to temporary file!"));
+    ReadRun noMarkers(tgx + one);
+    noMarkers.markerDevice.capacity = 0;
+    QVERIFY(!noMarkers.read().ok);
+    QCOMPARE(noMarkers.log.last(), QString("4|Writing to temporary data storage failed."));
 }
 
 void TestWvReader::progressAndCancel()

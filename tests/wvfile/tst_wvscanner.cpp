@@ -53,7 +53,6 @@ private slots:
     void fields();
     void tagsBehindTheBlock();
     void segments();
-    void unknownValues();
     void names();
     void files();
     void samplesAreNotRead();
@@ -64,22 +63,17 @@ void TestWvScanner::accepted()
     forRows(
         {{"no tag at all", "", {noLevels, noClock}},
          {"no levels", "{CLOCK:1}", {noLevels}},
-         {"clock 0", levels + "{CLOCK:0}", {noClock}},
-         {"any clock above 0", levels + "{CLOCK:1e12}", {}},
          {"LEVEL OFFSET isn't known here", "{CLOCK:1}{LEVEL OFFSET:1,2}", {noLevels}},
-         {"whatever the case", "{clock:1}{ Level   Offs :1,2}", {}},
          {"tags of no interest",
           clocked + "{CONTROL LENGTH:x}{CRESTFACTOR:{}{RESOLUTION:" + QByteArray(2000, '1') +
               "}{FREE" + QByteArray(5, '\0') + ":}{MWV_SEGMENT_NEWS:" + QByteArray(2000, '1') + '}',
           {}},
-         {"block as stated", clocked + "{SAMPLES:2}" + silentBlock(2), {}},
          {"block without SAMPLES", clocked + silentBlock(2), {suspicious(2, -1)}},
          {"block of broken length",
           clocked + "{SAMPLES:1}{WAVEFORM-8:1,#abcdef}",
           {"2|Resulting data length in WAVEFORM tag is invalid: 5",
            "2|Tag begins with 'WAVEFORM-8:1,#'",
            "2|Number of stripped bytes at beginning (including #): 3"}},
-         {"largest block", clocked + "{SAMPLES:4000000000}{WAVEFORM-16000000001: #ab}", {}},
          {"block beyond belief",
           clocked + "{SAMPLES:1}{WAVEFORM-16000000005: #ab}",
           {"2|Invalid number of samples in WAVEFORM tag: 4000000001",
@@ -99,17 +93,11 @@ void TestWvScanner::refused()
     forRows(
         {{"kind", "{TYPE:XYZ,0}", "4|Invalid file format in TYPE tag."},
          {"clock", "{CLOCK:inf}", "4|Invalid clock rate in CLOCK tag."},
-         {"samples", "{SAMPLES:x}", "4|Invalid samples count in SAMPLES tag."},
          {"one level", "{LEVEL OFFS:1}", "4|Invalid parameters in LEVEL OFFS tag."},
-         {"segment count", "{MWV_SEGMENT_COUNT:x}", "4|Invalid MWV_SEGMENT_COUNT tag."},
          {"negative count", "{MWV_SEGMENT_COUNT:-1}", "4|Invalid count in MSW_SEGMENT_COUNT tag."},
-         {"segment duration", "{MWV_SEGMENT_DURATION:1,x}", "4|Invalid MWV_SEGMENT_DURATION tag."},
          {"segment clock", "{MWV_SEGMENT_CLOCK:1,,2}", "4|Invalid MWV_SEGMENT_CLOCK tag."},
-         {"segment start", "{MWV_SEGMENT_START:}", "4|Invalid MWV_SEGMENT_START tag."},
-         {"segment length", "{MWV_SEGMENT_LENGTH:x}", "4|Invalid MWV_SEGMENT_LENGTH tag."},
          {"segment levels", "{MWV_SEGMENT_LEVEL_OFFS:1,2,3,x}",
           "4|Invalid MWV_SEGMENT_LEVEL_OFFS tag."},
-         {"block without number", "{WAVEFORM: #}", "4|Invalid WAVEFORM tag."},
          {"block without mark", "{WAVEFORM-5:}", "4|Invalid WAVEFORM tag."},
          {"list without end", "{MARKER LIST 1:0:1", "4|Invalid MARKER LIST tag."}},
         [](const QByteArray &tags, const QString &words) {
@@ -168,6 +156,11 @@ void TestWvScanner::fields()
     QCOMPARE(summary.peakOffset, 1.25);
     QVERIFY(summary.hasMarkers);
     QCOMPARE(summary.segmentCount, 0);
+    const WvFileSummary empty = scan("").summary;
+    QCOMPARE(empty.samples, qint64(-1));
+    QCOMPARE(empty.clock, -1.0);
+    QVERIFY(!empty.levelsValid);
+    QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
 }
 
 void TestWvScanner::tagsBehindTheBlock()
@@ -206,18 +199,6 @@ void TestWvScanner::segments()
     QCOMPARE(summary.segments.at(1).rmsOffset, 3.0);
     QCOMPARE(summary.segments.at(1).peakOffset, 4.0);
     QCOMPARE(summary.segments.at(2).rmsOffset, 0.0);
-}
-
-void TestWvScanner::unknownValues()
-{
-    const WvFileSummary empty = scan("").summary;
-    QCOMPARE(empty.samples, qint64(-1));
-    QCOMPARE(empty.clock, -1.0);
-    QCOMPARE(empty.playTime, -1.0);
-    QVERIFY(!empty.levelsValid);
-    QCOMPARE(scan("{CLOCK:1000}").summary.playTime, -1.0);
-    QCOMPARE(scan("{SAMPLES:1000}").summary.playTime, -1.0);
-    QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
 }
 
 void TestWvScanner::names()
