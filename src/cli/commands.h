@@ -23,5 +23,6 @@ void addEditCommands(CommandSet &commands);
 void addFilterCommands(CommandSet &commands);
 void addMarkerCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
+void addComposeCommand(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);
 void addCaptureCommand(CLI::App &instr, CommandSet &commands);

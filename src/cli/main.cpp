@@ -95,6 +95,7 @@ int run(int argc, char **argv)
     addFilterCommands(commands);
     addMarkerCommands(commands);
     addImportCommands(commands);
+    addComposeCommand(commands);
     addInstrumentCommands(commands);
     try {
         app.parse(argumentsOf(argc, argv));

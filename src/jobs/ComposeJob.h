@@ -1,0 +1,32 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "ToolJob.h"
+
+#include "composer/ComposerEngine.h"
+
+/// What the Composer is to render, and how.
+struct ComposeRequest
+{
+    Composition composition;  ///< rendered as it stands
+    bool multiProcess = true; ///< several segments at a time
+};
+
+/// Renders a composition into its target file. What can be seen to fail is told before the work
+/// begins. Progress is that of the whole run; that of its parts comes from the engine.
+class ComposeJob : public ToolJob
+{
+    Q_OBJECT
+
+public:
+    explicit ComposeJob(ComposeRequest request, QObject *parent = nullptr);
+
+    [[nodiscard]] const ComposerEngine &engine() const { return m_engine; }
+
+private:
+    [[nodiscard]] bool work() override;
+    [[nodiscard]] bool check();
+
+    ComposeRequest m_request;
+    ComposerEngine m_engine;
+};

@@ -1,0 +1,129 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "cli/CliRun.h"
+#include "support/files.h"
+#include "support/wvbytes.h"
+
+#include <QFile>
+#include <QJsonArray>
+#include <QJsonDocument>
+#include <QJsonObject>
+#include <QTest>
+#include <QtEndian>
+
+#include <cstdlib>
+#include <utility>
+
+class tst_composecommand : public QObject
+{
+    Q_OBJECT
+
+private slots:
+    void init();
+    void renders_data();
+    void renders();
+    void lists();
+    void refusals_data();
+    void refusals();
+
+private:
+    TestFolder m_folder;
+};
+
+/// A tone of 4000 samples from the start of the file on, and its copy 1000 samples later.
+void tst_composecommand::init()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4000)));
+    const QByteArray segment = "<Segment sName='tone.wv' lSamples='4000' lUsed='4000' "
+                               "dSrcClk='1e6' bMkr='1' lTarget='";
+    const QByteArray disabled = "<Track><Segment sName='gone.wv' lSamples='4' lUsed='4'/></Track>";
+    QVERIFY(
+        m_folder.store("a.cms", "<Settings><TargetWv sName='out.wv' lSamples='5000' dUsrClk='1e6'/>"
+                                "<Track bEnable='1'>" +
+                                    segment + "0'/></Track><Track bEnable='1'>" + segment +
+                                    "1000'/></Track>" + disabled + "</Settings>"));
+    QFile::remove(m_folder.path("out.wv"));
+    QFile::remove(m_folder.path("other.wv"));
+}
+
+void tst_composecommand::renders_data()
+{
+    QTest::addColumn<QStringList>("options");
+    QTest::addColumn<QString>("output");
+    QTest::newRow("as composed") << QStringList{"--no-multi-process"} << "out.wv";
+    QTest::newRow("other name") << QStringList{"-o", "other.wv"} << "other.wv";
+}
+
+void tst_composecommand::renders()
+{
+    QFETCH(QStringList, options);
+    QFETCH(QString, output);
+    const CliRun run = CliRun::in(m_folder.path(), QStringList{"compose", "a.cms"} + options);
+    QVERIFY2(run.exitCode == 0, qPrintable(run.lines.join('\n')));
+    QVERIFY(run.output.isEmpty());
+    const QByteArray file = m_folder.load(output);
+    QCOMPARE(tag(file, "SAMPLES"), "5000");
+    QCOMPARE(tag(file, "COMMENT"), "Created with Corvane");
+    QCOMPARE(tag(file, "MARKER LIST 1"), " 0:1;3000:0");
+    // Twice the tone where both play; 1000 samples are one turn. The tone's own rounding lifts the
+    // peak by some words.
+    for (const auto &[sample, word] :
+         {std::pair{0, 16384}, {1000, 32767}, {3000, 32767}, {4000, 16384}}) {
+        const auto got = qFromLittleEndian<qint16>(sampleWords(file).constData() + 4 * sample);
+        QVERIFY2(std::abs(got - word) <= 4, qPrintable(QString::number(got)));
+    }
+    const bool reported = !run.lines.filter("frequency shifting 2 Waveforms, 8000 Input").isEmpty();
+    QVERIFY2(reported, qPrintable(run.lines.join('\n')));
+    // An existing file stays.
+    QCOMPARE(CliRun::in(m_folder.path(), QStringList{"compose", "a.cms"} + options).exitCode, 1);
+}
+
+void tst_composecommand::lists()
+{
+    const CliRun run = CliRun::in(m_folder.path(), {"compose", "a.cms", "--list", "--json"});
+    QCOMPARE(run.exitCode, 0);
+    const QJsonObject object = QJsonDocument::fromJson(run.output).object();
+    QCOMPARE(object["target"]["sName"].toString(), m_folder.path("out.wv"));
+    QCOMPARE(object["target"]["dUsrClk"].toDouble(), 1e6);
+    QCOMPARE(object["tracks"].toArray().size(), 3);
+    const QJsonObject segment = object["tracks"][1]["segments"][0].toObject();
+    QCOMPARE(segment["lTarget"].toInt(), 1000);
+    QCOMPARE(segment["missing"].toBool(), false);
+    QCOMPARE(object["tracks"][2]["segments"][0]["missing"].toBool(), true);
+    QCOMPARE(object["tracks"][2]["bEnable"].toBool(), false);
+    const CliRun plain = CliRun::in(m_folder.path(), {"compose", "a.cms", "--list"});
+    QVERIFY(plain.output.contains("gone.wv (missing)"));
+    QVERIFY(!QFile::exists(m_folder.path("out.wv")));
+}
+
+void tst_composecommand::refusals_data()
+{
+    QTest::addColumn<QByteArray>("from");
+    QTest::addColumn<QByteArray>("to");
+    QTest::addColumn<QString>("reason");
+    const auto row = [](const char *name, const char *from, const char *to, const char *reason) {
+        QTest::newRow(name) << QByteArray(from) << QByteArray(to) << QString(reason);
+    };
+    row("missing source",
+        "sName='tone.wv' lSamples='4000' lUsed='4000' dSrcClk='1e6' bMkr='1' "
+        "lTarget='1000'",
+        "sName='x.wv'", "x.wv' of track 2, segment 1 is missing.");
+    row("nothing enabled", "bEnable='1'", "", "no enabled track has a segment");
+    row("no length", "lSamples='5000'", "", "a length of 0 samples");
+    row("no folder", "'out.wv'", "'no/out.wv'", "its folder doesn't exist");
+    row("broken", "</Settings>", "", "a.cms': line 1: ");
+}
+
+void tst_composecommand::refusals()
+{
+    QFETCH(QByteArray, from);
+    QFETCH(QByteArray, to);
+    QFETCH(QString, reason);
+    QVERIFY(m_folder.store("a.cms", m_folder.load("a.cms").replace(from, to)));
+    const CliRun run = CliRun::in(m_folder.path(), {"compose", "a.cms"});
+    QCOMPARE(run.exitCode, 1);
+    QVERIFY2(run.lastLine().startsWith("error: ") && run.lastLine().contains(reason),
+             qPrintable(run.lines.join('\n')));
+}
+
+QTEST_GUILESS_MAIN(tst_composecommand)
+#include "tst_composecommand.moc"
