@@ -4,9 +4,9 @@
 #include "ErrorQueue.h"
 #include "ProgramUnit.h"
 #include "hostfolder.h"
-#include "wildcard.h"
 
 #include <fcntl.h>
+#include <fnmatch.h>
 #include <strings.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
@@ -47,6 +47,22 @@ std::string_view typeOf(std::string_view name)
         return "SET";
     }
     return "BIN";
+}
+
+// A pattern with * and ? as fnmatch takes it, to which [ and \ are special too.
+std::string shellPattern(const std::string &pattern)
+{
+    if (pattern == "*.*") {
+        return "*"; // fits names without a suffix as well
+    }
+    std::string result;
+    for (const char byte : pattern) {
+        if (byte == '[' || byte == '\\') {
+            result += '\\';
+        }
+        result += byte;
+    }
+    return result;
 }
 
 } // namespace
@@ -251,12 +267,14 @@ int MassMemory::catalog(std::string_view path, Catalog &result) const
         }
     }
 
+    pattern = shellPattern(pattern);
+    const int flags = m_unixPaths ? 0 : FNM_CASEFOLD;
     forEachName(place.folder.get(), [&](std::string_view name) {
+        const std::string text(name);
         const bool fits = result.filtered && name == place.name;
-        if (!isPrintable(name) || (!fits && !matchesWildcard(name, pattern, m_unixPaths))) {
+        if (!isPrintable(name) || (!fits && ::fnmatch(pattern.c_str(), text.c_str(), flags) != 0)) {
             return;
         }
-        const std::string text(name);
         struct stat status
         {
         };

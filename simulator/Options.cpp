@@ -1,14 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Options.h"
 
+#include "configfile.h"
+
+#include <CLI/CLI.hpp>
 #include <arpa/inet.h>
 
 #include <algorithm>
-#include <array>
 #include <charconv>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <utility>
 
 namespace simulator {
@@ -21,7 +21,6 @@ constexpr std::string_view DefaultAddress = "127.0.0.2";
 constexpr std::uint64_t MaxPort = 65535;
 constexpr std::uint64_t FirstFreePort = 1025;
 constexpr std::uint64_t MaxGpib = 30;
-constexpr std::size_t MaxConfigSize = 1'048'576;
 
 std::optional<std::uint64_t> wholeNumber(std::string_view text)
 {
@@ -57,21 +56,9 @@ bool isPrintable(std::string_view text)
     });
 }
 
-std::optional<std::string> readFile(const std::string &name)
-{
-    std::ifstream file(name, std::ios::binary);
-    std::string text(MaxConfigSize + 1, '\0');
-    file.read(text.data(), static_cast<std::streamsize>(text.size()));
-    text.resize(static_cast<std::size_t>(file.gcount()));
-    if (file.bad() || (text.empty() && !file.eof()) || text.size() > MaxConfigSize) {
-        return std::nullopt;
-    }
-    return text;
-}
-
 bool loadConfig(const std::string &name, Options &options, std::string &error)
 {
-    const std::optional<std::string> text = readFile(name);
+    const std::optional<std::string> text = protocols::readTextFile(name);
     if (!text) {
         error = "cannot read the configuration file '" + name + "'";
         return false;
@@ -80,7 +67,7 @@ bool loadConfig(const std::string &name, Options &options, std::string &error)
         error = name + ": " + error;
         return false;
     };
-    const auto entries = parseConfig(*text, error);
+    const auto entries = protocols::parseIni(*text, error);
     if (!entries) {
         return fail();
     }
@@ -169,64 +156,60 @@ std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::st
     return place;
 }
 
-std::optional<Options> parseOptions(std::span<const std::string_view> arguments, std::string &error)
+std::optional<Options> parseOptions(std::vector<std::string> arguments, std::string &error)
 {
     Options options;
     RawInstrument raw{.label = "--"};
     std::optional<std::string> config;
-    bool single = false;
 
-    const std::array<std::pair<std::string_view, std::optional<std::string> *>, 8> switches{{
-        {"--model", &raw.model},
-        {"--serial", &raw.serial},
-        {"--firmware", &raw.firmware},
-        {"--options", &raw.options},
-        {"--address", &raw.address},
-        {"--root", &raw.root},
-        {"--seed", &raw.seed},
-        {"--config", &config},
-    }};
-    for (std::size_t i = 0; i < arguments.size(); ++i) {
-        const std::string_view argument = arguments[i];
-        if (argument == "--help" || argument == "-h" || argument == "--version") {
-            options.action =
-                argument == "--version" ? Options::Action::Version : Options::Action::Help;
-            return options;
-        }
-        if (argument == "--verbose") {
-            options.verbose = true;
-            continue;
-        }
-        const std::size_t equals = std::min(argument.find('='), argument.size());
-        const std::string_view name = argument.substr(0, equals);
-        const auto *known = std::find_if(switches.begin(), switches.end(),
-                                         [name](const auto &entry) { return entry.first == name; });
-        if (known == switches.end() && name != "--fault") {
-            error = "unknown argument '" + std::string(argument) + "'; see --help";
-            return std::nullopt;
-        }
-        std::string value;
-        if (equals < argument.size()) {
-            value = argument.substr(equals + 1);
-        } else if (i + 1 < arguments.size()) {
-            value = arguments[++i];
-        } else {
-            error = std::string(name) + " needs a value";
-            return std::nullopt;
-        }
-        single = single || name != "--config";
-        if (known == switches.end()) {
-            raw.faults.push_back(std::move(value));
-        } else {
-            *known->second = std::move(value);
-        }
+    CLI::App app("Answers like a bench instrument, on this machine alone.", "corvane-simulator");
+    app.footer("Models:\n" + modelNames() + "\n\nFaults:\n" + Faults::help());
+    app.set_version_flag("--version", "corvane-simulator " CORVANE_VERSION);
+    app.add_flag("--verbose", options.verbose, "logs each command and answer");
+    auto *file = app.add_option("--config", config,
+                                "several instruments, one group of an INI file each, with the keys "
+                                "model, serial, firmware, options, root, seed, fault, and either "
+                                "address, or gateway (a port above 1024) and gpib (0 to 30)");
+    struct Switch
+    {
+        const char *name;
+        std::optional<std::string> &value;
+        const char *help;
+    };
+    for (const Switch &one :
+         {Switch{"--model", raw.model, "instrument model, default TGX-870"},
+          Switch{"--serial", raw.serial, "serial number, default 100001"},
+          Switch{"--firmware", raw.firmware, "firmware version, default 1.0"},
+          Switch{"--options", raw.options, "answer to *OPT?, default that of the model"},
+          Switch{"--address", raw.address,
+                 "own address of 127.0.0.0/8, default 127.0.0.2; the ports 111 and 5025 are "
+                 "opened there"},
+          Switch{"--root", raw.root,
+                 "folder that stands for the top of the file system, default a temporary one"},
+          Switch{"--seed", raw.seed, "seed of the noise that an analyzer records, default 1"}}) {
+        app.add_option(one.name, one.value, one.help)->excludes(file);
+    }
+    app.add_option("--fault", raw.faults, "NAME[=VALUE]: a fault to show; may be repeated")
+        ->expected(1)
+        ->take_all()
+        ->excludes(file);
+
+    try {
+        // The parser takes them from the end.
+        std::reverse(arguments.begin(), arguments.end());
+        app.parse(std::move(arguments));
+    } catch (const CLI::CallForVersion &version) {
+        options.text = std::string(version.what()) + '\n';
+        return options;
+    } catch (const CLI::Success &) {
+        options.text = app.help();
+        return options;
+    } catch (const CLI::ParseError &failure) {
+        error = std::string(failure.what()) + "; see --help";
+        return std::nullopt;
     }
 
     if (config) {
-        if (single) {
-            error = "--config takes no switches of a single instrument beside it";
-            return std::nullopt;
-        }
         if (!loadConfig(*config, options, error)) {
             return std::nullopt;
         }
@@ -238,42 +221,6 @@ std::optional<Options> parseOptions(std::span<const std::string_view> arguments,
     }
     options.instruments.push_back(std::move(*place));
     return options;
-}
-
-std::string helpText()
-{
-    std::string text =
-        "Usage: corvane-simulator [OPTIONS]\n"
-        "Answers like a bench instrument, on this machine alone.\n"
-        "\n"
-        "  --model NAME        instrument model, default TGX-870\n"
-        "  --serial TEXT       serial number, default 100001\n"
-        "  --firmware TEXT     firmware version, default 1.0\n"
-        "  --options TEXT      answer to *OPT?, default that of the model\n"
-        "  --address ADDRESS   own address of 127.0.0.0/8, default 127.0.0.2;\n"
-        "                      the ports 111 and 5025 are opened there\n"
-        "  --root DIR          folder that stands for the top of the file system,\n"
-        "                      default a temporary one\n"
-        "  --seed N            seed of the noise that an analyzer records, default 1\n"
-        "  --fault NAME[=VALUE]  a fault to show; may be repeated\n"
-        "  --config FILE       several instruments, one group of an INI file each, with the keys\n"
-        "                      model, serial, firmware, options, root, seed, fault, and either\n"
-        "                      address, or gateway (a port above 1024) and gpib (0 to 30)\n"
-        "  --verbose           logs each command and answer\n"
-        "  --help, --version\n"
-        "\n"
-        "Models: ";
-    std::size_t column = std::string_view("Models: ").size();
-    constexpr std::size_t Width = 80;
-    for (const ModelInfo &model : modelTable()) {
-        if (column + model.name.size() + 1 > Width) {
-            text += "\n        ";
-            column = std::string_view("Models: ").size();
-        }
-        text.append(model.name).append(" ");
-        column += model.name.size() + 1;
-    }
-    return text + "\n\nFaults:\n" + Faults::help();
 }
 
 } // namespace simulator

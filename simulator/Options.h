@@ -5,9 +5,7 @@
 
 #include <cstdint>
 #include <optional>
-#include <span>
 #include <string>
-#include <string_view>
 #include <vector>
 
 namespace simulator {
@@ -24,35 +22,15 @@ struct InstrumentPlace
 /// What the program was asked for.
 struct Options
 {
-    enum class Action { Run, Help, Version };
-
-    Action action = Action::Run;
+    std::string text; ///< to be printed instead of running: help or version
     bool verbose = false;
     std::vector<InstrumentPlace> instruments;
 };
 
 /// Reads the command line without the program's name, and the configuration file it names.
 /// Nothing, with the reason in `error`, when there is anything wrong with it.
-[[nodiscard]] std::optional<Options> parseOptions(std::span<const std::string_view> arguments,
+[[nodiscard]] std::optional<Options> parseOptions(std::vector<std::string> arguments,
                                                   std::string &error);
-
-/// One line of an INI file, as group, key and value.
-struct ConfigEntry
-{
-    std::string group;
-    std::string key; ///< empty: the group's heading
-    std::string value;
-    unsigned line = 0;
-    bool isQuoted = false;
-};
-
-/// Reads the lines of an INI file. Nothing, with the reason in `error`, when one is malformed.
-[[nodiscard]] std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text,
-                                                                  std::string &error);
-
-/// The instruments of a configuration; a relative root begins at `folder`.
-[[nodiscard]] std::optional<std::vector<InstrumentPlace>>
-instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, std::string &error);
 
 /// The values of one instrument as they were written, to be checked together.
 struct RawInstrument
@@ -74,8 +52,5 @@ struct RawInstrument
 /// them is not allowed.
 [[nodiscard]] std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw,
                                                              std::string &error);
-
-/// The text of --help.
-[[nodiscard]] std::string helpText();
 
 } // namespace simulator

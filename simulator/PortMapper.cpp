@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "PortMapper.h"
 
-#include "Rpc.h"
+#include "protocols/RpcRecord.h"
 #include "sockets.h"
 
 #include <netinet/in.h>
 #include <poll.h>
+#include <rpc/pmap_prot.h>
 #include <sys/eventfd.h>
 #include <sys/socket.h>
 
@@ -16,22 +17,16 @@
 namespace simulator {
 namespace {
 
-constexpr std::uint32_t Program = 100000;
-constexpr std::uint32_t Version = 2;
-constexpr std::size_t MaxCallSize = 4096;
-constexpr std::uint32_t ProtocolTcp = IPPROTO_TCP;
-constexpr std::uint32_t ProtocolUdp = IPPROTO_UDP;
+using protocols::XdrReader;
+using protocols::XdrWriter;
 
-enum Procedure : std::uint32_t { Set = 1, Unset = 2, GetPort = 3, Dump = 4 };
+constexpr std::size_t MaxCallSize = 4096;
 
 void putMapping(XdrWriter &results, std::uint32_t program, std::uint32_t version,
                 std::uint32_t protocol, std::uint32_t port)
 {
     results.number(1); // one more follows
-    results.number(program);
-    results.number(version);
-    results.number(protocol);
-    results.number(port);
+    results.value(xdr_pmap, pmap{program, version, protocol, port});
 }
 
 } // namespace
@@ -76,37 +71,34 @@ void PortMapper::stop()
 RpcStatus PortMapper::call(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) const
 {
     switch (procedure) {
-    case Set:
-    case Unset:
+    case PMAPPROC_SET:
+    case PMAPPROC_UNSET:
         // Nobody else may register anything on an instrument.
         results.number(0);
         return RpcStatus::Success;
-    case GetPort: {
-        const std::uint32_t program = arguments.number();
-        const std::uint32_t version = arguments.number();
-        const std::uint32_t protocol = arguments.number();
-        (void)arguments.number();
+    case PMAPPROC_GETPORT: {
+        const auto wanted = arguments.value(xdr_pmap);
         if (!arguments.isGood()) {
             return RpcStatus::GarbageArguments;
         }
         std::uint32_t port = 0;
         for (const Mapping &mapping : m_mappings) {
-            if (mapping.program == program && mapping.version == version &&
-                protocol == ProtocolTcp) {
+            if (mapping.program == wanted.pm_prog && mapping.version == wanted.pm_vers &&
+                wanted.pm_prot == IPPROTO_TCP) {
                 port = mapping.port;
             }
         }
-        if (program == Program) {
+        if (wanted.pm_prog == PMAPPROG) {
             port = Port;
         }
         results.number(port);
         return RpcStatus::Success;
     }
-    case Dump:
-        putMapping(results, Program, Version, ProtocolTcp, Port);
-        putMapping(results, Program, Version, ProtocolUdp, Port);
+    case PMAPPROC_DUMP:
+        putMapping(results, PMAPPROG, PMAPVERS, IPPROTO_TCP, Port);
+        putMapping(results, PMAPPROG, PMAPVERS, IPPROTO_UDP, Port);
         for (const Mapping &mapping : m_mappings) {
-            putMapping(results, mapping.program, mapping.version, ProtocolTcp, mapping.port);
+            putMapping(results, mapping.program, mapping.version, IPPROTO_TCP, mapping.port);
         }
         results.number(0);
         return RpcStatus::Success;
@@ -115,24 +107,24 @@ RpcStatus PortMapper::call(std::uint32_t procedure, XdrReader &arguments, XdrWri
     }
 }
 
+RpcProgram PortMapper::program() const
+{
+    return {PMAPPROG, PMAPVERS,
+            [this](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
+                return call(procedure, arguments, results);
+            }};
+}
+
 void PortMapper::serveTcp(int fd) const
 {
-    const std::array programs{
-        RpcProgram{Program, Version,
-                   [this](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
-                       return call(procedure, arguments, results);
-                   }}};
+    const std::array programs{program()};
     serveRpcStream(fd, MaxCallSize, programs, [] { return false; });
 }
 
 void PortMapper::serveUdp() const
 {
-    const std::array programs{
-        RpcProgram{Program, Version,
-                   [this](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
-                       return call(procedure, arguments, results);
-                   }}};
-    std::array<char, MaxCallSize> buffer{};
+    const std::array programs{program()};
+    std::array<std::uint8_t, MaxCallSize> buffer{};
     XdrWriter reply;
     for (;;) {
         std::array<pollfd, 2> events{{{m_wake.get(), POLLIN, 0}, {m_udp.get(), POLLIN, 0}}};
@@ -149,9 +141,11 @@ void PortMapper::serveUdp() const
         if (count <= 0) {
             continue;
         }
-        const std::span<const char> call = std::span(buffer).first(static_cast<std::size_t>(count));
+        const std::span<const std::uint8_t> call =
+            std::span(buffer).first(static_cast<std::size_t>(count));
         if (answerRpcCall(call, programs, reply)) {
-            const std::span<const char> bytes = reply.bytes().subspan(RecordMarkSize);
+            // A datagram goes without the mark of a record.
+            const auto bytes = reply.bytes().subspan(protocols::RecordMarkSize);
             (void)::sendto(m_udp.get(), bytes.data(), bytes.size(), MSG_NOSIGNAL,
                            reinterpret_cast<const sockaddr *>(&peer), length);
         }

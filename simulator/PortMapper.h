@@ -3,6 +3,7 @@
 
 #include "TcpServer.h"
 #include "UniqueFd.h"
+#include "rpcserver.h"
 
 #include <cstdint>
 #include <span>
@@ -11,10 +12,6 @@
 #include <vector>
 
 namespace simulator {
-
-class XdrReader;
-class XdrWriter;
-enum class RpcStatus : std::uint32_t;
 
 /// The RPC port mapper, RFC 1833, version 2, on TCP and UDP: it tells clients where the VXI-11
 /// channels are.
@@ -42,8 +39,9 @@ public:
     void stop();
 
 private:
-    [[nodiscard]] RpcStatus call(std::uint32_t procedure, XdrReader &arguments,
-                                 XdrWriter &results) const;
+    [[nodiscard]] RpcStatus call(std::uint32_t procedure, protocols::XdrReader &arguments,
+                                 protocols::XdrWriter &results) const;
+    [[nodiscard]] RpcProgram program() const;
     void serveTcp(int fd) const;
     void serveUdp() const;
 

@@ -32,7 +32,8 @@ bool sendAnswers(Instrument &instrument, Link &link, int fd, std::vector<char> &
             }
             result = link.read(buffer, std::nullopt);
         }
-        if (!sendAll(fd, std::span(buffer).first(result.count)) || link.isDropDue()) {
+        if (!sendAll(fd, std::as_bytes(std::span(buffer).first(result.count))) ||
+            link.isDropDue()) {
             return false;
         }
     }

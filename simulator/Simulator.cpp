@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Simulator.h"
 
+#include <vxi11.h>
+
 namespace simulator {
 namespace {
 
@@ -63,8 +65,8 @@ bool Simulator::addHost(const std::string &address, Instrument &instrument, std:
     host.vxi11.addDevice("inst0", instrument);
     host.vxi11.start(address);
     if (!instrument.faults().has("no-portmapper")) {
-        host.mapper.start({{Vxi11CoreProgram, Vxi11Version, host.vxi11.corePort()},
-                           {Vxi11AbortProgram, Vxi11Version, host.vxi11.abortPort()}});
+        host.mapper.start({{DEVICE_CORE, DEVICE_CORE_VERSION, host.vxi11.corePort()},
+                           {DEVICE_ASYNC, DEVICE_ASYNC_VERSION, host.vxi11.abortPort()}});
     }
     if (!instrument.faults().has("no-raw")) {
         host.raw.start(instrument, address + ":" + std::to_string(RawSocketServer::Port));

@@ -3,8 +3,10 @@
 
 #include "Instrument.h"
 #include "Link.h"
-#include "Rpc.h"
 #include "Vxi11Session.h"
+#include "rpcserver.h"
+
+#include <vxi11.h>
 
 #include <algorithm>
 #include <array>
@@ -12,9 +14,11 @@
 namespace simulator {
 namespace {
 
+using protocols::XdrReader;
+using protocols::XdrWriter;
+
 // Arguments beside the data of a call are short.
 constexpr std::size_t MaxCallOverhead = 4096;
-constexpr std::uint32_t DeviceAbort = 1;
 
 } // namespace
 
@@ -34,7 +38,7 @@ void Vxi11Server::start(const std::string &label)
     m_core.start([this](int fd) {
         Vxi11Session session(*this, fd);
         const std::array programs{RpcProgram{
-            Vxi11CoreProgram, Vxi11Version,
+            DEVICE_CORE, DEVICE_CORE_VERSION,
             [&session](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
                 return session.call(procedure, arguments, results);
             }}};
@@ -83,12 +87,12 @@ void Vxi11Server::unregisterLink(std::uint32_t id)
 void Vxi11Server::serveAbort(int fd)
 {
     const std::array programs{
-        RpcProgram{Vxi11AbortProgram, Vxi11Version,
+        RpcProgram{DEVICE_ASYNC, DEVICE_ASYNC_VERSION,
                    [this](std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) {
-                       if (procedure != DeviceAbort) {
+                       if (procedure != device_abort) {
                            return RpcStatus::ProcedureUnavailable;
                        }
-                       const std::uint32_t id = arguments.number();
+                       const auto id = static_cast<std::uint32_t>(arguments.value(xdr_Device_Link));
                        if (!arguments.isGood()) {
                            return RpcStatus::GarbageArguments;
                        }
@@ -107,8 +111,8 @@ void Vxi11Server::serveAbort(int fd)
                            entry.link->abort();
                            entry.instrument->notify();
                        }
-                       results.number(static_cast<std::uint32_t>(
-                           entry.link ? Vxi11Error::None : Vxi11Error::InvalidLink));
+                       results.value(xdr_Device_Error,
+                                     {entry.link ? DEVICE_ERROR_NONE : DEVICE_ERROR_INVALID_LINK});
                        return RpcStatus::Success;
                    }}};
     serveRpcStream(fd, MaxCallOverhead, programs, [] { return false; });

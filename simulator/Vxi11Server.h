@@ -17,27 +17,6 @@ namespace simulator {
 class Instrument;
 class Link;
 
-/// The RPC programs of VXI-11, revision 1.0.
-inline constexpr std::uint32_t Vxi11CoreProgram = 0x0607AF;
-inline constexpr std::uint32_t Vxi11AbortProgram = 0x0607B0;
-inline constexpr std::uint32_t Vxi11Version = 1;
-
-/// Error codes of VXI-11, table B.2.
-enum class Vxi11Error : std::uint32_t {
-    None = 0,
-    SyntaxError = 1,
-    NotAccessible = 3,
-    InvalidLink = 4,
-    ParameterError = 5,
-    NotSupported = 8,
-    OutOfResources = 9,
-    Locked = 11,
-    NoLock = 12,
-    Timeout = 15,
-    IoError = 17,
-    Abort = 23,
-};
-
 /// The core and abort channels in front of one or several instruments.
 class Vxi11Server
 {

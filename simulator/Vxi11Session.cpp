@@ -10,41 +10,12 @@
 namespace simulator {
 namespace {
 
-// Procedures of the core channel, VXI-11, B.6.
-enum Procedure : std::uint32_t {
-    CreateLink = 10,
-    DeviceWrite = 11,
-    DeviceRead = 12,
-    DeviceReadStb = 13,
-    DeviceTrigger = 14,
-    DeviceClear = 15,
-    DeviceRemote = 16,
-    DeviceLocal = 17,
-    DeviceLock = 18,
-    DeviceUnlock = 19,
-    DeviceEnableSrq = 20,
-    DeviceDoCmd = 22,
-    DestroyLink = 23,
-    CreateInterruptChannel = 25,
-    DestroyInterruptChannel = 26,
-};
-
-// Bits of Device_Flags.
-constexpr std::uint32_t WaitLock = 1;
-constexpr std::uint32_t End = 8;
-constexpr std::uint32_t TermCharSet = 128;
-
-// Bits of the reason of device_read.
-constexpr std::uint32_t RequestCount = 1;
-constexpr std::uint32_t TermCharSeen = 2;
-constexpr std::uint32_t EndSeen = 4;
-
 // What one device_read returns at most; the controller asks again for the rest.
 constexpr std::uint32_t MaxReadSize = 1'048'576;
 
-void putError(XdrWriter &results, Vxi11Error error)
+void putError(protocols::XdrWriter &results, Device_ErrorCode error)
 {
-    results.number(static_cast<std::uint32_t>(error));
+    results.value(xdr_Device_Error, {error});
 }
 
 TimePoint after(std::uint32_t milliseconds)
@@ -64,32 +35,32 @@ Vxi11Session::~Vxi11Session()
 RpcStatus Vxi11Session::call(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results)
 {
     switch (procedure) {
-    case CreateLink:
+    case create_link:
         return createLink(arguments, results);
-    case DeviceWrite:
+    case device_write:
         return write(arguments, results);
-    case DeviceRead:
+    case device_read:
         return read(arguments, results);
-    case DeviceReadStb:
-    case DeviceTrigger:
-    case DeviceClear:
-    case DeviceRemote:
-    case DeviceLocal:
+    case device_readstb:
+    case device_trigger:
+    case device_clear:
+    case device_remote:
+    case device_local:
         return generic(procedure, arguments, results);
-    case DeviceLock:
+    case device_lock:
         return lock(arguments, results);
-    case DeviceUnlock:
+    case device_unlock:
         return unlock(arguments, results);
-    case DestroyLink:
+    case destroy_link:
         return destroyLink(arguments, results);
-    case DeviceEnableSrq:
-    case CreateInterruptChannel:
-    case DestroyInterruptChannel:
+    case device_enable_srq:
+    case create_intr_chan:
+    case destroy_intr_chan:
         // No service requests: there is no interrupt channel.
-        putError(results, Vxi11Error::NotSupported);
+        putError(results, DEVICE_ERROR_NOT_SUPPORTED);
         return RpcStatus::Success;
-    case DeviceDoCmd:
-        putError(results, Vxi11Error::NotSupported);
+    case device_docmd:
+        putError(results, DEVICE_ERROR_NOT_SUPPORTED);
         (void)results.openOpaque(0);
         results.closeOpaque(0);
         return RpcStatus::Success;
@@ -104,26 +75,26 @@ Vxi11Session::Device *Vxi11Session::find(std::uint32_t link)
     return found == m_devices.end() ? nullptr : &found->second;
 }
 
-Vxi11Error Vxi11Session::access(std::unique_lock<std::mutex> &lock, Device &device,
-                                std::uint32_t flags, std::uint32_t timeoutMs)
+Device_ErrorCode Vxi11Session::access(std::unique_lock<std::mutex> &lock, Device &device,
+                                      Device_Flags flags, std::uint32_t timeoutMs)
 {
     // An abort that came while no call was running has nothing to end.
     (void)device.link->takeAbort();
-    const TimePoint deadline = (flags & WaitLock) != 0 ? after(timeoutMs) : TimePoint();
+    const TimePoint deadline = (flags & DEVICE_FLAG_WAITLOCK) != 0 ? after(timeoutMs) : TimePoint();
     switch (device.instrument->waitForAccess(lock, *device.link, deadline,
                                              [this] { return isPeerGone(m_fd); })) {
     case Instrument::Wait::Ready:
-        return Vxi11Error::None;
+        return DEVICE_ERROR_NONE;
     case Instrument::Wait::TimedOut:
-        return Vxi11Error::Locked;
+        return DEVICE_ERROR_LOCKED_BY_OTHER;
     case Instrument::Wait::Aborted:
-        return Vxi11Error::Abort;
+        return DEVICE_ERROR_ABORT;
     case Instrument::Wait::PeerGone:
     case Instrument::Wait::Stopped:
         break;
     }
     m_dropped = true;
-    return Vxi11Error::IoError;
+    return DEVICE_ERROR_IO;
 }
 
 void Vxi11Session::release(const Device &device, std::uint32_t id)
@@ -139,14 +110,14 @@ void Vxi11Session::release(const Device &device, std::uint32_t id)
 RpcStatus Vxi11Session::createLink(XdrReader &arguments, XdrWriter &results)
 {
     (void)arguments.number(); // the client's own number
-    const bool lockDevice = arguments.boolean();
+    const bool lockDevice = arguments.number() != 0;
     const std::uint32_t lockTimeoutMs = arguments.number();
     const std::string_view name = arguments.text();
     if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
     }
 
-    Vxi11Error error = Vxi11Error::None;
+    Device_ErrorCode error = DEVICE_ERROR_NONE;
     std::uint32_t id = 0;
     if (Instrument *instrument = m_server.findDevice(name)) {
         Device device{std::make_shared<Link>(*instrument, Link::Transport::Vxi11,
@@ -154,28 +125,27 @@ RpcStatus Vxi11Session::createLink(XdrReader &arguments, XdrWriter &results)
                       instrument};
         id = m_server.registerLink(device.link, *instrument);
         if (id == 0) {
-            error = Vxi11Error::OutOfResources;
+            error = DEVICE_ERROR_OUT_OF_RESOURCES;
         } else {
             if (lockDevice) {
                 std::unique_lock lock(instrument->mutex());
-                error = access(lock, device, WaitLock, lockTimeoutMs);
-                if (error == Vxi11Error::None) {
+                error = access(lock, device, DEVICE_FLAG_WAITLOCK, lockTimeoutMs);
+                if (error == DEVICE_ERROR_NONE) {
                     instrument->setAccess(device.link.get());
                 }
             }
-            if (error == Vxi11Error::None) {
+            if (error == DEVICE_ERROR_NONE) {
                 m_devices[id] = device;
             } else {
                 m_server.unregisterLink(id);
             }
         }
     } else {
-        error = Vxi11Error::NotAccessible;
+        error = DEVICE_ERROR_NOT_ACCESSIBLE;
     }
-    putError(results, error);
-    results.number(error == Vxi11Error::None ? id : 0);
-    results.number(m_server.abortPort());
-    results.number(Vxi11Server::MaxReceiveSize);
+    const bool opened = error == DEVICE_ERROR_NONE;
+    results.value(xdr_Create_LinkResp, {error, opened ? static_cast<Device_Link>(id) : 0,
+                                        m_server.abortPort(), Vxi11Server::MaxReceiveSize});
     return RpcStatus::Success;
 }
 
@@ -184,38 +154,33 @@ RpcStatus Vxi11Session::write(XdrReader &arguments, XdrWriter &results)
     const std::uint32_t id = arguments.number();
     (void)arguments.number(); // input is never held up, so its time-out cannot pass
     const std::uint32_t lockTimeoutMs = arguments.number();
-    const std::uint32_t flags = arguments.number();
-    const std::span<const char> data = arguments.opaque();
+    const auto flags = static_cast<Device_Flags>(arguments.number());
+    const std::span<const std::uint8_t> bytes = arguments.opaque();
     if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
     }
 
-    Vxi11Error error = Vxi11Error::InvalidLink;
+    Device_ErrorCode error = DEVICE_ERROR_INVALID_LINK;
     std::size_t taken = 0;
     if (Device *device = find(id)) {
         std::unique_lock lock(device->instrument->mutex());
         error = access(lock, *device, flags, lockTimeoutMs);
-        if (error == Vxi11Error::None) {
-            const bool end = (flags & End) != 0;
+        if (error == DEVICE_ERROR_NONE) {
+            const std::span data(reinterpret_cast<const char *>(bytes.data()), bytes.size());
+            const bool end = (flags & DEVICE_FLAG_END) != 0;
             do {
                 taken += device->link->feed(data.subspan(taken), end);
             } while (taken < data.size());
             m_dropped = m_dropped || device->link->isDropDue();
         }
     }
-    putError(results, error);
-    results.number(static_cast<std::uint32_t>(taken));
+    results.value(xdr_Device_WriteResp, {error, static_cast<unsigned>(taken)});
     return RpcStatus::Success;
 }
 
 RpcStatus Vxi11Session::read(XdrReader &arguments, XdrWriter &results)
 {
-    const std::uint32_t id = arguments.number();
-    const std::uint32_t requested = arguments.number();
-    const std::uint32_t ioTimeoutMs = arguments.number();
-    const std::uint32_t lockTimeoutMs = arguments.number();
-    const std::uint32_t flags = arguments.number();
-    const std::uint32_t termChar = arguments.number();
+    const auto call = arguments.value(xdr_Device_ReadParms);
     if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
     }
@@ -224,41 +189,42 @@ RpcStatus Vxi11Session::read(XdrReader &arguments, XdrWriter &results)
     results.number(0);
     const std::size_t reasonPlace = results.size();
     results.number(0);
-    const std::span<char> buffer = results.openOpaque(std::min(requested, MaxReadSize));
+    const auto room = results.openOpaque(std::min(call.requestSize, MaxReadSize));
+    const std::span buffer(reinterpret_cast<char *>(room.data()), room.size());
 
-    Vxi11Error error = Vxi11Error::InvalidLink;
+    Device_ErrorCode error = DEVICE_ERROR_INVALID_LINK;
     std::uint32_t reason = 0;
     std::size_t count = 0;
-    if (Device *device = find(id)) {
+    if (Device *device = find(static_cast<std::uint32_t>(call.lid))) {
         std::unique_lock lock(device->instrument->mutex());
-        error = access(lock, *device, flags, lockTimeoutMs);
-        if (error == Vxi11Error::None) {
+        error = access(lock, *device, call.flags, call.lock_timeout);
+        if (error == DEVICE_ERROR_NONE) {
             Link &link = *device->link;
             const Instrument::Wait waited = device->instrument->waitForOutput(
-                lock, link, after(ioTimeoutMs), [this] { return isPeerGone(m_fd); });
+                lock, link, after(call.io_timeout), [this] { return isPeerGone(m_fd); });
             if (waited == Instrument::Wait::Ready) {
                 std::optional<char> last;
-                if ((flags & TermCharSet) != 0) {
-                    last = static_cast<char>(termChar & 0xFFU);
+                if ((call.flags & DEVICE_FLAG_TERMCHRSET) != 0) {
+                    last = call.termChar;
                 }
                 const OutputQueue::ReadResult result = link.read(buffer, last);
                 count = result.count;
-                if (count == requested) {
-                    reason |= RequestCount;
+                if (count == call.requestSize) {
+                    reason |= DEVICE_REASON_REQCNT;
                 }
                 if (result.termChar) {
-                    reason |= TermCharSeen;
+                    reason |= DEVICE_REASON_CHR;
                 }
                 if (result.messageEnd) {
-                    reason |= EndSeen;
+                    reason |= DEVICE_REASON_END;
                 }
             } else if (waited == Instrument::Wait::TimedOut) {
                 link.noteUnterminated();
-                error = Vxi11Error::Timeout;
+                error = DEVICE_ERROR_TIMEOUT;
             } else if (waited == Instrument::Wait::Aborted) {
-                error = Vxi11Error::Abort;
+                error = DEVICE_ERROR_ABORT;
             } else {
-                error = Vxi11Error::IoError;
+                error = DEVICE_ERROR_IO;
                 m_dropped = true;
             }
             m_dropped = m_dropped || link.isDropDue();
@@ -272,55 +238,51 @@ RpcStatus Vxi11Session::read(XdrReader &arguments, XdrWriter &results)
 
 RpcStatus Vxi11Session::generic(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results)
 {
-    Generic parameters;
-    parameters.link = arguments.number();
-    parameters.flags = arguments.number();
-    parameters.lockTimeoutMs = arguments.number();
-    parameters.ioTimeoutMs = arguments.number();
+    const auto parameters = arguments.value(xdr_Device_GenericParms);
     if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
     }
 
-    Vxi11Error error = Vxi11Error::InvalidLink;
-    unsigned statusByte = 0;
-    if (Device *device = find(parameters.link)) {
+    Device_ErrorCode error = DEVICE_ERROR_INVALID_LINK;
+    unsigned char statusByte = 0;
+    if (Device *device = find(static_cast<std::uint32_t>(parameters.lid))) {
         std::unique_lock lock(device->instrument->mutex());
-        error = access(lock, *device, parameters.flags, parameters.lockTimeoutMs);
-        if (error == Vxi11Error::None) {
-            if (procedure == DeviceReadStb) {
-                statusByte = device->instrument->statusByte(*device->link);
-            } else if (procedure == DeviceTrigger) {
+        error = access(lock, *device, parameters.flags, parameters.lock_timeout);
+        if (error == DEVICE_ERROR_NONE) {
+            if (procedure == device_readstb) {
+                statusByte =
+                    static_cast<unsigned char>(device->instrument->statusByte(*device->link));
+            } else if (procedure == device_trigger) {
                 device->instrument->trigger();
-            } else if (procedure == DeviceClear) {
+            } else if (procedure == device_clear) {
                 device->link->clear();
                 device->instrument->clearPendingCompletion();
             }
         }
     }
-    putError(results, error);
-    if (procedure == DeviceReadStb) {
-        results.number(statusByte);
+    if (procedure == device_readstb) {
+        results.value(xdr_Device_ReadStbResp, {error, statusByte});
+    } else {
+        putError(results, error);
     }
     return RpcStatus::Success;
 }
 
 RpcStatus Vxi11Session::lock(XdrReader &arguments, XdrWriter &results)
 {
-    const std::uint32_t id = arguments.number();
-    const std::uint32_t flags = arguments.number();
-    const std::uint32_t timeoutMs = arguments.number();
+    const auto call = arguments.value(xdr_Device_LockParms);
     if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
     }
 
-    Vxi11Error error = Vxi11Error::InvalidLink;
-    if (Device *device = find(id)) {
+    Device_ErrorCode error = DEVICE_ERROR_INVALID_LINK;
+    if (Device *device = find(static_cast<std::uint32_t>(call.lid))) {
         std::unique_lock lock(device->instrument->mutex());
         // A link that has the lock gets no second one.
         error = device->instrument->access() == device->link.get()
-                    ? Vxi11Error::Locked
-                    : access(lock, *device, flags, timeoutMs);
-        if (error == Vxi11Error::None) {
+                    ? DEVICE_ERROR_LOCKED_BY_OTHER
+                    : access(lock, *device, call.flags, call.lock_timeout);
+        if (error == DEVICE_ERROR_NONE) {
             device->instrument->setAccess(device->link.get());
         }
     }
@@ -335,14 +297,14 @@ RpcStatus Vxi11Session::unlock(XdrReader &arguments, XdrWriter &results)
         return RpcStatus::GarbageArguments;
     }
 
-    Vxi11Error error = Vxi11Error::InvalidLink;
+    Device_ErrorCode error = DEVICE_ERROR_INVALID_LINK;
     if (Device *device = find(id)) {
         const std::lock_guard lock(device->instrument->mutex());
         const bool held = device->instrument->access() == device->link.get();
         if (held) {
             device->instrument->releaseAccess();
         }
-        error = held ? Vxi11Error::None : Vxi11Error::NoLock;
+        error = held ? DEVICE_ERROR_NONE : DEVICE_ERROR_NO_LOCK_HELD;
     }
     putError(results, error);
     return RpcStatus::Success;
@@ -358,9 +320,9 @@ RpcStatus Vxi11Session::destroyLink(XdrReader &arguments, XdrWriter &results)
     if (found != m_devices.end()) {
         release(found->second, id);
         m_devices.erase(found);
-        putError(results, Vxi11Error::None);
+        putError(results, DEVICE_ERROR_NONE);
     } else {
-        putError(results, Vxi11Error::InvalidLink);
+        putError(results, DEVICE_ERROR_INVALID_LINK);
     }
     return RpcStatus::Success;
 }

@@ -2,8 +2,10 @@
 #pragma once
 
 #include "Instrument.h"
-#include "Rpc.h"
 #include "Vxi11Server.h"
+#include "rpcserver.h"
+
+#include <vxi11.h>
 
 #include <cstdint>
 #include <map>
@@ -15,6 +17,9 @@ namespace simulator {
 class Vxi11Session
 {
 public:
+    using XdrReader = protocols::XdrReader;
+    using XdrWriter = protocols::XdrWriter;
+
     Vxi11Session(Vxi11Server &server, int fd)
         : m_server(server)
         , m_fd(fd)
@@ -37,15 +42,6 @@ private:
         Instrument *instrument = nullptr;
     };
 
-    /// The arguments that most procedures share.
-    struct Generic
-    {
-        std::uint32_t link = 0;
-        std::uint32_t flags = 0;
-        std::uint32_t lockTimeoutMs = 0;
-        std::uint32_t ioTimeoutMs = 0;
-    };
-
     [[nodiscard]] RpcStatus createLink(XdrReader &arguments, XdrWriter &results);
     [[nodiscard]] RpcStatus write(XdrReader &arguments, XdrWriter &results);
     [[nodiscard]] RpcStatus read(XdrReader &arguments, XdrWriter &results);
@@ -56,8 +52,8 @@ private:
     [[nodiscard]] RpcStatus destroyLink(XdrReader &arguments, XdrWriter &results);
 
     [[nodiscard]] Device *find(std::uint32_t link);
-    [[nodiscard]] Vxi11Error access(std::unique_lock<std::mutex> &lock, Device &device,
-                                    std::uint32_t flags, std::uint32_t timeoutMs);
+    [[nodiscard]] Device_ErrorCode access(std::unique_lock<std::mutex> &lock, Device &device,
+                                          Device_Flags flags, std::uint32_t timeoutMs);
     void release(const Device &device, std::uint32_t id);
 
     Vxi11Server &m_server;

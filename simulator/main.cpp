@@ -9,7 +9,6 @@
 #include <cstdio>
 #include <cstdlib>
 #include <string>
-#include <string_view>
 #include <vector>
 
 namespace {
@@ -28,19 +27,15 @@ int main(int argc, char **argv)
 {
     using simulator::Options;
 
-    const std::vector<std::string_view> arguments(argv + 1, argv + argc);
+    const std::vector<std::string> arguments(argv + 1, argv + argc);
     std::string error;
     const std::optional<Options> options = simulator::parseOptions(arguments, error);
     if (!options) {
         simulator::Log::error(error);
         return WrongUsage;
     }
-    if (options->action == Options::Action::Help) {
-        print(simulator::helpText());
-        return EXIT_SUCCESS;
-    }
-    if (options->action == Options::Action::Version) {
-        print("corvane-simulator " CORVANE_VERSION "\n");
+    if (!options->text.empty()) {
+        print(options->text);
         return EXIT_SUCCESS;
     }
     simulator::Log::setVerbose(options->verbose);

@@ -60,7 +60,7 @@ std::uint16_t localPort(int fd)
     return ntohs(name.sin_port);
 }
 
-bool sendAll(int fd, std::span<const char> bytes)
+bool sendAll(int fd, std::span<const std::byte> bytes)
 {
     while (!bytes.empty()) {
         const ssize_t count = ::send(fd, bytes.data(), bytes.size(), MSG_NOSIGNAL);

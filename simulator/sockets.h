@@ -22,7 +22,7 @@ namespace simulator {
 [[nodiscard]] std::uint16_t localPort(int fd);
 
 /// Sends all bytes, waiting as long as it takes; false when the connection ended.
-[[nodiscard]] bool sendAll(int fd, std::span<const char> bytes);
+[[nodiscard]] bool sendAll(int fd, std::span<const std::byte> bytes);
 
 /// Whether the peer closed its end of a connection. Bytes that wait to be read are left alone.
 [[nodiscard]] bool isPeerGone(int fd);

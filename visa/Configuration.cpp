@@ -1,28 +1,20 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Configuration.h"
 
+#include "protocols/ini.h"
+
+#include <unistd.h>
+
 #include <algorithm>
 #include <charconv>
 #include <cstdlib>
-#include <fstream>
 
 namespace visa {
 
 namespace {
 
-constexpr std::size_t LargestFile = 1U << 20U; // bytes
 constexpr ViUInt32 LongestOpenTimeoutMs = 600'000;
 constexpr ViUInt16 LargestPrimaryAddress = 30;
-
-std::string_view trimmed(std::string_view text)
-{
-    constexpr std::string_view Blank = " \t\r";
-    const std::size_t begin = text.find_first_not_of(Blank);
-    if (begin == std::string_view::npos) {
-        return {};
-    }
-    return text.substr(begin, text.find_last_not_of(Blank) - begin + 1);
-}
 
 std::string quoted(std::string_view text)
 {
@@ -37,8 +29,8 @@ std::optional<std::vector<ViUInt16>> parseAddresses(std::string_view text)
     std::vector<ViUInt16> addresses;
     for (const std::string &part : split(text, ",")) {
         const std::vector<std::string> ends = split(part, "-");
-        const auto first = parseNumber(trimmed(ends.front()), LargestPrimaryAddress);
-        const auto last = parseNumber(trimmed(ends.back()), LargestPrimaryAddress);
+        const auto first = parseNumber(protocols::trimmed(ends.front()), LargestPrimaryAddress);
+        const auto last = parseNumber(protocols::trimmed(ends.back()), LargestPrimaryAddress);
         if (ends.size() > 2 || !first || !last || *first > *last) {
             return std::nullopt;
         }
@@ -51,39 +43,25 @@ std::optional<std::vector<ViUInt16>> parseAddresses(std::string_view text)
     return addresses;
 }
 
-// Reads line by line; each function returns an error sentence, empty when all is well.
+// Takes entry by entry; each function returns an error sentence, empty when all is well.
 class Reader
 {
 public:
-    std::string readLine(std::string_view line)
+    std::string take(const protocols::IniEntry &entry)
     {
-        line = trimmed(line.substr(0, std::min(line.find(" ;"), line.find("\t;"))));
-        if (line.empty() || line.front() == ';' || line.front() == '#') {
-            return {};
+        if (entry.key.empty()) {
+            return beginSection(entry.section);
         }
-        if (line.front() == '[') {
-            if (line.back() != ']') {
-                return quoted(line) + " lacks its closing bracket.";
-            }
-            return beginSection(trimmed(line.substr(1, line.size() - 2)));
-        }
-        const std::size_t equals = line.find('=');
-        if (equals == std::string_view::npos) {
-            return quoted(line) + " is neither a [section] nor a key = value.";
-        }
-        const std::string key = upperCase(trimmed(line.substr(0, equals)));
-        const std::string_view value = trimmed(line.substr(equals + 1));
+        const std::string key = upperCase(entry.key);
         switch (m_section) {
         case Section::General:
-            return readGeneral(key, value);
+            return readGeneral(key, entry.value);
         case Section::Gateway:
-            return readGateway(key, value);
+            return readGateway(key, entry.value);
         case Section::Instrument:
-            return readInstrument(key, value);
-        case Section::None:
-            break;
+            return readInstrument(key, entry.value);
         }
-        return quoted(line) + " stands before the first section.";
+        return {};
     }
 
     // What can only be seen once the section is complete.
@@ -98,7 +76,7 @@ public:
     [[nodiscard]] Configuration takeResult() { return std::move(m_result); }
 
 private:
-    enum class Section { None, General, Gateway, Instrument };
+    enum class Section { General, Gateway, Instrument };
 
     std::string beginSection(std::string_view title)
     {
@@ -204,7 +182,7 @@ private:
     }
 
     Configuration m_result;
-    Section m_section = Section::None;
+    Section m_section = Section::General;
     std::string m_title;
     Gateway *m_gateway = nullptr; // into m_result, whose map does not move its entries
 };
@@ -223,11 +201,16 @@ ViUInt16 Configuration::fixedPort(const ResourceName &name) const
 
 std::optional<Configuration> parseConfiguration(std::string_view text, std::string &error)
 {
+    const auto entries = protocols::parseIni(text, error);
+    if (!entries) {
+        return std::nullopt;
+    }
     Reader reader;
-    std::size_t lineNumber = 0;
-    for (const std::string &line : split(text, "\n")) {
-        ++lineNumber;
-        error = reader.readLine(line);
+    unsigned line = 1;
+    error.clear();
+    for (const protocols::IniEntry &entry : *entries) {
+        line = entry.line;
+        error = reader.take(entry);
         if (!error.empty()) {
             break;
         }
@@ -236,7 +219,7 @@ std::optional<Configuration> parseConfiguration(std::string_view text, std::stri
         error = reader.endSection();
     }
     if (!error.empty()) {
-        error.insert(0, "line " + std::to_string(lineNumber) + ": ");
+        error = protocols::atLine(line, error);
         return std::nullopt;
     }
     return reader.takeResult();
@@ -255,23 +238,19 @@ std::optional<Configuration> loadConfiguration(std::string &error)
         path = std::string(home) + "/.config/corvane-visa.ini";
     }
 
-    std::ifstream file(path, std::ios::binary);
-    if (!file) {
+    if (::access(path.c_str(), R_OK) != 0) {
         if (!isNamed) {
             return Configuration();
         }
         error = "The configuration file '" + path + "' cannot be read.";
         return std::nullopt;
     }
-    std::string text;
-    text.resize(LargestFile + 1);
-    file.read(text.data(), static_cast<std::streamsize>(text.size()));
-    text.resize(static_cast<std::size_t>(file.gcount()));
-    if (file.bad() || text.size() > LargestFile) {
+    const std::optional<std::string> text = protocols::readTextFile(path);
+    if (!text) {
         error = "The configuration file '" + path + "' cannot be read or is above 1 MiB.";
         return std::nullopt;
     }
-    auto configuration = parseConfiguration(text, error);
+    auto configuration = parseConfiguration(*text, error);
     if (!configuration) {
         error.insert(0, "The configuration file '" + path + "' has a fault in ");
     }

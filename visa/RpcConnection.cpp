@@ -12,24 +12,11 @@ namespace {
 constexpr std::size_t LargestRecord = (1U << 20U) + 4096;
 constexpr std::size_t InputSize = std::size_t{64} * 1024;
 
-constexpr std::uint32_t MessageCall = 0;
-constexpr std::uint32_t RpcVersion = 2;
-constexpr std::uint32_t LastFragmentBit = 0x8000'0000U;
-constexpr std::size_t MarkSize = 4;
-
 // Different numbers in each connection, so that no stray reply fits by chance.
 std::uint32_t firstTransaction()
 {
     static std::atomic<std::uint32_t> next{0x1000};
     return next.fetch_add(0x01'0000);
-}
-
-void append(std::vector<std::uint8_t> &bytes, std::uint32_t word)
-{
-    for (unsigned shift = 32; shift > 0;) {
-        shift -= 8;
-        bytes.push_back(static_cast<std::uint8_t>(word >> shift));
-    }
 }
 
 } // namespace
@@ -53,26 +40,24 @@ ViStatus RpcConnection::connect(const std::vector<HostAddress> &addresses, std::
 std::size_t RpcConnection::beginCall(const RpcProcedure &procedure)
 {
     ++m_transaction;
-    m_call.clear();
-    append(m_call, 0); // the record mark, once the size is known
-    for (const std::uint32_t word : {m_transaction, MessageCall, RpcVersion, procedure.program,
-                                     procedure.version, procedure.number}) {
-        append(m_call, word);
+    m_head.clear();
+    m_head.number(0); // the record mark, once the size is known
+    for (const std::uint32_t word :
+         {m_transaction, std::uint32_t{CALL}, std::uint32_t{RPC_MSG_VERSION}, procedure.program,
+          procedure.version, procedure.number}) {
+        m_head.number(word);
     }
     // Credential and verifier: no authentication, no bytes.
     for (int i = 0; i < 4; ++i) {
-        append(m_call, 0);
+        m_head.number(0);
     }
+    m_call.assign(m_head.bytes().begin(), m_head.bytes().end());
     return m_call.size();
 }
 
 ViStatus RpcConnection::exchange(const Deadline &deadline)
 {
-    const auto mark = static_cast<std::uint32_t>(m_call.size() - MarkSize) | LastFragmentBit;
-    for (unsigned i = 0; i < MarkSize; ++i) {
-        m_call[i] = static_cast<std::uint8_t>(mark >> (24 - 8 * i));
-    }
-
+    protocols::markRecord(m_call);
     std::size_t sent = 0;
     if (const ViStatus status = m_socket.send(m_call, deadline, sent); status != VI_SUCCESS) {
         // The peer would take the next call for the rest of this one.
@@ -109,16 +94,16 @@ ViStatus RpcConnection::exchange(const Deadline &deadline)
 
 ViStatus RpcConnection::receiveRecord(const Deadline &deadline)
 {
-    if (m_reader.state() == RpcRecordReader::State::Complete) {
+    if (m_reader.state() == protocols::RpcRecordReader::State::Complete) {
         m_reader.next();
     }
     for (;;) {
         m_inputBegin +=
             m_reader.feed(std::span(m_input).subspan(m_inputBegin, m_inputEnd - m_inputBegin));
-        if (m_reader.state() == RpcRecordReader::State::Complete) {
+        if (m_reader.state() == protocols::RpcRecordReader::State::Complete) {
             return VI_SUCCESS;
         }
-        if (m_reader.state() == RpcRecordReader::State::TooLong) {
+        if (m_reader.state() == protocols::RpcRecordReader::State::Broken) {
             close();
             return VI_ERROR_IO;
         }

@@ -2,9 +2,11 @@
 #pragma once
 
 #include "Deadline.h"
-#include "RpcRecord.h"
+#include "RpcReply.h"
 #include "TcpSocket.h"
-#include "XdrValue.h"
+#include "protocols/RpcRecord.h"
+#include "protocols/XdrValue.h"
+#include "protocols/XdrWriter.h"
 
 #include <cstdint>
 #include <span>
@@ -40,14 +42,15 @@ public:
 
     /// `dataSize` is the number of bytes of variable size in the arguments.
     template <typename Arguments, typename Results>
-    [[nodiscard]] ViStatus call(const RpcProcedure &procedure, XdrCode<Arguments> *encode,
-                                Arguments arguments, std::size_t dataSize,
-                                XdrValue<Results> &results, const Deadline &deadline)
+    [[nodiscard]] ViStatus
+    call(const RpcProcedure &procedure, protocols::XdrCode<Arguments> *encode, Arguments arguments,
+         std::size_t dataSize, protocols::XdrValue<Results> &results, const Deadline &deadline)
     {
         const std::size_t headerSize = beginCall(procedure);
         const std::size_t room = LargestFixedArguments + dataSize;
         m_call.resize(headerSize + room);
-        const auto size = encodeXdr(encode, arguments, std::span(m_call).subspan(headerSize));
+        const auto size =
+            protocols::encodeXdr(encode, arguments, std::span(m_call).subspan(headerSize));
         if (!size) {
             return VI_ERROR_IO;
         }
@@ -65,13 +68,14 @@ public:
 private:
     static constexpr std::size_t LargestFixedArguments = 64;
 
-    std::size_t beginCall(const RpcProcedure &procedure);
+    [[nodiscard]] std::size_t beginCall(const RpcProcedure &procedure);
     [[nodiscard]] ViStatus exchange(const Deadline &deadline);
     [[nodiscard]] ViStatus receiveRecord(const Deadline &deadline);
 
     TcpSocket m_socket;
-    RpcRecordReader m_reader;
+    protocols::RpcRecordReader m_reader;
     std::uint32_t m_transaction;
+    protocols::XdrWriter m_head;
     std::vector<std::uint8_t> m_call;
     std::vector<std::uint8_t> m_input; // received bytes from m_inputBegin on are not yet fed
     std::size_t m_inputBegin = 0;

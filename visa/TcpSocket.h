@@ -2,8 +2,8 @@
 #pragma once
 
 #include "Deadline.h"
-#include "hostlookup.h"
 #include "Waker.h"
+#include "hostlookup.h"
 #include "visa.h"
 
 #include <cstddef>

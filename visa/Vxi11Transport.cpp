@@ -75,7 +75,7 @@ Vxi11Transport::~Vxi11Transport()
     // Waits for the answer, so that who opens the instrument again at once finds it free. An
     // interrupted session does not wait; the end of the connection frees the link then.
     const Deadline deadline = Deadline::after(m_isSilent ? AbortMs : DestroyLinkMs);
-    XdrValue<Device_Error> reply(xdr_Device_Error);
+    protocols::XdrValue<Device_Error> reply(xdr_Device_Error);
     (void)m_core.call<Device_Link, Device_Error>(coreProcedure(destroy_link), xdr_Device_Link,
                                                  m_link, 0, reply, deadline);
 }
@@ -116,7 +116,7 @@ ViStatus Vxi11Transport::createLink(const Deadline &deadline)
     Create_LinkParms arguments{};
     arguments.clientId = static_cast<int>(getpid());
     arguments.device = m_address.device.data();
-    XdrValue<Create_LinkResp> reply(xdr_Create_LinkResp);
+    protocols::XdrValue<Create_LinkResp> reply(xdr_Create_LinkResp);
     const ViStatus status = m_core.call<Create_LinkParms, Create_LinkResp>(
         coreProcedure(create_link), xdr_Create_LinkParms, arguments, m_address.device.size() + 4,
         reply, deadline);
@@ -137,9 +137,9 @@ ViStatus Vxi11Transport::createLink(const Deadline &deadline)
 }
 
 template <typename Arguments, typename Results>
-ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, XdrCode<Arguments> *encode,
+ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, protocols::XdrCode<Arguments> *encode,
                                     const Arguments &arguments, std::size_t dataSize,
-                                    XdrValue<Results> &results, const Deadline &deadline)
+                                    protocols::XdrValue<Results> &results, const Deadline &deadline)
 {
     const ViStatus status =
         m_core.call<Arguments, Results>(coreProcedure(procedure), encode, arguments, dataSize,
@@ -170,7 +170,7 @@ ViStatus Vxi11Transport::write(std::span<const std::uint8_t> data, bool end,
         // Encoding only reads, the structure is shared with decoding.
         auto *bytes = const_cast<std::uint8_t *>(part.data());
         arguments.data.data_val = reinterpret_cast<char *>(bytes);
-        XdrValue<Device_WriteResp> reply(xdr_Device_WriteResp);
+        protocols::XdrValue<Device_WriteResp> reply(xdr_Device_WriteResp);
         const ViStatus status = callDevice<Device_WriteParms, Device_WriteResp>(
             device_write, xdr_Device_WriteParms, arguments, part.size() + 4, reply, deadline);
         if (reply->size > part.size()) {
@@ -206,7 +206,7 @@ ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions 
             arguments.flags = DEVICE_FLAG_TERMCHRSET;
             arguments.termChar = static_cast<char>(*options.terminator);
         }
-        XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
+        protocols::XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
         const ViStatus status = callDevice<Device_ReadParms, ReadReply>(
             device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
         if (reply->size > target.size()) {
@@ -240,7 +240,7 @@ ViStatus Vxi11Transport::callGeneric(std::uint32_t procedure, const Deadline &de
     Device_GenericParms arguments{};
     arguments.lid = m_link;
     arguments.io_timeout = deadline.remainingMs();
-    XdrValue<Device_Error> reply(xdr_Device_Error);
+    protocols::XdrValue<Device_Error> reply(xdr_Device_Error);
     return callDevice<Device_GenericParms, Device_Error>(procedure, xdr_Device_GenericParms,
                                                          arguments, 0, reply, deadline);
 }
@@ -275,7 +275,7 @@ void Vxi11Transport::abortRunningCall()
         return;
     }
     const RpcProcedure abort{DEVICE_ASYNC, DEVICE_ASYNC_VERSION, device_abort};
-    XdrValue<Device_Error> reply(xdr_Device_Error);
+    protocols::XdrValue<Device_Error> reply(xdr_Device_Error);
     // The call that was aborted has failed already; that its end could not be told is no news.
     (void)connection.call<Device_Link, Device_Error>(abort, xdr_Device_Link, m_link, 0, reply,
                                                      deadline);

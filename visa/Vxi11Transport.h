@@ -48,9 +48,10 @@ private:
     [[nodiscard]] ViStatus createLink(const Deadline &deadline);
     [[nodiscard]] ViStatus callGeneric(std::uint32_t procedure, const Deadline &deadline);
     template <typename Arguments, typename Results>
-    [[nodiscard]] ViStatus callDevice(std::uint32_t procedure, XdrCode<Arguments> *encode,
-                                      const Arguments &arguments, std::size_t dataSize,
-                                      XdrValue<Results> &results, const Deadline &deadline);
+    [[nodiscard]] ViStatus
+    callDevice(std::uint32_t procedure, protocols::XdrCode<Arguments> *encode,
+               const Arguments &arguments, std::size_t dataSize,
+               protocols::XdrValue<Results> &results, const Deadline &deadline);
     void abortRunningCall();
 
     Vxi11Address m_address;

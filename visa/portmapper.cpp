@@ -22,7 +22,7 @@ ViStatus findRpcPort(const std::vector<HostAddress> &addresses, std::uint32_t pr
     wanted.pm_prog = program;
     wanted.pm_vers = version;
     wanted.pm_prot = IPPROTO_TCP;
-    XdrValue<unsigned> found(xdr_u_int);
+    protocols::XdrValue<unsigned> found(xdr_u_int);
     status = connection.call<pmap, unsigned>(getPort, xdr_pmap, wanted, 0, found, deadline);
     if (status == VI_ERROR_NSUP_OPER) {
         return VI_ERROR_RSRC_NFOUND;

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "simulator/Options.h"
+#include "simulator/configfile.h"
 
 #include <algorithm>
 #include <cstdlib>
 
+using namespace protocols;
 using namespace simulator;
 
 /// The text of a configuration file.
@@ -11,7 +12,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
 {
     const std::string_view text(reinterpret_cast<const char *>(data), size);
     std::string error;
-    const auto entries = parseConfig(text, error);
+    const auto entries = parseIni(text, error);
     if (entries.has_value() != error.empty())
         std::abort();
     if (!entries)
@@ -24,7 +25,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     if (!places)
         return 0;
     const auto groups = std::count_if(entries->begin(), entries->end(),
-                                      [](const ConfigEntry &entry) { return entry.key.empty(); });
+                                      [](const IniEntry &entry) { return entry.key.empty(); });
     if (places->size() != static_cast<std::size_t>(groups))
         std::abort();
     for (const InstrumentPlace &place : *places) {

@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "simulator/Rpc.h"
+#include "protocols/RpcRecord.h"
+#include "simulator/rpcserver.h"
 
 #include <algorithm>
 #include <array>
 #include <cstdlib>
 
+using namespace protocols;
 using namespace simulator;
 
 namespace {
@@ -17,22 +19,24 @@ RpcStatus answer(std::uint32_t procedure, XdrReader &arguments, XdrWriter &resul
 {
     results.number(procedure);
     const std::uint32_t requested = arguments.number();
-    results.number(arguments.boolean() ? 1 : 0);
+    results.number(arguments.number() != 0 ? 1 : 0);
     const std::string_view name = arguments.text();
-    const std::span<const char> data = arguments.opaque();
+    const std::span<const std::uint8_t> data = arguments.opaque();
     if (!arguments.isGood())
         return RpcStatus::GarbageArguments;
-    const std::span<char> room = results.openOpaque(std::min<std::size_t>(requested, LargestReply));
+    const std::span<std::uint8_t> room =
+        results.openOpaque(std::min<std::size_t>(requested, LargestReply));
     const std::size_t count = std::min({room.size(), data.size() + name.size()});
-    std::fill_n(room.begin(), count, 'x');
+    std::fill_n(room.begin(), count, std::uint8_t{'x'});
     std::copy_n(data.begin(), std::min(count, data.size()), room.begin());
     results.closeOpaque(count);
     return RpcStatus::Success;
 }
 
-std::uint32_t word(std::span<const char> bytes, std::size_t place)
+std::uint32_t word(std::span<const std::uint8_t> bytes, std::size_t place)
 {
-    return XdrReader(bytes.subspan(place)).number();
+    XdrReader reader(bytes.subspan(place));
+    return reader.number();
 }
 
 } // namespace
@@ -40,12 +44,12 @@ std::uint32_t word(std::span<const char> bytes, std::size_t place)
 /// One record from a peer; each is answered as a whole record with its number, or not at all.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
-    const std::span<const char> call(reinterpret_cast<const char *>(data), size);
+    const std::span call(data, size);
     const std::array<RpcProgram, 1> programs{{{CoreProgram, 1, answer}}};
     XdrWriter reply;
     if (!answerRpcCall(call, programs, reply))
         return 0;
-    const std::span<const char> bytes = reply.bytes();
+    const std::span<const std::uint8_t> bytes = reply.bytes();
     constexpr std::size_t SmallestReply = RecordMarkSize + 5 * 4;
     constexpr std::uint32_t LastFragment = 0x80000000U;
     if (bytes.size() < SmallestReply || bytes.size() % 4 != 0)

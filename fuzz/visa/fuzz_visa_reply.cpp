@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "protocols/RpcRecord.h"
+#include "protocols/XdrValue.h"
 #include "visa/MessageTracker.h"
 #include "visa/ReadReply.h"
-#include "visa/RpcRecord.h"
-#include "visa/XdrValue.h"
+#include "visa/RpcReply.h"
 
 #include <vxi11.h>
 
@@ -10,6 +11,7 @@
 #include <cstdlib>
 #include <vector>
 
+using namespace protocols;
 using namespace visa;
 
 namespace {
@@ -88,7 +90,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
 
     RpcRecordReader reader(LargestRecord);
     auto rest = stream;
-    while (!rest.empty() && reader.state() != RpcRecordReader::State::TooLong) {
+    while (!rest.empty() && reader.state() != RpcRecordReader::State::Broken) {
         const std::size_t taken = reader.feed(rest.first(std::min(rest.size(), pieceSize)));
         if (taken == 0 || reader.record().size() > LargestRecord)
             std::abort();

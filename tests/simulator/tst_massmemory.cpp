@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "simulator/ErrorQueue.h"
 #include "simulator/MassMemory.h"
-#include "simulator/wildcard.h"
+#include "support/files.h"
+#include "support/rows.h"
 
 #include <QDir>
 #include <QFile>
@@ -16,31 +17,25 @@ namespace {
 
 void writeFile(const QString &name, const QByteArray &content)
 {
-    QFile file(name);
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    QCOMPARE(file.write(content), content.size());
+    QVERIFY(store(name, content));
 }
 
 } // namespace
 
-class tst_MassMemory : public QObject
+class TestMassMemory : public QObject
 {
     Q_OBJECT
 
 private slots:
     void init();
     void cleanup();
-    void escapes_data();
     void escapes();
     void specialFiles();
     void driveNames();
     void catalogOrderAndTypes();
-    void filters_data();
     void filters();
     void movingKeepsTarget();
     void rootsAreProtected();
-    void wildcards_data();
-    void wildcards();
 
 private:
     std::unique_ptr<QTemporaryDir> m_folder;
@@ -54,7 +49,7 @@ private:
 };
 
 // The folder around the top holds a secret that no path may reach, and links in the top lead there.
-void tst_MassMemory::init()
+void TestMassMemory::init()
 {
     m_folder = std::make_unique<QTemporaryDir>();
     m_unix = std::make_unique<MassMemory>(true, std::vector<std::string>{"/var/user", "/hdd"});
@@ -74,7 +69,7 @@ void tst_MassMemory::init()
     }
 }
 
-void tst_MassMemory::cleanup()
+void TestMassMemory::cleanup()
 {
     QFile secret(m_folder->filePath("outside/secret"));
     QVERIFY(secret.open(QIODevice::ReadOnly));
@@ -85,50 +80,55 @@ void tst_MassMemory::cleanup()
              QStringList({"outside", "top"}));
 }
 
-void tst_MassMemory::escapes_data()
+// Each operation refuses; that nothing outside was touched is looked at afterwards.
+void TestMassMemory::escapes()
 {
-    QTest::addColumn<QString>("path");
-
-    for (const char *path :
-         {"..", "/..", "../secret", "/var/user/../../../secret", "/var/user/..\\..\\..\\secret",
-          "D:..\\secret", "D:\\..\\..\\secret", "D:/x/../../secret", "folder/secret",
-          "folder\\secret", "/var/user/folder/secret", "D:\\folder\\secret", "D:/FOLDER/secret",
-          "file", "dangling", "/var/user/./folder/./secret", "//..//secret"})
-        QTest::newRow(path) << path;
-    QTest::newRow("absolute") << QDir::tempPath() + "/passwd";
-    QTest::newRow("control character") << "a\x01\nb";
-    QTest::newRow("long") << QString(300, 'x');
-}
-
-// Each operation refuses; that nothing outside was touched is looked at after each row.
-void tst_MassMemory::escapes()
-{
-    QFETCH(QString, path);
-    const std::string name = path.toStdString();
-    for (MassMemory *memory : {m_unix.get(), m_drives.get()}) {
-        UniqueFd fd;
-        std::uint64_t size = 0;
-        QVERIFY(memory->openForReading(name, fd, size) != NoError);
-        std::unique_ptr<FileWriter> writer;
-        QVERIFY(memory->openForWriting(name, writer) != NoError);
-        QVERIFY(memory->makeDirectory(name) != NoError);
-        QVERIFY(memory->changeDirectory(name) != NoError);
-        QVERIFY(memory->removeDirectory(name) != NoError);
-        writeFile(top("D:/own"), "x");
-        writeFile(top("var/user/own"), "x");
-        QVERIFY(memory->copy(name, "copy") != NoError);
-        QVERIFY(memory->copy("own", name) != NoError);
-        QVERIFY(memory->move("own", name) != NoError);
-        MassMemory::Catalog catalog;
-        const int error = memory->catalog(name, catalog);
-        QVERIFY(error != NoError || catalog.entries.empty());
-        // A link itself may go, what it shows must not.
-        (void)memory->remove(name);
+    std::vector<QByteArray> paths{"..",
+                                  "/..",
+                                  "../secret",
+                                  "/var/user/../../../secret",
+                                  "/var/user/..\\..\\..\\secret",
+                                  "D:..\\secret",
+                                  "D:\\..\\..\\secret",
+                                  "D:/x/../../secret",
+                                  "folder/secret",
+                                  "folder\\secret",
+                                  "/var/user/folder/secret",
+                                  "D:\\folder\\secret",
+                                  "D:/FOLDER/secret",
+                                  "file",
+                                  "dangling",
+                                  "/var/user/./folder/./secret",
+                                  "//..//secret",
+                                  "/etc/passwd",
+                                  "a\x01\nb",
+                                  QByteArray(300, 'x')};
+    for (const QByteArray &path : paths) {
+        const std::string name = path.toStdString();
+        for (MassMemory *memory : {m_unix.get(), m_drives.get()}) {
+            UniqueFd fd;
+            std::uint64_t size = 0;
+            std::unique_ptr<FileWriter> writer;
+            writeFile(top("D:/own"), "x");
+            writeFile(top("var/user/own"), "x");
+            for (const int error :
+                 {memory->openForReading(name, fd, size), memory->openForWriting(name, writer),
+                  memory->makeDirectory(name), memory->changeDirectory(name),
+                  memory->removeDirectory(name), memory->copy(name, "copy"),
+                  memory->copy("own", name), memory->move("own", name)}) {
+                QVERIFY2(error != NoError, path.constData());
+            }
+            MassMemory::Catalog catalog;
+            const int error = memory->catalog(name, catalog);
+            QVERIFY2(error != NoError || catalog.entries.empty(), path.constData());
+            // A link itself may go, what it shows must not.
+            (void)memory->remove(name);
+        }
     }
 }
 
 // A named pipe would hang whoever opens it; it and links are not even listed.
-void tst_MassMemory::specialFiles()
+void TestMassMemory::specialFiles()
 {
     QCOMPARE(::mkfifo(top("D:/pipe").toLocal8Bit().constData(), 0600), 0);
     UniqueFd fd;
@@ -141,7 +141,7 @@ void tst_MassMemory::specialFiles()
     QVERIFY(catalog.entries.empty());
 }
 
-void tst_MassMemory::driveNames()
+void TestMassMemory::driveNames()
 {
     QVERIFY(QDir(top("D:")).mkdir("Waves"));
     writeFile(top("D:/Waves/Tone.wv"), "12345");
@@ -162,7 +162,7 @@ void tst_MassMemory::driveNames()
     QCOMPARE(MassMemory(false, {}).catalog("D:", catalog), HardwareMissing);
 }
 
-void tst_MassMemory::catalogOrderAndTypes()
+void TestMassMemory::catalogOrderAndTypes()
 {
     for (const char *name : {"b.wv", "a.TXT", "c.set", "noSuffix"})
         writeFile(top(QString("var/user/") + name), "123");
@@ -181,36 +181,33 @@ void tst_MassMemory::catalogOrderAndTypes()
     QVERIFY(!catalog.filtered);
 }
 
-void tst_MassMemory::filters_data()
+void TestMassMemory::filters()
 {
-    QTest::addColumn<QString>("path");
-    QTest::addColumn<int>("error");
-    QTest::addColumn<int>("count");
-
-    QTest::newRow("pattern") << "/var/user/*.wv" << 0 << 1;
-    QTest::newRow("pattern in capitals") << "/var/user/*.WV" << 0 << 0;
-    QTest::newRow("all") << "/var/user/*.*" << 0 << 2;
-    QTest::newRow("one file") << "/var/user/a.wv" << 0 << 1;
-    QTest::newRow("no fit") << "/var/user/*.mat" << 0 << 0;
-    QTest::newRow("missing") << "/var/user/b.wv" << int{FileNameNotFound} << 0;
-    QTest::newRow("missing folder") << "/var/user/x/*.wv" << int{FileNameNotFound} << 0;
-    QTest::newRow("file as folder") << "/var/user/a.wv/*.wv" << int{FileNameError} << 0;
+    const QString many = QString(40, 'a') + 'b';
+    for (const QString &name : {QString("a.wv"), QString("[b]x.wv"), QString("none"), many}) {
+        writeFile(top("var/user/" + name), "1");
+        writeFile(top("D:/" + name), "1");
+    }
+    forRows({{"pattern", true, "/var/user/*.wv", 0, 2},
+             {"pattern in capitals", true, "/var/user/*.WV", 0, 0},
+             {"drives take either case", false, "D:\\*.WV", 0, 2},
+             {"all", true, "/var/user/*.*", 0, 4},
+             {"any letter", true, "/var/user/n?n?", 0, 1},
+             {"too short", true, "/var/user/none?", 0, 0},
+             {"brackets are letters", true, "/var/user/[b]*", 0, 1},
+             {"a hard one", true, "/var/user/*a*a*a*a*a*a*a*a*a*a*a*a*a*a*c", 0, 0},
+             {"one file", true, "/var/user/a.wv", 0, 1},
+             {"missing", true, "/var/user/b.wv", int{FileNameNotFound}, 0},
+             {"missing folder", true, "/var/user/x/*.wv", int{FileNameNotFound}, 0},
+             {"file as folder", true, "/var/user/a.wv/*.wv", int{FileNameError}, 0}},
+            [this](bool isUnix, std::string path, int error, std::size_t count) {
+                MassMemory::Catalog catalog;
+                QCOMPARE((isUnix ? m_unix : m_drives)->catalog(path, catalog), error);
+                QCOMPARE(catalog.entries.size(), count);
+            });
 }
 
-void tst_MassMemory::filters()
-{
-    QFETCH(QString, path);
-    QFETCH(int, error);
-    QFETCH(int, count);
-
-    writeFile(top("var/user/a.wv"), "1");
-    writeFile(top("var/user/noSuffix"), "1");
-    MassMemory::Catalog catalog;
-    QCOMPARE(m_unix->catalog(path.toStdString(), catalog), error);
-    QCOMPARE(static_cast<int>(catalog.entries.size()), count);
-}
-
-void tst_MassMemory::movingKeepsTarget()
+void TestMassMemory::movingKeepsTarget()
 {
     writeFile(top("D:/a"), "aaa");
     writeFile(top("D:/b"), "b");
@@ -225,7 +222,7 @@ void tst_MassMemory::movingKeepsTarget()
     QCOMPARE(QFile(top("E:/d")).size(), 3);
 }
 
-void tst_MassMemory::rootsAreProtected()
+void TestMassMemory::rootsAreProtected()
 {
     for (const char *path : {"/", "/var", "/var/user/", "/hdd"}) {
         QVERIFY2(m_unix->removeDirectory(path) == MediaProtected, path);
@@ -241,37 +238,5 @@ void tst_MassMemory::rootsAreProtected()
     QCOMPARE(m_unix->removeDirectory("/var/user/a"), NoError);
 }
 
-void tst_MassMemory::wildcards_data()
-{
-    QTest::addColumn<QString>("name");
-    QTest::addColumn<QString>("pattern");
-    QTest::addColumn<bool>("caseSensitive");
-    QTest::addColumn<bool>("fits");
-
-    const auto row = [](const char *name, const char *pattern, bool sensitive, bool fits) {
-        QTest::addRow("%s ~ %s", name, pattern) << name << pattern << sensitive << fits;
-    };
-    row("a.wv", "*.wv", true, true);
-    row("a.WV", "*.wv", true, false);
-    row("a.WV", "*.wv", false, true);
-    row("a", "*.*", true, true);
-    row("aXbXc", "a*b*c", true, true);
-    row("aXbX", "a*b*c", true, false);
-    row("ab", "a?", true, true);
-    row("a", "a?", true, false);
-    row("a", "a**", true, true);
-    row("", "*", true, true);
-    row("aaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaaab", "*a*a*a*a*a*a*a*a*c", true, false);
-}
-
-void tst_MassMemory::wildcards()
-{
-    QFETCH(QString, name);
-    QFETCH(QString, pattern);
-    QFETCH(bool, caseSensitive);
-    QFETCH(bool, fits);
-    QCOMPARE(matchesWildcard(name.toStdString(), pattern.toStdString(), caseSensitive), fits);
-}
-
-QTEST_APPLESS_MAIN(tst_MassMemory)
+QTEST_APPLESS_MAIN(TestMassMemory)
 #include "tst_massmemory.moc"

@@ -1,12 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "protocols/RpcRecord.h"
 #include "visa/MessageTracker.h"
-#include "visa/RpcRecord.h"
+#include "visa/RpcReply.h"
 
 #include <QTest>
 
 #include <algorithm>
 #include <vector>
 
+using namespace protocols;
 using namespace visa;
 using Bytes = std::vector<std::uint8_t>;
 
@@ -63,7 +65,7 @@ void TestVisaRecords::recordsInPieces()
                                   qsizetype(record.size()));
             reader.next();
         }
-        QVERIFY(reader.state() != RpcRecordReader::State::TooLong);
+        QVERIFY(reader.state() != RpcRecordReader::State::Broken);
     }
     QCOMPARE(records, (QByteArrayList{"abc", "defgh", ""}));
 }
@@ -82,7 +84,7 @@ void TestVisaRecords::announcedLengths()
     QFETCH(QByteArray, stream);
     RpcRecordReader reader(100);
     QCOMPARE(reader.feed(bytesOf(stream)), std::size_t(stream.size()));
-    QVERIFY2(reader.state() == RpcRecordReader::State::TooLong, "a length was believed");
+    QVERIFY2(reader.state() == RpcRecordReader::State::Broken, "a length was believed");
     QCOMPARE(reader.feed(bytesOf(stream)), std::size_t{0});
 }
 

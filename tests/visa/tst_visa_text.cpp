@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
-#include "visa/formattext.h"
 #include "visa/ResourceName.h"
+#include "visa/formattext.h"
 #include "visa/statustext.h"
 
 #include <QElapsedTimer>

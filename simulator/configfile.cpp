@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "Options.h"
+#include "configfile.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -10,25 +10,14 @@
 namespace simulator {
 namespace {
 
+using protocols::atLine;
+using protocols::IniEntry;
+using protocols::trimmed;
+
 constexpr std::size_t FirstSerial = 100001;
 
-std::string_view trimmed(std::string_view text)
-{
-    constexpr std::string_view White = " \t\r";
-    const std::size_t begin = text.find_first_not_of(White);
-    if (begin == std::string_view::npos) {
-        return {};
-    }
-    return text.substr(begin, text.find_last_not_of(White) - begin + 1);
-}
-
-std::string atLine(unsigned line, const std::string &text)
-{
-    return "line " + std::to_string(line) + ": " + text;
-}
-
 // Several faults stand in one value with commas between; quotes keep a comma within one of them.
-void addFaults(const ConfigEntry &entry, std::vector<std::string> &faults)
+void addFaults(const IniEntry &entry, std::vector<std::string> &faults)
 {
     if (entry.isQuoted) {
         faults.push_back(entry.value);
@@ -45,7 +34,7 @@ void addFaults(const ConfigEntry &entry, std::vector<std::string> &faults)
     }
 }
 
-bool setValue(RawInstrument &raw, const ConfigEntry &entry, std::string &error)
+bool setValue(RawInstrument &raw, const IniEntry &entry, std::string &error)
 {
     const std::map<std::string_view, std::optional<std::string> *> keys{
         {"model", &raw.model},     {"serial", &raw.serial}, {"firmware", &raw.firmware},
@@ -91,55 +80,14 @@ bool arePlacesDistinct(std::span<const InstrumentPlace> places, std::string &err
 
 } // namespace
 
-std::optional<std::vector<ConfigEntry>> parseConfig(std::string_view text, std::string &error)
-{
-    std::vector<ConfigEntry> entries;
-    std::string group;
-    unsigned number = 0;
-    while (!text.empty()) {
-        const std::size_t length = std::min(text.find('\n'), text.size());
-        const std::string_view line = trimmed(text.substr(0, length));
-        text.remove_prefix(std::min(length + 1, text.size()));
-        ++number;
-        if (line.empty() || line.front() == ';' || line.front() == '#') {
-            continue;
-        }
-        if (line.front() == '[') {
-            if (line.back() != ']') {
-                error = atLine(number, "']' is missing behind the name of the group");
-                return std::nullopt;
-            }
-            group = trimmed(line.substr(1, line.size() - 2));
-            entries.push_back({group, {}, {}, number, false});
-            continue;
-        }
-        const std::size_t equals = line.find('=');
-        if (equals == std::string_view::npos || trimmed(line.substr(0, equals)).empty()) {
-            error = atLine(number, "neither '[group]' nor 'key = value'");
-            return std::nullopt;
-        }
-        if (entries.empty()) {
-            error = atLine(number, "a group has to stand before the first key");
-            return std::nullopt;
-        }
-        std::string_view value = trimmed(line.substr(equals + 1));
-        const bool quoted = value.size() >= 2 && value.front() == '"' && value.back() == '"';
-        if (quoted) {
-            value = value.substr(1, value.size() - 2);
-        }
-        entries.push_back({group, std::string(trimmed(line.substr(0, equals))), std::string(value),
-                           number, quoted});
-    }
-    return entries;
-}
-
 std::optional<std::vector<InstrumentPlace>>
-instrumentsOf(std::span<const ConfigEntry> entries, const std::string &folder, std::string &error)
+instrumentsOf(std::span<const protocols::IniEntry> entries, const std::string &folder,
+              std::string &error)
 {
     std::vector<RawInstrument> raws;
-    for (const ConfigEntry &entry : entries) {
+    for (const IniEntry &entry : entries) {
         if (entry.key.empty()) {
-            raws.push_back({.label = "[" + entry.group + "] "});
+            raws.push_back({.label = "[" + entry.section + "] "});
         } else if (!setValue(raws.back(), entry, error)) {
             return std::nullopt;
         }

@@ -9,7 +9,7 @@
 #include <optional>
 #include <span>
 
-namespace visa {
+namespace protocols {
 
 /// A function of rpcgen that codes, decodes and frees a value of type T.
 template <typename T>
@@ -85,4 +85,4 @@ private:
     T m_value;
 };
 
-} // namespace visa
+} // namespace protocols

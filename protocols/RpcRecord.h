@@ -4,11 +4,16 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <optional>
 #include <span>
 #include <vector>
 
-namespace visa {
+namespace protocols {
+
+/// Bytes of the mark in front of a record that goes in one fragment.
+inline constexpr std::size_t RecordMarkSize = 4;
+
+/// Writes the mark of a whole record into its first four bytes.
+void markRecord(std::span<std::uint8_t> record);
 
 /// Puts the records of an RPC stream together from bytes as they come (record marking standard,
 /// RFC 5531 section 11). Memory grows with what arrived, never with what a header announces. A
@@ -19,11 +24,15 @@ public:
     enum class State {
         Incomplete, ///< more bytes are needed
         Complete,   ///< record() holds one; feed no more before next()
-        TooLong     ///< the peer announced more than the limit; the stream is of no use any more
+        Broken      ///< an announced length is not allowed; the stream is of no use any more
     };
 
+    /// What a fragment without bytes means that is not the last of its record.
+    enum class EmptyFragment { Allowed, Refused };
+
     /// `limit` is the size in bytes of the longest record that is taken.
-    explicit RpcRecordReader(std::size_t limit);
+    explicit RpcRecordReader(std::size_t limit,
+                             EmptyFragment emptyFragment = EmptyFragment::Allowed);
 
     /// Takes bytes up to the end of a record and returns how many it took. They have to stay where
     /// they are until next().
@@ -38,6 +47,13 @@ public:
     /// Drops the complete record and makes ready for the next.
     void next();
 
+    /// A record or the head of one has begun and is not complete.
+    [[nodiscard]] bool isInside() const
+    {
+        return m_state == State::Incomplete &&
+               (m_headerSize > 0 || m_fragmentLeft > 0 || !m_record.empty());
+    }
+
     /// Drops everything, for a new stream.
     void reset();
 
@@ -45,6 +61,7 @@ private:
     void beginFragment();
 
     std::size_t m_limit;
+    EmptyFragment m_emptyFragment;
     State m_state = State::Incomplete;
     std::array<std::uint8_t, 4> m_header{};
     std::size_t m_headerSize = 0;
@@ -54,22 +71,4 @@ private:
     std::span<const std::uint8_t> m_whole; // the record, where it came in one piece
 };
 
-enum class RpcReplyKind {
-    Accepted,    ///< results follow
-    OtherCall,   ///< the answer to a call that was given up
-    Unavailable, ///< the server knows no such program, version or procedure
-    Refused,     ///< denied, or the server could not decode the arguments or failed
-    Malformed    ///< no RPC reply at all
-};
-
-struct RpcReply
-{
-    RpcReplyKind kind = RpcReplyKind::Malformed;
-    std::span<const std::uint8_t> results; ///< XDR coded, part of the record
-};
-
-/// Reads the header of a reply to the call with this transaction number (RFC 5531 section 9).
-[[nodiscard]] RpcReply parseRpcReply(std::span<const std::uint8_t> record,
-                                     std::uint32_t transaction);
-
-} // namespace visa
+} // namespace protocols
