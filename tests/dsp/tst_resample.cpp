@@ -207,36 +207,26 @@ void TestResample::evenLengthLeadsByOneSample()
 
 void TestResample::markers()
 {
-    const QByteArray six("\x01\x02\x03\x04\x05\x06", 6);
-    forRows({{"twice", six, 12, QByteArray("\x01\x01\x02\x02\x03\x03\x04\x04\x05\x05\x06\x06", 12)},
-             {"half", six, 3, QByteArray("\x01\x03\x05", 3)},
-             {"same", six, 6, six},
-             // Positions 0, 1.2, 2.4, 3.6, 4.8.
-             {"5 of 6", six, 5, QByteArray("\x01\x02\x03\x04\x05", 5)}},
-            [&](const QByteArray &input, int outputCount, const QByteArray &expected) {
-                Run run;
-                QVERIFY(run.prepare(randomSamples(static_cast<int>(input.size())), outputCount));
-                QVERIFY(run.markersIn.open());
-                QVERIFY(run.markersOut.open());
-                QVERIFY(
-                    run.markersIn->writeBytes(static_cast<int>(input.size()), input.constData()));
-                run.resample.setMarkers(run.markersIn.stream(), run.markersOut.stream());
-                QVERIFY(run.resample.run());
-                QVERIFY(run.markersOut->restartAtBegining());
-                QByteArray result(20, '\xff');
-                QCOMPARE(run.markersOut->readBlock(20, result.data()),
-                         static_cast<int>(expected.size()));
-                QCOMPARE(result.first(expected.size()), expected);
-
-                // A marker stream that ends early is an error, not a guess.
-                QVERIFY(run.markersIn->restartAtBegining());
-                Run shortened;
-                QVERIFY(shortened.prepare(randomSamples(8), 8));
-                shortened.resample.setMarkers(run.markersIn.stream(), run.markersOut.stream());
-                (void)takeMessages();
-                QVERIFY(!shortened.resample.run());
-                QCOMPARE(takeMessages(), QStringList{"*** Cannot read marker data."});
-            });
+    // The last one takes the positions 0, 1.2, 2.4, 3.6, 4.8.
+    for (const QByteArray &expected :
+         {QByteArray("112233445566"), QByteArray("135"), QByteArray("12345")}) {
+        Run run;
+        QVERIFY(run.prepare(randomSamples(6), static_cast<int>(expected.size())));
+        QVERIFY(run.markersIn.open() && run.markersOut.open());
+        QVERIFY(run.markersIn->writeBytes(6, "123456"));
+        run.resample.setMarkers(run.markersIn.stream(), run.markersOut.stream());
+        QVERIFY(run.resample.run());
+        QVERIFY(run.markersOut->restartAtBegining());
+        QByteArray result(20, ' ');
+        QCOMPARE(run.markersOut->readBlock(20, result.data()), static_cast<int>(expected.size()));
+        QCOMPARE(result.trimmed(), expected);
+        // A marker stream that ends early is an error, not a guess.
+        Run shortened;
+        QVERIFY(shortened.prepare(randomSamples(8), 8));
+        shortened.resample.setMarkers(run.markersIn.stream(), run.markersOut.stream());
+        QVERIFY(!shortened.resample.run());
+        QCOMPARE(takeMessages(), QStringList{"*** Cannot read marker data."});
+    }
 }
 
 void TestResample::failures()

@@ -36,20 +36,6 @@ double fmIndex(double frequency, double deviation, double clock)
     return pi * deviation / clock / std::sin(pi * frequency / clock);
 }
 
-/// Phase from sample to sample, without jumps, starting with that of the first one.
-std::vector<double> unwrapped(const Samples &samples)
-{
-    std::vector<double> phases;
-    double phase = 0;
-    Complex last = 1;
-    for (const std::complex<float> &sample : samples) {
-        phase += std::arg(Complex(sample) * std::conj(last));
-        last = Complex(sample);
-        phases.push_back(phase);
-    }
-    return phases;
-}
-
 /// Power of a noise in bands of one octave from bin 32 on, per bin, in dB.
 std::vector<double> octaveLevels(const Samples &samples, int octaves)
 {
@@ -78,7 +64,6 @@ class TestSignalShapes : public QObject
 private slots:
     void fmLinesAreBessel();
     void sidebands();
-    void chirpPhase();
     void noiseBand();
     void noiseSlope();
     void codedPulse();
@@ -135,28 +120,6 @@ void TestSignalShapes::sidebands()
             QVERIFY(std::abs(std::abs(lineOf(samples, 0)) - carrier) < 1e-6);
             QVERIFY(std::abs(std::abs(lineOf(samples, 1)) - upper) < 1e-6);
         });
-}
-
-void TestSignalShapes::chirpPhase()
-{
-    const PulseSettings pulse{1e-5, 1e-4, 1e-5, 1e-4, RampKind::RaisedCosine, 1e-7};
-    const double range = 1e6;
-    const Samples samples =
-        make(SignalType::Pulse, &CreateSignal::configureChirp, ChirpSettings{pulse, range});
-    QCOMPARE(samples.size(), size_t{2200});
-    const int width = 1200;
-    Samples inside(samples.begin() + 1, samples.begin() + width - 1);
-    const std::vector<double> phases = unwrapped(inside);
-    for (size_t i = 0; i < phases.size(); ++i) {
-        const auto n = static_cast<double>(i + 1);
-        const double cycles = (n * (n + 1) / 2 / width - (n + 1) / 2) * range / m_clock;
-        QVERIFY(std::abs(phases[i] - 2 * pi * cycles) < 1e-4);
-    }
-    QVERIFY(std::abs(std::abs(samples[50]) - 0.5) < 1e-6); // half way up the cosine ramp
-    QVERIFY(std::abs(std::abs(samples[600]) - 1.0) < 1e-6);
-    for (size_t i = width; i < samples.size(); ++i) {
-        QCOMPARE(samples[i], std::complex<float>(0));
-    }
 }
 
 void TestSignalShapes::noiseBand()

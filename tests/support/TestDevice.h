@@ -2,6 +2,7 @@
 #pragma once
 
 #include <QByteArray>
+#include <QDeadlineTimer>
 #include <QIODevice>
 
 #include <algorithm>
@@ -16,6 +17,7 @@ public:
     qint64 bytesWritten = 0;
     qint64 capacity = -1;       ///< writes end here, as on a full disk; -1: no limit
     qint64 unreadableFrom = -1; ///< reads that begin here or later fail; -1: none
+    int slowMs = 0;             ///< time that each transfer takes at least
     bool canOpen = true;
     bool canSeek = true;
 
@@ -26,6 +28,7 @@ public:
 protected:
     qint64 readData(char *data, qint64 length) override
     {
+        letTimePass();
         if (unreadableFrom >= 0 && pos() >= unreadableFrom) {
             return -1;
         }
@@ -39,6 +42,7 @@ protected:
 
     qint64 writeData(const char *data, qint64 length) override
     {
+        letTimePass();
         const qint64 count =
             capacity < 0 ? length : std::clamp<qint64>(capacity - pos(), 0, length);
         if (bytes.size() < pos() + count) {
@@ -47,5 +51,13 @@ protected:
         std::memcpy(bytes.data() + pos(), data, static_cast<size_t>(count));
         bytesWritten += count;
         return count;
+    }
+
+private:
+    void letTimePass() const
+    {
+        const QDeadlineTimer end(slowMs);
+        while (slowMs > 0 && !end.hasExpired()) {
+        }
     }
 };
