@@ -12,13 +12,50 @@
 namespace {
 
 /// The colours of the striped table. All colours of the report pass here.
-InfoColors stripeColors(const QPalette &palette)
+QString stripeStyle(const QPalette &palette)
 {
-    const auto name = [&](QPalette::ColorRole role) { return palette.color(role).name(); };
+    const QString text = palette.color(QPalette::Text).name();
     // The toolkit's alternate base is too faint for a table without lines.
     const QColor base = palette.color(QPalette::Base);
     const QColor stripe = base.lightness() > 127 ? base.darker(108) : base.lighter(130);
-    return {name(QPalette::Text), base.name(), name(QPalette::Text), stripe.name()};
+    const QString rule = "tr.d%1 td {; color: " + text + ";  background-color: %2}";
+    return "<style type=\"text/css\">" + rule.arg(QString::number(0), base.name()) +
+           rule.arg(QString::number(1), stripe.name()) + "</style>";
+}
+
+QString tableRow(const InfoRow &row, bool odd)
+{
+    QString label = row.label;
+    if (row.kind == InfoRow::Kind::Segment) {
+        label = "<b>" + label + "</b>";
+    } else if (row.kind == InfoRow::Kind::Detail) {
+        label.prepend("&nbsp;&nbsp; ");
+    }
+    return QString("<tr class=\"d%1\"><td width=\"30%\">%2</td><td width=\"70%\">%3</td></tr>")
+        .arg(QString::number(odd ? 1 : 0), label, row.value.toHtmlEscaped());
+}
+
+QString table(const QList<InfoRow> &rows)
+{
+    QString html = "<p><table border=\"0\" width=\"100%\">";
+    bool odd = false;
+    for (const InfoRow &row : rows) {
+        html += tableRow(row, odd);
+        odd = !odd;
+    }
+    return html + "</table> </p> ";
+}
+
+/// The report, with `folder` above the file name. Texts from the file are escaped.
+QString reportHtml(const WvFileSummary &summary, const QString &folder, const QPalette &palette)
+{
+    QString html = stripeStyle(palette) + "<h2>" + folder.toHtmlEscaped() + "</h2>";
+    html += "<h2>&nbsp;&nbsp;" + summary.fileName.toHtmlEscaped() + "</h2>";
+    html += table(fileRows(summary));
+    if (summary.segmentCount > 0) {
+        html += "<h3> Multi Segment Waveform </h3>" + table(segmentRows(summary));
+    }
+    return html;
 }
 
 } // namespace
@@ -44,7 +81,7 @@ bool DlgInfo::startModule(const QString &path)
         return false;
     }
     m_ui->te_Info->setHtml(
-        infoHtml(summary, QFileInfo(path).absolutePath(), stripeColors(m_ui->te_Info->palette())));
+        reportHtml(summary, QFileInfo(path).absolutePath(), m_ui->te_Info->palette()));
     return true;
 }
 

@@ -20,10 +20,10 @@ struct CreateArguments
     int scaling = 0;
     bool zeroCrest = false;
     std::optional<qint64> seed;
-    std::map<const CreateField *, std::optional<double>> numbers;
+    std::map<const SignalField *, std::optional<double>> numbers;
     OutputArguments output;
 
-    [[nodiscard]] double value(const CreateField &field) const
+    [[nodiscard]] double value(const SignalField &field) const
     {
         const auto found = numbers.find(&field);
         return found == numbers.end() ? field.start : found->second.value_or(field.start);
@@ -37,15 +37,15 @@ int runCreate(CreateArguments &arguments)
     }
     arguments.choices.ramp = static_cast<RampKind>(arguments.ramp);
     arguments.choices.customOversampling =
-        arguments.numbers[&createfields::oversampling].has_value();
+        arguments.numbers[&signalfields::oversampling].has_value();
     CreateRequest request;
     request.output = arguments.output.options;
     request.signal =
         makeSettings(arguments.kind, arguments.choices,
-                     [&arguments](const CreateField &field) { return arguments.value(field); });
-    request.minClockHz = arguments.value(createfields::minClock);
-    request.maxClockHz = arguments.value(createfields::maxClock);
-    request.clockHz = arguments.numbers[&createfields::clockRate];
+                     [&arguments](const SignalField &field) { return arguments.value(field); });
+    request.minClockHz = arguments.value(signalfields::minClock);
+    request.maxClockHz = arguments.value(signalfields::maxClock);
+    request.clockHz = arguments.numbers[&signalfields::clockRate];
     request.autoScaling = arguments.scaling == 0;
     request.zeroCrest = arguments.zeroCrest;
     if (arguments.seed) {
@@ -70,10 +70,10 @@ public:
         , m_command(addCommand<CreateArguments>(create, name, help, commands.action, m_arguments,
                                                 runCreate))
     {
-        number("--min-clock", createfields::minClock);
-        number("--max-clock", createfields::maxClock);
-        addNumber(m_command, "--clock", m_arguments->numbers[&createfields::clockRate],
-                  rangeOf(createfields::clockRate), "Clock written to the file (default: fitted)");
+        number("--min-clock", signalfields::minClock);
+        number("--max-clock", signalfields::maxClock);
+        addNumber(m_command, "--clock", m_arguments->numbers[&signalfields::clockRate],
+                  rangeOf(signalfields::clockRate), "Clock written to the file (default: fitted)");
         addChoice(m_command, "--scaling", m_arguments->scaling, {"auto", "none"},
                   "Level scaling (default: auto)");
         m_command.add_flag("--zero-crest", m_arguments->zeroCrest,
@@ -84,14 +84,14 @@ public:
         addOutputArguments(m_command, m_arguments->output);
     }
 
-    KindCommand &number(const std::string &name, const CreateField &field)
+    KindCommand &number(const std::string &name, const SignalField &field)
     {
         addNumber(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
         return *this;
     }
 
     /// A number of which only whole values make sense.
-    KindCommand &count(const std::string &name, const CreateField &field)
+    KindCommand &count(const std::string &name, const SignalField &field)
     {
         addInteger(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
         return *this;
@@ -118,12 +118,12 @@ public:
     }
 
 private:
-    [[nodiscard]] static NumberRange rangeOf(const CreateField &field)
+    [[nodiscard]] static NumberRange rangeOf(const SignalField &field)
     {
         return {field.unit, field.min, field.max};
     }
 
-    [[nodiscard]] static std::string helpOf(const CreateField &field)
+    [[nodiscard]] static std::string helpOf(const SignalField &field)
     {
         const QString start = engineeringText(field.start, field.unit);
         return std::string(field.text) + " (default: " + start.toStdString() + ")";
@@ -135,7 +135,7 @@ private:
 
 void addPeriodicKinds(CommandSet &commands, CLI::App &create)
 {
-    using namespace createfields;
+    using namespace signalfields;
     KindCommand(commands, create, "function", CreateKind::Function, "Periodic function")
         .subKind("--shape", {"sine", "square", "triangular", "sawtooth"}, "Shape (default: sine)")
         .number("--freq", frequency)
@@ -158,7 +158,7 @@ void addPeriodicKinds(CommandSet &commands, CLI::App &create)
 
 void addPulseKinds(CommandSet &commands, CLI::App &create)
 {
-    using namespace createfields;
+    using namespace signalfields;
     KindCommand(commands, create, "pulse", CreateKind::Pulse, "Single pulse")
         .number("--rise", pulseRise)
         .number("--on", pulseOn)
@@ -178,7 +178,7 @@ void addPulseKinds(CommandSet &commands, CLI::App &create)
 
 void addModulatedKinds(CommandSet &commands, CLI::App &create)
 {
-    using namespace createfields;
+    using namespace signalfields;
     KindCommand(commands, create, "fm", CreateKind::Fm, "Frequency modulation by one or two tones")
         .subKind("--tones", {"1", "2"}, "Number of tones (default: 1)")
         .number("--freq", fmFrequency)

@@ -6,11 +6,11 @@
 
 namespace {
 
-using FieldValue = std::function<double(const CreateField &)>;
+using FieldValue = std::function<double(const SignalField &)>;
 
 PulseSettings pulseSettings(const CreateChoices &choices, const FieldValue &value)
 {
-    using namespace createfields;
+    using namespace signalfields;
     return {.riseTime = value(pulseRise),
             .onTime = value(pulseOn),
             .fallTime = value(pulseFall),
@@ -21,7 +21,7 @@ PulseSettings pulseSettings(const CreateChoices &choices, const FieldValue &valu
 
 ChirpSettings chirpSettings(const CreateChoices &choices, const FieldValue &value)
 {
-    using namespace createfields;
+    using namespace signalfields;
     return {.pulse = {.riseTime = value(chirpRise),
                       .onTime = value(chirpOn),
                       .fallTime = value(chirpFall),
@@ -75,7 +75,7 @@ SignalType typeOf(CreateKind kind)
 
 SignalSettings makeSettings(CreateKind kind, const CreateChoices &choices, const FieldValue &value)
 {
-    using namespace createfields;
+    using namespace signalfields;
     switch (kind) {
     case CreateKind::Function:
         return FunctionSettings{.kind = static_cast<FunctionKind>(choices.subKind),

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "OutputOptions.h"
-#include "createfields.h"
+#include "signalfields.h"
 
 #include "dsp/signalsettings.h"
 
@@ -34,8 +34,8 @@ struct CreateRequest
 {
     OutputOptions output;
     SignalSettings signal;
-    double minClockHz = createfields::minClock.start;
-    double maxClockHz = createfields::maxClock.start;
+    double minClockHz = signalfields::minClock.start;
+    double maxClockHz = signalfields::maxClock.start;
     std::optional<double> clockHz; ///< written to the file; nothing: the fitted one
     bool autoScaling = true;       ///< the peak vector is brought to full scale
     bool zeroCrest = false;        ///< the file states a peak to RMS ratio of 0 dB
@@ -44,7 +44,7 @@ struct CreateRequest
 
 /// Collects the settings of a kind from the values of its fields.
 [[nodiscard]] SignalSettings makeSettings(CreateKind kind, const CreateChoices &choices,
-                                          const std::function<double(const CreateField &)> &value);
+                                          const std::function<double(const SignalField &)> &value);
 
 /// Prepares the generator for the request. False, with the reason logged, if the settings don't
 /// fit, or give more than a million samples.

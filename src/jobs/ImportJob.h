@@ -17,7 +17,7 @@ struct LevelSums;
 struct ImportTarget
 {
     static constexpr double MinClockHz = 1000;
-    static constexpr double MaxClockHz = 600e6;
+    static constexpr double MaxClockHz = ::MaxClockHz;
 
     OutputOptions output;
     double clockHz = 100e6;

@@ -25,22 +25,9 @@ QString quoted(const QString &text)
     return '\'' + text + '\'';
 }
 
-QString tableRow(const InfoRow &row, bool odd)
+InfoRow detail(const QString &label, const QString &value)
 {
-    const QString label = row.heading ? "<b>" + row.label + "</b>" : row.label;
-    return QString("<tr class=\"d%1\"><td width=\"30%\">%2</td><td width=\"70%\">%3</td></tr>")
-        .arg(QString::number(odd ? 1 : 0), label, row.value.toHtmlEscaped());
-}
-
-QString table(const QList<InfoRow> &rows)
-{
-    QString html = "<p><table border=\"0\" width=\"100%\">";
-    bool odd = false;
-    for (const InfoRow &row : rows) {
-        html += tableRow(row, odd);
-        odd = !odd;
-    }
-    return html + "</table> </p> ";
+    return {label, value, InfoRow::Kind::Detail};
 }
 
 } // namespace
@@ -77,32 +64,15 @@ QList<InfoRow> segmentRows(const WvFileSummary &summary)
     };
     for (qsizetype i = 0; i < summary.segments.size(); ++i) {
         const WvSegment &segment = summary.segments.at(i);
-        rows << InfoRow{QString("Segment %1").arg(i + 1), segment.fileName, true}
-             << InfoRow{"&nbsp;&nbsp; Clock", engineeringText(segment.clock, "Hz")}
-             << InfoRow{"&nbsp;&nbsp; Start Sample, Samples",
-                        QString("%1, %2").arg(segment.start).arg(segment.length)}
-             << InfoRow{"&nbsp;&nbsp; Play Time", engineeringText(segment.duration, "s")}
-             << InfoRow{"&nbsp;&nbsp; Peak Offset", decibels(segment.peakOffset)}
-             << InfoRow{"&nbsp;&nbsp; Peak/RMS", decibels(segment.rmsOffset - segment.peakOffset)};
+        rows << InfoRow{QString("Segment %1").arg(i + 1), segment.fileName, InfoRow::Kind::Segment}
+             << detail("Clock", engineeringText(segment.clock, "Hz"))
+             << detail("Start Sample, Samples",
+                       QString("%1, %2").arg(segment.start).arg(segment.length))
+             << detail("Play Time", engineeringText(segment.duration, "s"))
+             << detail("Peak Offset", decibels(segment.peakOffset))
+             << detail("Peak/RMS", decibels(segment.rmsOffset - segment.peakOffset));
     }
     return rows;
-}
-
-QString infoHtml(const WvFileSummary &summary, const QString &folder, const InfoColors &colors)
-{
-    QString html = "<style type=\"text/css\">";
-    html +=
-        "tr.d0 td {; color: " + colors.text0 + ";  background-color: " + colors.background0 + "}";
-    html +=
-        "tr.d1 td {; color: " + colors.text1 + ";  background-color: " + colors.background1 + "}";
-    html += "</style>";
-    html += "<h2>" + folder.toHtmlEscaped() + "</h2>";
-    html += "<h2>&nbsp;&nbsp;" + summary.fileName.toHtmlEscaped() + "</h2>";
-    html += table(fileRows(summary));
-    if (summary.segmentCount > 0) {
-        html += "<h3> Multi Segment Waveform </h3>" + table(segmentRows(summary));
-    }
-    return html;
 }
 
 QString infoText(const WvFileSummary &summary)
@@ -112,7 +82,9 @@ QString infoText(const WvFileSummary &summary)
     rows += segmentRows(summary);
     qsizetype width = 0;
     for (InfoRow &row : rows) {
-        row.label.replace("&nbsp;", " ");
+        if (row.kind == InfoRow::Kind::Detail) {
+            row.label.prepend("   ");
+        }
         width = std::max(width, row.label.size());
     }
     QString text;

@@ -10,18 +10,15 @@
 /// One row of the information report.
 struct InfoRow
 {
+    enum class Kind {
+        File,
+        Segment, ///< the name of a segment
+        Detail,  ///< belongs to the segment above
+    };
+
     QString label;
     QString value;
-    bool heading = false; ///< a segment's name
-};
-
-/// Colours of the striped table, as CSS values ("#102030").
-struct InfoColors
-{
-    QString text0;
-    QString background0;
-    QString text1;
-    QString background1;
+    Kind kind = Kind::File;
 };
 
 /// The rows on the file itself.
@@ -29,10 +26,6 @@ struct InfoColors
 
 /// The rows on the segments of a multi-segment waveform; empty for a plain one.
 [[nodiscard]] QList<InfoRow> segmentRows(const WvFileSummary &summary);
-
-/// The report as HTML, with `folder` above the file name. Texts from the file are escaped.
-[[nodiscard]] QString infoHtml(const WvFileSummary &summary, const QString &folder,
-                               const InfoColors &colors);
 
 /// The report as plain text, one row a line.
 [[nodiscard]] QString infoText(const WvFileSummary &summary);

@@ -7,7 +7,7 @@
 struct ResampleTarget
 {
     static constexpr double MinClockHz = 1000;
-    static constexpr double MaxClockHz = 600e6;
+    static constexpr double MaxClockHz = ::MaxClockHz;
     static constexpr qint64 MaxSamples = 268435456;
 
     bool clockDecides = true;

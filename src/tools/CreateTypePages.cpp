@@ -9,19 +9,18 @@
 
 CreateTypePages::CreateTypePages(Ui::DlgWvCreate &form)
 {
-    setUp(*form.le_maxclock, createfields::maxClock);
-    setUp(*form.le_minclock, createfields::minClock);
-    setUp(*form.le_clockrate, createfields::clockRate);
+    setUp(*form.le_maxclock, signalfields::maxClock, "clk.max");
+    setUp(*form.le_minclock, signalfields::minClock, "clk.min");
+    setUp(*form.le_clockrate, signalfields::clockRate, nullptr);
     fillFunctionPage(form);
     fillPulsePages(form);
     fillModulationPages(form);
     fillOtherPages(form);
 }
 
-void CreateTypePages::setUp(QtNumericEdit &edit, const CreateField &field)
+void CreateTypePages::setUp(QtNumericEdit &edit, const SignalField &field, const char *key)
 {
     const QString unit = field.unit;
-    edit.setObjectName(field.object);
     edit.setName(field.text);
     edit.setUnit(unit);
     edit.setScaled(unit == "Hz" || unit == "s");
@@ -29,7 +28,7 @@ void CreateTypePages::setUp(QtNumericEdit &edit, const CreateField &field)
     edit.setMax(field.max);
     edit.setMin(field.min);
     edit.setVal(field.start);
-    m_fields[&field] = &edit;
+    m_fields[&field] = {&edit, key};
 }
 
 QFormLayout *CreateTypePages::layoutOf(QWidget *page, const QString &title)
@@ -43,10 +42,12 @@ QFormLayout *CreateTypePages::layoutOf(QWidget *page, const QString &title)
     return layout;
 }
 
-void CreateTypePages::add(QFormLayout *layout, const QString &label, const CreateField &field)
+void CreateTypePages::add(QFormLayout *layout, const QString &label, const SignalField &field,
+                          const char *name, const char *key)
 {
     auto *edit = new QtNumericEdit;
-    setUp(*edit, field);
+    edit->setObjectName(name);
+    setUp(*edit, field, key);
     layout->addRow(label, edit);
 }
 
@@ -54,99 +55,100 @@ QComboBox *CreateTypePages::addRamp(QFormLayout *layout, const char *name)
 {
     auto *ramp = new QComboBox;
     ramp->setObjectName(name);
-    ramp->setToolTip(DlgWvCreate::tr("Shape of the edges"));
+    ramp->setToolTip("Shape of the edges");
     ramp->addItems({"Linear", "RCOS"});
-    layout->addRow(DlgWvCreate::tr("Ramp &Type"), ramp);
+    layout->addRow("Ramp &Type", ramp);
     return ramp;
 }
 
 void CreateTypePages::fillFunctionPage(const Ui::DlgWvCreate &form)
 {
-    using namespace createfields;
-    QFormLayout *layout = layoutOf(form.page_function, DlgWvCreate::tr("Function"));
-    add(layout, DlgWvCreate::tr("&Frequency"), frequency);
-    add(layout, DlgWvCreate::tr("&I Amplitude"), amplitudeI);
-    add(layout, DlgWvCreate::tr("&Q Amplitude"), amplitudeQ);
-    add(layout, DlgWvCreate::tr("I &Offset"), offsetI);
-    add(layout, DlgWvCreate::tr("Q O&ffset"), offsetQ);
-    add(layout, DlgWvCreate::tr("Q P&hase Offset"), phaseQ);
-    m_oversampling = new QCheckBox(DlgWvCreate::tr("&Custom\nOversampling"));
+    using namespace signalfields;
+    QFormLayout *layout = layoutOf(form.page_function, "Function");
+    add(layout, "&Frequency", frequency, "le_freq", "fn.freq");
+    add(layout, "&I Amplitude", amplitudeI, "le_ampi", "fn.ampi");
+    add(layout, "&Q Amplitude", amplitudeQ, "le_ampq", "fn.ampq");
+    add(layout, "I &Offset", offsetI, "le_ofsi", "fn.ofsi");
+    add(layout, "Q O&ffset", offsetQ, "le_ofsq", "fn.ofsq");
+    add(layout, "Q P&hase Offset", phaseQ, "le_phaseq", "fn.phsq");
+    m_oversampling = new QCheckBox("&Custom\nOversampling");
     m_oversampling->setObjectName("cb_over");
-    m_oversampling->setToolTip(DlgWvCreate::tr("Start from this number of samples per period"));
+    m_oversampling->setToolTip("Start from this number of samples per period");
     auto *ratio = new QtNumericEdit;
-    setUp(*ratio, oversampling);
+    ratio->setObjectName("le_over");
+    setUp(*ratio, oversampling, "fn.over");
     layout->addRow(m_oversampling, ratio);
 }
 
 void CreateTypePages::fillPulsePages(const Ui::DlgWvCreate &form)
 {
-    using namespace createfields;
-    QFormLayout *layout = layoutOf(form.page_pulse, DlgWvCreate::tr("Pulse"));
-    add(layout, DlgWvCreate::tr("&Rise Time"), pulseRise);
-    add(layout, DlgWvCreate::tr("&On Time"), pulseOn);
-    add(layout, DlgWvCreate::tr("&Fall Time"), pulseFall);
-    add(layout, DlgWvCreate::tr("&Blank Time"), pulseBlank);
+    using namespace signalfields;
+    QFormLayout *layout = layoutOf(form.page_pulse, "Pulse");
+    add(layout, "&Rise Time", pulseRise, "le_trise", "pulse.rise");
+    add(layout, "&On Time", pulseOn, "le_ton", "pulse.on");
+    add(layout, "&Fall Time", pulseFall, "le_tfall", "pulse.fall");
+    add(layout, "&Blank Time", pulseBlank, "le_tblank", "pulse.blank");
     m_pulseRamp = addRamp(layout, "cb_rtype");
-    add(layout, DlgWvCreate::tr("Time R&esolution"), pulseResolution);
+    add(layout, "Time R&esolution", pulseResolution, "le_pulseresolution", "pulse.tres");
 
-    layout = layoutOf(form.page_chirp, DlgWvCreate::tr("Chirp"));
-    add(layout, DlgWvCreate::tr("&Rise Time"), chirpRise);
-    add(layout, DlgWvCreate::tr("&On Time"), chirpOn);
-    add(layout, DlgWvCreate::tr("&Fall Time"), chirpFall);
-    add(layout, DlgWvCreate::tr("&Blank Time"), chirpBlank);
+    layout = layoutOf(form.page_chirp, "Chirp");
+    add(layout, "&Rise Time", chirpRise, "le_trise_2", "chirp.rise");
+    add(layout, "&On Time", chirpOn, "le_ton_2", "chirp.on");
+    add(layout, "&Fall Time", chirpFall, "le_tfall_2", "chirp.fall");
+    add(layout, "&Blank Time", chirpBlank, "le_tblank_2", "chirp.blank");
     m_chirpRamp = addRamp(layout, "cb_rtype_2");
-    add(layout, DlgWvCreate::tr("Time R&esolution"), chirpResolution);
-    add(layout, DlgWvCreate::tr("&Chirp Range"), chirpRange);
+    add(layout, "Time R&esolution", chirpResolution, "le_pulseresolution_2", "chirp.tres");
+    add(layout, "&Chirp Range", chirpRange, "le_chirprange", "chirp.range");
 }
 
 void CreateTypePages::fillModulationPages(const Ui::DlgWvCreate &form)
 {
-    using namespace createfields;
-    QFormLayout *layout = layoutOf(form.page_fm, DlgWvCreate::tr("FM"));
-    add(layout, DlgWvCreate::tr("&Modulation Frequency"), fmFrequency);
-    add(layout, DlgWvCreate::tr("&Deviation"), fmDeviation);
-    add(layout, DlgWvCreate::tr("Modulation &Frequency, 2nd Tone"), fmFrequency2);
-    add(layout, DlgWvCreate::tr("D&eviation, 2nd Tone"), fmDeviation2);
+    using namespace signalfields;
+    QFormLayout *layout = layoutOf(form.page_fm, "FM");
+    add(layout, "&Modulation Frequency", fmFrequency, "le_modfreq", "fm.modf");
+    add(layout, "&Deviation", fmDeviation, "le_dev", "fm.dev");
+    add(layout, "Modulation &Frequency, 2nd Tone", fmFrequency2, "le_modfreq_2", "fm.modf2");
+    add(layout, "D&eviation, 2nd Tone", fmDeviation2, "le_dev_2", "fm.dev2");
 
-    layout = layoutOf(form.page_sweep, DlgWvCreate::tr("FM Sweep"));
-    add(layout, DlgWvCreate::tr("&Deviation"), sweepDeviation);
-    add(layout, DlgWvCreate::tr("Sweep &Time"), sweepTime);
-    add(layout, DlgWvCreate::tr("&Start Phase"), sweepStart);
-    add(layout, DlgWvCreate::tr("St&op Phase"), sweepStop);
+    layout = layoutOf(form.page_sweep, "FM Sweep");
+    add(layout, "&Deviation", sweepDeviation, "le_sweepdev", "fmswe.dev");
+    add(layout, "Sweep &Time", sweepTime, "le_sweeptime", "fmswe.time");
+    add(layout, "&Start Phase", sweepStart, "le_startphase", "fmswe.pstart");
+    // The key keeps its name from another field of old.
+    add(layout, "St&op Phase", sweepStop, "le_stopphase", "fmswe.modf");
 
-    layout = layoutOf(form.page_am, DlgWvCreate::tr("AM"));
-    add(layout, DlgWvCreate::tr("&Modulation Frequency"), amFrequency);
-    add(layout, DlgWvCreate::tr("&Depth"), amDepth);
-    add(layout, DlgWvCreate::tr("Modulation &Frequency, 2nd Tone"), amFrequency2);
-    add(layout, DlgWvCreate::tr("D&epth, 2nd Tone"), amDepth2);
+    layout = layoutOf(form.page_am, "AM");
+    add(layout, "&Modulation Frequency", amFrequency, "le_ammodfreq", "am.modf");
+    add(layout, "&Depth", amDepth, "le_amdepth", "am.dep");
+    add(layout, "Modulation &Frequency, 2nd Tone", amFrequency2, "le_ammodfreq_2", "am.modf2");
+    add(layout, "D&epth, 2nd Tone", amDepth2, "le_amdepth_2", "am.dep2");
 
-    layout = layoutOf(form.page_pm, DlgWvCreate::tr("PM"));
-    add(layout, DlgWvCreate::tr("&Modulation Frequency"), pmFrequency);
-    add(layout, DlgWvCreate::tr("&Deviation"), pmDeviation);
+    layout = layoutOf(form.page_pm, "PM");
+    add(layout, "&Modulation Frequency", pmFrequency, "le_pmmodfreq", "pm.modf");
+    add(layout, "&Deviation", pmDeviation, "le_pmdev", "pm.dev");
 }
 
 void CreateTypePages::fillOtherPages(const Ui::DlgWvCreate &form)
 {
-    using namespace createfields;
-    QFormLayout *layout = layoutOf(form.page_multicarrier, DlgWvCreate::tr("Multi Carrier"));
-    add(layout, DlgWvCreate::tr("Frequency &Spacing"), spacing);
-    add(layout, DlgWvCreate::tr("Number of &Carriers"), carriers);
-    add(layout, DlgWvCreate::tr("&I Offset"), carrierOffsetI);
-    m_randomPhase = new QCheckBox(DlgWvCreate::tr("&Random Phase"));
+    using namespace signalfields;
+    QFormLayout *layout = layoutOf(form.page_multicarrier, "Multi Carrier");
+    add(layout, "Frequency &Spacing", spacing, "le_spacing", "mc.spc");
+    add(layout, "Number of &Carriers", carriers, "le_carriers", "mc.carr");
+    add(layout, "&I Offset", carrierOffsetI, "le_ioffset", "mc.iofs");
+    m_randomPhase = new QCheckBox("&Random Phase");
     m_randomPhase->setObjectName("cb_randomphase");
-    m_randomPhase->setToolTip(
-        DlgWvCreate::tr("Give each carrier a random phase, for a lower peak"));
+    m_randomPhase->setToolTip("Give each carrier a random phase, for a lower peak");
     m_randomPhase->setChecked(true);
     layout->addRow(QString(), m_randomPhase);
 
-    layout = layoutOf(form.page_noise, DlgWvCreate::tr("Noise"));
-    add(layout, DlgWvCreate::tr("&Bandwidth"), noiseBandwidth);
-    add(layout, DlgWvCreate::tr("&Duration"), noiseDuration);
+    layout = layoutOf(form.page_noise, "Noise");
+    add(layout, "&Bandwidth", noiseBandwidth, "le_noisebw", "noise.bw");
+    add(layout, "&Duration", noiseDuration, "le_noiseduration", "noise.time");
 }
 
-double CreateTypePages::value(const CreateField &field) const
+double CreateTypePages::value(const SignalField &field) const
 {
-    return m_fields.at(&field)->getVal();
+    return m_fields.at(&field).edit->getVal();
 }
 
 CreateChoices CreateTypePages::choices(CreateKind kind) const
@@ -159,16 +161,16 @@ CreateChoices CreateTypePages::choices(CreateKind kind) const
     return choices;
 }
 
-void CreateTypePages::setEnabled(const CreateField &field, bool enabled) const
+void CreateTypePages::setEnabled(const SignalField &field, bool enabled) const
 {
-    m_fields.at(&field)->setEnabled(enabled);
+    m_fields.at(&field).edit->setEnabled(enabled);
 }
 
 void CreateTypePages::writeSettings(QSettings &settings) const
 {
-    for (const auto &[field, edit] : m_fields) {
-        if (*field->key != 0) {
-            settings.setValue(field->key, edit->getVal());
+    for (const auto &[field, shown] : m_fields) {
+        if (shown.key) {
+            settings.setValue(shown.key, shown.edit->getVal());
         }
     }
     settings.setValue("fn.overen", m_oversampling->isChecked());
@@ -179,9 +181,9 @@ void CreateTypePages::writeSettings(QSettings &settings) const
 
 void CreateTypePages::readSettings(const QSettings &settings) const
 {
-    for (const auto &[field, edit] : m_fields) {
-        if (*field->key != 0) {
-            edit->setVal(settings.value(field->key, field->start).toDouble());
+    for (const auto &[field, shown] : m_fields) {
+        if (shown.key) {
+            shown.edit->setVal(settings.value(shown.key, field->start).toDouble());
         }
     }
     m_oversampling->setChecked(settings.value("fn.overen", false).toBool());

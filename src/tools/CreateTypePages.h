@@ -24,7 +24,7 @@ class CreateTypePages
 public:
     explicit CreateTypePages(Ui::DlgWvCreate &form);
 
-    [[nodiscard]] double value(const CreateField &field) const;
+    [[nodiscard]] double value(const SignalField &field) const;
 
     /// The choices for a kind that are no numbers, but for its variant.
     [[nodiscard]] CreateChoices choices(CreateKind kind) const;
@@ -32,14 +32,21 @@ public:
     /// The check box that switches the oversampling ratio on.
     [[nodiscard]] QCheckBox &oversamplingBox() const { return *m_oversampling; }
 
-    void setEnabled(const CreateField &field, bool enabled) const;
+    void setEnabled(const SignalField &field, bool enabled) const;
 
     void writeSettings(QSettings &settings) const;
     void readSettings(const QSettings &settings) const;
 
 private:
-    void setUp(QtNumericEdit &edit, const CreateField &field);
-    void add(QFormLayout *layout, const QString &label, const CreateField &field);
+    struct Shown
+    {
+        QtNumericEdit *edit = nullptr;
+        const char *key = nullptr; ///< in the settings; null for a value that isn't kept
+    };
+
+    void setUp(QtNumericEdit &edit, const SignalField &field, const char *key);
+    void add(QFormLayout *layout, const QString &label, const SignalField &field, const char *name,
+             const char *key);
     static QFormLayout *layoutOf(QWidget *page, const QString &title);
     static QComboBox *addRamp(QFormLayout *layout, const char *name);
     void fillPulsePages(const Ui::DlgWvCreate &form);
@@ -47,7 +54,7 @@ private:
     void fillModulationPages(const Ui::DlgWvCreate &form);
     void fillOtherPages(const Ui::DlgWvCreate &form);
 
-    std::map<const CreateField *, QtNumericEdit *> m_fields;
+    std::map<const SignalField *, Shown> m_fields;
     QCheckBox *m_oversampling = nullptr;
     QCheckBox *m_randomPhase = nullptr;
     QComboBox *m_pulseRamp = nullptr;

@@ -160,7 +160,7 @@ CreateRequest DlgWvCreate::options() const
     CreateRequest request;
     request.output = outputOptions();
     request.signal = makeSettings(
-        kind(), choices, [this](const CreateField &field) { return m_pages->value(field); });
+        kind(), choices, [this](const SignalField &field) { return m_pages->value(field); });
     request.minClockHz = m_ui->le_minclock->getVal();
     request.maxClockHz = m_ui->le_maxclock->getVal();
     request.clockHz = m_ui->le_clockrate->getVal();
@@ -185,10 +185,10 @@ void DlgWvCreate::enableSecondTone()
 {
     const bool twoToneFm = subKind() == static_cast<int>(FmKind::TwoTone);
     const bool twoToneAm = subKind() >= static_cast<int>(AmKind::TwoTone);
-    m_pages->setEnabled(createfields::fmFrequency2, twoToneFm);
-    m_pages->setEnabled(createfields::fmDeviation2, twoToneFm);
-    m_pages->setEnabled(createfields::amFrequency2, twoToneAm);
-    m_pages->setEnabled(createfields::amDepth2, twoToneAm);
+    m_pages->setEnabled(signalfields::fmFrequency2, twoToneFm);
+    m_pages->setEnabled(signalfields::fmDeviation2, twoToneFm);
+    m_pages->setEnabled(signalfields::amFrequency2, twoToneAm);
+    m_pages->setEnabled(signalfields::amDepth2, twoToneAm);
 }
 
 bool DlgWvCreate::preview()
@@ -236,7 +236,7 @@ void DlgWvCreate::slot_crf(int state)
 
 void DlgWvCreate::slot_over_enable(int state)
 {
-    m_pages->setEnabled(createfields::oversampling, state != Qt::Unchecked);
+    m_pages->setEnabled(signalfields::oversampling, state != Qt::Unchecked);
 }
 
 int DlgWvCreate::pageAfter(int page)

@@ -9,12 +9,12 @@ namespace {
 
 QString waveformTitle()
 {
-    return QFileDialog::tr("Select waveform file");
+    return "Select waveform file";
 }
 
 QString waveformFilter()
 {
-    return QFileDialog::tr("Waveform File (*.wv)");
+    return "Waveform File (*.wv)";
 }
 
 } // namespace

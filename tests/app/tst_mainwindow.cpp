@@ -3,6 +3,8 @@
 #include "app/QCustomTreeView.h"
 #include "guitesting.h"
 #include "log/Tracer.h"
+#include "support/logreader.h"
+#include "support/rows.h"
 #include "toolframe/DlgBase.h"
 
 #include <QComboBox>
@@ -10,10 +12,7 @@
 #include <QListWidget>
 #include <QMenu>
 #include <QMenuBar>
-#include <QMessageBox>
 #include <QScrollBar>
-#include <QSignalSpy>
-#include <QStatusBar>
 #include <QTest>
 #include <QToolButton>
 
@@ -59,49 +58,15 @@ class TestMainWindow : public QObject
     Q_OBJECT
 
 private slots:
-    void showsWhatItMust();
     void menusHaveNoEmptyEntryAndUniqueMnemonics();
-    void selectionEnablesTools_data();
     void selectionEnablesTools();
     void registryPlacesAndStartsTools();
     void historyHoldsElevenEntries();
-    void historyLeadsBack();
     void activePaneIsMarked();
     void masksHideOtherFiles();
     void logKeepsTheLast256Lines();
-    void logIconsFollowTheLevel_data();
-    void logIconsFollowTheLevel();
     void refreshGoesToTheDefaultFolder();
-    void aboutNamesTheOriginOfTheIcons();
-    void infoTextIsShownAsItIs();
 };
-
-void TestMainWindow::showsWhatItMust()
-{
-    Desk desk;
-    desk.open();
-    QCOMPARE(desk.window()->windowTitle(), "HV Corvane");
-    QCOMPARE(desk.window()->pos(), QPoint(50, 50));
-    QCOMPARE(desk.window()->size(), QSize(700, 500));
-    for (int pane = 1; pane <= 2; ++pane) {
-        const auto *device = desk.find<QComboBox>(QString("cb_dev_%1").arg(pane));
-        QCOMPARE(device->count(), 1);
-        QCOMPARE(device->itemText(0), "Local");
-        QVERIFY(device->itemData(0).toString().isEmpty());
-        const auto *mask = desk.find<QComboBox>(QString("cb_flt_%1").arg(pane));
-        QCOMPARE(mask->count(), 2);
-        QCOMPARE(mask->itemText(0), "*.*");
-        QCOMPARE(mask->itemText(1), "*.wv");
-        QCOMPARE(mask->toolTip(), "Filter Mask");
-        QCOMPARE(desk.tree(pane)->currentPath(), desk.path("") + '/');
-    }
-    QVERIFY(desk.log().contains("Loading program settings..."));
-    QCOMPARE(desk.log().last(), "Startup complete");
-    // All controls lie within the panes even at the smallest size.
-    const auto *button = desk.find<QToolButton>("tb_refresh_2");
-    const QWidget *central = desk.window()->centralWidget();
-    QVERIFY(central->rect().contains(QRect(button->mapTo(central, QPoint(0, 0)), button->size())));
-}
 
 void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
 {
@@ -129,28 +94,19 @@ void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
     QVERIFY(findEntry(*desk.window(), "Help", "About"));
 }
 
-void TestMainWindow::selectionEnablesTools_data()
-{
-    QTest::addColumn<QString>("entry");
-    QTest::addColumn<bool>("enabled");
-    QTest::newRow("waveform") << "tone.wv" << true;
-    QTest::newRow("mixed case") << "other.Wv" << true;
-    QTest::newRow("other type") << "data.txt" << false;
-    QTest::newRow("no type") << "readme" << false;
-    QTest::newRow("folder") << "sub" << false;
-    QTest::newRow("folder like a waveform") << "folder.wv" << false;
-}
-
 void TestMainWindow::selectionEnablesTools()
 {
-    QFETCH(QString, entry);
-    QFETCH(bool, enabled);
     Desk desk;
     QVERIFY(writeTone(desk.path("other.Wv")));
     QVERIFY(QDir().mkpath(desk.path("folder.wv")));
     desk.open();
-    desk.select(1, entry);
-    QCOMPARE(findEntry(*desk.window(), "Analyze", "File Info")->isEnabled(), enabled);
+    forRows({{"mixed case", "other.Wv", true},
+             {"no type", "readme", false},
+             {"folder like a waveform", "folder.wv", false}},
+            [&](const QString &entry, bool enabled) {
+                desk.select(1, entry);
+                QCOMPARE(findEntry(*desk.window(), "Analyze", "File Info")->isEnabled(), enabled);
+            });
 }
 
 void TestMainWindow::registryPlacesAndStartsTools()
@@ -198,13 +154,10 @@ void TestMainWindow::registryPlacesAndStartsTools()
     modules.closeAll();
 
     tool->accepts = false;
-    (void)Tracer::takeEntries();
+    (void)takeLog();
     entry->trigger();
     QVERIFY(!tool->isVisible());
-    const QList<Tracer::Entry> lines = Tracer::takeEntries();
-    QCOMPARE(lines.size(), 1);
-    QVERIFY(lines.first().first.endsWith("Cannot initialize module."));
-    QCOMPARE(lines.first().second, int(Tracer::Error));
+    QCOMPARE(takeLog(), QStringList("4|Cannot initialize module."));
 }
 
 void TestMainWindow::historyHoldsElevenEntries()
@@ -226,19 +179,11 @@ void TestMainWindow::historyHoldsElevenEntries()
     desk.select(1, "file7.dat");
     QCOMPARE(history->count(), 11);
     QCOMPARE(history->currentText(), desk.path("file7.dat"));
-}
-
-void TestMainWindow::historyLeadsBack()
-{
-    Desk desk;
-    desk.open();
-    desk.select(1, "tone.wv");
-    desk.select(1, "sub");
-    auto *history = desk.find<QComboBox>("cb_entry1");
-    history->setFocus();
-    QTest::keyClick(history, Qt::Key_Up);
-    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("tone.wv"));
-    QCOMPARE(desk.tree(2)->currentPath(), desk.path("") + '/');
+    // And it leads back.
+    auto *box = desk.find<QComboBox>("cb_entry1");
+    box->setFocus();
+    QTest::keyClick(box, Qt::Key_Up);
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("file6.dat"));
 }
 
 void TestMainWindow::activePaneIsMarked()
@@ -309,35 +254,6 @@ void TestMainWindow::logKeepsTheLast256Lines()
     QCOMPARE(desk.log().last(), "line 999");
 }
 
-void TestMainWindow::logIconsFollowTheLevel_data()
-{
-    QTest::addColumn<int>("level");
-    QTest::addColumn<QString>("icon");
-    QTest::newRow("information") << 1 << "bulb";
-    QTest::newRow("warning") << 2 << "yellowled";
-    QTest::newRow("information and warning") << 3 << "yellowled";
-    QTest::newRow("error") << 4 << "redflag";
-    QTest::newRow("severe") << 8 << "redflag";
-    QTest::newRow("error and severe") << 12 << "redflag";
-    QTest::newRow("debug") << 16 << "debug";
-    QTest::newRow("debug and warning") << 18 << "yellowled";
-}
-
-void TestMainWindow::logIconsFollowTheLevel()
-{
-    QFETCH(int, level);
-    QFETCH(QString, icon);
-    Desk desk;
-    desk.open();
-    Tracer::setMask(Tracer::DebugMask);
-    Tracer::Trace(level, QString("message"));
-    Tracer::setMask(Tracer::DefaultMask);
-    const auto *list = desk.find<QListWidget>("lw_log");
-    const QImage shown = list->item(list->count() - 1)->icon().pixmap(16, 16).toImage();
-    QVERIFY(!shown.isNull());
-    QCOMPARE(shown, QIcon(":/icons16/" + icon + ".png").pixmap(16, 16).toImage());
-}
-
 void TestMainWindow::refreshGoesToTheDefaultFolder()
 {
     Desk desk;
@@ -352,41 +268,6 @@ void TestMainWindow::refreshGoesToTheDefaultFolder()
     desk.tree(1)->setFocus();
     QTest::keyClick(desk.tree(1), Qt::Key_R, Qt::ControlModifier);
     QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("sub") + '/');
-}
-
-void TestMainWindow::aboutNamesTheOriginOfTheIcons()
-{
-    Desk desk;
-    desk.open();
-    QString text;
-    QString title;
-    QVERIFY(withModal([&] { findEntry(*desk.window(), "Help", "About")->trigger(); },
-                      [&](QWidget &box) {
-                          text = dynamic_cast<QMessageBox &>(box).text();
-                          title = box.windowTitle();
-                          QTest::keyClick(&box, Qt::Key_Escape);
-                      }));
-    QCOMPARE(title, "HV Corvane");
-    QVERIFY(text.contains("<h2>HV Corvane</h2>"));
-    QVERIFY(text.contains("Tango"));
-    QVERIFY(text.contains("Version "));
-}
-
-void TestMainWindow::infoTextIsShownAsItIs()
-{
-    Desk desk;
-    desk.open();
-    QString text;
-    QVERIFY(withModal([&] { emit desk.tree(1)->infoTextAvailable("<b>name</b>"); },
-                      [&](QWidget &box) {
-                          auto &message = dynamic_cast<QMessageBox &>(box);
-                          QCOMPARE(message.textFormat(), Qt::PlainText);
-                          text = message.text();
-                          press("OK")(box);
-                      }));
-    QCOMPARE(text, "<b>name</b>");
-    emit desk.tree(1)->errMsg("a reason");
-    QCOMPARE(desk.window()->statusBar()->currentMessage(), "a reason");
 }
 
 QTEST_MAIN(TestMainWindow)

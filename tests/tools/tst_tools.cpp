@@ -1,61 +1,56 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "jobs/jobrun.h"
 #include "toolwindow.h"
 
+#include "support/files.h"
+#include "support/logreader.h"
+#include "support/modals.h"
+#include "support/rows.h"
+#include "support/wvbytes.h"
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
 #include "tools/DlgWvCreate.h"
 #include "tools/ViewFrame.h"
 
 #include "display/CWidgetIQTrace.h"
+#include "display/CWidgetTimeline.h"
 #include "display/QtNumericEdit.h"
-#include "log/Tracer.h"
-#include "streams/TempStream.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QComboBox>
+#include <QDeadlineTimer>
 #include <QLabel>
 #include <QPushButton>
-#include <QRadioButton>
 #include <QSettings>
 #include <QStackedWidget>
-#include <QTemporaryDir>
 #include <QTest>
 #include <QTextEdit>
 
 #include <cmath>
-#include <numbers>
+#include <memory>
 
 using namespace toolwindow;
 
 namespace {
 
-/// A whole number of cycles of a complex tone at 0.7 of full scale, with marker 1 high in the
-/// first half.
-void writeTone(const QString &fileName, int samples, double clockHz)
+QTextEdit &reportOf(QWidget &dialog)
 {
-    WvWriteJob job;
-    job.clock = clockHz;
-    job.samples = samples;
-    job.comment = "tone";
-    for (int i = 0; i < samples; ++i) {
-        const double phase = 2 * std::numbers::pi * 10 * i / samples;
-        job.iSamples.append(static_cast<float>(0.7 * std::cos(phase)));
-        job.qSamples.append(static_cast<float>(0.7 * std::sin(phase)));
-        job.markers.append(i < samples / 2 ? 1 : 0);
-    }
-    QVERIFY(HvFileIO().writeWaveform(job, fileName, nullptr, nullptr, nullptr));
+    return *child<QTextEdit>(dialog, "te_result");
 }
 
-QStringList errors()
+int pageOf(QWidget &dialog)
 {
-    QStringList lines;
-    const QList<Tracer::Entry> entries = Tracer::takeEntries();
-    for (const auto &[line, level] : entries) {
-        if (level == Tracer::Error) {
-            lines.append(line.mid(line.indexOf("  ") + 2));
-        }
-    }
-    return lines;
+    return child<QStackedWidget>(dialog, "sw_assist")->currentIndex();
+}
+
+ViewFrame &frameOf(QWidget &dialog)
+{
+    return *child<ViewFrame>(dialog, "w_view");
+}
+
+QString textOf(QWidget &dialog, const char *label)
+{
+    return child<QLabel>(dialog, label)->text();
 }
 
 } // namespace
@@ -65,260 +60,365 @@ class TestTools : public QObject
     Q_OBJECT
 
 private slots:
-    void init()
-    {
-        m_folder = std::make_unique<QTemporaryDir>();
-        m_tone = m_folder->filePath("tone.wv");
-        writeTone(m_tone, 4000, 1e6);
-        static_cast<void>(Tracer::takeEntries());
-    }
-
-    void resampleFollowsTheFieldThatDecides()
-    {
-        DlgResample dialog;
-        QVERIFY(dialog.startModule(m_tone));
-        dialog.show();
-        QCOMPARE(child<QLabel>(dialog, "l_src_samples")->text(), QString("4000"));
-        QCOMPARE(child<QLineEdit>(dialog, "le_outfile")->text(),
-                 m_folder->filePath("tone_resample.wv"));
-        click(dialog, "pb_next");
-        auto *clock = child<QtNumericEdit>(dialog, "le_target_clock");
-        auto *samples = child<QtNumericEdit>(dialog, "le_target_samples");
-        type(clock, "1.5M");
-        QCOMPARE(samples->getValInt(), 6000); // 1.5 MHz / 1 MHz * 4000
-        QVERIFY(!samples->isEnabled());
-        click(dialog, "rb_samples");
-        QVERIFY(!clock->isEnabled());
-        type(samples, "2000");
-        QCOMPARE(clock->getVal(), 500e3);
-        QCOMPARE(child<QtNumericEdit>(dialog, "le_clockrate")->getVal(), 500e3);
-    }
-
-    void resampleWritesTheFileAndReports()
-    {
-        DlgResample dialog;
-        QVERIFY(dialog.startModule(m_tone));
-        dialog.show();
-        click(dialog, "pb_next");
-        type(child<QtNumericEdit>(dialog, "le_target_clock"), "2M");
-        click(dialog, "pb_next");
-        click(dialog, "pb_next");
-        const QString report = child<QTextEdit>(dialog, "te_result")->toPlainText();
-        QVERIFY2(report.contains("Resampling completed"), qPrintable(report));
-        QVERIFY(report.contains(" OUT-samples: \t8000"));
-        WvFileSummary summary;
-        QVERIFY(HvFileIO().readWaveformInfo(m_folder->filePath("tone_resample.wv"), &summary));
-        QCOMPARE(summary.samples, 8000);
-        QCOMPARE(summary.clock, 2e6);
-        QCOMPARE(summary.comment, QString("tone"));
-        QVERIFY(summary.hasMarkers);
-        // 0.7 of full scale, as in the source.
-        QVERIFY(std::fabs(summary.peakOffset - 3.098) < 0.01);
-    }
-
-    void aFileThatCannotBeReadDoesNotStart_data()
-    {
-        QTest::addColumn<QByteArray>("content");
-        QTest::addColumn<QString>("viewWords");
-        QTest::newRow("empty") << QByteArray() << "No tag mark found! Probably incorrect format.";
-        QTest::newRow("no type") << QByteArray("{SAMPLES:1}{CLOCK:1000}{WAVEFORM-5: #abcd}")
-                                 << "Unsupported waveform file type!";
-        QTest::newRow("cut samples") << QByteArray("{TYPE: TGX-WV,0}{CLOCK:1000}{WAVEFORM-41: #ab")
-                                     << "Cannot read enough data from xWAVEFORM tag!";
-    }
-
-    void aFileThatCannotBeReadDoesNotStart()
-    {
-        QFETCH(QByteArray, content);
-        QFETCH(QString, viewWords);
-        const QString fileName = m_folder->filePath("bad.wv");
-        QFile file(fileName);
-        QVERIFY(file.open(QIODevice::WriteOnly) && file.write(content) == content.size());
-        file.close();
-        DlgView view;
-        QVERIFY(!view.startModule(fileName));
-        QCOMPARE(errors().value(0), viewWords);
-    }
-
-    void viewMovesAndZooms()
-    {
-        const QString fileName = m_folder->filePath("long.wv");
-        writeTone(fileName, 20000, 1e6);
-        DlgView view;
-        QVERIFY(view.startModule(fileName));
-        view.show();
-        QCOMPARE(view.window().points(), 5000);
-        click(view, "pb_forward");
-        QCOMPARE(view.window().first(), 5000);
-        click(view, "pb_forward_little");
-        QCOMPARE(view.window().first(), 5250); // a twentieth of the view
-        click(view, "pb_end");
-        QCOMPARE(view.window().first(), 15000);
-        click(view, "pb_forward"); // would lead beyond the file: the view stays
-        QCOMPARE(view.window().first(), 15000);
-        click(view, "pb_zoomin");
-        QCOMPARE(view.window().points(), 2000);
-        QCOMPARE(view.window().first(), 16500); // the middle, 17500, stays
-        click(view, "pb_start");
-        QCOMPARE(view.window().first(), 0);
-    }
-
-    void viewCursorsShowValuesAndDistance()
-    {
-        DlgView view;
-        QVERIFY(view.startModule(m_tone));
-        view.resize(1000, 720);
-        view.show();
-        QCOMPARE(child<QLabel>(view, "l_csr_time")->text(), QString("---"));
-        child<ViewFrame>(view, "w_view")->set_csr_data(1000, 0.7, 0);
-        click(view, "pb_fix_ref");
-        child<ViewFrame>(view, "w_view")->set_csr_data(3000, 0, 0.7);
-        QCOMPARE(child<QLabel>(view, "l_csr_sample")->text(), QString("3000"));
-        QCOMPARE(child<QLabel>(view, "l_csr_time")->text(), QString("3 ms"));
-        QCOMPARE(child<QLabel>(view, "l_csr_mag")->text(), QString("-3.10 dB"));
-        QCOMPARE(child<QLabel>(view, "l_csr_phase")->text(), QString("90.00 deg"));
-        QCOMPARE(child<QLabel>(view, "l_delta_samples")->text(), QString("2000"));
-        QCOMPARE(child<QLabel>(view, "l_delta_time")->text(), QString("2 ms"));
-        auto *trace = child<CWidgetIQTrace>(view, "w_iqtrace");
-        QTest::mouseClick(trace, Qt::LeftButton, {}, trace->rect().center());
-        QVERIFY(child<QLabel>(view, "l_csr_sample")->text() != "3000");
-    }
-
-    void viewShowsThreeSamples()
-    {
-        const QString fileName = m_folder->filePath("three.wv");
-        writeTone(fileName, 3, 1e3);
-        DlgView view;
-        QVERIFY(view.startModule(fileName));
-        view.show();
-        QCOMPARE(view.window().points(), 3);
-        QVERIFY(!view.grab().isNull());
-        QVERIFY(errors().isEmpty());
-    }
-
-    void createOffersTheVariantsOfEachKind_data()
-    {
-        QTest::addColumn<QString>("waveform");
-        QTest::addColumn<int>("variants");
-        QTest::addColumn<QString>("page");
-        QTest::newRow("function") << "Function" << 4 << "page_function";
-        QTest::newRow("am") << "AM" << 8 << "page_am";
-        QTest::newRow("pm") << "PM" << 0 << "page_pm";
-        QTest::newRow("fm") << "FM" << 2 << "page_fm";
-        QTest::newRow("sweep") << "FM Sweep" << 3 << "page_sweep";
-        QTest::newRow("multi carrier") << "Multi Carrier" << 0 << "page_multicarrier";
-        QTest::newRow("pulse") << "Pulse" << 2 << "page_pulse";
-        QTest::newRow("noise") << "Noise" << 3 << "page_noise";
-    }
-
-    void createOffersTheVariantsOfEachKind()
-    {
-        QFETCH(QString, waveform);
-        QFETCH(int, variants);
-        QFETCH(QString, page);
-        DlgWvCreate dialog;
-        dialog.show();
-        auto *box = child<QComboBox>(dialog, "cb_waveform");
-        box->setFocus();
-        box->setCurrentText(waveform);
-        QCOMPARE(child<QComboBox>(dialog, "cb_wtype")->count(), variants);
-        click(dialog, "pb_next");
-        auto *pages = child<QStackedWidget>(dialog, "sw_assist");
-        QCOMPARE(pages->currentWidget()->objectName(), page);
-        click(dialog, "pb_next");
-        QCOMPARE(pages->currentIndex(), 10);
-        QVERIFY(child<QtNumericEdit>(dialog, "le_samples")->getVal() >= 512);
-    }
-
-    void createRefusesTooManySamples()
-    {
-        DlgWvCreate dialog;
-        dialog.show();
-        click(dialog, "pb_next");
-        type(child<QtNumericEdit>(dialog, "le_freq"), "100");
-        click(dialog, "cb_over");
-        type(child<QtNumericEdit>(dialog, "le_over"), "100000");
-        type(child<QtNumericEdit>(dialog, "le_freq"), "100");
-        click(dialog, "pb_next"); // 100 000 samples at 10 MHz: fits
-        auto *pages = child<QStackedWidget>(dialog, "sw_assist");
-        QCOMPARE(pages->currentIndex(), 10);
-        dialog.setFocus();
-        click(dialog, "pb_prev");
-        click(dialog, "pb_prev");
-        type(child<QtNumericEdit>(dialog, "le_minclock"), "10M");
-        type(child<QtNumericEdit>(dialog, "le_maxclock"), "600M");
-        child<QComboBox>(dialog, "cb_waveform")->setCurrentText("Noise");
-        click(dialog, "pb_next");
-        type(child<QtNumericEdit>(dialog, "le_noisebw"), "20M");
-        type(child<QtNumericEdit>(dialog, "le_noiseduration"), "1");
-        click(dialog, "pb_next"); // 30 million samples
-        QCOMPARE(pages->currentWidget()->objectName(), QString("page_noise"));
-        QCOMPARE(errors().constLast(),
-                 QString("Cannot configure waveform creation. Check settings."));
-    }
-
-    void createAsksBeforeOverwriting()
-    {
-        DlgWvCreate dialog;
-        QVERIFY(dialog.startModule(m_tone));
-        dialog.show();
-        for (int page = 0; page < 3; ++page) {
-            click(dialog, "pb_next");
-        }
-        QCOMPARE(child<QLineEdit>(dialog, "le_outfile")->text(), m_tone);
-        QFile file(m_tone);
-        QVERIFY(file.open(QIODevice::ReadOnly));
-        const QByteArray before = file.readAll();
-        file.close();
-        QString question;
-        answerNextQuestion(QMessageBox::No, &question);
-        click(dialog, "pb_next");
-        QCOMPARE(question,
-                 QString("The target file already exists.\nDo you want to overwrite this file?"));
-        QVERIFY(child<QTextEdit>(dialog, "te_result")->toPlainText().contains("Creation aborted"));
-        QVERIFY(file.open(QIODevice::ReadOnly));
-        QCOMPARE(file.readAll(), before);
-        file.close();
-
-        click(dialog, "pb_prev");
-        answerNextQuestion(QMessageBox::Yes, &question);
-        click(dialog, "pb_next");
-        const QString report = child<QTextEdit>(dialog, "te_result")->toPlainText();
-        QVERIFY2(report.contains("Signal creation completed"), qPrintable(report));
-        WvFileSummary summary;
-        QVERIFY(HvFileIO().readWaveformInfo(m_tone, &summary));
-        QCOMPARE(summary.samples, 1000); // the 10 kHz sine of the start values
-        QCOMPARE(summary.clock, 10e6);
-    }
-
-    void createKeepsItsSettings()
-    {
-        const QString store = m_folder->filePath("settings.ini");
-        {
-            DlgWvCreate dialog;
-            dialog.show();
-            child<QComboBox>(dialog, "cb_waveform")->setCurrentText("FM");
-            child<QComboBox>(dialog, "cb_wtype")->setCurrentText("Two Tone");
-            click(dialog, "pb_next");
-            QVERIFY(child<QtNumericEdit>(dialog, "le_modfreq_2")->isEnabled());
-            type(child<QtNumericEdit>(dialog, "le_modfreq"), "7k");
-            QSettings settings(store, QSettings::IniFormat);
-            dialog.writeSettings(settings);
-            QCOMPARE(settings.value("WvCreate/ver").toDouble(), 1.0);
-        }
-        DlgWvCreate dialog;
-        QSettings settings(store, QSettings::IniFormat);
-        dialog.readSettings(settings);
-        QCOMPARE(child<QComboBox>(dialog, "cb_waveform")->currentText(), QString("FM"));
-        QCOMPARE(child<QComboBox>(dialog, "cb_wtype")->currentText(), QString("Two Tone"));
-        QCOMPARE(child<QtNumericEdit>(dialog, "le_modfreq")->getVal(), 7000.0);
-        QCOMPARE(child<QtNumericEdit>(dialog, "le_freq")->getVal(), 10000.0);
-    }
+    void init();
+    void resampleFollowsTheFieldThatDecides();
+    void resampleWritesTheFileAndReports();
+    void typedValuesAreTakenByKeys();
+    void cancelledConversionLeavesNothing();
+    void cancelledCreationSparesTheFile();
+    void refusalKeepsTheFile();
+    void createRefusesTooManySamples();
+    void createOffersTheSecondTone();
+    void createOverwritesWhenToldTo();
+    void createKeepsItsSettings();
+    void viewMovesZoomsAndPlays();
+    void viewCursorsShowValuesAndDistance();
+    void viewRefusesAndKeeps();
+    void viewShowsThreeSamples();
 
 private:
-    std::unique_ptr<QTemporaryDir> m_folder;
-    QString m_tone;
+    [[nodiscard]] QString path(const QString &name) const { return m_folder->path(name); }
+
+    std::unique_ptr<TestFolder> m_folder;
+    StreamFolder m_streams;
 };
+
+void TestTools::init()
+{
+    m_folder = std::make_unique<TestFolder>();
+    QVERIFY(m_folder->store("tone.wv", toneFile(4000)));
+    (void)takeLog();
+}
+
+void TestTools::resampleFollowsTheFieldThatDecides()
+{
+    DlgResample dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    QCOMPARE(textOf(dialog, "l_src_samples"), QString("4000"));
+    QCOMPARE(child<QLineEdit>(dialog, "le_outfile")->text(), path("tone_resample.wv"));
+    click(dialog, "pb_next");
+    auto *clock = child<QtNumericEdit>(dialog, "le_target_clock");
+    auto *samples = child<QtNumericEdit>(dialog, "le_target_samples");
+    type(clock, "1.5M");
+    QCOMPARE(samples->getValInt(), 6000); // 1.5 MHz / 1 MHz * 4000
+    QVERIFY(!samples->isEnabled());
+    click(dialog, "rb_samples");
+    QVERIFY(!clock->isEnabled());
+    type(samples, "2000");
+    QCOMPARE(clock->getVal(), 500e3);
+    QCOMPARE(child<QtNumericEdit>(dialog, "le_clockrate")->getVal(), 500e3);
+    // A target that no waveform can have keeps the wizard where it is.
+    type(samples, "268435456");
+    QVERIFY(!textOf(dialog, "l_warn").isEmpty());
+    click(dialog, "pb_next");
+    QCOMPARE(pageOf(dialog), 1);
+}
+
+void TestTools::resampleWritesTheFileAndReports()
+{
+    DlgResample dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    click(dialog, "pb_next");
+    type(child<QtNumericEdit>(dialog, "le_target_clock"), "2M");
+    click(dialog, "pb_next");
+    click(dialog, "pb_next");
+    const QString report = reportOf(dialog).toPlainText();
+    QVERIFY2(report.contains("Resampling completed"), qPrintable(report));
+    QVERIFY(report.contains(" OUT-samples: \t8000"));
+    WvFileSummary summary;
+    QVERIFY(HvFileIO().readWaveformInfo(path("tone_resample.wv"), &summary));
+    QCOMPARE(summary.samples, 8000);
+    QCOMPARE(summary.clock, 2e6);
+    QVERIFY(summary.hasMarkers);
+    // Half of full scale, as in the source.
+    QVERIFY(std::fabs(summary.peakOffset - 6.0206) < 0.01);
+}
+
+void TestTools::typedValuesAreTakenByKeys()
+{
+    // The mnemonic of Next leaves the focus, and with it the typed text, where it is.
+    for (const int key : {int(Qt::Key_Return), int(Qt::Key_N)}) {
+        DlgResample dialog;
+        QVERIFY(dialog.startModule(path("tone.wv")));
+        dialog.show();
+        dialog.activateWindow();
+        QVERIFY(QTest::qWaitForWindowActive(&dialog));
+        const Qt::KeyboardModifiers modifiers = key == Qt::Key_N ? Qt::AltModifier : Qt::NoModifier;
+        QTest::keyClick(dialog.windowHandle(), Qt::Key_Return);
+        QCOMPARE(pageOf(dialog), 1);
+        auto *clock = child<QtNumericEdit>(dialog, "le_target_clock");
+        clock->setFocus();
+        clock->selectAll();
+        QTest::keyClicks(clock, "3M");
+        QTest::keyClick(dialog.windowHandle(), static_cast<Qt::Key>(key), modifiers);
+        QTRY_COMPARE(pageOf(dialog), 2);
+        QCOMPARE(dialog.options().target.clockHz, 3e6);
+        QTest::keyClick(dialog.windowHandle(), Qt::Key_P, Qt::AltModifier);
+        QTRY_COMPARE(pageOf(dialog), 1);
+        // One that won't do keeps its page, as it does by mouse.
+        click(dialog, "rb_samples");
+        auto *samples = child<QtNumericEdit>(dialog, "le_target_samples");
+        samples->setFocus();
+        samples->selectAll();
+        QTest::keyClicks(samples, "268435456");
+        QTest::keyClick(dialog.windowHandle(), static_cast<Qt::Key>(key), modifiers);
+        QTRY_VERIFY(!textOf(dialog, "l_warn").isEmpty());
+        QCOMPARE(pageOf(dialog), 1);
+    }
+}
+
+void TestTools::cancelledConversionLeavesNothing()
+{
+    // A hole in a file, long enough for a run of seconds on any machine.
+    constexpr qint64 samples = 10'000'000;
+    QVERIFY(m_folder->store("long.wv", "{TYPE: TGX-WV,0}{CLOCK:10000000}{WAVEFORM-" +
+                                           QByteArray::number(4 * samples + 1) + ": #"));
+    QVERIFY(QFile::resize(path("long.wv"), 4 * samples + 1000));
+    DlgResample dialog;
+    QVERIFY(dialog.startModule(path("long.wv")));
+    dialog.show();
+    click(dialog, "pb_next");
+    type(child<QtNumericEdit>(dialog, "le_target_clock"), "200M");
+    click(dialog, "pb_next");
+    cancelNextJob();
+    click(dialog, "pb_next");
+    QVERIFY(reportOf(dialog).toPlainText().endsWith("Resampling failed"));
+    QVERIFY(reportOf(dialog).toHtml().contains("color:#c00000"));
+    QVERIFY(!QFile::exists(path("long_resample.wv")));
+    QVERIFY(m_streams.isEmpty());
+
+    // The window goes on as if nothing had been.
+    QVERIFY(dialog.isVisible());
+    click(dialog, "pb_prev");
+    click(dialog, "pb_prev");
+    type(child<QtNumericEdit>(dialog, "le_target_clock"), "1M");
+    click(dialog, "pb_next");
+    click(dialog, "pb_next");
+    QVERIFY(reportOf(dialog).toPlainText().endsWith("Resampling completed"));
+    QVERIFY(QFile::exists(path("long_resample.wv")));
+}
+
+void TestTools::cancelledCreationSparesTheFile()
+{
+    const QByteArray before = m_folder->load("tone.wv");
+    DlgWvCreate dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    for (int page = 0; page < 3; ++page) {
+        click(dialog, "pb_next");
+    }
+    // A creation is too short for a user to cancel; slow lines of the log make it long.
+    Tracer listener;
+    connect(&listener, &Tracer::TraceDataAvailable, this, [] {
+        for (const QString &line : takeMessages(Tracer::Information)) {
+            const QDeadlineTimer moment(line.startsWith("Creating waveform file") ? 600 : 150);
+            while (!moment.hasExpired()) {
+            }
+        }
+    });
+    whenModal(press("Yes"));
+    cancelNextJob();
+    click(dialog, "pb_next");
+    QVERIFY(reportOf(dialog).toPlainText().endsWith("Creation failed"));
+    QVERIFY(m_folder->load("tone.wv") == before);
+    QCOMPARE(m_folder->entries(), QStringList("tone.wv"));
+    QVERIFY(dialog.isVisible() && child<QAbstractButton>(dialog, "pb_prev")->isEnabled());
+}
+
+void TestTools::refusalKeepsTheFile()
+{
+    const QByteArray before = m_folder->load("tone.wv");
+    DlgResample dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    click(dialog, "pb_next");
+    click(dialog, "pb_next");
+    type(child<QLineEdit>(dialog, "le_outfile"), path("tone.wv"));
+    Seen seen;
+    QVERIFY(withModal([&] { click(dialog, "pb_next"); }, answer("No", seen)));
+    QCOMPARE(seen.text, "The target file already exists.\nDo you want to overwrite this file?");
+    QCOMPARE(reportOf(dialog).toPlainText(), QString("Resampling aborted"));
+    QCOMPARE(takeMessages(Tracer::Error), QStringList("User break."));
+    QVERIFY(m_folder->load("tone.wv") == before);
+
+    // An empty name asks nothing and does nothing.
+    click(dialog, "pb_prev");
+    child<QLineEdit>(dialog, "le_outfile")->clear();
+    click(dialog, "pb_next");
+    QCOMPARE(takeMessages(Tracer::Error), QStringList("Output file name is empty."));
+    QVERIFY(reportOf(dialog).toPlainText().isEmpty());
+}
+
+void TestTools::createRefusesTooManySamples()
+{
+    DlgWvCreate dialog;
+    dialog.show();
+    type(child<QtNumericEdit>(dialog, "le_minclock"), "10M");
+    type(child<QtNumericEdit>(dialog, "le_maxclock"), "600M");
+    child<QComboBox>(dialog, "cb_waveform")->setCurrentText("Noise");
+    click(dialog, "pb_next");
+    type(child<QtNumericEdit>(dialog, "le_noisebw"), "20M");
+    type(child<QtNumericEdit>(dialog, "le_noiseduration"), "1");
+    click(dialog, "pb_next"); // 30 million samples
+    QCOMPARE(child<QStackedWidget>(dialog, "sw_assist")->currentWidget()->objectName(),
+             QString("page_noise"));
+    QCOMPARE(takeMessages(Tracer::Error).constLast(),
+             QString("Cannot configure waveform creation. Check settings."));
+}
+
+void TestTools::createOffersTheSecondTone()
+{
+    forRows({{"one", "FM", 0, "le_dev_2", false}, {"two", "AM", 6, "le_amdepth_2", true}},
+            [](const QString &waveform, int variant, const QByteArray &field, bool enabled) {
+                DlgWvCreate dialog;
+                dialog.show();
+                child<QComboBox>(dialog, "cb_waveform")->setCurrentText(waveform);
+                child<QComboBox>(dialog, "cb_wtype")->setCurrentIndex(variant);
+                click(dialog, "pb_next");
+                QCOMPARE(child<QWidget>(dialog, field)->isEnabled(), enabled);
+            });
+}
+
+void TestTools::createOverwritesWhenToldTo()
+{
+    DlgWvCreate dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    for (int page = 0; page < 3; ++page) {
+        click(dialog, "pb_next");
+    }
+    QVERIFY(withModal([&] { click(dialog, "pb_next"); }, press("Yes")));
+    const QString report = reportOf(dialog).toPlainText();
+    QVERIFY2(report.contains("Signal creation completed"), qPrintable(report));
+    WvFileSummary summary;
+    QVERIFY(HvFileIO().readWaveformInfo(path("tone.wv"), &summary));
+    QCOMPARE(summary.samples, 1000); // the 10 kHz sine of the start values
+    QCOMPARE(summary.clock, 10e6);
+}
+
+void TestTools::createKeepsItsSettings()
+{
+    {
+        DlgWvCreate dialog;
+        dialog.show();
+        child<QComboBox>(dialog, "cb_waveform")->setCurrentText("FM");
+        child<QComboBox>(dialog, "cb_wtype")->setCurrentText("Two Tone");
+        click(dialog, "pb_next");
+        type(child<QtNumericEdit>(dialog, "le_modfreq"), "7k");
+        QSettings settings(path("settings.ini"), QSettings::IniFormat);
+        dialog.writeSettings(settings);
+        QCOMPARE(settings.value("WvCreate/ver").toDouble(), 1.0);
+        QCOMPARE(settings.value("WvCreate/fm.modf").toDouble(), 7000.0);
+    }
+    DlgWvCreate dialog;
+    QSettings settings(path("settings.ini"), QSettings::IniFormat);
+    dialog.readSettings(settings);
+    QCOMPARE(child<QComboBox>(dialog, "cb_waveform")->currentText(), QString("FM"));
+    QCOMPARE(child<QComboBox>(dialog, "cb_wtype")->currentText(), QString("Two Tone"));
+    QCOMPARE(child<QtNumericEdit>(dialog, "le_modfreq")->getVal(), 7000.0);
+    QCOMPARE(child<QtNumericEdit>(dialog, "le_freq")->getVal(), 10000.0);
+}
+
+void TestTools::viewMovesZoomsAndPlays()
+{
+    QVERIFY(m_folder->store("long.wv", toneFile(20000)));
+    DlgView view;
+    QVERIFY(view.startModule(path("long.wv")));
+    view.show();
+    QCOMPARE(view.window().points(), 5000);
+    // A twentieth of the view is a small step; a move beyond the file leaves the view in place.
+    forRows({{"forward", "pb_forward", 5000},
+             {"a little", "pb_forward_little", 5250},
+             {"back a little", "pb_reverse_little", 5000},
+             {"back", "pb_reverse", 0},
+             {"before the start", "pb_reverse", 0},
+             {"end", "pb_end", 15000},
+             {"beyond the end", "pb_forward", 15000}},
+            [&](const char *button, int first) {
+                click(view, button);
+                QCOMPARE(view.window().first(), first);
+            });
+    click(view, "pb_zoomin");
+    QCOMPARE(view.window().points(), 2000);
+    QCOMPARE(view.window().first(), 16500); // the middle, 17500, stays
+    frameOf(view).set_position(17700);
+    click(view, "pb_play");
+    QTRY_COMPARE(view.window().first(), 18000);
+    frameOf(view).slot_playstep();
+    QCOMPARE(view.window().first(), 18000);
+    // The limits of the frequency view count in that view alone.
+    auto *mode = child<QComboBox>(view, "cb_ViewMode");
+    for (int index = 0; index < mode->count(); ++index) {
+        mode->setCurrentIndex(index);
+        QCOMPARE(child<QLabel>(view, "l_fmin")->isEnabled(), index == 5);
+    }
+}
+
+void TestTools::viewCursorsShowValuesAndDistance()
+{
+    DlgView view;
+    QVERIFY(view.startModule(path("tone.wv")));
+    view.resize(1000, 720);
+    view.show();
+    QCOMPARE(textOf(view, "l_csr_time"), QString("---"));
+    frameOf(view).set_csr_data(1000, 0.7, 0);
+    click(view, "pb_fix_ref");
+    frameOf(view).set_csr_data(3000, 0, 0.7);
+    QCOMPARE(textOf(view, "l_csr_sample"), QString("3000"));
+    QCOMPARE(textOf(view, "l_csr_time"), QString("3 ms"));
+    QCOMPARE(textOf(view, "l_csr_mag"), QString("-3.10 dB"));
+    QCOMPARE(textOf(view, "l_csr_phase"), QString("90.00 deg"));
+    QCOMPARE(textOf(view, "l_delta_samples"), QString("2000"));
+    QCOMPARE(textOf(view, "l_delta_time"), QString("2 ms"));
+    auto *trace = child<CWidgetIQTrace>(view, "w_iqtrace");
+    QTest::mouseClick(trace, Qt::LeftButton, {}, trace->rect().center());
+    QVERIFY(textOf(view, "l_csr_sample") != "3000");
+
+    // Another file has no cursors.
+    QVERIFY(m_folder->store("short.wv", toneFile(511)));
+    QVERIFY(view.startModule(path("short.wv")));
+    const auto *timeline = child<CWidgetTimeline>(view, "w_timeline");
+    QCOMPARE(timeline->scene().cursors, (std::array<qint64, 2>{-1, -1}));
+    QCOMPARE(timeline->scene().total, 511);
+    QCOMPARE(textOf(view, "l_csr_sample"), QString("---"));
+    QCOMPARE(textOf(view, "l_delta_samples"), QString("---"));
+    QCOMPARE(textOf(view, "l_file_time"), QString("511 us"));
+}
+
+void TestTools::viewRefusesAndKeeps()
+{
+    forRows({{"nothing", QByteArray(""), "No tag mark found! Probably incorrect format."},
+             {"wrong length", toneFile(100).replace("WAVEFORM-401", "WAVEFORM-4001"),
+              "Cannot read enough data from xWAVEFORM tag!"}},
+            [&](const QByteArray &content, const QString &words) {
+                QVERIFY(m_folder->store("bad.wv", content));
+                DlgView view;
+                QVERIFY(view.startModule(path("tone.wv")));
+                view.show();
+                (void)takeLog();
+                QVERIFY(!view.startModule(path("bad.wv")));
+                QCOMPARE(takeMessages(Tracer::Error).value(0), words);
+                QCOMPARE(view.window().sampleCount(), 4000);
+                QCOMPARE(view.windowTitle(), QString("View Waveform - tone.wv"));
+                click(view, "pb_zoomin");
+                QCOMPARE(view.window().points(), 2000);
+                view.close();
+                QVERIFY(m_streams.isEmpty());
+            });
+}
+
+void TestTools::viewShowsThreeSamples()
+{
+    QVERIFY(m_folder->store("three.wv", toneFile(3)));
+    DlgView view;
+    QVERIFY(view.startModule(path("three.wv")));
+    view.show();
+    QCOMPARE(view.window().points(), 3);
+    QVERIFY(!view.grab().isNull());
+    QVERIFY(takeMessages(Tracer::Error).isEmpty());
+}
 
 QTEST_MAIN(TestTools)
 #include "tst_tools.moc"
