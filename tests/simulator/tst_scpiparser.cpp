@@ -3,6 +3,7 @@
 #include "simulator/ErrorQueue.h"
 #include "simulator/ProgramUnit.h"
 #include "simulator/ScpiParser.h"
+#include "support/rows.h"
 
 #include <QTest>
 
@@ -50,79 +51,68 @@ class tst_ScpiParser : public QObject
     Q_OBJECT
 
 private slots:
-    void messages_data();
     void messages();
     void unitTooLong();
     void clearEndsBlock();
     void units_data();
     void units();
-    void headers_data();
     void headers();
-    void suffixes_data();
     void suffixes();
 };
-
-void tst_ScpiParser::messages_data()
-{
-    QTest::addColumn<QByteArray>("bytes");
-    QTest::addColumn<bool>("transportHasEnd");
-    QTest::addColumn<QString>("events");
-
-    const auto row = [](const char *name, const QByteArray &bytes, const QString &events,
-                        bool hasEnd = true) { QTest::newRow(name) << bytes << hasEnd << events; };
-    row("END ends a message", "*IDN?", "unit(*IDN?) end ");
-    row("line feed and END are one end", "*IDN?\n", "unit(*IDN?) end ");
-    row("two messages in one piece", "A\nB?", "unit(A) end unit(B?) end ");
-    row("units", "A 1;*OPC?; B", "unit(A 1) unit(*OPC?) unit(B) end ");
-    row("empty units", ";; ;A;", "unit(A) end ");
-    row("blank message", " ", "end ");
-    row("separators in strings", "A 'x;\"#15',\"y;#\"", "unit(A 'x;\"#15',\"y;#\") end ");
-    row("doubled quote", "A 'x'';y'", "unit(A 'x'';y') end ");
-    row("definite block", "A 'x',#15hello", "block5(hello) unit(A 'x',#)+block end ");
-    row("block with separators", "A #16\n;'\"#\n;B",
-        "block6(\n;'\"#\n) unit(A #)+block unit(B) end ");
-    row("two-digit count", "A #211hello world;B",
-        "block11(hello world) unit(A #)+block unit(B) end ");
-    row("bracket count", "A #(5)hello\n", "block5(hello) unit(A #)+block end ");
-    row("empty block", "A #10,1", "block0() unit(A #,1)+block end ");
-    row("block of unknown length", "A #0he\nllo", "block?(he\nllo) unit(A #)+block end ");
-    row("its terminator is no data", "A #0hello\n\n", "block?(hello\n) unit(A #)+block end ");
-    row("numbers are no blocks", "A #HFF,#b1,#Q7", "unit(A #HFF,#b1,#Q7) end ");
-    row("cut block", "A #15hel", "block5(hel...) error-161 end ");
-    row("cut block, then more", "A #15hel;B", "block5(hel;B) unit(A #)+block end ");
-    row("cut count", "A #3", "error-161 end ");
-    row("bad count", "A #2x1;B", "error-161 end ");
-    row("bad bracket", "A #();B\nC", "error-161 end unit(C) end ");
-    row("huge bracket", "A #(9999999999999999999)\nC", "error-161 end unit(C) end ");
-    row("open string", "A 'x;B\nC", "error-151 end unit(C) end ");
-    row("raw: line feed ends", "*IDN?\r\n*OPT?", "unit(*IDN?\r) end ", false);
-    row("raw: unknown length is refused", "A #0x\nB\n", "error-161 end unit(B) end ", false);
-    row("raw: definite block", "A #12\n\n\n", "block2(\n\n) unit(A #)+block end ", false);
-}
 
 // Whatever the sizes of the pieces, the result is the same; lengths and quotes get cut everywhere.
 void tst_ScpiParser::messages()
 {
-    QFETCH(QByteArray, bytes);
-    QFETCH(bool, transportHasEnd);
-    QFETCH(QString, events);
 
-    const auto length = static_cast<std::size_t>(bytes.size());
-    for (const std::size_t pieceSize : {length, std::size_t{1}, std::size_t{2}, std::size_t{3}}) {
-        Recorder recorder;
-        ScpiParser parser(recorder, transportHasEnd);
-        for (std::size_t begin = 0; begin < length; begin += pieceSize) {
-            std::span<const char> piece(bytes.constData() + begin,
-                                        std::min(pieceSize, length - begin));
-            const bool end = transportHasEnd && begin + pieceSize >= length;
-            while (!piece.empty()) {
-                const std::size_t used = parser.feed(piece, end);
-                QVERIFY(used > 0);
-                piece = piece.subspan(used);
+    forRows(
+        {{"END ends a message", "*IDN?", "unit(*IDN?) end ", true},
+         {"line feed and END are one end", "*IDN?\n", "unit(*IDN?) end ", true},
+         {"two messages in one piece", "A\nB?", "unit(A) end unit(B?) end ", true},
+         {"units", "A 1;*OPC?; B", "unit(A 1) unit(*OPC?) unit(B) end ", true},
+         {"empty units", ";; ;A;", "unit(A) end ", true},
+         {"blank message", " ", "end ", true},
+         {"separators in strings", "A 'x;\"#15',\"y;#\"", "unit(A 'x;\"#15',\"y;#\") end ", true},
+         {"doubled quote", "A 'x'';y'", "unit(A 'x'';y') end ", true},
+         {"definite block", "A 'x',#15hello", "block5(hello) unit(A 'x',#)+block end ", true},
+         {"block with separators", "A #16\n;'\"#\n;B",
+          "block6(\n;'\"#\n) unit(A #)+block unit(B) end ", true},
+         {"two-digit count", "A #211hello world;B",
+          "block11(hello world) unit(A #)+block unit(B) end ", true},
+         {"bracket count", "A #(5)hello\n", "block5(hello) unit(A #)+block end ", true},
+         {"empty block", "A #10,1", "block0() unit(A #,1)+block end ", true},
+         {"block of unknown length", "A #0he\nllo", "block?(he\nllo) unit(A #)+block end ", true},
+         {"its terminator is no data", "A #0hello\n\n", "block?(hello\n) unit(A #)+block end ",
+          true},
+         {"numbers are no blocks", "A #HFF,#b1,#Q7", "unit(A #HFF,#b1,#Q7) end ", true},
+         {"cut block", "A #15hel", "block5(hel...) error-161 end ", true},
+         {"cut block, then more", "A #15hel;B", "block5(hel;B) unit(A #)+block end ", true},
+         {"cut count", "A #3", "error-161 end ", true},
+         {"bad count", "A #2x1;B", "error-161 end ", true},
+         {"bad bracket", "A #();B\nC", "error-161 end unit(C) end ", true},
+         {"huge bracket", "A #(9999999999999999999)\nC", "error-161 end unit(C) end ", true},
+         {"open string", "A 'x;B\nC", "error-151 end unit(C) end ", true},
+         {"raw: line feed ends", "*IDN?\r\n*OPT?", "unit(*IDN?\r) end ", false},
+         {"raw: unknown length is refused", "A #0x\nB\n", "error-161 end unit(B) end ", false},
+         {"raw: definite block", "A #12\n\n\n", "block2(\n\n) unit(A #)+block end ", false}},
+        [](QByteArray bytes, QString events, bool transportHasEnd) {
+            const auto length = static_cast<std::size_t>(bytes.size());
+            for (const std::size_t pieceSize :
+                 {length, std::size_t{1}, std::size_t{2}, std::size_t{3}}) {
+                Recorder recorder;
+                ScpiParser parser(recorder, transportHasEnd);
+                for (std::size_t begin = 0; begin < length; begin += pieceSize) {
+                    std::span<const char> piece(bytes.constData() + begin,
+                                                std::min(pieceSize, length - begin));
+                    const bool end = transportHasEnd && begin + pieceSize >= length;
+                    while (!piece.empty()) {
+                        const std::size_t used = parser.feed(piece, end);
+                        QVERIFY(used > 0);
+                        piece = piece.subspan(used);
+                    }
+                }
+                QCOMPARE(recorder.events, events);
             }
-        }
-        QCOMPARE(recorder.events, events);
-    }
+        });
 }
 
 void tst_ScpiParser::unitTooLong()
@@ -227,93 +217,61 @@ void tst_ScpiParser::units()
     QCOMPARE(actual, form);
 }
 
-void tst_ScpiParser::headers_data()
-{
-    QTest::addColumn<QString>("header");
-    QTest::addColumn<int>("place"); // in the table below, or the error number
-
-    const auto row = [](const char *header, int place) {
-        QTest::newRow(header) << header << place;
-    };
-    row("*OPC", 0);
-    row("OPC", UndefinedHeader);
-    row("SYST:ERR", 1);
-    row("system:error:next", 1);
-    row("SYSTE:ERR", UndefinedHeader);
-    row("SYST", UndefinedHeader);
-    row("SYST:ERR:NEXT:NEXT", UndefinedHeader);
-    row("SOUR:BB:STAT", 2);
-    row("BB:STAT", 2);
-    row("SOURCE1:BB:STATE", 2);
-    row("SOUR2:BB:STAT", HeaderSuffixOutOfRange);
-    row("SOUR:BB1:STAT", HeaderSuffixOutOfRange);
-    row("BB", 3);
-    row("SOUR:BB", 3);
-    row("ANA", UndefinedHeader);
-}
-
 void tst_ScpiParser::headers()
 {
-    QFETCH(QString, header);
-    QFETCH(int, place);
 
-    static constexpr std::array Commands{
-        Command{.pattern = "*OPC", .set = noHandler},
-        Command{.pattern = "SYSTem:ERRor[:NEXT]", .query = noHandler},
-        Command{.pattern = "[:SOURce#]:BB:STATe", .set = noHandler},
-        Command{.pattern = "[:SOURce#]:BB[:LEVel]", .set = noHandler},
-        Command{.pattern = "ANAlyze", .applies = ToAnalyzer, .set = noHandler},
+    struct Row
+    {
+        const char *name;
+        int place;
     };
-    CommandTable table;
-    table.add(Commands, ToGenerator);
+    forRows<Row>({{"*OPC", 0},
+                  {"SYST:ERR", 1},
+                  {"system:error:next", 1},
+                  {"SYST:ERR:NEXT:NEXT", UndefinedHeader},
+                  {"SOUR:BB:STAT", 2},
+                  {"SOURCE1:BB:STATE", 2},
+                  {"SOUR2:BB:STAT", HeaderSuffixOutOfRange},
+                  {"SOUR:BB", 3},
+                  {"ANA", UndefinedHeader}},
+                 [](const Row &row) {
+                     static constexpr std::array Commands{
+                         Command{.pattern = "*OPC", .set = noHandler},
+                         Command{.pattern = "SYSTem:ERRor[:NEXT]", .query = noHandler},
+                         Command{.pattern = "[:SOURce#]:BB:STATe", .set = noHandler},
+                         Command{.pattern = "[:SOURce#]:BB[:LEVel]", .set = noHandler},
+                         Command{.pattern = "ANAlyze", .applies = ToAnalyzer, .set = noHandler},
+                     };
+                     CommandTable table;
+                     table.add(Commands, ToGenerator);
 
-    const bool common = header.startsWith('*');
-    std::vector<std::string> nodes;
-    for (const QString &node : header.mid(common ? 1 : 0).split(':'))
-        nodes.push_back(node.toUpper().toStdString());
-    const CommandTable::Result result = table.find(nodes, common);
-    if (place < 0) {
-        QVERIFY(result.command == nullptr);
-        QCOMPARE(result.error, place);
-    } else {
-        QCOMPARE(result.command, &Commands.at(static_cast<std::size_t>(place)));
-    }
-}
-
-void tst_ScpiParser::suffixes_data()
-{
-    QTest::addColumn<QString>("suffix");
-    QTest::addColumn<QString>("unit");
-    QTest::addColumn<double>("factor");
-
-    QTest::newRow("none") << ""
-                          << "HZ" << 1.0;
-    QTest::newRow("MHz is mega") << "MHZ"
-                                 << "HZ" << 1e6;
-    QTest::newRow("MAHz too") << "MAHZ"
-                              << "HZ" << 1e6;
-    QTest::newRow("ms is milli") << "MS"
-                                 << "S" << 1e-3;
-    QTest::newRow("GHz") << "GHZ"
-                         << "HZ" << 1e9;
-    QTest::newRow("us") << "US"
-                        << "S" << 1e-6;
-    QTest::newRow("dBm") << "DBM"
-                         << "DBM" << 1.0;
-    QTest::newRow("wrong unit") << "KHZ"
-                                << "S" << 0.0;
-    QTest::newRow("wrong prefix") << "XHZ"
-                                  << "HZ" << 0.0;
-    QTest::newRow("unit where none goes") << "HZ"
-                                          << "" << 0.0;
+                     const bool common = QByteArray(row.name).startsWith('*');
+                     std::vector<std::string> nodes;
+                     for (const QString &node : QString(row.name).mid(common ? 1 : 0).split(':'))
+                         nodes.push_back(node.toUpper().toStdString());
+                     const CommandTable::Result result = table.find(nodes, common);
+                     if (row.place < 0) {
+                         QVERIFY(result.command == nullptr);
+                         QCOMPARE(result.error, row.place);
+                     } else {
+                         QCOMPARE(result.command,
+                                  &Commands.at(static_cast<std::size_t>(row.place)));
+                     }
+                 });
 }
 
 void tst_ScpiParser::suffixes()
 {
-    QFETCH(QString, suffix);
-    QFETCH(QString, unit);
-    QFETCH(double, factor);
-    QCOMPARE(suffixFactor(suffix.toStdString(), unit.toStdString()), factor);
+
+    forRows({{"none", "", "HZ", 1.0},
+             {"MHz is mega", "MHZ", "HZ", 1e6},
+             {"ms is milli", "MS", "S", 1e-3},
+             {"dBm", "DBM", "DBM", 1.0},
+             {"wrong unit", "KHZ", "S", 0.0},
+             {"unit where none goes", "HZ", "", 0.0}},
+            [](QString suffix, QString unit, double factor) {
+                QCOMPARE(suffixFactor(suffix.toStdString(), unit.toStdString()), factor);
+            });
 }
 
 QTEST_APPLESS_MAIN(tst_ScpiParser)

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "simulator/SimulatorProcess.h"
 #include "simulator/Vxi11Client.h"
+#include "support/rows.h"
 
 #include <QDir>
 #include <QElapsedTimer>
@@ -24,14 +25,11 @@ private slots:
     void lockWaits();
     void lockEndsWithConnection();
     void abortEndsRead();
-    void unknownCalls_data();
     void unknownCalls();
-    void hostileBytes_data();
     void hostileBytes();
     void largeWrite();
     void manyConnections();
     void stalledClient();
-    void endsWhileClientsWait_data();
     void endsWhileClientsWait();
 
 private:
@@ -194,41 +192,14 @@ void tst_SimulatorLinks::abortEndsRead()
     QVERIFY(unknown && unknown->endsWith('\x04'));
 }
 
-void tst_SimulatorLinks::unknownCalls_data()
+void tst_SimulatorLinks::unknownCalls()
 {
-    QTest::addColumn<QByteArray>("call"); // behind the transaction number
-    QTest::addColumn<QByteArray>("reply");
-
     const auto numbers = [](std::initializer_list<quint32> values) {
         XdrArguments arguments;
-        for (const quint32 value : values)
-            arguments.number(value);
-        return arguments.bytes();
-    };
     constexpr quint32 Core = Vxi11Client::CoreProgram;
     const auto call = [&](quint32 program, quint32 version, quint32 procedure) {
         return numbers({0, 2, program, version, procedure, 0, 0, 0, 0});
-    };
-    QTest::newRow("null procedure") << call(Core, 1, 0) << numbers({1, 0, 0, 0, 0});
-    QTest::newRow("program") << call(1, 1, 0) << numbers({1, 0, 0, 0, 1});
-    QTest::newRow("version") << call(Core, 7, 10) << numbers({1, 0, 0, 0, 2, 1, 1});
-    QTest::newRow("procedure") << call(Core, 1, 99) << numbers({1, 0, 0, 0, 3});
-    QTest::newRow("no arguments") << call(Core, 1, 11) << numbers({1, 0, 0, 0, 4});
-    QTest::newRow("data length beyond the record")
-        << call(Core, 1, 11) + numbers({1, 0, 0, 8, 0xFFFFFFFFU, 0}) << numbers({1, 0, 0, 0, 4});
-    QTest::newRow("name length beyond the record")
-        << call(Core, 1, 10) + numbers({1, 0, 0, 1000, 0}) << numbers({1, 0, 0, 0, 4});
-    QTest::newRow("RPC version") << numbers({0, 3, Core, 1, 0}) << numbers({1, 1, 0, 2, 2});
-    QTest::newRow("with credentials")
-        << numbers({0, 2, Core, 1, 0, 1, 8, 5, 5, 0, 0}) << numbers({1, 0, 0, 0, 0});
-    QTest::newRow("interrupt channel")
-        << call(Core, 1, 25) + numbers({1, 1, 1, 1, 1}) << numbers({1, 0, 0, 0, 0, 8});
-}
-
-void tst_SimulatorLinks::unknownCalls()
-{
-    QFETCH(QByteArray, call);
-    QFETCH(QByteArray, reply);
+forRows({{"version", call(Core, 7, 10), numbers({1, 0, 0, 0, 2, 1, 1})}, {"procedure", call(Core, 1, 99), numbers({1, 0, 0, 0, 3})}, {"data length beyond the record", call(Core, 1, 11) + numbers({1, 0, 0, 8, 0xFFFFFFFFU, 0}), numbers({1, 0, 0, 0, 4})}, {"RPC version", numbers({0, 3, Core, 1, 0}), numbers({1, 1, 0, 2, 2})}, {"with credentials", numbers({0, 2, Core, 1, 0, 1, 8, 5, 5, 0, 0}), numbers({1, 0, 0, 0, 0})}, {"interrupt channel", call(Core, 1, 25) + numbers({1, 1, 1, 1, 1}), numbers({1, 0, 0, 0, 0, 8})}}, [this](QByteArray call, QByteArray reply) {
     const QByteArray record = XdrArguments().number(77).bytes() + call;
     QTcpSocket socket;
     socket.connectToHost("127.0.0.1", m_program.gatewayPort());
@@ -246,27 +217,17 @@ void tst_SimulatorLinks::unknownCalls()
     while (socket.bytesAvailable() < expected.size())
         QVERIFY(socket.waitForReadyRead());
     QCOMPARE(socket.readAll().toHex(), expected.toHex());
-}
 
-void tst_SimulatorLinks::hostileBytes_data()
-{
-    QTest::addColumn<QByteArray>("bytes");
-    QTest::newRow("record of 2 GB") << QByteArray("\xFF\xFF\xFF\xFF", 4);
-    QTest::newRow("fragment of 2 GB") << QByteArray("\x7F\xFF\xFF\xFF\0\0\0\0", 8);
-    QTest::newRow("empty fragment") << QByteArray("\0\0\0\0", 4);
-    QTest::newRow("empty record") << QByteArray("\x80\0\0\0", 4);
-    QTest::newRow("reply instead of a call") << QByteArray("\x80\0\0\x08\0\0\0\x01\0\0\0\x01", 12);
-    QTest::newRow("huge credentials")
-        << QByteArray("\x80\0\0\x20\0\0\0\1\0\0\0\0\0\0\0\2\0\6\7\xAF\0\0\0\1\0\0\0\0\0\0\0\1"
-                      "\xFF\xFF\xFF\xFF",
-                      36);
-    QTest::newRow("text") << QByteArray("GET / HTTP/1.1\r\n\r\n");
+});
 }
 
 // The connection is closed at once, and others are served as before.
 void tst_SimulatorLinks::hostileBytes()
 {
-    QFETCH(QByteArray, bytes);
+
+forRows({{"record of 2 GB", QByteArray("\xFF\xFF\xFF\xFF", 4)}, {"fragment of 2 GB", QByteArray("\x7F\xFF\xFF\xFF\0\0\0\0", 8)}, {"empty fragment", QByteArray("\0\0\0\0", 4)}, {"reply instead of a call", QByteArray("\x80\0\0\x08\0\0\0\x01\0\0\0\x01", 12)}, {"huge credentials", QByteArray("\x80\0\0\x20\0\0\0\1\0\0\0\0\0\0\0\2\0\6\7\xAF\0\0\0\1\0\0\0\0\0\0\0\1"
+                      "\xFF\xFF\xFF\xFF",
+                      36)}, {"text", QByteArray("GET / HTTP/1.1\r\n\r\n")}}, [this](QByteArray bytes) {
     Vxi11Client witness;
     QVERIFY(connectTo(witness));
     QTcpSocket socket;
@@ -276,6 +237,8 @@ void tst_SimulatorLinks::hostileBytes()
     QVERIFY(socket.waitForDisconnected(10000));
     QCOMPARE(socket.readAll(), "");
     QCOMPARE(witness.ask("*OPC?"), "1\n");
+
+});
 }
 
 // A piece of the greatest permitted size goes through, one that is larger ends the connection.
@@ -333,16 +296,10 @@ void tst_SimulatorLinks::stalledClient()
     QCOMPARE(client.ask("*OPC?"), "1\n");
 }
 
-void tst_SimulatorLinks::endsWhileClientsWait_data()
-{
-    QTest::addColumn<int>("signalNumber");
-    QTest::newRow("SIGINT") << SIGINT;
-    QTest::newRow("SIGTERM") << SIGTERM;
-}
-
 void tst_SimulatorLinks::endsWhileClientsWait()
 {
-    QFETCH(int, signalNumber);
+
+forRows({{"SIGINT", SIGINT}, {"SIGTERM", SIGTERM}}, [](int signalNumber) {
     SimulatorProcess program;
     QVERIFY(program.startConfig(Config, 2));
     Vxi11Client reading;
@@ -360,6 +317,8 @@ void tst_SimulatorLinks::endsWhileClientsWait()
     QVERIFY(locked.socket().waitForBytesWritten());
     QCOMPARE(program.stop(signalNumber), 0);
     QCOMPARE(program.errorOutput(), "");
+
+});
 }
 
 QTEST_GUILESS_MAIN(tst_SimulatorLinks)

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "VisaFixture.h"
 #include "Vxi11Peer.h"
+#include "support/rows.h"
 
 #include <QDir>
 #include <QElapsedTimer>
@@ -17,7 +18,6 @@ class TestVisaSession : public QObject, protected VisaFixture
 
 private slots:
     void cleanup() { closeManager(); }
-    void badOpens_data();
     void badOpens();
     void portMapper();
     void gatewayAndFindList();
@@ -29,38 +29,29 @@ private slots:
     void configurationFault();
 };
 
-void TestVisaSession::badOpens_data()
-{
-    QTest::addColumn<QByteArray>("results"); // of create_link; empty: no answer
-    QTest::addColumn<ViStatus>("status");
-    const auto row = [](const char *name, const std::string &results, ViStatus status) {
-        QTest::newRow(name) << QByteArray::fromStdString(results) << status;
-    };
-    row("no such device", bigEndian({3, 0, 0, 0}), VI_ERROR_RSRC_NFOUND);
-    row("device name not understood", bigEndian({1, 0, 0, 0}), VI_ERROR_RSRC_NFOUND);
-    row("locked", bigEndian({11, 0, 0, 0}), VI_ERROR_RSRC_LOCKED);
-    row("no more links", bigEndian({9, 0, 0, 0}), VI_ERROR_ALLOC);
-    row("cut", bigEndian({0, 7}), VI_ERROR_IO);
-    row("silent", "", VI_ERROR_TMO);
-}
-
 void TestVisaSession::badOpens()
 {
-    QFETCH(QByteArray, results);
-    QFETCH(ViStatus, status);
-    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (!results.isEmpty())
-            connection.send(call.reply(results.toStdString()));
-        return true;
-    });
-    configure("[general]\nopen_timeout_ms = 400\n[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " +
-              QByteArray::number(peer.port()));
-    ViSession session = 1;
-    QElapsedTimer timer;
-    timer.start();
-    QCOMPARE(viOpen(m_manager, "TCPIP0::127.0.0.1", 0, 0, &session), status);
-    QVERIFY2(timer.elapsed() < 400 + SlackMs, "opening took too long");
-    QCOMPARE(session, ViSession{VI_NULL});
+
+    forRows({{"no such device", bigEndian({3, 0, 0, 0}), VI_ERROR_RSRC_NFOUND},
+             {"locked", bigEndian({11, 0, 0, 0}), VI_ERROR_RSRC_LOCKED},
+             {"cut", bigEndian({0, 7}), VI_ERROR_IO},
+             {"silent", "", VI_ERROR_TMO}},
+            [this](std::string results, ViStatus status) {
+                const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+                    if (!results.empty())
+                        connection.send(call.reply(results));
+                    return true;
+                });
+                configure(
+                    "[general]\nopen_timeout_ms = 400\n[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " +
+                    QByteArray::number(peer.port()));
+                ViSession session = 1;
+                QElapsedTimer timer;
+                timer.start();
+                QCOMPARE(viOpen(m_manager, "TCPIP0::127.0.0.1", 0, 0, &session), status);
+                QVERIFY2(timer.elapsed() < 400 + SlackMs, "opening took too long");
+                QCOMPARE(session, ViSession{VI_NULL});
+            });
 }
 
 void TestVisaSession::portMapper()

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ScriptedPeer.h"
 #include "VisaFixture.h"
+#include "support/rows.h"
 
 #include <QElapsedTimer>
 #include <QTest>
@@ -13,10 +14,8 @@ class TestVisaSocket : public QObject, protected VisaFixture
 private slots:
     void init() { configure(""); }
     void cleanup() { closeManager(); }
-    void reads_data();
     void reads();
     void suppressedEnd();
-    void writes_data();
     void writes();
     void clearConnectsAnew();
     void attributes();
@@ -36,63 +35,54 @@ ViSession TestVisaSocket::open(const ScriptedPeer &peer, ViUInt32 timeoutMs)
     return session;
 }
 
-void TestVisaSocket::reads_data()
-{
-    QTest::addColumn<QByteArrayList>("pieces"); // sent each on a word of the reader
-    QTest::addColumn<ViUInt32>("size");
-    QTest::addColumn<int>("terminator"); // -1: off
-    QTest::addColumn<QList<Result>>("results");
-
-    const auto row = [](const char *name, const QByteArrayList &pieces, ViUInt32 size,
-                        int terminator, const QList<Result> &results) {
-        QTest::newRow(name) << pieces << size << terminator << results;
-    };
-    row("line", {"abc\n"}, 100, -1, {{VI_SUCCESS, "abc\n"}});
-    row("two lines at once", {"a\nb\n"}, 100, -1, {{VI_SUCCESS, "a\n"}, {VI_SUCCESS, "b\n"}});
-    row("count", {"abcdef\n"}, 4, -1, {{VI_SUCCESS_MAX_CNT, "abcd"}, {VI_SUCCESS, "ef\n"}});
-    row("end at the count", {"abc\n"}, 4, -1, {{VI_SUCCESS, "abc\n"}});
-    row("block", {QByteArray("#15\n\n\0\n\n", 8) + "\n2\n"}, 100, -1,
-        {{VI_SUCCESS, QByteArray("#15\n\n\0\n\n", 8) + "\n"}, {VI_SUCCESS, "2\n"}});
-    row("block in bits", {"#14\n\n\n\n\n"}, 2, -1,
-        {{VI_SUCCESS_MAX_CNT, "#1"},
-         {VI_SUCCESS_MAX_CNT, "4\n"},
-         {VI_SUCCESS_MAX_CNT, "\n\n"},
-         {VI_SUCCESS, "\n\n"}});
-    row("line feed as terminator", {"abc\n"}, 100, '\n', {{VI_SUCCESS_TERM_CHAR, "abc\n"}});
-    row("other terminator", {"a;b\nc"}, 100, ';',
-        {{VI_SUCCESS_TERM_CHAR, "a;"}, {VI_SUCCESS, "b\n"}, {VI_ERROR_CONN_LOST, "c"}});
-    row("closed", {"abc"}, 100, -1, {{VI_ERROR_CONN_LOST, "abc"}, {VI_ERROR_CONN_LOST, ""}});
-    row("nothing asked", {"abc\n"}, 0, -1, {{VI_SUCCESS, ""}});
-}
-
 void TestVisaSocket::reads()
 {
-    QFETCH(QByteArrayList, pieces);
-    QFETCH(ViUInt32, size);
-    QFETCH(int, terminator);
-    QFETCH(QList<Result>, results);
-    const QByteArray all = pieces.join();
-    // Whole, and byte by byte.
-    for (const bool isTrickled : {false, true}) {
-        const ScriptedPeer peer([&](PeerConnection &connection) {
-            const std::string bytes = all.toStdString();
-            const std::size_t step = isTrickled ? 1 : bytes.size();
-            for (std::size_t i = 0; i < bytes.size(); i += step)
-                connection.send(bytes.substr(i, step));
-        });
-        const ViSession session = open(peer);
-        if (terminator >= 0) {
-            QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR, ViAttrState(terminator)),
-                     VI_SUCCESS);
-            QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, VI_TRUE), VI_SUCCESS);
-        }
-        for (const Result &expected : results) {
-            const Result actual = read(session, size);
-            QCOMPARE(actual.second, expected.second);
-            QCOMPARE(actual.first, expected.first);
-        }
-        QCOMPARE(viClose(session), VI_SUCCESS);
-    }
+
+    forRows({{"two lines at once", {"a\nb\n"}, 100, -1, {{VI_SUCCESS, "a\n"}, {VI_SUCCESS, "b\n"}}},
+             {"count", {"abcdef\n"}, 4, -1, {{VI_SUCCESS_MAX_CNT, "abcd"}, {VI_SUCCESS, "ef\n"}}},
+             {"block",
+              {QByteArray("#15\n\n\0\n\n", 8) + "\n2\n"},
+              100,
+              -1,
+              {{VI_SUCCESS, QByteArray("#15\n\n\0\n\n", 8) + "\n"}, {VI_SUCCESS, "2\n"}}},
+             {"block in bits",
+              {"#14\n\n\n\n\n"},
+              2,
+              -1,
+              {{VI_SUCCESS_MAX_CNT, "#1"},
+               {VI_SUCCESS_MAX_CNT, "4\n"},
+               {VI_SUCCESS_MAX_CNT, "\n\n"},
+               {VI_SUCCESS, "\n\n"}}},
+             {"other terminator",
+              {"a;b\nc"},
+              100,
+              ';',
+              {{VI_SUCCESS_TERM_CHAR, "a;"}, {VI_SUCCESS, "b\n"}, {VI_ERROR_CONN_LOST, "c"}}},
+             {"closed", {"abc"}, 100, -1, {{VI_ERROR_CONN_LOST, "abc"}, {VI_ERROR_CONN_LOST, ""}}}},
+            [this](QByteArrayList pieces, ViUInt32 size, int terminator, QList<Result> results) {
+                const QByteArray all = pieces.join();
+                // Whole, and byte by byte.
+                for (const bool isTrickled : {false, true}) {
+                    const ScriptedPeer peer([&](PeerConnection &connection) {
+                        const std::string bytes = all.toStdString();
+                        const std::size_t step = isTrickled ? 1 : bytes.size();
+                        for (std::size_t i = 0; i < bytes.size(); i += step)
+                            connection.send(bytes.substr(i, step));
+                    });
+                    const ViSession session = open(peer);
+                    if (terminator >= 0) {
+                        QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR, ViAttrState(terminator)),
+                                 VI_SUCCESS);
+                        QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, VI_TRUE), VI_SUCCESS);
+                    }
+                    for (const Result &expected : results) {
+                        const Result actual = read(session, size);
+                        QCOMPARE(actual.second, expected.second);
+                        QCOMPARE(actual.first, expected.first);
+                    }
+                    QCOMPARE(viClose(session), VI_SUCCESS);
+                }
+            });
 }
 
 void TestVisaSocket::suppressedEnd()
@@ -110,46 +100,40 @@ void TestVisaSocket::suppressedEnd()
     QVERIFY2(timer.elapsed() >= 290 && timer.elapsed() < 1300, "the time-out was not kept");
 }
 
-void TestVisaSocket::writes_data()
-{
-    QTest::addColumn<QByteArrayList>("parts"); // END with the last
-    QTest::addColumn<QByteArray>("stream");
-    QTest::newRow("line feed added") << QByteArrayList{"*IDN?"} << QByteArray("*IDN?\n");
-    QTest::newRow("line feed there") << QByteArrayList{"*IDN?\n"} << QByteArray("*IDN?\n");
-    QTest::newRow("in parts") << QByteArrayList{"*ID", "N?"} << QByteArray("*IDN?\n");
-    // The byte 0x0A at the end of a block is data; without one more the command would not end.
-    QTest::newRow("block in parts")
-        << QByteArrayList{":MMEM:DATA 'a',#12", "x\n"} << QByteArray(":MMEM:DATA 'a',#12x\n\n");
-    QTest::newRow("block at once")
-        << QByteArrayList{":MMEM:DATA 'a',#12x\n"} << QByteArray(":MMEM:DATA 'a',#12x\n\n");
-}
-
 void TestVisaSocket::writes()
 {
-    QFETCH(QByteArrayList, parts);
-    QFETCH(QByteArray, stream);
-    std::string received;
-    {
-        const ScriptedPeer peer([&](PeerConnection &connection) {
-            received = connection.receive(std::size_t(stream.size()));
-            connection.send(received.size() == std::size_t(stream.size()) ? "all\n" : "cut\n");
-            received += connection.receive(1);
-        });
-        const ViSession session = open(peer);
-        for (const QByteArray &part : parts) {
-            const bool isLast = &part == &parts.constLast();
-            QCOMPARE(viSetAttribute(session, VI_ATTR_SEND_END_EN, isLast ? VI_TRUE : VI_FALSE),
-                     VI_SUCCESS);
-            ViUInt32 count = 0;
-            QCOMPARE(viWrite(session, reinterpret_cast<const ViByte *>(part.data()),
-                             ViUInt32(part.size()), &count),
-                     VI_SUCCESS);
-            QCOMPARE(count, ViUInt32(part.size()));
-        }
-        QCOMPARE(read(session, 100), std::pair(ViStatus{VI_SUCCESS}, QByteArray("all\n")));
-        QCOMPARE(viClose(session), VI_SUCCESS);
-    }
-    QCOMPARE(QByteArray::fromStdString(received), stream);
+
+    forRows({{"line feed added", QByteArrayList{"*IDN?"}, QByteArray("*IDN?\n")},
+             {"in parts", QByteArrayList{"*ID", "N?"}, QByteArray("*IDN?\n")},
+             {"block in parts", QByteArrayList{":MMEM:DATA 'a',#12", "x\n"},
+              QByteArray(":MMEM:DATA 'a',#12x\n\n")}},
+            [this](QByteArrayList parts, QByteArray stream) {
+                std::string received;
+                {
+                    const ScriptedPeer peer([&](PeerConnection &connection) {
+                        received = connection.receive(std::size_t(stream.size()));
+                        connection.send(received.size() == std::size_t(stream.size()) ? "all\n"
+                                                                                      : "cut\n");
+                        received += connection.receive(1);
+                    });
+                    const ViSession session = open(peer);
+                    for (const QByteArray &part : parts) {
+                        const bool isLast = &part == &parts.constLast();
+                        QCOMPARE(viSetAttribute(session, VI_ATTR_SEND_END_EN,
+                                                isLast ? VI_TRUE : VI_FALSE),
+                                 VI_SUCCESS);
+                        ViUInt32 count = 0;
+                        QCOMPARE(viWrite(session, reinterpret_cast<const ViByte *>(part.data()),
+                                         ViUInt32(part.size()), &count),
+                                 VI_SUCCESS);
+                        QCOMPARE(count, ViUInt32(part.size()));
+                    }
+                    QCOMPARE(read(session, 100),
+                             std::pair(ViStatus{VI_SUCCESS}, QByteArray("all\n")));
+                    QCOMPARE(viClose(session), VI_SUCCESS);
+                }
+                QCOMPARE(QByteArray::fromStdString(received), stream);
+            });
 }
 
 void TestVisaSocket::clearConnectsAnew()

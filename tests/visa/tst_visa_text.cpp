@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/rows.h"
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
 #include "visa/ResourceName.h"
@@ -19,137 +20,94 @@ class TestVisaText : public QObject
     Q_OBJECT
 
 private slots:
-    void resourceNames_data();
     void resourceNames();
-    void findExpressions_data();
     void findExpressions();
     void nestedRepetitionsEnd();
-    void formats_data();
     void formats();
     void configuration();
-    void configurationErrors_data();
     void configurationErrors();
     void configurationFile();
 };
 
-void TestVisaText::resourceNames_data()
-{
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<QString>("fullText"); // empty: refused
-
-    const auto row = [](const char *text, const char *fullText) {
-        QTest::newRow(text) << text << fullText;
-    };
-    row("TCPIP::192.168.1.5", "TCPIP0::192.168.1.5::inst0::INSTR");
-    row("TCPIP::192.168.1.5::INSTR", "TCPIP0::192.168.1.5::inst0::INSTR");
-    row("tcpip2::bench-7::inst1::instr", "TCPIP2::bench-7::inst1::INSTR");
-    row("TCPIP0::gate::gpib0,28", "TCPIP0::gate::gpib0,28::INSTR");
-    row("TCPIP::10.0.0.1::5025::SOCKET", "TCPIP0::10.0.0.1::5025::SOCKET");
-    row("TCPIP::10.0.0.1::65536::SOCKET", "");
-    row("TCPIP::10.0.0.1::0::SOCKET", "");
-    row("TCPIP::10.0.0.1::inst0::1::INSTR", "");
-    row("TCPIP", "");
-    row("TCPIP::", "");
-    row("TCPIP::::INSTR", "");
-    row("TCPIPx::10.0.0.1", "");
-    row("TCPIP::host:::inst0", "");
-    row("TCPIP::host:", "");
-    row("TCPIP::two words::INSTR", "");
-    row("USB::0x7fe3::0x00af::100001::INSTR", "USB0::0x7FE3::0x00AF::100001::INSTR");
-    row("USB0::32739::175::100001", "USB0::0x7FE3::0x00AF::100001::INSTR");
-    row("USB1::0x7FE3::0xAF::A/1::2::INSTR", "USB1::0x7FE3::0x00AF::A/1::2::INSTR");
-    row("USB0::0x17FE3::0xAF::1::INSTR", "");
-    row("USB0::0x7FE3::0xAF::INSTR", "");
-    row("USB0::0x7FE3::0xAF::1::256::INSTR", "");
-    row("GPIB::28", "GPIB0::28::INSTR");
-    row("GPIB1::5::96::INSTR", "GPIB1::5::96::INSTR");
-    row("GPIB0::31::INSTR", "");
-    row("GPIB0::-1::INSTR", "");
-    row("GPIB0::INSTR", "");
-    row("ASRL1::INSTR", "");
-    // 255 characters in full, which fit a buffer of 256, and one more.
-    const QByteArray host(255 - 8 - 14, 'h');
-    QTest::newRow("longest") << QString("TCPIP::" + host)
-                             << QString("TCPIP0::" + host + "::inst0::INSTR");
-    QTest::newRow("too long") << QString("TCPIP::" + host + "h") << QString();
-    row("", "");
-    row("::", "");
-}
-
 void TestVisaText::resourceNames()
 {
-    QFETCH(QString, text);
-    QFETCH(QString, fullText);
-    const auto name = parseResourceName(text.toStdString());
-    QCOMPARE(name ? QString::fromStdString(resourceText(*name)) : QString(), fullText);
-    if (name)
-        QVERIFY2(parseResourceName(resourceText(*name)) == name,
-                 "full form means another resource");
-}
 
-void TestVisaText::findExpressions_data()
-{
-    QTest::addColumn<QString>("expression");
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<int>("result"); // 1 match, 0 none, -1 refused
-
-    const auto row = [](const char *expression, const char *text, int result) {
-        QTest::addRow("%s on %s", expression, text) << expression << text << result;
+    struct Row
+    {
+        const char *name;
+        QString fullText;
     };
-    const char *gpib = "GPIB0::28::INSTR";
-    const char *usb = "USB0::0x7FE3::0x00AF::100001::INSTR";
-    const char *lan = "TCPIP0::10.0.0.1::inst0::INSTR";
-    const char *raw = "TCPIP0::10.0.0.1::5025::SOCKET";
-    row("?*", raw, 1);
-    row("?*INSTR", gpib, 1);
-    row("?*INSTR", raw, 0);
-    row("GPIB?*INSTR", gpib, 1);
-    row("GPIB?*INSTR", usb, 0);
-    row("gpib?*instr", gpib, 1);
-    row("USB[0-9]::0x7FE3::?*INSTR", usb, 1);
-    row("USB[1-9]::0x7FE3::?*INSTR", usb, 0);
-    row("USB[0-9]::0x7FE4::?*INSTR", usb, 0);
-    row("USB[0-9]*::0x7fe3::?*", usb, 1);
-    row("GPIB[^0]::?*", gpib, 0);
-    row("GPIB[^1-9]::?*", gpib, 1);
-    row("GPIB[a-z]?*", "GPIBX::1::INSTR", 1);
-    row("GPIB0::2?::INSTR", gpib, 1);
-    row("GPIB0::2?::INSTR", "GPIB0::2::INSTR", 0);
-    row("GPIB0::28::INS", gpib, 0);
-    row("PIB0::28::INSTR", gpib, 0);
-    row("?*::28::?*|?*::SOCKET", raw, 1);
-    row("?*::28::?*|?*::SOCKET", lan, 0);
-    row("(GPIB|TCPIP)[0-9]+::?*INSTR", lan, 1);
-    row("(GPIB|TCPIP)[0-9]+::?*INSTR", usb, 0);
-    row("GPIB0::[0-9]+::INSTR", gpib, 1);
-    row("GPIB0::28[0-9]+::INSTR", gpib, 0);
-    row("GPIB0::28[0-9]*::INSTR", gpib, 1);
-    row("TCPIP0::10\\.0\\.0\\.1::?*", lan, 1);
-    row("a\\?b", "a?b", 1);
-    row("a\\?b", "axb", 0);
-    row("[\\]\\-]", "-", 1);
-    row("(ab)+", "ababab", 1);
-    row("(ab)+", "ababa", 0);
-    row("(ab)*c", "c", 1);
-    row("", gpib, -1);
-    row("*", gpib, -1);
-    row("a||b", gpib, -1);
-    row("(GPIB", gpib, -1);
-    row("GPIB)", gpib, -1);
-    row("[0-9", gpib, -1);
-    row("[]", gpib, -1);
-    row("[9-0]", gpib, -1);
-    row("GPIB\\", gpib, -1);
-    row("?*{VI_ATTR_INTF_NUM == 0}", gpib, -1);
+    // 255 characters in full, which fit a buffer of 256; one more is refused.
+    const QByteArray longest = "TCPIP::" + QByteArray(255 - 8 - 14, 'h');
+    const QByteArray tooLong = longest + 'h';
+    forRows<Row>({{"TCPIP::192.168.1.5::INSTR", "TCPIP0::192.168.1.5::inst0::INSTR"},
+                  {"tcpip2::bench-7::inst1::instr", "TCPIP2::bench-7::inst1::INSTR"},
+                  {"TCPIP0::gate::gpib0,28", "TCPIP0::gate::gpib0,28::INSTR"},
+                  {"TCPIP::10.0.0.1::5025::SOCKET", "TCPIP0::10.0.0.1::5025::SOCKET"},
+                  {"TCPIP::10.0.0.1::65536::SOCKET", ""},
+                  {"TCPIP::", ""},
+                  {"TCPIP::::INSTR", ""},
+                  {"TCPIP::two words::INSTR", ""},
+                  {"USB::0x7fe3::0x00af::100001::INSTR", "USB0::0x7FE3::0x00AF::100001::INSTR"},
+                  {"USB1::0x7FE3::0xAF::A/1::2::INSTR", "USB1::0x7FE3::0x00AF::A/1::2::INSTR"},
+                  {"USB0::0x7FE3::0xAF::INSTR", ""},
+                  {"USB0::0x7FE3::0xAF::1::256::INSTR", ""},
+                  {"GPIB::28", "GPIB0::28::INSTR"},
+                  {"GPIB1::5::96::INSTR", "GPIB1::5::96::INSTR"},
+                  {"GPIB0::31::INSTR", ""},
+                  {"ASRL1::INSTR", ""},
+                  {"::", ""},
+                  {longest.data(), "TCPIP0::" + longest.mid(7) + "::inst0::INSTR"},
+                  {tooLong.data(), ""}},
+                 [](const Row &row) {
+                     const auto name = parseResourceName(row.name);
+                     QCOMPARE(name ? QString::fromStdString(resourceText(*name)) : QString(),
+                              row.fullText);
+                     if (name)
+                         QVERIFY2(parseResourceName(resourceText(*name)) == name,
+                                  "full form means another resource");
+                 });
 }
 
 void TestVisaText::findExpressions()
 {
-    QFETCH(QString, expression);
-    QFETCH(QString, text);
-    QFETCH(int, result);
-    const auto pattern = FindExpression::parse(expression.toStdString());
-    QCOMPARE(pattern ? int{pattern->matches(text.toStdString())} : -1, result);
+    const char *gpib = "GPIB0::28::INSTR";
+    const char *usb = "USB0::0x7FE3::0x00AF::100001::INSTR";
+    const char *lan = "TCPIP0::10.0.0.1::inst0::INSTR";
+    const char *raw = "TCPIP0::10.0.0.1::5025::SOCKET";
+    struct Row
+    {
+        const char *name;
+        QString text;
+        int result;
+    };
+    forRows<Row>({{"?*INSTR", raw, 0},
+                  {"GPIB?*INSTR", gpib, 1},
+                  {"gpib?*instr", gpib, 1},
+                  {"USB[0-9]::0x7FE3::?*INSTR", usb, 1},
+                  {"GPIB[^0]::?*", gpib, 0},
+                  {"GPIB0::2?::INSTR", "GPIB0::2::INSTR", 0},
+                  {"GPIB0::28::INS", gpib, 0},
+                  {"?*::28::?*|?*::SOCKET", raw, 1},
+                  {"(GPIB|TCPIP)[0-9]+::?*INSTR", lan, 1},
+                  {"GPIB0::28[0-9]*::INSTR", gpib, 1},
+                  {"TCPIP0::10\\.0\\.0\\.1::?*", lan, 1},
+                  {"a\\?b", "axb", 0},
+                  {"[\\]\\-]", "-", 1},
+                  {"(ab)+", "ababab", 1},
+                  {"", gpib, -1},
+                  {"a||b", gpib, -1},
+                  {"(GPIB", gpib, -1},
+                  {"GPIB)", gpib, -1},
+                  {"[0-9", gpib, -1},
+                  {"[9-0]", gpib, -1},
+                  {"GPIB\\", gpib, -1},
+                  {"?*{VI_ATTR_INTF_NUM == 0}", gpib, -1}},
+                 [](const Row &row) {
+                     const auto pattern = FindExpression::parse(row.name);
+                     QCOMPARE(pattern ? int{pattern->matches(row.text.toStdString())} : -1,
+                              row.result);
+                 });
 }
 
 void TestVisaText::nestedRepetitionsEnd()
@@ -163,51 +121,32 @@ void TestVisaText::nestedRepetitionsEnd()
     QVERIFY2(timer.elapsed() < 2000, "nested repetitions take too long");
 }
 
-void TestVisaText::formats_data()
-{
-    QTest::addColumn<QByteArray>("format");
-    QTest::addColumn<QByteArrayList>("messages");
-    QTest::addColumn<bool>("isValid");
-
-    const auto row = [](const char *name, const char *format, const QByteArrayList &messages,
-                        bool isValid = true) {
-        QTest::newRow(name) << QByteArray(format) << messages << isValid;
-    };
-    row("plain", "*IDN?", {"*IDN?"});
-    row("empty", "", {});
-    row("percent", "LEV 50%%;FREQ 1", {"LEV 50%;FREQ 1"});
-    row("string conversion", ":MMEM:CAT? '%s'", {}, false);
-    row("number conversion", "FREQ %d", {}, false);
-    row("conversion after text", "abc%%%f", {}, false);
-    row("lone percent", "100%", {}, false);
-    row("real line feed", "*CLS\n*IDN?", {"*CLS\n", "*IDN?"});
-    row("escaped line feed", "*CLS\\n*IDN?\\r\\n", {"*CLS\n", "*IDN?\r\n"});
-    row("tab, quote, backslash", "a\\tb\\\"c\\\\d", {"a\tb\"c\\d"});
-    row("octal", "\\101\\60\\0122", {"A0\n", "2"});
-    row("unknown escape", "D:\\waves", {"D:\\waves"});
-    row("backslash last", "D:\\", {"D:\\"});
-    // Folders named new, temp and 101 on an instrument with drive letters.
-    row("path in apostrophes", ":MMEM:CAT? 'D:\\new\\temp\\101'",
-        {":MMEM:CAT? 'D:\\new\\temp\\101'"});
-    row("path in quotes", ":MMEM:CAT? \"D:\\new\\\";*OPC?\\n",
-        {":MMEM:CAT? \"D:\\new\\\";*OPC?\n"});
-    row("lone apostrophe", "it's\\n", {"it's\n"});
-    row("percent in a string", ":MMEM:CAT? '50%'", {}, false);
-}
-
 void TestVisaText::formats()
 {
-    QFETCH(QByteArray, format);
-    QFETCH(QByteArrayList, messages);
-    QFETCH(bool, isValid);
-    const auto result = formatMessages(std::string_view(format.data(), std::size_t(format.size())));
-    QCOMPARE(result.has_value(), isValid);
-    QByteArrayList actual;
-    if (result) {
-        for (const std::string &message : *result)
-            actual << QByteArray::fromStdString(message);
-    }
-    QCOMPARE(actual, messages);
+
+    forRows({{"plain", "*IDN?", {"*IDN?"}, true},
+             {"percent", "LEV 50%%;FREQ 1", {"LEV 50%;FREQ 1"}, true},
+             {"string conversion", ":MMEM:CAT? '%s'", {}, false},
+             {"lone percent", "100%", {}, false},
+             {"escaped line feed", "*CLS\\n*IDN?\\r\\n", {"*CLS\n", "*IDN?\r\n"}, true},
+             {"octal", "\\101\\60\\0122", {"A0\n", "2"}, true},
+             {"path in apostrophes",
+              ":MMEM:CAT? 'D:\\new\\temp\\101'",
+              {":MMEM:CAT? 'D:\\new\\temp\\101'"},
+              true},
+             {"lone apostrophe", "it's\\n", {"it's\n"}, true},
+             {"percent in a string", ":MMEM:CAT? '50%'", {}, false}},
+            [](QByteArray format, QByteArrayList messages, bool isValid) {
+                const auto result =
+                    formatMessages(std::string_view(format.data(), std::size_t(format.size())));
+                QCOMPARE(result.has_value(), isValid);
+                QByteArrayList actual;
+                if (result) {
+                    for (const std::string &message : *result)
+                        actual << QByteArray::fromStdString(message);
+                }
+                QCOMPARE(actual, messages);
+            });
 }
 
 void TestVisaText::configuration()
@@ -236,44 +175,39 @@ void TestVisaText::configuration()
     QCOMPARE(result->fixedPort(*parseResourceName("TCPIP0::127.0.0.1::inst0::INSTR")), 0);
 }
 
-void TestVisaText::configurationErrors_data()
-{
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<QString>("error");
-
-    const auto row = [](const char *text, const char *error) {
-        QTest::newRow(error) << text << error;
-    };
-    row("port = 1", "line 1: 'port = 1' stands before the first section.");
-    row("[GPIB0]\nhost = a\nport = 99999", "line 3: port '99999' is not 1 to 65535.");
-    row("[GPIB0]\nhost = a\nport = 0", "line 3: port '0' is not 1 to 65535.");
-    row("[GPIB0]\nport = 1\n[general]", "line 3: section 'GPIB0' names no host.");
-    row("[GPIB0]\nport = 1", "line 2: section 'GPIB0' names no host.");
-    row("[GPIB0]\nhost=a\naddresses = 5-31",
-        "line 3: addresses '5-31' are no list of 0 to 30 such as '5, 20-22'.");
-    row("[GPIB0]\nhost=a\naddresses = 9-5",
-        "line 3: addresses '9-5' are no list of 0 to 30 such as '5, 20-22'.");
-    row("[GPIB0]\nhost=a\n[GPIB]\nhost=b", "line 3: section 'GPIB' stands twice.");
-    row("[GPIBX]", "line 1: 'GPIBX' is no GPIB board such as 'GPIB0'.");
-    row("[USB0::1::2::3]",
-        "line 1: section 'USB0::1::2::3' is none of 'general', a GPIB board such "
-        "as 'GPIB0' or a TCPIP resource.");
-    row("[general", "line 1: '[general' lacks its closing bracket.");
-    row("[general]\nopen_timeout_ms = -1", "line 2: open time-out '-1' is not 1 to 600000 ms.");
-    row("[general]\ntimeout = 1",
-        "line 2: key 'TIMEOUT' of section 'general' is not allowed; 'open_timeout_ms' would be.");
-    row("[general]\nword", "line 2: 'word' is neither a [section] nor a key = value.");
-    row("[TCPIP::a::1::SOCKET]\nport = 1", "line 2: key 'PORT' of section 'TCPIP::a::1::SOCKET' is "
-                                           "not allowed; 'port' of an INSTR resource would be.");
-}
-
 void TestVisaText::configurationErrors()
 {
-    QFETCH(QString, text);
-    QFETCH(QString, error);
-    std::string actual;
-    QVERIFY(!parseConfiguration(text.toStdString(), actual));
-    QCOMPARE(QString::fromStdString(actual), error);
+
+    forRows(
+        {{"line 1: 'port = 1' stands before the first section.", "port = 1",
+          "line 1: 'port = 1' stands before the first section."},
+         {"line 3: port '99999' is not 1 to 65535.", "[GPIB0]\nhost = a\nport = 99999",
+          "line 3: port '99999' is not 1 to 65535."},
+         {"line 3: section 'GPIB0' names no host.", "[GPIB0]\nport = 1\n[general]",
+          "line 3: section 'GPIB0' names no host."},
+         {"line 3: addresses '9-5' are no list of 0 to 30 such as '5, 20-22'.",
+          "[GPIB0]\nhost=a\naddresses = 9-5",
+          "line 3: addresses '9-5' are no list of 0 to 30 such as '5, 20-22'."},
+         {"line 3: section 'GPIB' stands twice.", "[GPIB0]\nhost=a\n[GPIB]\nhost=b",
+          "line 3: section 'GPIB' stands twice."},
+         {"line 1: section 'USB0::1::2::3' is none of 'general', a GPIB board such "
+          "as 'GPIB0' or a TCPIP resource.",
+          "[USB0::1::2::3]",
+          "line 1: section 'USB0::1::2::3' is none of 'general', a GPIB board such "
+          "as 'GPIB0' or a TCPIP resource."},
+         {"line 2: key 'TIMEOUT' of section 'general' is not allowed; 'open_timeout_ms' would be.",
+          "[general]\ntimeout = 1",
+          "line 2: key 'TIMEOUT' of section 'general' is not allowed; 'open_timeout_ms' would be."},
+         {"line 2: key 'PORT' of section 'TCPIP::a::1::SOCKET' is "
+          "not allowed; 'port' of an INSTR resource would be.",
+          "[TCPIP::a::1::SOCKET]\nport = 1",
+          "line 2: key 'PORT' of section 'TCPIP::a::1::SOCKET' is "
+          "not allowed; 'port' of an INSTR resource would be."}},
+        [](QString text, QString error) {
+            std::string actual;
+            QVERIFY(!parseConfiguration(text.toStdString(), actual));
+            QCOMPARE(QString::fromStdString(actual), error);
+        });
 }
 
 void TestVisaText::configurationFile()

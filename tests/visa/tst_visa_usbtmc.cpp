@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/rows.h"
 #include "visa/UsbtmcDevices.h"
 #include "visa/UsbtmcTransport.h"
 
@@ -150,15 +151,12 @@ class TestVisaUsbtmc : public QObject
 
 private slots:
     void devices();
-    void openErrors_data();
     void openErrors();
-    void reads_data();
     void reads();
     void readsWithOldDriver();
     void writes();
     void timeouts();
     void terminatorNotSupported();
-    void remoteControl_data();
     void remoteControl();
 };
 
@@ -210,76 +208,52 @@ void TestVisaUsbtmc::devices()
     QVERIFY(findUsbtmcDevices("/nowhere").empty());
 }
 
-void TestVisaUsbtmc::openErrors_data()
-{
-    QTest::addColumn<int>("error");
-    QTest::addColumn<int>("status");
-    QTest::newRow("gone") << ENOENT << int{VI_ERROR_RSRC_NFOUND};
-    QTest::newRow("no permission") << EACCES << int{VI_ERROR_NPERMISSION};
-    QTest::newRow("in use") << EBUSY << int{VI_ERROR_RSRC_BUSY};
-}
-
 void TestVisaUsbtmc::openErrors()
 {
-    QFETCH(int, error);
-    QFETCH(int, status);
-    DriverState state;
-    state.openError = error;
-    std::unique_ptr<Transport> transport;
-    QCOMPARE(
-        UsbtmcTransport::open("/dev/usbtmc0", std::make_unique<ScriptedKernel>(state), transport),
-        status);
-    QVERIFY(!transport);
-}
 
-void TestVisaUsbtmc::reads_data()
-{
-    using Answers = QList<DriverState::Answer>;
-    QTest::addColumn<Answers>("answers");
-    QTest::addColumn<int>("size");
-    QTest::addColumn<bool>("hasTerminator");
-    QTest::addColumn<int>("status");
-    QTest::addColumn<QByteArray>("data");
-
-    const auto row = [](const char *name, const Answers &answers, int size, bool hasTerminator,
-                        ViStatus status, const char *data) {
-        QTest::newRow(name) << answers << size << hasTerminator << int{status} << QByteArray(data);
-    };
-    row("end", {{"abc", End}}, 10, false, VI_SUCCESS, "abc");
-    row("end at the count", {{"abc", End}}, 3, false, VI_SUCCESS, "abc");
-    row("count", {{"abcdef", 0}}, 3, false, VI_SUCCESS_MAX_CNT, "abc");
-    row("partial", {{"ab", 0}, {"", 0}, {"c", End}}, 10, false, VI_SUCCESS, "abc");
-    row("terminator", {{"ab\n", Terminated}}, 10, true, VI_SUCCESS_TERM_CHAR, "ab\n");
-    row("terminator and end", {{"ab\n", Terminated | End}}, 10, true, VI_SUCCESS, "ab\n");
-    row("terminator not asked", {{"a\n", Terminated}, {"b", End}}, 10, false, VI_SUCCESS, "a\nb");
-    row("time-out behind data", {{"ab", 0}}, 10, false, VI_ERROR_TMO, "ab");
-    row("unplugged", {{"", 0, ENODEV}}, 10, false, VI_ERROR_CONN_LOST, "");
-    row("stalled", {{"", 0, EPIPE}}, 10, false, VI_ERROR_IO, "");
-    row("signal", {{"", 0, EINTR}, {"ab", End}}, 10, false, VI_SUCCESS, "ab");
-    row("nothing for ever", Answers(40, {"", 0}), 10, false, VI_ERROR_IO, "");
+    forRows({{"gone", ENOENT, int{VI_ERROR_RSRC_NFOUND}},
+             {"no permission", EACCES, int{VI_ERROR_NPERMISSION}},
+             {"in use", EBUSY, int{VI_ERROR_RSRC_BUSY}}},
+            [](int error, int status) {
+                DriverState state;
+                state.openError = error;
+                std::unique_ptr<Transport> transport;
+                QCOMPARE(UsbtmcTransport::open("/dev/usbtmc0",
+                                               std::make_unique<ScriptedKernel>(state), transport),
+                         status);
+                QVERIFY(!transport);
+            });
 }
 
 void TestVisaUsbtmc::reads()
 {
-    QFETCH(QList<DriverState::Answer>, answers);
-    QFETCH(int, size);
-    QFETCH(bool, hasTerminator);
-    QFETCH(int, status);
-    QFETCH(QByteArray, data);
-    DriverState state;
-    state.answers.assign(answers.begin(), answers.end());
-    const auto transport = openWith(state);
-    std::vector<std::uint8_t> buffer(static_cast<std::size_t>(size));
-    ReadOptions options;
-    if (hasTerminator)
-        options.terminator = '\n';
-    std::size_t count = 99;
-    QCOMPARE(transport->read(buffer, options, Deadline::after(5000), count), status);
-    QCOMPARE(QByteArray(reinterpret_cast<char *>(buffer.data()), qsizetype(count)), data);
-    QCOMPARE(state.terminator.term_char_enabled != 0, hasTerminator);
-    const bool hasAborted =
-        std::count(state.requests.begin(), state.requests.end(), USBTMC_IOCTL_ABORT_BULK_IN) > 0;
-    QCOMPARE(hasAborted, status == VI_ERROR_TMO);
+    using Answers = QList<DriverState::Answer>;
+    forRows({{"end at the count", {{"abc", End}}, 3, false, VI_SUCCESS, "abc"},
+             {"count", {{"abcdef", 0}}, 3, false, VI_SUCCESS_MAX_CNT, "abc"},
+             {"partial", {{"ab", 0}, {"", 0}, {"c", End}}, 10, false, VI_SUCCESS, "abc"},
+             {"terminator and end", {{"ab\n", Terminated | End}}, 10, true, VI_SUCCESS, "ab\n"},
+             {"time-out behind data", {{"ab", 0}}, 10, false, VI_ERROR_TMO, "ab"},
+             {"unplugged", {{"", 0, ENODEV}}, 10, false, VI_ERROR_CONN_LOST, ""},
+             {"signal", {{"", 0, EINTR}, {"ab", End}}, 10, false, VI_SUCCESS, "ab"},
+             {"nothing for ever", Answers(40, {"", 0}), 10, false, VI_ERROR_IO, ""}},
+            [](QList<DriverState::Answer> answers, int size, bool hasTerminator, int status,
+               QByteArray data) {
+                DriverState state;
+                state.answers.assign(answers.begin(), answers.end());
+                const auto transport = openWith(state);
+                std::vector<std::uint8_t> buffer(static_cast<std::size_t>(size));
+                ReadOptions options;
+                if (hasTerminator)
+                    options.terminator = '\n';
+                std::size_t count = 99;
+                QCOMPARE(transport->read(buffer, options, Deadline::after(5000), count), status);
+                QCOMPARE(QByteArray(reinterpret_cast<char *>(buffer.data()), qsizetype(count)),
+                         data);
+                QCOMPARE(state.terminator.term_char_enabled != 0, hasTerminator);
+                const bool hasAborted = std::count(state.requests.begin(), state.requests.end(),
+                                                   USBTMC_IOCTL_ABORT_BULK_IN) > 0;
+                QCOMPARE(hasAborted, status == VI_ERROR_TMO);
+            });
 }
 
 void TestVisaUsbtmc::readsWithOldDriver()
@@ -349,33 +323,26 @@ void TestVisaUsbtmc::terminatorNotSupported()
     QCOMPARE(transport->read(buffer, {}, Deadline::after(1000), count), VI_SUCCESS);
 }
 
-void TestVisaUsbtmc::remoteControl_data()
-{
-    using Requests = QList<unsigned long>;
-    QTest::addColumn<int>("mode");
-    QTest::addColumn<Requests>("requests");
-    QTest::newRow("deassert") << 0 << Requests{USBTMC488_IOCTL_REN_CONTROL};
-    QTest::newRow("deassert, local")
-        << 2 << Requests{USBTMC488_IOCTL_GOTO_LOCAL, USBTMC488_IOCTL_REN_CONTROL};
-    QTest::newRow("lockout") << 4 << Requests{USBTMC488_IOCTL_LOCAL_LOCKOUT};
-    QTest::newRow("assert, lockout")
-        << 5 << Requests{USBTMC488_IOCTL_REN_CONTROL, USBTMC488_IOCTL_LOCAL_LOCKOUT};
-    QTest::newRow("local") << 6 << Requests{USBTMC488_IOCTL_GOTO_LOCAL};
-}
-
 void TestVisaUsbtmc::remoteControl()
 {
-    QFETCH(int, mode);
-    QFETCH(QList<unsigned long>, requests);
-    DriverState state;
-    {
-        const auto transport = openWith(state);
-        QCOMPARE(transport->controlRemote(ViUInt16(mode), Deadline::after(1000)), VI_SUCCESS);
-        state.requests.erase(state.requests.begin()); // the time-out
-        QCOMPARE(QList<unsigned long>(state.requests.begin(), state.requests.end()), requests);
-        QCOMPARE(state.openCount, 1);
-    }
-    QCOMPARE(state.openCount, 0);
+    using Requests = QList<unsigned long>;
+    forRows(
+        {{"deassert, local", 2, Requests{USBTMC488_IOCTL_GOTO_LOCAL, USBTMC488_IOCTL_REN_CONTROL}},
+         {"assert, lockout", 5,
+          Requests{USBTMC488_IOCTL_REN_CONTROL, USBTMC488_IOCTL_LOCAL_LOCKOUT}}},
+        [](int mode, QList<unsigned long> requests) {
+            DriverState state;
+            {
+                const auto transport = openWith(state);
+                QCOMPARE(transport->controlRemote(ViUInt16(mode), Deadline::after(1000)),
+                         VI_SUCCESS);
+                state.requests.erase(state.requests.begin()); // the time-out
+                QCOMPARE(QList<unsigned long>(state.requests.begin(), state.requests.end()),
+                         requests);
+                QCOMPARE(state.openCount, 1);
+            }
+            QCOMPARE(state.openCount, 0);
+        });
 }
 
 QTEST_APPLESS_MAIN(TestVisaUsbtmc)

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "VisaFixture.h"
 #include "Vxi11Peer.h"
+#include "support/rows.h"
 
 #include <QElapsedTimer>
 #include <QTest>
@@ -24,15 +25,11 @@ class TestVisaVxi11 : public QObject, protected VisaFixture
 
 private slots:
     void cleanup() { closeManager(); }
-    void reads_data();
     void reads();
     void readRequests();
     void writes();
-    void deviceErrors_data();
     void deviceErrors();
-    void brokenReplies_data();
     void brokenReplies();
-    void stalledReplies_data();
     void stalledReplies();
     void trickledReply();
     void lateReplyIsDropped();
@@ -40,66 +37,66 @@ private slots:
     void printing();
 };
 
-void TestVisaVxi11::reads_data()
-{
-    // Replies: error, reason, data.
-    using Reply = std::tuple<std::uint32_t, std::uint32_t, QByteArray>;
-    QTest::addColumn<QList<Reply>>("replies");
-    QTest::addColumn<int>("size");
-    QTest::addColumn<bool>("hasTerminator");
-    QTest::addColumn<bool>("suppressesEnd");
-    QTest::addColumn<Result>("result");
-
-    const auto row = [](const char *name, const QList<Reply> &replies, int size,
-                        const Result &result, bool hasTerminator = false,
-                        bool suppressesEnd = false) {
-        QTest::newRow(name) << replies << size << hasTerminator << suppressesEnd << result;
-    };
-    constexpr auto Count = Vxi11Peer::ReasonCount, Character = Vxi11Peer::ReasonTerminator,
-                   End = Vxi11Peer::ReasonEnd;
-    row("end", {{0, End, "abc"}}, 10, {VI_SUCCESS, "abc"});
-    row("empty message", {{0, End, ""}}, 10, {VI_SUCCESS, ""});
-    row("count", {{0, Count, "abc"}}, 3, {VI_SUCCESS_MAX_CNT, "abc"});
-    row("count without reason", {{0, 0, "abc"}}, 3, {VI_SUCCESS_MAX_CNT, "abc"});
-    row("end and count", {{0, End | Count, "abc"}}, 3, {VI_SUCCESS, "abc"});
-    row("terminator", {{0, Character, "ab\n"}}, 10, {VI_SUCCESS_TERM_CHAR, "ab\n"}, true);
-    row("terminator and count", {{0, Character | Count, "ab\n"}}, 3, {VI_SUCCESS_TERM_CHAR, "ab\n"},
-        true);
-    row("terminator and end", {{0, Character | End, "ab\n"}}, 10, {VI_SUCCESS, "ab\n"}, true);
-    row("terminator not asked", {{0, Character, "a\n"}, {0, End, "b"}}, 10, {VI_SUCCESS, "a\nb"});
-    row("partial", {{0, 0, "ab"}, {0, 0, ""}, {0, Count, "c"}, {0, End, "d"}}, 10,
-        {VI_SUCCESS, "abcd"});
-    row("partial up to the count", {{0, 0, "ab"}, {0, Count, "cd"}}, 4,
-        {VI_SUCCESS_MAX_CNT, "abcd"});
-    row("end suppressed", {{0, End, "ab"}, {0, End, "cd"}}, 4, {VI_SUCCESS_MAX_CNT, "abcd"}, false,
-        true);
-    row("error behind data", {{0, 0, "ab"}, {17, 0, "c"}}, 10, {VI_ERROR_IO, "abc"});
-    row("instrument timed out", {{15, 0, ""}}, 10, {VI_ERROR_TMO, ""});
-    row("more than asked", {{0, End, "abcdef"}}, 3, {VI_ERROR_IO, ""});
-    row("nothing for ever", QList<Reply>(40, {0, 0, ""}), 10, {VI_ERROR_IO, ""});
-}
-
 void TestVisaVxi11::reads()
 {
     using Reply = std::tuple<std::uint32_t, std::uint32_t, QByteArray>;
-    QFETCH(QList<Reply>, replies);
-    QFETCH(int, size);
-    QFETCH(bool, hasTerminator);
-    QFETCH(bool, suppressesEnd);
-    QFETCH(Result, result);
-    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Read || replies.isEmpty())
-            return false;
-        const auto [error, reason, data] = replies.takeFirst();
-        connection.send(call.reply(Vxi11Peer::readReply(error, reason, data.toStdString())));
-        return true;
-    });
-    const ViSession session = open(peer);
-    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, hasTerminator ? 1 : 0), VI_SUCCESS);
-    QCOMPARE(viSetAttribute(session, VI_ATTR_SUPPRESS_END_EN, suppressesEnd ? 1 : 0), VI_SUCCESS);
-    const Result actual = read(session, ViUInt32(size));
-    QCOMPARE(actual.second, result.second);
-    QCOMPARE(actual.first, result.first);
+    constexpr auto Count = Vxi11Peer::ReasonCount, Character = Vxi11Peer::ReasonTerminator,
+                   End = Vxi11Peer::ReasonEnd;
+    forRows(
+        {{"end", {{0, End, "abc"}}, 10, {VI_SUCCESS, "abc"}, false, false},
+         {"end and count", {{0, End | Count, "abc"}}, 3, {VI_SUCCESS, "abc"}, false, false},
+         {"terminator and count",
+          {{0, Character | Count, "ab\n"}},
+          3,
+          {VI_SUCCESS_TERM_CHAR, "ab\n"},
+          true,
+          false},
+         {"terminator and end",
+          {{0, Character | End, "ab\n"}},
+          10,
+          {VI_SUCCESS, "ab\n"},
+          true,
+          false},
+         {"partial",
+          {{0, 0, "ab"}, {0, 0, ""}, {0, Count, "c"}, {0, End, "d"}},
+          10,
+          {VI_SUCCESS, "abcd"},
+          false,
+          false},
+         {"end suppressed",
+          {{0, End, "ab"}, {0, End, "cd"}},
+          4,
+          {VI_SUCCESS_MAX_CNT, "abcd"},
+          false,
+          true},
+         {"error behind data",
+          {{0, 0, "ab"}, {17, 0, "c"}},
+          10,
+          {VI_ERROR_IO, "abc"},
+          false,
+          false},
+         {"instrument timed out", {{15, 0, ""}}, 10, {VI_ERROR_TMO, ""}, false, false},
+         {"more than asked", {{0, End, "abcdef"}}, 3, {VI_ERROR_IO, ""}, false, false},
+         {"nothing for ever", QList<Reply>(40, {0, 0, ""}), 10, {VI_ERROR_IO, ""}, false, false}},
+        [this](QList<Reply> replies, int size, Result result, bool hasTerminator,
+               bool suppressesEnd) {
+            const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+                if (call.procedure != Vxi11Peer::Read || replies.isEmpty())
+                    return false;
+                const auto [error, reason, data] = replies.takeFirst();
+                connection.send(
+                    call.reply(Vxi11Peer::readReply(error, reason, data.toStdString())));
+                return true;
+            });
+            const ViSession session = open(peer);
+            QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, hasTerminator ? 1 : 0),
+                     VI_SUCCESS);
+            QCOMPARE(viSetAttribute(session, VI_ATTR_SUPPRESS_END_EN, suppressesEnd ? 1 : 0),
+                     VI_SUCCESS);
+            const Result actual = read(session, ViUInt32(size));
+            QCOMPARE(actual.second, result.second);
+            QCOMPARE(actual.first, result.first);
+        });
 }
 
 void TestVisaVxi11::readRequests()
@@ -166,122 +163,94 @@ void TestVisaVxi11::writes()
     QCOMPARE(count, 1005U); // the ninth and five bytes of the tenth
 }
 
-void TestVisaVxi11::deviceErrors_data()
-{
-    QTest::addColumn<std::uint32_t>("error");
-    QTest::addColumn<ViStatus>("status");
-    QTest::newRow("invalid link") << 4U << VI_ERROR_CONN_LOST;
-    QTest::newRow("not supported") << 8U << VI_ERROR_NSUP_OPER;
-    QTest::newRow("locked") << 11U << VI_ERROR_RSRC_LOCKED;
-    QTest::newRow("time-out") << 15U << VI_ERROR_TMO;
-    QTest::newRow("input/output") << 17U << VI_ERROR_IO;
-    QTest::newRow("abort") << 23U << VI_ERROR_ABORT;
-    QTest::newRow("unknown") << 0xFFFF'FFFFU << VI_ERROR_IO;
-}
-
 void TestVisaVxi11::deviceErrors()
 {
-    QFETCH(std::uint32_t, error);
-    QFETCH(ViStatus, status);
-    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Clear && call.procedure != Vxi11Peer::Write)
-            return false;
-        connection.send(call.reply(bigEndian({error, 0})));
-        return true;
-    });
-    const ViSession session = open(peer);
-    QCOMPARE(viClear(session), status);
-    QCOMPARE(write(session, "*CLS"), status);
-}
 
-void TestVisaVxi11::brokenReplies_data()
-{
-    // What the peer sends for a read before it closes; %T stands for the transaction.
-    QTest::addColumn<QByteArray>("bytes");
-    QTest::addColumn<ViStatus>("status");
-    const auto row = [](const char *name, const char *hex, ViStatus status) {
-        QTest::newRow(name) << QByteArray(hex) << status;
-    };
-    const char *accepted = "%T 00000001 00000000 00000000 00000000 00000000 ";
-    row("closed at once", "", VI_ERROR_CONN_LOST);
-    row("closed in the mark", "8000", VI_ERROR_CONN_LOST);
-    row("closed in the record", "80000040 %T 00000001", VI_ERROR_CONN_LOST);
-    row("closed between fragments", "00000004 %T", VI_ERROR_CONN_LOST);
-    row("2 GiB announced", "ffffffff %T 00000001", VI_ERROR_IO);
-    row("2 GiB in a second fragment", "00000004 %T 7fffffff", VI_ERROR_IO);
-    row("too short for a reply", "80000004 %T", VI_ERROR_IO);
-    row("a call", "80000008 %T 00000000", VI_ERROR_IO);
-    row("denied", "80000010 %T 00000001 00000001 00000000", VI_ERROR_IO);
-    row("garbage arguments", "80000018 %T 00000001 00000000 00000000 00000000 00000004",
-        VI_ERROR_IO);
-    row("no such procedure", "80000018 %T 00000001 00000000 00000000 00000000 00000003",
-        VI_ERROR_NSUP_OPER);
-    row("no results", QByteArray("80000018 ").append(accepted), VI_ERROR_IO);
-    row("data cut",
-        QByteArray("80000028 ").append(accepted).append("00000000 00000004 00000008 61626364"),
-        VI_ERROR_IO);
-    row("data of 4 GiB",
-        QByteArray("80000028 ").append(accepted).append("00000000 00000004 ffffffff 61626364"),
-        VI_ERROR_IO);
-    row("data of 16 MiB",
-        QByteArray("80000028 ").append(accepted).append("00000000 00000004 01000000 61626364"),
-        VI_ERROR_IO);
+    forRows({{"invalid link", 4U, VI_ERROR_CONN_LOST},
+             {"time-out", 15U, VI_ERROR_TMO},
+             {"unknown", 0xFFFF'FFFFU, VI_ERROR_IO}},
+            [this](std::uint32_t error, ViStatus status) {
+                const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+                    if (call.procedure != Vxi11Peer::Clear && call.procedure != Vxi11Peer::Write)
+                        return false;
+                    connection.send(call.reply(bigEndian({error, 0})));
+                    return true;
+                });
+                const ViSession session = open(peer);
+                QCOMPARE(viClear(session), status);
+                QCOMPARE(write(session, "*CLS"), status);
+            });
 }
 
 void TestVisaVxi11::brokenReplies()
 {
-    QFETCH(QByteArray, bytes);
-    QFETCH(ViStatus, status);
-    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Read)
-            return false;
-        const QByteArray transaction = QByteArray::fromStdString(bigEndian({call.transaction}));
-        const QByteArray hex = QByteArray(bytes).replace("%T", transaction.toHex());
-        connection.send(QByteArray::fromHex(hex).toStdString());
-        connection.shutDown();
-        return true;
-    });
-    const ViSession session = open(peer);
-    QElapsedTimer timer;
-    timer.start();
-    QCOMPARE(read(session, 100), Result(status, QByteArray()));
-    QVERIFY2(timer.elapsed() < 4000, "the call waited for more than the peer could send");
-    QCOMPARE(read(session, 100), Result(VI_ERROR_CONN_LOST, QByteArray()));
-    QCOMPARE(viClear(session), VI_ERROR_CONN_LOST);
-    QCOMPARE(viClose(session), VI_SUCCESS);
-}
-
-void TestVisaVxi11::stalledReplies_data()
-{
-    QTest::addColumn<QByteArray>("bytes");
-    QTest::newRow("silent") << QByteArray();
-    QTest::newRow("stops in the mark") << QByteArray::fromHex("8000");
-    QTest::newRow("stops in the record") << QByteArray::fromHex("8000004000");
-    QTest::newRow("empty fragments") << QByteArray(4000, '\0');
+    const char *accepted = "%T 00000001 00000000 00000000 00000000 00000000 ";
+    forRows(
+        {{"closed at once", "", VI_ERROR_CONN_LOST},
+         {"closed in the record", "80000040 %T 00000001", VI_ERROR_CONN_LOST},
+         {"closed between fragments", "00000004 %T", VI_ERROR_CONN_LOST},
+         {"2 GiB announced", "ffffffff %T 00000001", VI_ERROR_IO},
+         {"2 GiB in a second fragment", "00000004 %T 7fffffff", VI_ERROR_IO},
+         {"no such procedure", "80000018 %T 00000001 00000000 00000000 00000000 00000003",
+          VI_ERROR_NSUP_OPER},
+         {"data cut",
+          QByteArray("80000028 ").append(accepted).append("00000000 00000004 00000008 61626364"),
+          VI_ERROR_IO},
+         {"data of 4 GiB",
+          QByteArray("80000028 ").append(accepted).append("00000000 00000004 ffffffff 61626364"),
+          VI_ERROR_IO},
+         {"data of 16 MiB",
+          QByteArray("80000028 ").append(accepted).append("00000000 00000004 01000000 61626364"),
+          VI_ERROR_IO}},
+        [this](QByteArray bytes, ViStatus status) {
+            const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+                if (call.procedure != Vxi11Peer::Read)
+                    return false;
+                const QByteArray transaction =
+                    QByteArray::fromStdString(bigEndian({call.transaction}));
+                const QByteArray hex = QByteArray(bytes).replace("%T", transaction.toHex());
+                connection.send(QByteArray::fromHex(hex).toStdString());
+                connection.shutDown();
+                return true;
+            });
+            const ViSession session = open(peer);
+            QElapsedTimer timer;
+            timer.start();
+            QCOMPARE(read(session, 100), Result(status, QByteArray()));
+            QVERIFY2(timer.elapsed() < 4000, "the call waited for more than the peer could send");
+            QCOMPARE(read(session, 100), Result(VI_ERROR_CONN_LOST, QByteArray()));
+            QCOMPARE(viClear(session), VI_ERROR_CONN_LOST);
+            QCOMPARE(viClose(session), VI_SUCCESS);
+        });
 }
 
 void TestVisaVxi11::stalledReplies()
 {
-    QFETCH(QByteArray, bytes);
-    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure == Vxi11Peer::CreateLink || call.program != 0x0607AF)
-            return false;
-        connection.send(bytes.toStdString());
-        return true;
-    });
-    const ViSession session = open(peer, 300);
-    QElapsedTimer timer;
-    timer.start();
-    QCOMPARE(read(session, 100), Result(VI_ERROR_TMO, QByteArray()));
-    QVERIFY2(timer.elapsed() >= 290, "the call gave up too soon");
-    QVERIFY2(timer.elapsed() < 300 + SlackMs, "the call took too long");
-    // The instrument is told that nobody waits any more.
-    QVERIFY(peer.waitForCalls(Vxi11Peer::Abort, 1));
-    QCOMPARE(peer.calls(Vxi11Peer::Abort).front().word(0), Vxi11Peer::Link);
-    QCOMPARE(peer.calls(Vxi11Peer::Abort).front().program, 0x0607B0U);
-    timer.restart();
-    QCOMPARE(viClose(session), VI_SUCCESS);
-    QVERIFY2(timer.elapsed() < 1000 + SlackMs, "closing took too long");
+
+    forRows({{"silent", QByteArray()},
+             {"stops in the record", QByteArray::fromHex("8000004000")},
+             {"empty fragments", QByteArray(4000, '\0')}},
+            [this](QByteArray bytes) {
+                const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+                    if (call.procedure == Vxi11Peer::CreateLink || call.program != 0x0607AF)
+                        return false;
+                    connection.send(bytes.toStdString());
+                    return true;
+                });
+                const ViSession session = open(peer, 300);
+                QElapsedTimer timer;
+                timer.start();
+                QCOMPARE(read(session, 100), Result(VI_ERROR_TMO, QByteArray()));
+                QVERIFY2(timer.elapsed() >= 290, "the call gave up too soon");
+                QVERIFY2(timer.elapsed() < 300 + SlackMs, "the call took too long");
+                // The instrument is told that nobody waits any more.
+                QVERIFY(peer.waitForCalls(Vxi11Peer::Abort, 1));
+                QCOMPARE(peer.calls(Vxi11Peer::Abort).front().word(0), Vxi11Peer::Link);
+                QCOMPARE(peer.calls(Vxi11Peer::Abort).front().program, 0x0607B0U);
+                timer.restart();
+                QCOMPARE(viClose(session), VI_SUCCESS);
+                QVERIFY2(timer.elapsed() < 1000 + SlackMs, "closing took too long");
+            });
 }
 
 void TestVisaVxi11::trickledReply()
