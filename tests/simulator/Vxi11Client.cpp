@@ -1,39 +1,45 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Vxi11Client.h"
 
+#include "protocols/RpcRecord.h"
+#include "protocols/XdrReader.h"
+
 #include <QtEndian>
 
 namespace {
 
 constexpr int WaitMilliseconds = 20000;
-constexpr quint32 LastFragment = 0x80000000U;
-constexpr qsizetype ReplyHeadSize = 24; // xid, REPLY, accepted, empty verifier, status
 
-quint32 numberAt(const QByteArray &bytes, qsizetype place)
+std::span<const std::uint8_t> bytesOf(const QByteArray &data)
 {
-    return place + 4 <= bytes.size() ? qFromBigEndian<quint32>(bytes.constData() + place) : 0;
+    return {reinterpret_cast<const std::uint8_t *>(data.constData()), std::size_t(data.size())};
 }
 
-quint32 firstNumber(const std::optional<QByteArray> &reply)
+template <typename T>
+QByteArray encoded(protocols::XdrCode<T> *code, T value, qsizetype dataSize = 0)
 {
-    return reply && reply->size() >= 4 ? numberAt(*reply, 0) : Vxi11Client::NoReply;
+    QByteArray bytes(64 + dataSize, '\0');
+    const std::span room(reinterpret_cast<std::uint8_t *>(bytes.data()), std::size_t(bytes.size()));
+    bytes.truncate(qsizetype(protocols::encodeXdr(code, value, room).value_or(0)));
+    return bytes;
+}
+
+quint32 errorOf(const std::optional<QByteArray> &reply)
+{
+    return reply && reply->size() >= 4 ? protocols::XdrReader(bytesOf(*reply)).number()
+                                       : Vxi11Client::NoReply;
 }
 
 } // namespace
 
-XdrArguments &XdrArguments::number(quint32 value)
+QByteArray words(std::initializer_list<quint32> values)
 {
-    const quint32 big = qToBigEndian(value);
-    m_bytes.append(reinterpret_cast<const char *>(&big), sizeof(big));
-    return *this;
-}
-
-XdrArguments &XdrArguments::opaque(const QByteArray &data)
-{
-    number(static_cast<quint32>(data.size()));
-    m_bytes.append(data);
-    m_bytes.append((4 - data.size() % 4) % 4, '\0');
-    return *this;
+    QByteArray bytes;
+    for (const quint32 value : values) {
+        const quint32 big = qToBigEndian(value);
+        bytes.append(reinterpret_cast<const char *>(&big), sizeof(big));
+    }
+    return bytes;
 }
 
 bool Vxi11Client::open(quint16 port, const QString &address)
@@ -46,27 +52,27 @@ bool Vxi11Client::open(quint16 port, const QString &address)
 void Vxi11Client::sendCall(quint32 program, quint32 procedure, const QByteArray &arguments,
                            quint32 version)
 {
-    XdrArguments head;
-    head.number(m_transaction++).number(0).number(2).number(program).number(version);
-    head.number(procedure).number(0).number(0).number(0).number(0);
-    const auto size = static_cast<quint32>(head.bytes().size() + arguments.size());
-    m_socket.write(XdrArguments().number(LastFragment | size).bytes() + head.bytes() + arguments);
+    QByteArray record =
+        words({0, m_transaction++, CALL, RPC_MSG_VERSION, program, version, procedure, 0, 0, 0, 0});
+    record += arguments;
+    protocols::markRecord(
+        {reinterpret_cast<std::uint8_t *>(record.data()), std::size_t(record.size())});
+    m_socket.write(record);
 }
 
 std::optional<QByteArray> Vxi11Client::takeReply()
 {
-    if (!fill(4))
+    if (!fill(4)) {
         return std::nullopt;
-    const auto size = static_cast<qsizetype>(numberAt(m_buffer, 0) & ~LastFragment);
-    if (!fill(4 + size))
+    }
+    const qsizetype size = qFromBigEndian<quint32>(m_buffer.constData()) & 0x7FFFFFFFU;
+    if (!fill(4 + size)) {
         return std::nullopt;
+    }
     const QByteArray record = m_buffer.mid(4, size);
     m_buffer.remove(0, 4 + size);
-    const bool accepted = numberAt(record, 0) == m_transaction - 1 && numberAt(record, 4) == 1 &&
-                          numberAt(record, 8) == 0 && numberAt(record, 20) == 0;
-    if (!accepted || size < ReplyHeadSize)
-        return std::nullopt;
-    return record.mid(ReplyHeadSize);
+    const QByteArray head = words({m_transaction - 1, REPLY, MSG_ACCEPTED, 0, 0, SUCCESS});
+    return record.startsWith(head) ? std::optional(record.mid(head.size())) : std::nullopt;
 }
 
 std::optional<QByteArray> Vxi11Client::call(quint32 program, quint32 procedure,
@@ -79,8 +85,9 @@ std::optional<QByteArray> Vxi11Client::call(quint32 program, quint32 procedure,
 bool Vxi11Client::fill(qsizetype size)
 {
     while (m_buffer.size() < size) {
-        if (m_socket.bytesAvailable() == 0 && !m_socket.waitForReadyRead(WaitMilliseconds))
+        if (m_socket.bytesAvailable() == 0 && !m_socket.waitForReadyRead(WaitMilliseconds)) {
             return false;
+        }
         m_buffer += m_socket.readAll();
     }
     return true;
@@ -88,93 +95,93 @@ bool Vxi11Client::fill(qsizetype size)
 
 quint32 Vxi11Client::link(const QString &device, bool lock, quint32 lockTimeoutMs)
 {
-    XdrArguments arguments;
-    arguments.number(1).number(lock ? 1 : 0).number(lockTimeoutMs).opaque(device.toLatin1());
-    const auto reply = call(CoreProgram, CreateLink, arguments.bytes());
+    QByteArray name = device.toLatin1();
+    const Create_LinkParms arguments{1, lock, lockTimeoutMs, name.data()};
+    const auto reply =
+        call(DEVICE_CORE, create_link, encoded(xdr_Create_LinkParms, arguments, name.size()));
     if (reply) {
-        m_link = numberAt(*reply, 4);
-        m_abortPort = static_cast<quint16>(numberAt(*reply, 8));
-        m_maxReceiveSize = numberAt(*reply, 12);
+        m_link = protocols::XdrReader(bytesOf(*reply)).value(xdr_Create_LinkResp);
     }
-    return firstNumber(reply);
+    return errorOf(reply);
 }
 
 quint32 Vxi11Client::write(const QByteArray &data, quint32 flags)
 {
-    XdrArguments arguments;
-    arguments.number(m_link).number(5000).number(0).number(flags).opaque(data);
-    const auto reply = call(CoreProgram, DeviceWrite, arguments.bytes());
-    if (firstNumber(reply) == 0 && numberAt(*reply, 4) != static_cast<quint32>(data.size()))
+    QByteArray copy = data;
+    const auto size = static_cast<unsigned>(copy.size());
+    const Device_WriteParms arguments{m_link.lid, 5000, 0, int(flags), {size, copy.data()}};
+    const auto reply =
+        call(DEVICE_CORE, device_write, encoded(xdr_Device_WriteParms, arguments, copy.size()));
+    if (errorOf(reply) == 0 && *reply != words({0, size})) {
         return NoReply;
-    return firstNumber(reply);
+    }
+    return errorOf(reply);
 }
 
 quint32 Vxi11Client::generic(quint32 procedure, quint32 flags, quint32 lockTimeoutMs)
 {
-    XdrArguments arguments;
-    arguments.number(m_link).number(flags).number(lockTimeoutMs).number(5000);
-    return firstNumber(call(CoreProgram, procedure, arguments.bytes()));
+    return errorOf(call(DEVICE_CORE, procedure, words({linkId(), flags, lockTimeoutMs, 5000})));
 }
 
-quint32 Vxi11Client::lock(quint32 flags, quint32 timeoutMs)
+quint32 Vxi11Client::lock()
 {
-    XdrArguments arguments;
-    arguments.number(m_link).number(flags).number(timeoutMs);
-    return firstNumber(call(CoreProgram, DeviceLock, arguments.bytes()));
+    return errorOf(call(DEVICE_CORE, device_lock, words({linkId(), 0, 0})));
 }
 
 quint32 Vxi11Client::linkOnly(quint32 procedure)
 {
-    return firstNumber(call(CoreProgram, procedure, XdrArguments().number(m_link).bytes()));
+    return errorOf(call(DEVICE_CORE, procedure, words({linkId()})));
 }
 
 int Vxi11Client::statusByte()
 {
-    XdrArguments arguments;
-    arguments.number(m_link).number(0).number(0).number(0);
-    const auto reply = call(CoreProgram, DeviceReadStb, arguments.bytes());
-    return firstNumber(reply) == 0 ? static_cast<int>(numberAt(*reply, 4)) : -1;
-}
-
-QByteArray Vxi11Client::readArguments(quint32 link, quint32 count, quint32 timeoutMs)
-{
-    XdrArguments arguments;
-    arguments.number(link).number(count).number(timeoutMs).number(0).number(0).number(0);
-    return arguments.bytes();
-}
-
-Vxi11Client::ReadResult Vxi11Client::readResult(const std::optional<QByteArray> &reply)
-{
-    ReadResult result;
-    result.error = firstNumber(reply);
-    if (reply) {
-        result.reason = numberAt(*reply, 4);
-        result.data = reply->mid(12, numberAt(*reply, 8));
-    }
-    return result;
+    const auto reply = call(DEVICE_CORE, device_readstb, words({linkId(), 0, 0, 0}));
+    return errorOf(reply) == 0 ? static_cast<quint8>(reply->back()) : -1;
 }
 
 Vxi11Client::ReadResult Vxi11Client::read(quint32 count, quint32 timeoutMs,
                                           std::optional<char> termChar)
 {
-    XdrArguments arguments;
-    arguments.number(m_link).number(count).number(timeoutMs).number(0);
-    arguments.number(termChar ? quint32{TermCharSet} : 0);
-    arguments.number(static_cast<unsigned char>(termChar.value_or(0)));
-    return readResult(call(CoreProgram, DeviceRead, arguments.bytes()));
+    sendRead(count, timeoutMs, termChar);
+    return takeRead();
+}
+
+void Vxi11Client::sendRead(quint32 count, quint32 timeoutMs, std::optional<char> termChar)
+{
+    const int flags = termChar ? DEVICE_FLAG_TERMCHRSET : 0;
+    const Device_ReadParms arguments{m_link.lid, count, timeoutMs,
+                                     0,          flags, termChar.value_or('\0')};
+    sendCall(DEVICE_CORE, device_read, encoded(xdr_Device_ReadParms, arguments));
+}
+
+Vxi11Client::ReadResult Vxi11Client::takeRead()
+{
+    const auto reply = takeReply();
+    if (!reply) {
+        return {};
+    }
+    protocols::XdrReader reader(bytesOf(*reply));
+    const quint32 error = reader.number();
+    const quint32 reason = reader.number();
+    const auto data = reader.opaque();
+    return {error, reason,
+            QByteArray(reinterpret_cast<const char *>(data.data()), qsizetype(data.size()))};
 }
 
 QByteArray Vxi11Client::ask(const QByteArray &command, quint32 timeoutMs)
 {
-    if (write(command) != 0)
+    if (write(command) != 0) {
         return {};
+    }
     QByteArray answer("");
     for (;;) {
         const ReadResult part = read(1024 * 1024, timeoutMs);
-        if (part.error != 0)
+        if (part.error != 0) {
             return {};
+        }
         answer += part.data;
-        if ((part.reason & EndSeen) != 0)
+        if ((part.reason & EndSeen) != 0) {
             return answer;
+        }
     }
 }

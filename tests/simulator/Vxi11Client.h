@@ -5,40 +5,24 @@
 #include <QString>
 #include <QTcpSocket>
 
+#include <vxi11.h>
+
+#include <initializer_list>
 #include <optional>
 
-/// The arguments of a call as XDR.
-class XdrArguments
-{
-public:
-    XdrArguments &number(quint32 value);
-    XdrArguments &opaque(const QByteArray &data);
-    [[nodiscard]] const QByteArray &bytes() const { return m_bytes; }
+/// Numbers as they stand on the wire.
+[[nodiscard]] QByteArray words(std::initializer_list<quint32> values);
 
-private:
-    QByteArray m_bytes;
-};
-
-/// A small VXI-11 controller, written from the protocol alone so that it shares no mistake with the
-/// programs under test.
+/// A small VXI-11 controller for one link.
 class Vxi11Client
 {
 public:
-    enum Flags : quint32 { WaitLock = 1, End = 8, TermCharSet = 128 };
-    enum Reasons : quint32 { RequestCount = 1, TermCharSeen = 2, EndSeen = 4 };
-    enum Procedures : quint32 {
-        CreateLink = 10,
-        DeviceWrite = 11,
-        DeviceRead = 12,
-        DeviceReadStb = 13,
-        DeviceTrigger = 14,
-        DeviceClear = 15,
-        DeviceLock = 18,
-        DeviceUnlock = 19,
-        DestroyLink = 23,
+    enum Flags : quint32 { WaitLock = DEVICE_FLAG_WAITLOCK, End = DEVICE_FLAG_END };
+    enum Reasons : quint32 {
+        RequestCount = DEVICE_REASON_REQCNT,
+        TermCharSeen = DEVICE_REASON_CHR,
+        EndSeen = DEVICE_REASON_END
     };
-    static constexpr quint32 CoreProgram = 0x0607AF;
-    static constexpr quint32 AbortProgram = 0x0607B0;
     static constexpr quint32 NoReply = 0xFFFFFFFF; ///< the connection ended instead
 
     struct ReadResult
@@ -63,23 +47,23 @@ public:
     quint32 link(const QString &device, bool lock = false, quint32 lockTimeoutMs = 0);
     quint32 write(const QByteArray &data, quint32 flags = End);
     quint32 generic(quint32 procedure, quint32 flags = 0, quint32 lockTimeoutMs = 0);
-    quint32 lock(quint32 flags = 0, quint32 timeoutMs = 0);
+    quint32 lock();
     quint32 linkOnly(quint32 procedure);
 
-    /// The status byte; -1 when it could not be had.
-    [[nodiscard]] int statusByte();
+    [[nodiscard]] int statusByte(); ///< -1 when it could not be had
 
     [[nodiscard]] ReadResult read(quint32 count, quint32 timeoutMs = 5000,
                                   std::optional<char> termChar = std::nullopt);
-    [[nodiscard]] static QByteArray readArguments(quint32 link, quint32 count, quint32 timeoutMs);
-    [[nodiscard]] static ReadResult readResult(const std::optional<QByteArray> &reply);
+    /// The same in two steps; the second takes the reply.
+    void sendRead(quint32 count, quint32 timeoutMs, std::optional<char> termChar = std::nullopt);
+    [[nodiscard]] ReadResult takeRead();
 
     /// Sends a command and reads its answer up to END; null when there is none.
     [[nodiscard]] QByteArray ask(const QByteArray &command, quint32 timeoutMs = 5000);
 
-    [[nodiscard]] quint32 linkId() const { return m_link; }
-    [[nodiscard]] quint16 abortPort() const { return m_abortPort; }
-    [[nodiscard]] quint32 maxReceiveSize() const { return m_maxReceiveSize; }
+    [[nodiscard]] quint32 linkId() const { return static_cast<quint32>(m_link.lid); }
+    [[nodiscard]] quint16 abortPort() const { return m_link.abortPort; }
+    [[nodiscard]] quint32 maxReceiveSize() const { return m_link.maxRecvSize; }
     [[nodiscard]] QTcpSocket &socket() { return m_socket; }
 
 private:
@@ -88,7 +72,5 @@ private:
     QTcpSocket m_socket;
     QByteArray m_buffer;
     quint32 m_transaction = 1;
-    quint32 m_link = 0;
-    quint16 m_abortPort = 0;
-    quint32 m_maxReceiveSize = 0;
+    Create_LinkResp m_link{};
 };

@@ -60,7 +60,7 @@ constexpr quint32 Udp = 17;
 
 QByteArray getPortArguments(quint32 program, quint32 version, quint32 protocol)
 {
-    return XdrArguments().number(program).number(version).number(protocol).number(0).bytes();
+    return words({program, version, protocol, 0});
 }
 
 } // namespace
@@ -79,9 +79,9 @@ void TestSimulatorAddress::initTestCase()
 
 void TestSimulatorAddress::portMapper()
 {
-    constexpr quint32 Core = Vxi11Client::CoreProgram;
+    constexpr quint32 Core = DEVICE_CORE;
     forRows({{"core", Core, 1, Tcp, true},
-             {"abort", Vxi11Client::AbortProgram, 1, Tcp, true},
+             {"abort", DEVICE_ASYNC, 1, Tcp, true},
              {"core over UDP", Core, 1, Udp, false},
              {"core version 2", Core, 2, Tcp, false},
              {"itself", MapperProgram, 2, Tcp, true}},
@@ -109,15 +109,13 @@ void TestSimulatorAddress::portMapper()
 
 void TestSimulatorAddress::portMapperOverUdp()
 {
-    XdrArguments call;
-    call.number(5).number(0).number(2).number(MapperProgram).number(2).number(GetPort);
-    call.number(0).number(0).number(0).number(0);
-    const QByteArray arguments = getPortArguments(Vxi11Client::CoreProgram, 1, Tcp);
+    const QByteArray call = words({5, 0, 2, MapperProgram, 2, GetPort, 0, 0, 0, 0});
+    const QByteArray arguments = getPortArguments(DEVICE_CORE, 1, Tcp);
     QUdpSocket socket;
     QVERIFY(socket.bind(QHostAddress(m_address), 0));
     const QHostAddress host(m_address);
     socket.writeDatagram("nonsense", host, MapperPort); // unanswered
-    socket.writeDatagram(call.bytes() + arguments, host, MapperPort);
+    socket.writeDatagram(call + arguments, host, MapperPort);
     while (!socket.hasPendingDatagrams())
         QVERIFY(socket.waitForReadyRead(10000));
     QByteArray reply(100, '\0');
@@ -203,15 +201,15 @@ void TestSimulatorAddress::lxiTools()
     };
     for (const bool raw : {false, true}) {
         isRaw = raw;
-    QCOMPARE(lxi("*IDN?"), "Halvorn,TGX-870,TGX870/100001/01,1.0");
-    QCOMPARE(lxi("MMEM:DATA '/var/user/lxi.txt',#15Hallo"), "");
-    QFile file(m_program.root() + "/var/user/lxi.txt");
-    QTRY_COMPARE(file.size(), 5);
-    QVERIFY(lxi("MMEM:CAT? '/var/user/'").contains(",\"lxi.txt,ASC,5\""));
-    QCOMPARE(lxi("MMEM:DATA? '/var/user/lxi.txt'"), "#15Hallo");
-    QCOMPARE(lxi("MMEM:DEL '/var/user/lxi.txt';*OPC?"), "1");
-    QVERIFY(!file.exists());
-    QCOMPARE(lxi("SYST:ERR?"), "0,\"No error\"");
+        QCOMPARE(lxi("*IDN?"), "Halvorn,TGX-870,TGX870/100001/01,1.0");
+        QCOMPARE(lxi("MMEM:DATA '/var/user/lxi.txt',#15Hallo"), "");
+        QFile file(m_program.root() + "/var/user/lxi.txt");
+        QTRY_COMPARE(file.size(), 5);
+        QVERIFY(lxi("MMEM:CAT? '/var/user/'").contains(",\"lxi.txt,ASC,5\""));
+        QCOMPARE(lxi("MMEM:DATA? '/var/user/lxi.txt'"), "#15Hallo");
+        QCOMPARE(lxi("MMEM:DEL '/var/user/lxi.txt';*OPC?"), "1");
+        QVERIFY(!file.exists());
+        QCOMPARE(lxi("SYST:ERR?"), "0,\"No error\"");
     }
 }
 
