@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "base/EngineeringNumber.h"
 #include "support/rows.h"
-
 #include "support/seed.h"
+
 #include <QTest>
 
 #include <cmath>

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "base/OutputFile.h"
+#include "support/files.h"
 #include "support/rows.h"
 
-#include "support/files.h"
 #include <QDir>
 #include <QFile>
 #include <QTest>

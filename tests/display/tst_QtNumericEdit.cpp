@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "display/QtNumericEdit.h"
 #include "log/Tracer.h"
+#include "support/logreader.h"
 #include "support/rows.h"
 
-#include "support/logreader.h"
 #include <QApplication>
 #include <QContextMenuEvent>
 #include <QMenu>

@@ -1,11 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dsp/CreateSignal.h"
-#include "support/rows.h"
-
 #include "dsp/Resample.h"
 #include "literal_resample.h"
 #include "signal_cases.h"
 #include "stream_helpers.h"
+#include "support/rows.h"
 
 #include <QTest>
 

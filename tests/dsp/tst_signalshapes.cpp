@@ -1,11 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // The signals against what the textbooks say of them, not against the code's own formulas.
 #include "dsp/CreateSignal.h"
-#include "support/rows.h"
-
 #include "dsp/fft.h"
 #include "dsp/signalgenerators.h"
 #include "stream_helpers.h"
+#include "support/rows.h"
 
 #include <QTest>
 

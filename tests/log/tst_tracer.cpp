@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "log/Tracer.h"
-
 #include "support/logreader.h"
 #include "support/rows.h"
 

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "streams/BufferedIO.h"
 #include "streams/levels.h"
-
 #include "support/TestDevice.h"
 #include "support/logreader.h"
 #include "support/rows.h"

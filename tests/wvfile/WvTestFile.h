@@ -1,15 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "support/TestDevice.h"
-
 #include "streams/BufferedIO.h"
+#include "support/TestDevice.h"
+#include "support/files.h"
 #include "support/logreader.h"
+#include "support/wvbytes.h"
 #include "wvfile/HvFileIO.h"
 #include "wvfile/WvTypes.h"
 
-#include "support/files.h"
-#include "support/wvbytes.h"
 #include <QByteArray>
 #include <QDateTime>
 #include <QList>

@@ -3,11 +3,11 @@
 // A disk that fills up: a small file system in memory, mounted where this process alone sees it.
 #include "streams/BufferedIO.h"
 #include "streams/TempStream.h"
+#include "support/files.h"
 #include "support/logreader.h"
 #include "support/rows.h"
 #include "wvfile/HvFileIO.h"
 
-#include "support/files.h"
 #include <QCoreApplication>
 #include <QDir>
 #include <QFile>

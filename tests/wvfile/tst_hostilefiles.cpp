@@ -3,7 +3,6 @@
 // Files that lie. What they may cost is counted in bytes moved and not in seconds, so that a slow
 // machine doesn't matter; one that really hangs ends at the time limit of the test.
 #include "WvTestFile.h"
-
 #include "base/ProgressClock.h"
 #include "support/rows.h"
 #include "wvfile/WvReader.h"

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "WvTestFile.h"
-
 #include "QRegularExpression"
+#include "WvTestFile.h"
 #include "support/rows.h"
 #include "support/seed.h"
+
 #include <QTest>
 
 #include <random>

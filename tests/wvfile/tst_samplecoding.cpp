@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "support/rows.h"
+#include "support/seed.h"
 #include "wvfile/SampleCoding.h"
 
-#include "support/seed.h"
 #include <QTest>
 
 #include <cmath>

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvTestFile.h"
-
 #include "support/rows.h"
 #include "wvfile/WvScanner.h"
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "WvTestFile.h"
-
 #include "support/rows.h"
+
 #include <QTest>
 
 #include <cmath>
