@@ -18,11 +18,20 @@
 
 namespace {
 
+/// The first argument that is no option: those before a command take no values.
+template <typename Iterator>
+Iterator findCommand(Iterator begin, Iterator end)
+{
+    return std::find_if(begin, end,
+                        [](std::string_view argument) { return !argument.starts_with('-'); });
+}
+
 /// Only pictures need fonts and painters; all else starts without the window system's modules, and
 /// nothing needs a display.
 std::unique_ptr<QCoreApplication> makeApplication(int &argc, char **argv)
 {
-    if (std::find(argv, argv + argc, std::string_view("plot")) == argv + argc) {
+    char **const command = findCommand(argv + std::min(argc, 1), argv + argc);
+    if (command == argv + argc || *command != std::string_view("plot")) {
         return std::make_unique<QCoreApplication>(argc, argv);
     }
     qputenv("QT_QPA_PLATFORM", "offscreen");
@@ -51,9 +60,7 @@ QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
 std::vector<std::string> argumentsOf(int argc, char **argv)
 {
     std::vector<std::string> arguments(argv + std::min(argc, 1), argv + argc);
-    const auto command =
-        std::find_if(arguments.begin(), arguments.end(),
-                     [](const std::string &argument) { return !argument.starts_with('-'); });
+    const auto command = findCommand(arguments.begin(), arguments.end());
     if (command != arguments.end() && *command == "info") {
         std::for_each(command, arguments.end(), [](std::string &argument) {
             if (argument.starts_with('[')) {

@@ -1,19 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliRun.h"
-#include "jobs/filebytes.h"
+#include "support/files.h"
+#include "support/rows.h"
+#include "support/wavbytes.h"
+#include "support/wvbytes.h"
 
 #include <QDir>
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QStandardPaths>
-#include <QTemporaryDir>
 #include <QTest>
 
 #include <cmath>
 #include <cstdlib>
-
-using namespace filebytes;
 
 /// What the commands print and write, against decoders of the test's own and against sox.
 class TestCliResults : public QObject
@@ -22,28 +22,24 @@ class TestCliResults : public QObject
 
 private slots:
     void initTestCase();
-    void dumpsEachForm_data();
     void dumpsEachForm();
-    void dumpsRanges_data();
     void dumpsRanges();
     void dumpsMarkers();
     void infoListsFiles();
     void infoShowsTheRest();
-    void infoTellsSegments();
     void measuresSamples();
     void listsWavFiles();
-    void carriesSoundThrough_data();
     void carriesSoundThrough();
 
 private:
-    [[nodiscard]] QString path(const QString &name) const { return m_folder.filePath(name); }
+    [[nodiscard]] QString path(const QString &name) const { return m_folder.path(name); }
 
     [[nodiscard]] CliRun run(const QString &arguments) const
     {
         return CliRun::in(m_folder.path(), arguments.split(' ', Qt::SkipEmptyParts));
     }
 
-    QTemporaryDir m_folder;
+    TestFolder m_folder;
 };
 
 namespace {
@@ -52,15 +48,6 @@ namespace {
 const QList<int> testWords{0,     1,      -1,    2,     -2,   32767, -32767, 12345, -12345,
                            16384, -16384, 10000, -9999, 3277, 33,    -327,   7,     -32766};
 const QByteArray kindA = "{TYPE: TGX-WV,0}";
-
-QByteArray asBytes(const QList<int> &values)
-{
-    QByteArray bytes;
-    for (const int value : values) {
-        bytes += words({value});
-    }
-    return bytes;
-}
 
 /// The value of a word in the common coding, in the single precision of the streams.
 float valueOf(int word)
@@ -82,10 +69,8 @@ void TestCliResults::initTestCase()
     QVERIFY2(QFile::exists(CliRun::program()), "CORVANE_BIN must name the folder of corvane-cli");
 }
 
-void TestCliResults::dumpsEachForm_data()
+void TestCliResults::dumpsEachForm()
 {
-    QTest::addColumn<QString>("format");
-    QTest::addColumn<QByteArray>("expected");
     QByteArray csv = "sample,i,q,markers\n";
     QByteArray floats;
     for (qsizetype i = 0; i < testWords.size(); i += 2) {
@@ -97,53 +82,38 @@ void TestCliResults::dumpsEachForm_data()
         csv += line.data();
         floats += littleEndian(inPhase) + littleEndian(quadrature);
     }
-    QTest::newRow("default") << "" << csv;
-    QTest::newRow("csv") << "--format csv" << csv;
-    QTest::newRow("cf32") << "--format cf32" << floats;
-    QTest::newRow("ci16") << "--format ci16" << asBytes(testWords);
-}
-
-void TestCliResults::dumpsEachForm()
-{
-    QFETCH(QString, format);
-    QFETCH(QByteArray, expected);
-    QVERIFY(store(path("in.wv"), wvFile(kindA, asBytes(testWords))));
-    const CliRun answer = run("dump in.wv " + format);
-    QCOMPARE(answer.exitCode, 0);
-    QCOMPARE(answer.output, expected);
-    QCOMPARE(run("dump in.wv --force -o dumped " + format).exitCode, 0);
-    QCOMPARE(load(path("dumped")), expected);
-}
-
-void TestCliResults::dumpsRanges_data()
-{
-    QTest::addColumn<QString>("range");
-    QTest::addColumn<qsizetype>("begin");
-    QTest::addColumn<qsizetype>("count");
-    // Blocks of the dump hold 16384 samples, those of the reader 65536.
-    QTest::newRow("all") << "" << qsizetype(0) << qsizetype(70000);
-    QTest::newRow("from") << "--from 69999" << qsizetype(69999) << qsizetype(1);
-    QTest::newRow("count") << "--count 16385" << qsizetype(0) << qsizetype(16385);
-    QTest::newRow("both") << "--from 16383 --count 49155" << qsizetype(16383) << qsizetype(49155);
-    QTest::newRow("prefix") << "--from 65.5k --count 3" << qsizetype(65500) << qsizetype(3);
+    QVERIFY(m_folder.store("in.wv", wvFile(kindA, words(testWords))));
+    forRows({{"default", "", csv},
+             {"cf32", "--format cf32", floats},
+             {"ci16", "--format ci16", words(testWords)}},
+            [&](const QString &format, const QByteArray &expected) {
+                const CliRun answer = run("dump in.wv " + format);
+                QCOMPARE(answer.exitCode, 0);
+                QCOMPARE(answer.output, expected);
+                QCOMPARE(run("dump in.wv --force -o dumped " + format).exitCode, 0);
+                QCOMPARE(m_folder.load("dumped"), expected);
+            });
 }
 
 void TestCliResults::dumpsRanges()
 {
-    QFETCH(QString, range);
-    QFETCH(qsizetype, begin);
-    QFETCH(qsizetype, count);
     QByteArray samples;
     for (int i = 0; i < 140000; ++i) {
         samples += littleEndian(static_cast<qint16>((i * 7919) % 32767));
     }
-    QVERIFY(store(path("in.wv"), wvFile(kindA, samples)));
-    QVERIFY(run("dump in.wv --format ci16 " + range).output == samples.mid(4 * begin, 4 * count));
-    const QByteArray csv = run("dump in.wv " + range).output;
-    const QList<QByteArray> lines = csv.split('\n');
-    QCOMPARE(lines.size(), count + 2); // the header and the end of the last line
-    QVERIFY(lines.at(1).startsWith(QByteArray::number(begin) + ','));
-    QVERIFY(lines.at(count).startsWith(QByteArray::number(begin + count - 1) + ','));
+    QVERIFY(m_folder.store("in.wv", wvFile(kindA, samples)));
+    // Blocks of the dump hold 16384 samples, those of the reader 65536.
+    forRows({{"all", "", 0, 70000},
+             {"both", "--from 16383 --count 49155", 16383, 49155},
+             {"prefix", "--from 65.5k --count 3", 65500, 3}},
+            [&](const QString &range, int begin, int count) {
+                QVERIFY(run("dump in.wv --format ci16 " + range).output ==
+                        samples.mid(4 * begin, 4 * count));
+                const QList<QByteArray> lines = run("dump in.wv " + range).output.split('\n');
+                QCOMPARE(lines.size(), count + 2); // the header and the end of the last line
+                QVERIFY(lines.at(1).startsWith(QByteArray::number(begin) + ','));
+                QVERIFY(lines.at(count).startsWith(QByteArray::number(begin + count - 1) + ','));
+            });
 }
 
 void TestCliResults::dumpsMarkers()
@@ -152,7 +122,7 @@ void TestCliResults::dumpsMarkers()
     const QByteArray lists =
         "{CONTROL LENGTH:7}{MARKER LIST 1: 0:1;2:0}{MARKER LIST 2: 0:0;1:1;5:0}"
         "{MARKER LIST 3: 0:0}{MARKER LIST 4: 0:0;6:1}";
-    QVERIFY(store(path("in.wv"), wvFile(kindA + lists, QByteArray(32, '\0'))));
+    QVERIFY(m_folder.store("in.wv", wvFile(kindA + lists, QByteArray(32, '\0'))));
     const QList<QByteArray> lines = run("dump in.wv").output.split('\n');
     QList<QByteArray> markers;
     for (int i = 1; i <= 8; ++i) {
@@ -166,7 +136,7 @@ void TestCliResults::infoListsFiles()
     const QByteArray tags = "{TYPE: TVX-WV,77}{COMMENT:say \"hi\" \\}{COPYRIGHT:me}"
                             "{DATE:2011-04-18;09:30:00}{CLOCK:2000000}{LEVEL OFFS:6.5,1.25}"
                             "{SAMPLES:4}{MARKER LIST 1: 0:1}";
-    QVERIFY(store(path("a b.wv"), wvFile(tags, QByteArray(16, '\0'))));
+    QVERIFY(m_folder.store("a b.wv", wvFile(tags, QByteArray(16, '\0'))));
     const CliRun answer = CliRun::in(m_folder.path(), {"info", "--json", path("a b.wv")});
     QCOMPARE(answer.exitCode, 0);
     QVERIFY(json(answer).isArray());
@@ -190,25 +160,13 @@ void TestCliResults::infoListsFiles()
                                {"segmentCount", 0},
                                {"segments", QJsonArray()}};
     QCOMPARE(object, expected);
-    const CliRun text = CliRun::in(m_folder.path(), {"info", "a b.wv"});
-    QStringList rows = QString::fromUtf8(text.output).split('\n', Qt::SkipEmptyParts);
-    for (QString &row : rows) {
-        row = row.simplified();
-    }
-    QCOMPARE(rows,
-             (QStringList{"File: a b.wv", "Type: TVX Waveform File",
-                          QString("File Size: %1 bytes").arg(QFileInfo(path("a b.wv")).size()),
-                          "Created: " + today, "Comment: 'say \"hi\" \\'", "Copyright: 'me'",
-                          "Date Info: '2011-04-18;09:30:00'", "Samples: 4", "Clock: 2 MHz",
-                          "Play Time: 2 us", "Peak Offset (Tag): 1.25 dB",
-                          "Peak / RMS (Tag): 5.25 dB", "Checksum: Yes", "Markers: Yes"}));
 }
 
 void TestCliResults::infoShowsTheRest()
 {
-    QVERIFY(store(path("1.wv"), wvFile(kindA + "{CLOCK:1}", QByteArray(4, '\0'))));
-    QVERIFY(store(path("2.wv"), "{TYPE: NONE,0}"));
-    QVERIFY(store(path("3.wv"), {}));
+    QVERIFY(m_folder.store("1.wv", wvFile(kindA + "{CLOCK:1}", QByteArray(4, '\0'))));
+    QVERIFY(m_folder.store("2.wv", "{TYPE: NONE,0}"));
+    QVERIFY(m_folder.store("3.wv", {}));
     const CliRun listed = run("info 1.wv 2.wv missing.wv 3.wv --json");
     QCOMPARE(listed.exitCode, 1);
     const QJsonArray objects = json(listed).array();
@@ -226,29 +184,9 @@ void TestCliResults::infoShowsTheRest()
     QCOMPARE(json(run("info missing.wv --json")).array().size(), 0);
 }
 
-void TestCliResults::infoTellsSegments()
-{
-    QVERIFY(store(path("m.wv"), "{TYPE: TGX-MWV,0}{MWV_SEGMENT_COUNT:2}{CLOCK:1e6}"
-                                "{MWV_SEGMENT_FILES:\"a.wv\",\"b.wv\"}{MWV_SEGMENT_START:0,100}"
-                                "{MWV_SEGMENT_LENGTH:100,3000000000}{MWV_SEGMENT_CLOCK:1e6,2.5e6}"
-                                "{MWV_SEGMENT_DURATION:0.0001,1200}"
-                                "{MWV_SEGMENT_LEVEL_OFFS:3,1,6,2}"));
-    const QJsonObject object = json(run("info m.wv --json")).array().first().toObject();
-    QCOMPARE(object.value("segmentCount"), 2);
-    QCOMPARE(object.value("segments").toArray().at(1).toObject(),
-             (QJsonObject{{"fileName", "b.wv"},
-                          {"clock", 2.5e6},
-                          {"start", 100},
-                          {"length", qint64(3000000000)},
-                          {"duration", 1200},
-                          {"peakOffset", 2},
-                          {"rmsOffset", 6}}));
-    QCOMPARE(run("dump m.wv").lastLine(), "error: File is not a valid waveform file (TGX-MWV) !");
-}
-
 void TestCliResults::measuresSamples()
 {
-    QVERIFY(store(path("in.wv"), wvFile(kindA, words({0x4000, 0, 0, 0, 0, 0, 0, -100}))));
+    QVERIFY(m_folder.store("in.wv", wvFile(kindA, words({0x4000, 0, 0, 0, 0, 0, 0, -100}))));
     const CliRun answer = run("measure in.wv --json");
     QCOMPARE(answer.exitCode, 0);
     const QJsonObject levels = json(answer).object();
@@ -271,8 +209,8 @@ void TestCliResults::measuresSamples()
 
 void TestCliResults::listsWavFiles()
 {
-    QVERIFY(store(path("in.wav"),
-                  wavFile(formatChunk(1, 2, 192000) + chunk("data", QByteArray(384000, '\0')))));
+    QVERIFY(m_folder.store(
+        "in.wav", wavFile(formatChunk(1, 2, 192000) + chunk("data", QByteArray(384000, '\0')))));
     QCOMPARE(json(run("import wav in.wav --list --json")).object(),
              (QJsonObject{{"sampleRate", 192000},
                           {"samples", 96000},
@@ -284,23 +222,16 @@ void TestCliResults::listsWavFiles()
     QCOMPARE(text.simplified(), "Sample Rate: 192 kHz Samples: 96000 Play Time: 500 ms");
 }
 
-void TestCliResults::carriesSoundThrough_data()
-{
-    QTest::addColumn<QString>("making"); // effects for sox
-    QTest::newRow("sines") << "synth 0.5 sine 997 sine 1501 vol 0.7";
-    QTest::newRow("noise") << "synth 0.5 whitenoise pinknoise vol 0.5";
-    QTest::newRow("one channel silent") << "synth 0.5 square 440 remix 1 0 vol 0.9";
-}
-
 void TestCliResults::carriesSoundThrough()
 {
     if (QStandardPaths::findExecutable("sox").isEmpty()) {
         QSKIP("sox, which makes the files, is not installed");
     }
-    QFETCH(QString, making);
     const auto sox = [&](const QString &arguments) {
         return CliRun::of(m_folder.path(), "sox", arguments.split(' ', Qt::SkipEmptyParts));
     };
+    // Noise on one channel, and a tone of its own on the other.
+    const QString making = "synth 0.5 whitenoise sine 997 vol 0.7";
     QCOMPARE(sox("-D -R -n -r 96000 -b 16 -c 2 in.wav " + making).exitCode, 0);
     QCOMPARE(sox("in.wav -t raw -e signed-integer -b 16 original.raw").exitCode, 0);
     const CliRun imported = run("import wav in.wav -o out.wv --scaling none --force");
@@ -310,7 +241,7 @@ void TestCliResults::carriesSoundThrough()
 
     // A word w is w / 32768 on the way, which becomes trunc(w / 32768 * 32767 + 0.5), each step of
     // it in single precision.
-    const QByteArray original = load(path("original.raw"));
+    const QByteArray original = m_folder.load("original.raw");
     QCOMPARE(original.size(), 4 * 48000);
     QByteArray expected;
     for (qsizetype i = 0; i < original.size(); i += 2) {
@@ -318,7 +249,7 @@ void TestCliResults::carriesSoundThrough()
         const float scaled = value * 32767.0F + 0.5F;
         expected += littleEndian(static_cast<qint16>(scaled));
     }
-    QVERIFY(load(path("dumped.raw")) == expected);
+    QVERIFY(m_folder.load("dumped.raw") == expected);
 
     // Heard by sox, the result is the source but for the steps of 16 bits.
     QCOMPARE(sox("-t raw -r 96000 -e signed-integer -b 16 -c 2 dumped.raw out.wav").exitCode, 0);

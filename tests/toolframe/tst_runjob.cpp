@@ -1,19 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "base/ProgressClock.h"
 #include "jobs/ToolJob.h"
-#include "log/Tracer.h"
+#include "support/files.h"
+#include "support/logreader.h"
+#include "support/modals.h"
 #include "toolframe/QtProgressDialog.h"
 #include "toolframe/questions.h"
 #include "toolframe/runjob.h"
 
-#include <QApplication>
-#include <QFile>
-#include <QMessageBox>
-#include <QPushButton>
-#include <QTemporaryDir>
 #include <QTest>
 #include <QTextEdit>
-#include <QTimer>
 
 namespace {
 
@@ -21,7 +17,7 @@ namespace {
 class SampleJob : public ToolJob
 {
 public:
-    enum class End { Success, Failure, WaitForCancel };
+    enum class End { Success, WaitForCancel };
 
     explicit SampleJob(End end)
         : m_end(end)
@@ -49,19 +45,6 @@ private:
     End m_end;
 };
 
-/// Does something to the next modal window of a class that comes up.
-template <typename Window>
-void onNext(QTimer &timer, const std::function<void(Window &)> &action)
-{
-    QObject::connect(&timer, &QTimer::timeout, [&timer, action] {
-        if (auto *window = qobject_cast<Window *>(QApplication::activeModalWidget())) {
-            timer.stop();
-            action(*window);
-        }
-    });
-    timer.start(10);
-}
-
 } // namespace
 
 class TestRunJob : public QObject
@@ -69,21 +52,10 @@ class TestRunJob : public QObject
     Q_OBJECT
 
 private slots:
-    void outcomes();
     void reportKeepsItsLayout();
     void cancelButtonEndsTheJob();
-    void asksBeforeOverwriting_data();
     void asksBeforeOverwriting();
-    void newFilesNeedNoQuestion();
 };
-
-void TestRunJob::outcomes()
-{
-    SampleJob good(SampleJob::End::Success);
-    QCOMPARE(runJob(good, nullptr, nullptr), JobOutcome::Finished);
-    SampleJob bad(SampleJob::End::Failure);
-    QCOMPARE(runJob(bad, nullptr, nullptr), JobOutcome::Failed);
-}
 
 void TestRunJob::reportKeepsItsLayout()
 {
@@ -104,53 +76,32 @@ void TestRunJob::cancelButtonEndsTheJob()
     SampleJob job(SampleJob::End::WaitForCancel);
     QString label;
     int value = 0;
-    QTimer timer;
-    onNext<QtProgressDialog>(timer, [&](QtProgressDialog &dialog) {
-        label = dialog.labelText();
-        value = dialog.value();
-        QTest::keyClick(&dialog, Qt::Key_Escape);
-    });
+    whenModal([](QWidget &window) { return qobject_cast<QtProgressDialog *>(&window) != nullptr; },
+              [&](QWidget &window) {
+                  const auto &dialog = dynamic_cast<QtProgressDialog &>(window);
+                  label = dialog.labelText();
+                  value = dialog.value();
+                  QTest::keyClick(&window, Qt::Key_Escape);
+              });
     QCOMPARE(runJob(job, nullptr, nullptr), JobOutcome::Cancelled);
     QCOMPARE(label, "Reading Waveform...");
     QCOMPARE(value, 10);
 }
 
-void TestRunJob::asksBeforeOverwriting_data()
-{
-    QTest::addColumn<QMessageBox::StandardButton>("button");
-    QTest::addColumn<bool>("agreed");
-    QTest::newRow("yes") << QMessageBox::Yes << true;
-    QTest::newRow("no") << QMessageBox::No << false;
-}
-
 void TestRunJob::asksBeforeOverwriting()
 {
-    QFETCH(QMessageBox::StandardButton, button);
-    QFETCH(bool, agreed);
-    QTemporaryDir folder;
-    QFile file(folder.filePath("taken.wv"));
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    (void)Tracer::takeEntries();
-    QString title;
-    QString text;
-    QTimer timer;
-    onNext<QMessageBox>(timer, [&](QMessageBox &box) {
-        title = box.windowTitle();
-        text = box.text();
-        QTest::mouseClick(box.button(button), Qt::LeftButton);
-    });
-    QCOMPARE(confirmOverwrite(nullptr, file.fileName()), agreed);
-    QCOMPARE(title, "Overwrite File");
-    QCOMPARE(text, "The target file already exists.\nDo you want to overwrite this file?");
-    const QList<Tracer::Entry> lines = Tracer::takeEntries();
-    QCOMPARE(lines.size(), agreed ? 0 : 1);
-    QVERIFY(agreed || lines.first().first.endsWith("  User break."));
-}
-
-void TestRunJob::newFilesNeedNoQuestion()
-{
-    QTemporaryDir folder;
-    QVERIFY(confirmOverwrite(nullptr, folder.filePath("new.wv")));
+    const TestFolder folder;
+    QVERIFY(folder.store("taken.wv", {}));
+    QVERIFY(confirmOverwrite(nullptr, folder.path("new.wv")));
+    for (const bool agreed : {true, false}) {
+        (void)takeLog();
+        Seen seen;
+        QVERIFY(
+            withModal([&] { QCOMPARE(confirmOverwrite(nullptr, folder.path("taken.wv")), agreed); },
+                      answer(agreed ? "Yes" : "No", seen)));
+        QCOMPARE(seen.title, "Overwrite File");
+        QCOMPARE(takeMessages(), agreed ? QStringList() : QStringList("User break."));
+    }
 }
 
 QTEST_MAIN(TestRunJob)
