@@ -64,10 +64,3 @@ void FakeInstrument::failCall(const QString &beginning, qint32 status, int skipp
         return skipped-- > 0 ? 0 : status;
     };
 }
-
-void FakeInstrument::fail(const Fault &fault) const
-{
-    if (!fault.call.isEmpty()) {
-        failCall(fault.call, fault.status, fault.skipped);
-    }
-}

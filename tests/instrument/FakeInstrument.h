@@ -3,18 +3,8 @@
 
 #include "FakeVisa.h"
 
-#include <QMetaType>
 #include <QString>
 #include <QStringList>
-
-/// A call that is to end with a status after some of its kind went well.
-struct Fault
-{
-    QString call; ///< how it begins; empty for none
-    qint32 status = 0;
-    int skipped = 0;
-};
-Q_DECLARE_METATYPE(Fault)
 
 /// Makes the next first VisaDevice load the fake library and gives access to its script.
 class FakeInstrument
@@ -36,7 +26,6 @@ public:
 
     /// Makes the calls that begin so end with a status, after `skipped` of them went well.
     void failCall(const QString &beginning, qint32 status, int skipped = 0) const;
-    void fail(const Fault &fault) const;
 
     [[nodiscard]] static QString libraryName();
 

@@ -4,6 +4,7 @@
 
 #include "instrument/ArbControl.h"
 #include "instrument/VisaDevice.h"
+#include "support/rows.h"
 
 #include <QElapsedTimer>
 #include <QSignalSpy>
@@ -21,102 +22,93 @@ class TestArbStart : public QObject
     Q_OBJECT
 private slots:
     void init() { (void)takeLog(); }
-    void arbWait_data();
     void arbWait();
-    void arbStart_data();
     void arbStart();
     void arbCancel();
 };
 
-void TestArbStart::arbWait_data()
-{
-    QTest::addColumn<QString>("model");
-    QTest::addColumn<QStringList>("conditions");
-    QTest::addColumn<int>("seconds");
-    QTest::addColumn<bool>("ready");
-    QTest::addColumn<QStringList>("words");
-    QTest::newRow("no time") << "TGX-870" << QStringList{} << 0 << false << QStringList{};
-    QTest::newRow("ready") << "TGX-870" << QStringList{"0"} << 3 << true << QStringList{};
-    QTest::newRow("other bits") << "TGX-870" << QStringList{"5"} << 3 << true << QStringList{};
-    QTest::newRow("busy, then ready")
-        << "TGX-840" << QStringList{"2", "4"} << 4 << true << QStringList{};
-    QTest::newRow("busy too long") << "TGX-840" << QStringList(20, "2") << 2 << false
-                                   << QStringList{"4 ARB did not get ready in time."};
-    QTest::newRow("nonsense") << "TGX-870" << QStringList{"abc"} << 3 << false
-                              << QStringList{"4 Invalid instrument response."};
-    QTest::newRow("no progress") << "TGX-870" << QStringList{"MCOD"} << 3 << false
-                                 << QStringList{"4 Cannot read MCOD progress."};
-    QTest::newRow("no condition") << "TGX-870" << QStringList{"COND"} << 3 << false
-                                  << QStringList{"4 Cannot read instrument status."};
-}
-
 void TestArbStart::arbWait()
 {
-    QFETCH(const QString, model);
-    QFETCH(QStringList, conditions);
-    QFETCH(const int, seconds);
-    QFETCH(const bool, ready);
-    QFETCH(const QStringList, words);
-    FakeInstrument fake;
-    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    device.setArbIntervals(Short);
-    // A word among the numbers stands for the query at which the instrument complains.
-    const QString failing = conditions.value(0).size() == 4 ? conditions.first() : QString("-");
-    fake->answer = [&](const std::string &message) -> std::string {
-        if (QString::fromStdString(message).contains(failing)) {
-            fake->errors = {"-300,\"Device-specific error\""};
-        }
-        if (message == "SOUR:BB:PROG:MCOD?") {
-            return "37\n";
-        }
-        return message == "STAT:OPER:COND?" ? conditions.takeFirst().toStdString() + "\n"
-                                            : std::string();
+    struct Row
+    {
+        const char *name;
+        QString model;
+        QStringList conditions; ///< a word of four letters: the query at which it complains
+        int seconds;
+        bool ready;
+        QStringList words;
     };
-    (void)fake.takeMessages();
-    (void)takeLog();
-    QSignalSpy progress(&device, &VisaDevice::ProgressUpdate);
-    QCOMPARE(device.waitForArbReady(seconds), ready);
-    QCOMPARE(takeLog(), words);
-    const bool asksProgress = model == "TGX-870" && seconds > 0;
-    QCOMPARE(fake.takeMessages().contains("SOUR:BB:PROG:MCOD?"), asksProgress);
-    if (ready) {
-        QCOMPARE(progress.last().first().toInt(), 100);
-    }
-}
-
-void TestArbStart::arbStart_data()
-{
-    QTest::addColumn<QString>("model");
-    QTest::addColumn<QStringList>("messages");
-    QTest::newRow("with a coder") << "TGX-870"
-                                  << QStringList{"SOUR:BB:ARB:WAV:SEL '/var/user/a.wv'",
-                                                 "SOUR:BB:PROG:MCOD?", "STAT:OPER:COND?",
-                                                 "SOUR:BB:ARB:STAT ON; *OPC?"};
-    QTest::newRow("without") << "TGX-840"
-                             << QStringList{"SOUR:WAV:SEL '/var/user/a.wv'", "STAT:OPER:COND?",
-                                            "SOUR:STAT ON; *OPC?"};
+    forRows<Row>(
+        {{"no time", "TGX-870", {}, 0, false, {}},
+         {"other bits", "TGX-870", {"5"}, 3, true, {}},
+         {"busy, then ready", "TGX-840", {"2", "4"}, 20, true, {}},
+         {"busy too long",
+          "TGX-840",
+          QStringList(99, "2"),
+          2,
+          false,
+          {"4 ARB did not get ready in time."}},
+         {"nonsense", "TGX-870", {"abc"}, 3, false, {"4 Invalid instrument response."}},
+         {"no progress", "TGX-870", {"MCOD"}, 3, false, {"4 Cannot read MCOD progress."}},
+         {"no condition", "TGX-870", {"COND"}, 3, false, {"4 Cannot read instrument status."}}},
+        [](const Row &row) {
+            FakeInstrument fake;
+            fake->identity = "Halvorn," + row.model.toStdString() + ",x/1/2,1.0";
+            VisaDevice device;
+            QVERIFY(device.openResource(resource));
+            device.setArbIntervals(Short);
+            QStringList conditions = row.conditions;
+            const QString failing = conditions.value(0).size() == 4 ? conditions.first() : "-";
+            fake->answer = [&](const std::string &message) -> std::string {
+                if (QString::fromStdString(message).contains(failing)) {
+                    fake->errors = {"-300,\"Device-specific error\""};
+                }
+                if (message == "SOUR:BB:PROG:MCOD?") {
+                    return "37\n";
+                }
+                return message == "STAT:OPER:COND?" ? conditions.takeFirst().toStdString() + "\n"
+                                                    : std::string();
+            };
+            (void)fake.takeMessages();
+            (void)takeLog();
+            QSignalSpy progress(&device, &VisaDevice::ProgressUpdate);
+            QCOMPARE(device.waitForArbReady(row.seconds), row.ready);
+            QCOMPARE(takeLog(), row.words);
+            QCOMPARE(fake.takeMessages().contains("SOUR:BB:PROG:MCOD?"),
+                     row.model == "TGX-870" && row.seconds > 0);
+            if (row.ready) {
+                QCOMPARE(progress.last().first().toInt(), 100);
+            }
+        });
 }
 
 void TestArbStart::arbStart()
 {
-    QFETCH(const QString, model);
-    QFETCH(const QStringList, messages);
-    FakeInstrument fake;
-    fake->identity = "Halvorn," + model.toStdString() + ",x/1/2,1.0";
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    device.setArbIntervals(Short);
-    fake->answer = [&](const std::string &message) {
-        return message == "STAT:OPER:COND?" || message == "SOUR:BB:PROG:MCOD?" ? std::string("0\n")
-                                                                               : std::string();
+    struct Row
+    {
+        const char *name;
+        QStringList messages;
     };
-    // An old error is no error of this start.
-    fake->errors = {"-1,\"Old\""};
-    (void)fake.takeMessages();
-    QVERIFY(device.startArb("/var/user/a.wv"));
-    QCOMPARE(fake.takeMessages(), messages);
+    forRows<Row>(
+        {{"TGX-870",
+          {"SOUR:BB:ARB:WAV:SEL '/var/user/a.wv'", "SOUR:BB:PROG:MCOD?", "STAT:OPER:COND?",
+           "SOUR:BB:ARB:STAT ON; *OPC?"}},
+         {"TGX-840", {"SOUR:WAV:SEL '/var/user/a.wv'", "STAT:OPER:COND?", "SOUR:STAT ON; *OPC?"}}},
+        [](const Row &row) {
+            FakeInstrument fake;
+            fake->identity = "Halvorn," + std::string(row.name) + ",x/1/2,1.0";
+            VisaDevice device;
+            QVERIFY(device.openResource(resource));
+            device.setArbIntervals(Short);
+            fake->answer = [](const std::string &message) {
+                return message == "STAT:OPER:COND?" || message == "SOUR:BB:PROG:MCOD?" ? "0\n" : "";
+            };
+            // An old error is no error of this start.
+            fake->errors = {"-1,\"Old\""};
+            (void)fake.takeMessages();
+            QVERIFY(device.startArb("/var/user/a.wv"));
+            QCOMPARE(fake.takeMessages(), row.messages);
+        });
 }
 
 void TestArbStart::arbCancel()

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // The instr commands of corvane-cli against simulated instruments.
 #include "simulator/SimulatorProcess.h"
+#include "support/files.h"
+#include "support/rows.h"
 
 #include <QDir>
 #include <QElapsedTimer>
@@ -46,18 +48,6 @@ Outcome run(const QStringList &arguments)
     return outcomeOf(process);
 }
 
-bool store(const QString &fileName, const QByteArray &bytes)
-{
-    QFile file(fileName);
-    return file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size();
-}
-
-QByteArray content(const QString &fileName)
-{
-    QFile file(fileName);
-    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
-}
-
 const QString device = "GPIB0::28";
 
 } // namespace
@@ -68,23 +58,20 @@ class TestInstrCommands : public QObject
 private slots:
     void init();
     void cleanup() { m_simulator.reset(); }
-    void wrongUsage_data();
     void wrongUsage();
     void info();
     void scan();
     void queryAndSend();
     void foldersAndFiles();
-    void drives();
     void transfers();
     void getKeepsFiles();
-    void failures_data();
     void failures();
     void play();
-    void interrupted_data();
     void interrupted();
     void withoutLibrary();
 
 private:
+    void interrupt(const QString &command, const QByteArray &sign);
     [[nodiscard]] QString local(const QString &name) const { return m_folder->filePath(name); }
     [[nodiscard]] QString remote(const QString &name) const
     {
@@ -110,37 +97,31 @@ void TestInstrCommands::init()
     qputenv("CORVANE_VISA_CONFIG", local("visa.ini").toLocal8Bit());
 }
 
-void TestInstrCommands::wrongUsage_data()
-{
-    QTest::addColumn<QStringList>("arguments");
-    QTest::addColumn<QString>("words");
-    QTest::newRow("no command") << QStringList{} << "subcommand";
-    QTest::newRow("unknown command") << QStringList{"dance", "x"} << "dance";
-    QTest::newRow("no resource") << QStringList{"info"} << "resource";
-    QTest::newRow("empty resource") << QStringList{"info", " "} << "RES";
-    QTest::newRow("no local file") << QStringList{"get", "x", "/a.wv"} << "local";
-    QTest::newRow("other interface") << QStringList{"scan", "tcpip"} << "gpib, usb";
-    QTest::newRow("no waveform") << QStringList{"run", "x", "/var/user/a.wv.txt"} << "a.wv.txt";
-    QTest::newRow("time-out") << QStringList{"run", "x", "/a.wv", "--timeout", "0"} << "--timeout";
-    QTest::newRow("relative folder") << QStringList{"mkdir", "x", "a"} << "'a'";
-    QTest::newRow("drive alone") << QStringList{"rmdir", "x", "D:", "--recursive"} << "'D:'";
-    QTest::newRow("top alone") << QStringList{"rmdir", "x", "/"} << "'/'";
-    QTest::newRow("folder above") << QStringList{"rmdir", "x", "/a/b/..", "--recursive"} << "..";
-    QTest::newRow("old name relative") << QStringList{"mv", "x", "a.wv", "b.wv"} << "OLD";
-    QTest::newRow("other folder") << QStringList{"mv", "x", "/d/a.wv", "/e/a.wv"} << "NEW";
-    QTest::newRow("apostrophe") << QStringList{"rm", "x", "/it's.wv"} << "apostrophe";
-    QTest::newRow("empty query") << QStringList{"query", "x", ""} << "COMMAND";
-}
-
 void TestInstrCommands::wrongUsage()
 {
-    QFETCH(const QStringList, arguments);
-    QFETCH(const QString, words);
-    const Outcome outcome = run(arguments);
-    QCOMPARE(outcome.exitCode, 2);
-    QVERIFY(outcome.output.isEmpty());
-    QVERIFY2(outcome.lastLine().startsWith("error: ") && outcome.lastLine().contains(words),
-             qPrintable(outcome.log.join('\n')));
+    struct Row
+    {
+        const char *name;
+        QStringList arguments;
+        QString words;
+    };
+    forRows<Row>({{"unknown command", {"dance", "x"}, "dance"},
+                  {"empty resource", {"info", " "}, "RES"},
+                  {"other interface", {"scan", "tcpip"}, "gpib, usb"},
+                  {"no waveform", {"run", "x", "/var/user/a.wv.txt"}, "a.wv.txt"},
+                  {"drive alone", {"rmdir", "x", "D:", "--recursive"}, "'D:'"},
+                  {"folder above", {"rmdir", "x", "/a/b/..", "--recursive"}, ".."},
+                  {"other folder", {"mv", "x", "/d/a.wv", "/e/a.wv"}, "NEW"},
+                  {"apostrophe", {"rm", "x", "/it's.wv"}, "apostrophe"},
+                  {"few samples", {"capture", "x", "-o", "a.wv", "--samples", "99"}, "--samples"}},
+                 [](const Row &row) {
+                     const Outcome outcome = run(row.arguments);
+                     QCOMPARE(outcome.exitCode, 2);
+                     QVERIFY(outcome.output.isEmpty());
+                     QVERIFY2(outcome.lastLine().startsWith("error: ") &&
+                                  outcome.lastLine().contains(row.words),
+                              qPrintable(outcome.log.join('\n')));
+                 });
 }
 
 void TestInstrCommands::info()
@@ -212,7 +193,7 @@ void TestInstrCommands::foldersAndFiles()
                              "BIN            5  w/a.wv\n");
     QCOMPARE(run({"mv", device, "/var/user/w/a.wv", "c.wv"}).exitCode, 0);
     QCOMPARE(run({"mv", device, "/var/user/w/c.wv", "/var/user/w/d.wv"}).exitCode, 0);
-    QCOMPARE(content(remote("w/d.wv")), "12345");
+    QCOMPARE(load(remote("w/d.wv")), "12345");
     QCOMPARE(run({"mv", device, "/var/user/w/", "v"}).exitCode, 0);
     QCOMPARE(run({"rmdir", device, "/var/user/v"}).exitCode, 1);
     QCOMPARE(run({"rm", device, "/var/user/b.txt"}).exitCode, 0);
@@ -224,19 +205,6 @@ void TestInstrCommands::foldersAndFiles()
     QVERIFY(!QDir(remote("v")).exists());
 }
 
-void TestInstrCommands::drives()
-{
-    QCOMPARE(run({"mkdir", "GPIB0::5", "D:\\w"}).exitCode, 0);
-    QVERIFY(store(local("x.wv"), "12345"));
-    QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "D:\\w\\"}).exitCode, 0);
-    QCOMPARE(content(m_simulator->root() + "/b/D:/w/x.wv"), "12345");
-    QCOMPARE(run({"mv", "GPIB0::5", "D:\\w\\x.wv", "D:/w/y.wv"}).exitCode, 0);
-    QCOMPARE(run({"get", "GPIB0::5", "D:\\w\\y.wv", m_folder->path()}).exitCode, 0);
-    QCOMPARE(content(local("y.wv")), "12345");
-    QCOMPARE(run({"rmdir", "GPIB0::5", "D:\\w", "--recursive"}).exitCode, 0);
-    QVERIFY(!QDir(m_simulator->root() + "/b/D:/w").exists());
-}
-
 void TestInstrCommands::transfers()
 {
     const QByteArray data = QByteArray("#1\n\0x", 5).repeated(100'001);
@@ -244,13 +212,21 @@ void TestInstrCommands::transfers()
     Outcome outcome = run({"put", device, local("x.wv"), "/var/user/x.wv"});
     QCOMPARE(outcome.exitCode, 0);
     QCOMPARE(outcome.log, QStringList{});
-    QVERIFY(content(remote("x.wv")) == data);
+    QVERIFY(load(remote("x.wv")) == data);
     QCOMPARE(run({"get", device, "/var/user/x.wv", local("back.wv")}).exitCode, 0);
-    QVERIFY(content(local("back.wv")) == data);
+    QVERIFY(load(local("back.wv")) == data);
+    // On an instrument with drives, whose paths may be written either way.
+    QCOMPARE(run({"mkdir", "GPIB0::5", "D:\\w"}).exitCode, 0);
+    QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "D:\\w\\"}).exitCode, 0);
+    QCOMPARE(run({"mv", "GPIB0::5", "D:\\w\\x.wv", "D:/w/y.wv"}).exitCode, 0);
+    QCOMPARE(run({"get", "GPIB0::5", "D:\\w\\y.wv", m_folder->path()}).exitCode, 0);
+    QVERIFY(load(local("y.wv")) == data);
+    QCOMPARE(run({"rmdir", "GPIB0::5", "D:\\w", "--recursive"}).exitCode, 0);
+    QVERIFY(!QDir(m_simulator->root() + "/b/D:/w").exists());
     // Sent again, a file is replaced.
     QVERIFY(store(local("x.wv"), "short"));
     QCOMPARE(run({"put", device, local("x.wv"), "/var/user/x.wv"}).exitCode, 0);
-    QCOMPARE(content(remote("x.wv")), "short");
+    QCOMPARE(load(remote("x.wv")), "short");
 }
 
 void TestInstrCommands::getKeepsFiles()
@@ -260,43 +236,46 @@ void TestInstrCommands::getKeepsFiles()
     Outcome outcome = run({"get", device, "/var/user/x.wv", local("x.wv")});
     QCOMPARE(outcome.exitCode, 1);
     QVERIFY(outcome.lastLine().contains("--force"));
-    QCOMPARE(content(local("x.wv")), "old");
+    QCOMPARE(load(local("x.wv")), "old");
     outcome = run({"get", device, "/var/user/gone.wv", local("x.wv"), "--force"});
     QCOMPARE(outcome.exitCode, 1);
     QVERIFY2(outcome.lastLine().contains("-256,\"File name not found\""),
              qPrintable(outcome.lastLine()));
-    QCOMPARE(content(local("x.wv")), "old");
+    QCOMPARE(load(local("x.wv")), "old");
     QCOMPARE(run({"get", device, "/var/user/x.wv", local("x.wv"), "--force"}).exitCode, 0);
-    QCOMPARE(content(local("x.wv")), "new");
+    QCOMPARE(load(local("x.wv")), "new");
     QCOMPARE(QDir(m_folder->path()).entryList(QDir::Files), (QStringList{"visa.ini", "x.wv"}));
-}
-
-void TestInstrCommands::failures_data()
-{
-    QTest::addColumn<QStringList>("arguments");
-    QTest::addColumn<QString>("words");
-    QTest::newRow("no such device") << QStringList{"info", "GPIB0::9"} << "viOpen";
-    QTest::newRow("no such host") << QStringList{"info", "nowhere.invalid"}
-                                  << "No host address found. ";
-    QTest::newRow("dead host") << QStringList{"info", "127.0.0.99"}
-                               << "error: The instrument 'TCPIP::127.0.0.99::INSTR' cannot be "
-                                  "reached.";
-    QTest::newRow("no folder") << QStringList{"ls", device, "/var/user/gone"}
-                               << "The instrument reports: -256,";
-    QTest::newRow("no local file") << QStringList{"put", device, "/nonexistent.wv", "/var/user/"}
-                                   << "'/nonexistent.wv' does not exist";
-    QTest::newRow("nothing on USB") << QStringList{"scan", "usb"} << "No devices found.";
 }
 
 void TestInstrCommands::failures()
 {
-    QFETCH(const QStringList, arguments);
-    QFETCH(const QString, words);
-    const Outcome outcome = run(arguments);
-    QCOMPARE(outcome.exitCode, 1);
-    QVERIFY(outcome.output.isEmpty());
-    QVERIFY2(outcome.log.join('\n').contains(words), qPrintable(outcome.log.join('\n')));
-    QVERIFY(outcome.lastLine().startsWith("error: "));
+    struct Row
+    {
+        const char *name;
+        QStringList arguments;
+        QString words;
+    };
+    forRows<Row>({{"no such device", {"info", "GPIB0::9"}, "viOpen"},
+                  {"dead host",
+                   {"info", "127.0.0.99"},
+                   "error: The instrument 'TCPIP::127.0.0.99::INSTR' cannot be reached."},
+                  {"no folder", {"ls", device, "/var/user/gone"}, "The instrument reports: -256,"},
+                  {"no local file",
+                   {"put", device, "/nonexistent.wv", "/var/user/"},
+                   "'/nonexistent.wv' does not exist"},
+                  {"nothing on USB", {"scan", "usb"}, "No devices found."},
+                  {"no analyzer",
+                   {"capture", device, "-o", local("c.wv")},
+                   "The Selected Device is not a Spectrum Analyzer."}},
+                 [](const Row &row) {
+                     const Outcome outcome = run(row.arguments);
+                     QCOMPARE(outcome.exitCode, 1);
+                     QVERIFY(outcome.output.isEmpty());
+                     QVERIFY2(outcome.log.join('\n').contains(row.words),
+                              qPrintable(outcome.log.join('\n')));
+                     QVERIFY(outcome.lastLine().startsWith("error: "));
+                 });
+    QVERIFY(!QFile::exists(local("c.wv")));
 }
 
 void TestInstrCommands::play()
@@ -310,22 +289,20 @@ void TestInstrCommands::play()
     QCOMPARE(outcome.lastLine(), "error: ARB did not get ready in time.");
 }
 
-void TestInstrCommands::interrupted_data()
-{
-    QTest::addColumn<QString>("command");
-    QTest::addColumn<QString>("sign"); // in the log, that the work has begun
-    QTest::newRow("put") << "put"
-                         << "VISA >> Sending data";
-    QTest::newRow("get") << "get"
-                         << "Read block size";
-    QTest::newRow("run") << "run"
-                         << "Waiting for ARB";
-}
-
 void TestInstrCommands::interrupted()
 {
-    QFETCH(const QString, command);
-    QFETCH(const QString, sign);
+    struct Row
+    {
+        const char *name; ///< the command
+        QByteArray sign;  ///< in the log, that the work has begun
+    };
+    forRows<Row>(
+        {{"put", "VISA >> Sending data"}, {"get", "Read block size"}, {"run", "Waiting for ARB"}},
+        [this](const Row &row) { interrupt(row.name, row.sign); });
+}
+
+void TestInstrCommands::interrupt(const QString &command, const QByteArray &sign)
+{
     // Sparse, and far more than moves before the signal arrives.
     QFile huge(command == "put" ? local("huge.wv") : remote("huge.wv"));
     QVERIFY(huge.open(QIODevice::WriteOnly) && huge.resize(999'999'999));
@@ -341,7 +318,7 @@ void TestInstrCommands::interrupted()
     process.setReadChannel(QProcess::StandardError);
     process.start(program(), arguments);
     QByteArray log;
-    while (!log.contains(sign.toLatin1()) && process.waitForReadyRead(30'000)) {
+    while (!log.contains(sign) && process.waitForReadyRead(30'000)) {
         log += process.readAllStandardError();
     }
     QElapsedTimer timer;
@@ -355,6 +332,8 @@ void TestInstrCommands::interrupted()
                              : !QFile::exists(local("huge.wv")));
     QCOMPARE(QDir(m_folder->path()).entryList({"*.part*"}), QStringList{});
     QCOMPARE(run({"query", device, "*OPT?"}).exitCode, 0);
+    QFile::remove(huge.fileName());
+    QCOMPARE(run({"send", device, ":SYST:FAUL:CLE"}).exitCode, 0);
 }
 
 void TestInstrCommands::withoutLibrary()

@@ -3,11 +3,13 @@
 #include "LogRecorder.h"
 
 #include "instrument/VisaDevice.h"
+#include "support/rows.h"
 #include "visa/visa.h"
 
 #include <QSignalSpy>
 #include <QTest>
 
+#include <functional>
 #include <map>
 
 class TestRemoteFiles : public QObject
@@ -16,16 +18,12 @@ class TestRemoteFiles : public QObject
 private slots:
     void init();
     void cleanup();
-    void listDirectory();
     void listDirectoryFails();
     void listTree();
     void endlessTree();
-    void commands_data();
     void commands();
     void deleteFile();
-    void deleteFileFails();
     void removeTree();
-    void removeTreeFails_data();
     void removeTreeFails();
 
 private:
@@ -69,19 +67,6 @@ void TestRemoteFiles::answerCatalogues(const std::map<std::string, std::string> 
         }
         return "10,20" + found->second + "\n";
     };
-}
-
-void TestRemoteFiles::listDirectory()
-{
-    answerCatalogues({{"D:\\w", ",\"a.wv,BIN,5\",\"s,DIR,0\""}, {"D:\\empty", ""}});
-    QList<RemoteFileEntry> entries;
-    QVERIFY(m_device->listDirectory(entries, "D:\\w"));
-    QCOMPARE(entries.size(), 2);
-    QCOMPARE(entries.first().name, "a.wv");
-    QCOMPARE(entries.first().size, 5);
-    QVERIFY(entries.last().isDirectory());
-    QVERIFY(m_device->listDirectory(entries, "D:\\empty"));
-    QVERIFY(entries.isEmpty());
 }
 
 void TestRemoteFiles::listDirectoryFails()
@@ -147,44 +132,35 @@ void TestRemoteFiles::endlessTree()
     QVERIFY(fake.takeMessages().filter("RDIR").isEmpty());
 }
 
-void TestRemoteFiles::commands_data()
-{
-    QTest::addColumn<QString>("operation");
-    QTest::addColumn<QStringList>("arguments");
-    QTest::addColumn<QString>("message"); // or the words of the failure
-    const QString noPath = "4 Directory path cannot be empty.";
-    QTest::newRow("make") << "make" << QStringList{"D:/w/", "/a"} << ":MMEM:MDIR 'D:\\w\\a'; *OPC?";
-    QTest::newRow("make nothing") << "make" << QStringList{"", ""} << noPath;
-    QTest::newRow("remove") << "remove" << QStringList{"D:", "it's"}
-                            << ":MMEM:RDIR 'D:\\its'; *OPC?";
-    QTest::newRow("remove nothing") << "remove" << QStringList{"/", "/"} << noPath;
-    // Without a name this would be the folder above.
-    QTest::newRow("remove no name") << "remove" << QStringList{"D:\\w", ""} << noPath;
-    // A folder's path may end in a separator.
-    QTest::newRow("remove with separator")
-        << "remove" << QStringList{"D:\\w", "a/"} << ":MMEM:RDIR 'D:\\w\\a\\'; *OPC?";
-    QTest::newRow("remove tree, no name") << "tree" << QStringList{"D:\\w", "\\"} << noPath;
-    QTest::newRow("rename") << "rename" << QStringList{"D:\\w", "a.wv", "b.wv"}
-                            << ":MMEM:MOVE 'D:\\w\\a.wv','D:\\w\\b.wv'; *OPC?";
-    QTest::newRow("rename to nothing")
-        << "rename" << QStringList{"", "a.wv", ""} << "4 Entry name cannot be empty.";
-}
-
 void TestRemoteFiles::commands()
 {
-    QFETCH(const QString, operation);
-    QFETCH(const QStringList, arguments);
-    QFETCH(const QString, message);
-    const QString &parent = arguments.at(0);
-    const QString &name = arguments.at(1);
-    const bool done = operation == "make"     ? m_device->makeDirectory(parent, name)
-                      : operation == "remove" ? m_device->removeDirectory(parent, name)
-                      : operation == "tree"   ? m_device->removeTree(parent, name)
-                                            : m_device->renameEntry(parent, name, arguments.at(2));
-    const bool fails = message.startsWith("4 ");
-    QCOMPARE(done, !fails);
-    QCOMPARE(m_fake->takeMessages(), fails ? QStringList() : QStringList{message});
-    QCOMPARE(takeLog(), fails ? QStringList{message} : QStringList());
+    using Device = VisaDevice;
+    struct Row
+    {
+        const char *name;
+        std::function<bool(Device &)> run;
+        QString message; ///< or the words of the failure
+    };
+    const QString noPath = "4 Directory path cannot be empty.";
+    forRows<Row>(
+        {{"make", [](Device &d) { return d.makeDirectory("D:/w/", "/a"); },
+          ":MMEM:MDIR 'D:\\w\\a'; *OPC?"},
+         {"make nothing", [](Device &d) { return d.makeDirectory("", ""); }, noPath},
+         {"remove", [](Device &d) { return d.removeDirectory("D:", "it's"); },
+          ":MMEM:RDIR 'D:\\its'; *OPC?"},
+         // Without a name this would be the folder above.
+         {"remove no name", [](Device &d) { return d.removeDirectory("D:\\w", ""); }, noPath},
+         {"remove tree", [](Device &d) { return d.removeTree("D:\\w", "\\"); }, noPath},
+         {"rename", [](Device &d) { return d.renameEntry("D:\\w", "a.wv", "b.wv"); },
+          ":MMEM:MOVE 'D:\\w\\a.wv','D:\\w\\b.wv'; *OPC?"},
+         {"rename to nothing", [](Device &d) { return d.renameEntry("", "a.wv", ""); },
+          "4 Entry name cannot be empty."}},
+        [this](const Row &row) {
+            const bool fails = row.message.startsWith("4 ");
+            QCOMPARE(row.run(*m_device), !fails);
+            QCOMPARE(m_fake->takeMessages(), fails ? QStringList() : QStringList{row.message});
+            QCOMPARE(takeLog(), fails ? QStringList{row.message} : QStringList());
+        });
 }
 
 void TestRemoteFiles::deleteFile()
@@ -217,19 +193,6 @@ void TestRemoteFiles::deleteFile()
     QCOMPARE(fake.takeMessages().size(), 2);
 }
 
-void TestRemoteFiles::deleteFileFails()
-{
-    FakeInstrument &fake = *m_fake;
-    answerCatalogues({{"D:\\*.wv", ",\"x.wv,BIN,1\""}});
-    fake.failCall("viWrite", VI_ERROR_TMO, 1);
-    QVERIFY(!m_device->deleteRemoteFile("D:\\x.wv", false));
-    QCOMPARE(takeLog(),
-             (QStringList{"4 ERROR: status BFFF0015", "4 *** Error deleting file on instrument."}));
-    fake->status = nullptr;
-    QVERIFY(!m_device->deleteRemoteFile("E:\\x.wv", false));
-    QCOMPARE(takeLog(), QStringList{"4 Cannot read files list from instrument."});
-}
-
 void TestRemoteFiles::removeTree()
 {
     FakeInstrument &fake = *m_fake;
@@ -251,35 +214,31 @@ void TestRemoteFiles::removeTree()
     QCOMPARE(takeLog(), QStringList{"4 *** User break."});
 }
 
-void TestRemoteFiles::removeTreeFails_data()
-{
-    QTest::addColumn<QString>("failure");
-    QTest::newRow("command") << "command";
-    QTest::newRow("error queue") << "queue";
-    QTest::newRow("cancel") << "cancel";
-}
-
 void TestRemoteFiles::removeTreeFails()
 {
-    QFETCH(const QString, failure);
-    FakeInstrument &fake = *m_fake;
-    fake->answer = [&](const std::string &message) -> std::string {
-        const bool isDelete = message.rfind(":MMEM:DEL", 0) == 0;
-        if (isDelete && failure == "queue") {
-            fake->errors = {"-257,\"File name error\""};
+    for (const QString failure : {"command", "queue", "cancel"}) {
+        cleanup();
+        init();
+        FakeInstrument &fake = *m_fake;
+        fake->answer = [&](const std::string &message) -> std::string {
+            const bool isDelete = message.rfind(":MMEM:DEL", 0) == 0;
+            if (isDelete && failure == "queue") {
+                fake->errors = {"-257,\"File name error\""};
+            }
+            if (isDelete && failure == "command") {
+                return "0\n";
+            }
+            return message.rfind(":MMEM:CAT?", 0) == 0 ? "1,2,\"a,BIN,5\",\"b,BIN,5\"\n" : "";
+        };
+        if (failure == "cancel") {
+            connect(m_device.get(), &VisaDevice::ProgressUpdate, m_device.get(),
+                    &VisaDevice::cancel);
         }
-        if (isDelete && failure == "command") {
-            return "0\n";
-        }
-        return message.rfind(":MMEM:CAT?", 0) == 0 ? "1,2,\"a,BIN,5\",\"b,BIN,5\"\n" : "";
-    };
-    if (failure == "cancel") {
-        connect(m_device.get(), &VisaDevice::ProgressUpdate, m_device.get(), &VisaDevice::cancel);
+        QVERIFY(!m_device->removeTree("D:", "w"));
+        const QStringList messages = fake.takeMessages();
+        QCOMPARE(messages.filter("DEL").size(), 1);
+        QVERIFY(messages.filter("RDIR").isEmpty());
     }
-    QVERIFY(!m_device->removeTree("D:", "w"));
-    const QStringList messages = fake.takeMessages();
-    QCOMPARE(messages.filter("DEL").size(), 1);
-    QVERIFY(messages.filter("RDIR").isEmpty());
 }
 
 QTEST_GUILESS_MAIN(TestRemoteFiles)

@@ -2,15 +2,14 @@
 // The session class, the VISA layer and the simulator together, over real sockets.
 #include "LogRecorder.h"
 
-#include "instrument/RemoteDirModel.h"
 #include "instrument/VisaDevice.h"
 #include "simulator/SimulatorProcess.h"
-#include "streams/TempStream.h"
+#include "support/files.h"
+#include "support/rows.h"
+#include "support/seed.h"
 
-#include <QAbstractItemModelTester>
 #include <QDir>
 #include <QFile>
-#include <QRandomGenerator>
 #include <QTest>
 #include <QThread>
 
@@ -20,28 +19,6 @@ namespace {
 
 const QString unixResource = "GPIB0::28::INSTR";
 const QString driveResource = "GPIB0::5::INSTR";
-
-QByteArray randomBytes(qsizetype size, quint32 seed)
-{
-    QByteArray bytes(size, '\0');
-    QRandomGenerator generator(seed);
-    for (char &byte : bytes) {
-        byte = static_cast<char>(generator.generate());
-    }
-    return bytes;
-}
-
-bool store(const QString &fileName, const QByteArray &bytes)
-{
-    QFile file(fileName);
-    return file.open(QIODevice::WriteOnly) && file.write(bytes) == bytes.size();
-}
-
-QByteArray content(const QString &fileName)
-{
-    QFile file(fileName);
-    return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray();
-}
 
 qsizetype entryCount(const QString &folder)
 {
@@ -65,21 +42,15 @@ class TestSimulatedInstrument : public QObject
 private slots:
     void init();
     void cleanup();
-    void bothWays_data();
     void bothWays();
-    void fiftyMegabytes();
-    void filesAndFolders();
     void faults_data();
     void faults();
     void brokenConnection_data();
     void brokenConnection();
     void cancelledTransfer_data();
     void cancelledTransfer();
-    void playsWaveform();
-    void scan();
     void twoSessionsAtOnce();
     void leavesNothingBehind();
-    void directoryModel();
     void overTheNetwork();
 
 private:
@@ -120,67 +91,17 @@ void TestSimulatedInstrument::cleanup()
     m_simulator.reset();
 }
 
-void TestSimulatedInstrument::bothWays_data()
-{
-    QTest::addColumn<int>("size");
-    for (const int size : {1, 1023, 1024, 1025, 32768, 32769, 100'000}) {
-        QTest::addRow("%d bytes", size) << size;
-    }
-}
-
 void TestSimulatedInstrument::bothWays()
 {
-    QFETCH(const int, size);
-    const QByteArray data = randomBytes(size, 1);
-    QVERIFY(store(local(), data));
-    QVERIFY(m_device->writeRemoteFile(local(), "/var/user/x.wv"));
-    QCOMPARE(content(onUnix("var/user/x.wv")), data);
-    QVERIFY(m_device->readRemoteFile("/var/user/x.wv", local("back.wv")));
-    QCOMPARE(content(local("back.wv")), data);
-    QCOMPARE(takeLog(), QStringList{});
-}
-
-void TestSimulatedInstrument::fiftyMegabytes()
-{
-    // 50 MB with a rest that fills no block.
-    const QByteArray data = randomBytes(50'000'001, 2);
-    QVERIFY(store(local(), data));
-    // On an instrument with drives, and over a file that is there.
-    VisaDevice device;
-    QVERIFY(device.openResource(driveResource));
-    QVERIFY(store(m_simulator->root() + "/b/D:/big.wv", "old"));
-    QVERIFY(device.writeRemoteFile(local(), "D:\\big.wv"));
-    QVERIFY(content(m_simulator->root() + "/b/D:/big.wv") == data);
-    QVERIFY(device.readRemoteFile("D:\\big.wv", local("back.wv")));
-    QVERIFY(content(local("back.wv")) == data);
-    QFile::remove(local("back.wv"));
-}
-
-void TestSimulatedInstrument::filesAndFolders()
-{
-    QVERIFY(m_device->makeDirectory("/var/user", "waves"));
-    QVERIFY(m_device->makeDirectory("/var/user/waves", "deep"));
-    QVERIFY(store(onUnix("var/user/waves/a,b.wv"), "12345"));
-    QVERIFY(store(onUnix("var/user/waves/deep/c.txt"), "123"));
-    QList<RemoteFileEntry> entries;
-    QVERIFY(m_device->listDirectory(entries, "/var/user/waves"));
-    QCOMPARE(entries.size(), 2);
-    QVERIFY(m_device->renameEntry("/var/user/waves", "a,b.wv", "n.wv"));
-    QCOMPARE(content(onUnix("var/user/waves/n.wv")), "12345");
-    QStringList files;
-    qint64 size = 0;
-    QVERIFY(m_device->listTree(files, size, "/var/user/waves"));
-    QCOMPARE(files, (QStringList{"/var/user/waves/deep/c.txt", "/var/user/waves/n.wv"}));
-    QCOMPARE(size, 8);
-    QVERIFY(m_device->deleteRemoteFile("/var/user/waves/n.wv", false));
-    QVERIFY(!QFile::exists(onUnix("var/user/waves/n.wv")));
-    QVERIFY(m_device->removeTree("/var/user", "waves"));
-    QVERIFY(!QFile::exists(onUnix("var/user/waves")));
-    QCOMPARE(takeLog(), QStringList{});
-    // Of what fails only the error queue tells.
-    QVERIFY(m_device->removeDirectory("/var/user", "waves"));
-    QVERIFY(!m_device->checkErrorQueue());
-    QVERIFY(m_device->takeLastError().startsWith("-256,"));
+    for (const int size : {1, 1024, 1025, 32769, 100'000}) {
+        const QByteArray data = randomBytes(size);
+        QVERIFY(store(local(), data));
+        QVERIFY(m_device->writeRemoteFile(local(), "/var/user/x.wv"));
+        QCOMPARE(load(onUnix("var/user/x.wv")), data);
+        QVERIFY(m_device->readRemoteFile("/var/user/x.wv", local("back.wv")));
+        QCOMPARE(load(local("back.wv")), data);
+        QCOMPARE(takeLog(), QStringList{});
+    }
 }
 
 void TestSimulatedInstrument::faults_data()
@@ -189,8 +110,6 @@ void TestSimulatedInstrument::faults_data()
     QTest::addColumn<QString>("operation");
     QTest::addColumn<bool>("done");
     QTest::addColumn<QString>("words"); // of the log, or of the instrument where they begin with -
-    QTest::newRow("error after put") << "'error-after-transfer'"
-                                     << "put" << false << "-310,\"System error\"\n";
     QTest::newRow("error after get") << "'error-after-transfer',-250"
                                      << "get" << false << "-250,\"Mass storage error\"\n";
     QTest::newRow("no terminator") << "'no-terminator'"
@@ -203,11 +122,6 @@ void TestSimulatedInstrument::faults_data()
                                     "completed.";
     QTest::newRow("empty folder") << "'empty-dir-469'"
                                   << "list" << true << "";
-    QTest::newRow("missing folder")
-        << "'queue',0"
-        << "list" << false << "4 Cannot read files list from instrument.";
-    QTest::newRow("many errors") << "'queue',30"
-                                 << "queue" << false << "-310,\"System error\"\n";
     QTest::newRow("*OPC? is 0") << "'opc-zero'"
                                 << "folder" << false << "4 ERROR : R Unexpected Result from *OPC?";
     QTest::newRow("loads too long") << "'busy',60"
@@ -251,7 +165,7 @@ void TestSimulatedInstrument::faults()
     (void)m_device->sendCommand("*CLS");
     const bool again = m_device->writeRemoteFile(local(), "/var/user/again.wv");
     QVERIFY2(again, qPrintable(takeLog().join("\n") + m_device->takeLastError()));
-    QVERIFY(content(onUnix("var/user/again.wv")) == content(local()));
+    QVERIFY(load(onUnix("var/user/again.wv")) == load(local()));
 }
 
 void TestSimulatedInstrument::brokenConnection_data()
@@ -282,7 +196,7 @@ void TestSimulatedInstrument::brokenConnection()
     QVERIFY(m_device->openResource(unixResource));
     (void)m_device->sendCommand(":SYST:FAUL:CLE");
     QVERIFY(m_device->writeRemoteFile(local(), "/var/user/p.wv"));
-    QVERIFY(content(onUnix("var/user/p.wv")) == content(local()));
+    QVERIFY(load(onUnix("var/user/p.wv")) == load(local()));
 }
 
 void TestSimulatedInstrument::cancelledTransfer_data()
@@ -318,34 +232,8 @@ void TestSimulatedInstrument::cancelledTransfer()
     QVERIFY(store(local(), "12345"));
     QVERIFY(m_device->writeRemoteFile(local(), "/var/user/p.wv"));
     QVERIFY(m_device->readRemoteFile("/var/user/p.wv", local("back.wv")));
-    QCOMPARE(content(local("back.wv")), "12345");
+    QCOMPARE(load(local("back.wv")), "12345");
     QFile::remove(local("back.wv"));
-}
-
-void TestSimulatedInstrument::playsWaveform()
-{
-    QVERIFY(store(onUnix("var/user/f.wv"), "12345"));
-    setFault("'busy',1");
-    QVERIFY(m_device->startArb("/var/user/f.wv"));
-    QString answer;
-    QVERIFY(m_device->queryText("SOUR:BB:ARB:STAT?", answer));
-    QCOMPARE(answer, "1");
-    QVERIFY(!m_device->startArb("/var/user/none.wv"));
-    QVERIFY(m_device->takeLastError().startsWith("-256,"));
-}
-
-void TestSimulatedInstrument::scan()
-{
-    m_device->closeResource();
-    QList<VisaDevice *> found;
-    QVERIFY(m_device->scanResources(found, VisaDevice::ScanGpib));
-    QStringList texts;
-    for (const VisaDevice *device : found) {
-        texts.append(device->resource() + ' ' + device->model() + ' ' + device->serial());
-    }
-    qDeleteAll(found);
-    QCOMPARE(texts,
-             (QStringList{"GPIB0::5::INSTR TGX-810 200002", "GPIB0::28::INSTR TGX-870 100001"}));
 }
 
 void TestSimulatedInstrument::twoSessionsAtOnce()
@@ -357,7 +245,7 @@ void TestSimulatedInstrument::twoSessionsAtOnce()
         VisaDevice device;
         return store(name, data) && device.openResource(resource) &&
                device.writeRemoteFile(name, remote) && device.readRemoteFile(remote, name) &&
-               content(name) == data;
+               load(name) == data;
     };
     bool first = false;
     bool second = false;
@@ -391,43 +279,6 @@ void TestSimulatedInstrument::leavesNothingBehind()
     QCOMPARE(entryCount("/proc/self/task"), threads);
 }
 
-void TestSimulatedInstrument::directoryModel()
-{
-    QVERIFY(QDir(onUnix("var/user")).mkpath("deep/er"));
-    QVERIFY(QDir(onUnix("var/user")).mkpath("empty"));
-    for (const QString name : {"c.wv", "a.wv", "b.txt", "deep/er/x.wv"}) {
-        QVERIFY(store(onUnix("var/user/" + name), name.toLatin1()));
-    }
-    RemoteDirModel model;
-    const QAbstractItemModelTester tester(&model,
-                                          QAbstractItemModelTester::FailureReportingMode::QtTest);
-    model.setDevice(m_device.get());
-    model.refresh();
-    const auto settle = [&] {
-        QCoreApplication::processEvents();
-        QCoreApplication::processEvents();
-    };
-    QTRY_COMPARE(model.rowCount(model.index(0, 0)), 5);
-    QVERIFY(model.expandPath("/var/user/deep/er/"));
-    QVERIFY(model.indexOfPath("/var/user/deep/er/x.wv").isValid());
-    model.sort(0, Qt::DescendingOrder);
-    settle();
-    QCOMPARE(model.index(2, 0, model.index(0, 0)).data().toString(), "c.wv");
-    QVERIFY(store(onUnix("var/user/empty/new.wv"), "1"));
-    model.refresh(model.indexOfPath("/var/user/empty/"));
-    QVERIFY(model.indexOfPath("/var/user/empty/new.wv").isValid());
-    // The instrument dies while its folders are shown.
-    QVERIFY(m_device->setTimeoutMs(500));
-    QCOMPARE(m_simulator->stop(SIGTERM), 0);
-    const QModelIndex folder = model.indexOfPath("/var/user/empty/");
-    model.refresh(folder);
-    QCOMPARE(folder.siblingAtColumn(1).data().toString(), "Read Error");
-    m_device->closeResource();
-    model.refresh();
-    settle();
-    QCOMPARE(model.index(0, 0).data().toString(), "no data for ...");
-}
-
 void TestSimulatedInstrument::overTheNetwork()
 {
     SimulatorProcess simulator;
@@ -442,7 +293,7 @@ void TestSimulatedInstrument::overTheNetwork()
     QCOMPARE(type, quint16{6});
     QVERIFY(store(local(), randomBytes(1025, 9)));
     QVERIFY(m_device->writeRemoteFile(local(), "/var/user/x.wv"));
-    QVERIFY(content(simulator.root() + "/var/user/x.wv") == content(local()));
+    QVERIFY(load(simulator.root() + "/var/user/x.wv") == load(local()));
 }
 
 QTEST_GUILESS_MAIN(TestSimulatedInstrument)

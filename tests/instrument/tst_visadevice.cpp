@@ -4,6 +4,7 @@
 
 #include "instrument/VisaDevice.h"
 #include "instrument/VisaLibrary.h"
+#include "support/rows.h"
 #include "visa/visa.h"
 
 #include <QSignalSpy>
@@ -29,16 +30,13 @@ private slots:
     void managerFails();
     void opens();
     void textArrivesAsWritten();
-    void openFails_data();
     void openFails();
     void openTwice();
     void hostIsUnreachable();
-    void sendCommand_data();
     void sendCommand();
     void queryText();
     void errorQueue();
     void errorQueueFails();
-    void sessionSettings();
     void charactersOutsideLatin1();
     void openElsewhere();
     void scan();
@@ -162,45 +160,42 @@ void TestVisaDevice::textArrivesAsWritten()
     QCOMPARE(answer, "1,2");
 }
 
-void TestVisaDevice::openFails_data()
-{
-    QTest::addColumn<QString>("call");
-    QTest::addColumn<qint32>("status");
-    QTest::addColumn<QString>("identity");
-    QTest::addColumn<QString>("words");
-    const QString good = "Halvorn,TGX-870,TGX870/100001/01,1.0";
-    const qint32 timeout = VI_ERROR_TMO;
-    const QString report = "4 ERROR: status BFFF0015";
-    QTest::newRow("viOpen with a remark")
-        << "viOpen G" << qint32{VI_SUCCESS_MAX_CNT} << good << "4 ERROR: status 3FFF0006";
-    QTest::newRow("clear") << "viClear" << timeout << good << report;
-    QTest::newRow("*CLS") << "viWrite" << timeout << good << report;
-    QTest::newRow("*IDN?") << "viWrite 5 END" << timeout << good << report;
-    QTest::newRow("other maker") << "-" << 0 << "Acme,TGX-870,TGX870/100001/01,1.0"
-                                 << "4 This device is not a Halvorn instrument.";
-    QTest::newRow("unknown model") << "-" << 0 << "Halvorn,QQQ-1,x/1/2,1.0"
-                                   << "4 The device 'QQQ-1' is not supported.";
-}
-
 void TestVisaDevice::openFails()
 {
-    QFETCH(const QString, call);
-    QFETCH(const qint32, status);
-    QFETCH(const QString, identity);
-    QFETCH(const QString, words);
-    FakeInstrument fake;
-    VisaDevice device;
-    fake->identity = identity.toStdString();
-    fake.failCall(call, status);
-    QVERIFY(!device.openResource(resource));
-    const QStringList log = takeLog();
-    QVERIFY2(log.contains(words), qPrintable(log.join('\n')));
-    QVERIFY(!device.isOpen());
-    QCOMPARE(fake->openSessions, 0U);
-    // Nothing of the failure stays behind.
-    fake->status = nullptr;
-    fake->identity = "halvorn,TGX-870,TGX870/100001/01,1.0";
-    QVERIFY(device.openResource(resource));
+    struct Row
+    {
+        const char *name;
+        QString call;
+        qint32 status;
+        std::string identity;
+        QString words;
+    };
+    const std::string good = "Halvorn,TGX-870,TGX870/100001/01,1.0";
+    const QString report = "4 ERROR: status BFFF0015";
+    forRows<Row>(
+        {{"viOpen with a remark", "viOpen G", VI_SUCCESS_MAX_CNT, good, "4 ERROR: status 3FFF0006"},
+         {"clear", "viClear", VI_ERROR_TMO, good, report},
+         {"*CLS", "viWrite", VI_ERROR_TMO, good, report},
+         {"*IDN?", "viWrite 5 END", VI_ERROR_TMO, good, report},
+         {"other maker", "-", 0, "Acme,TGX-870,TGX870/100001/01,1.0",
+          "4 This device is not a Halvorn instrument."},
+         {"unknown model", "-", 0, "Halvorn,QQQ-1,x/1/2,1.0",
+          "4 The device 'QQQ-1' is not supported."}},
+        [](const Row &row) {
+            FakeInstrument fake;
+            VisaDevice device;
+            fake->identity = row.identity;
+            fake.failCall(row.call, row.status);
+            QVERIFY(!device.openResource(resource));
+            const QStringList log = takeLog();
+            QVERIFY2(log.contains(row.words), qPrintable(log.join('\n')));
+            QVERIFY(!device.isOpen());
+            QCOMPARE(fake->openSessions, 0U);
+            // Nothing of the failure stays behind.
+            fake->status = nullptr;
+            fake->identity = "halvorn,TGX-870,TGX870/100001/01,1.0";
+            QVERIFY(device.openResource(resource));
+        });
 }
 
 void TestVisaDevice::openTwice()
@@ -235,36 +230,30 @@ void TestVisaDevice::hostIsUnreachable()
     QVERIFY(fake.takeCalls().isEmpty());
 }
 
-void TestVisaDevice::sendCommand_data()
-{
-    QTest::addColumn<QString>("answer");
-    QTest::addColumn<bool>("done");
-    QTest::newRow("1") << "1\n" << true;
-    QTest::newRow("0") << "0\n" << false;
-    QTest::newRow("text") << "ready  now\n" << false;
-}
-
 void TestVisaDevice::sendCommand()
 {
-    QFETCH(const QString, answer);
-    QFETCH(const bool, done);
     FakeInstrument fake;
     VisaDevice device;
     QVERIFY(!device.sendCommand("*CLS"));
     QCOMPARE(takeLog(), QStringList{"4 Device is not open."});
     QVERIFY(device.openResource(resource));
+    std::string answer;
     fake->answer = [&](const std::string &message) {
-        return message == "DO; *OPC?" ? answer.toStdString() : std::string();
+        return message == "DO; *OPC?" ? answer : std::string();
     };
-    (void)fake.takeCalls();
     (void)takeLog();
-    QCOMPARE(device.sendCommand("DO; *OPC?"), done);
-    QCOMPARE(fake.takeCalls(), (QStringList{"viWrite 9 END", "viRead 1023"}));
-    const QString shown = "VISA << '" + answer.simplified() + "'";
-    QCOMPARE(takeLog(),
-             done ? QStringList()
-                  : (QStringList{"4 ERROR : R Unexpected Result from *OPC?", "4 " + shown}));
+    for (const char *done : {"1\n", " \t+1 \r\n"}) {
+        answer = done;
+        QVERIFY(device.sendCommand("DO; *OPC?"));
+    }
+    for (const char *other : {"0\n", "ready  now\n", "1 1\n"}) {
+        answer = other;
+        QVERIFY(!device.sendCommand("DO; *OPC?"));
+        QCOMPARE(takeLog(), (QStringList{"4 ERROR : R Unexpected Result from *OPC?",
+                                         "4 VISA << '" + QString(other).simplified() + "'"}));
+    }
     // Without the question nothing is read, and it is one in this spelling only.
+    (void)fake.takeCalls();
     QVERIFY(device.sendCommand("*opc?"));
     QCOMPARE(fake.takeCalls(), QStringList{"viWrite 5 END"});
     fake.failCall("viWrite", VI_SUCCESS_MAX_CNT);
@@ -340,29 +329,6 @@ void TestVisaDevice::errorQueueFails()
     QVERIFY(!device.checkErrorQueue());
     QCOMPARE(takeLog(), (QStringList{"4 :SYST:ERR? Command failed.", "4 ERROR: status 3FFF0005",
                                      "4 No response from :SYST:ERR?", "4 ERROR: status 3FFF0006"}));
-}
-
-void TestVisaDevice::sessionSettings()
-{
-    FakeInstrument fake;
-    VisaDevice device;
-    QVERIFY(device.openResource(resource));
-    QCOMPARE(device.timeoutMs(), 5000U);
-    QVERIFY(device.setTimeoutMs(123));
-    QCOMPARE(device.timeoutMs(), 123U);
-    fake->interfaceType = VI_INTF_GPIB;
-    quint16 type = 0;
-    QVERIFY(device.interfaceType(type));
-    QCOMPARE(type, quint16{1});
-    fake.failCall("viGetAttribute", VI_ERROR_NSUP_ATTR);
-    QCOMPARE(device.timeoutMs(), 0U);
-    QVERIFY(!device.interfaceType(type));
-    fake.failCall("viSetAttribute", VI_ERROR_NSUP_ATTR_STATE);
-    QVERIFY(!device.setTimeoutMs(1));
-    device.closeResource();
-    (void)takeLog();
-    QVERIFY(!device.interfaceType(type));
-    QCOMPARE(takeLog(), QStringList{"4 Device is not open."});
 }
 
 void TestVisaDevice::charactersOutsideLatin1()

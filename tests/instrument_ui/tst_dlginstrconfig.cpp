@@ -5,6 +5,7 @@
 #include "instrument/FakeInstrument.h"
 #include "instrument/LogRecorder.h"
 #include "instrument/VisaDevice.h"
+#include "support/rows.h"
 #include "toolframe/QtProgressDialog.h"
 
 #include <QApplication>
@@ -23,10 +24,7 @@ class TestDlgInstrConfig : public InstrListTest
 
 private slots:
     void addsByResource();
-    void addsByHostName();
-    void refusesWhatDoesNotAnswer_data();
     void refusesWhatDoesNotAnswer();
-    void capabilities_data();
     void capabilities();
     void scansGpib();
     void scansUsbInVain();
@@ -69,102 +67,56 @@ void TestDlgInstrConfig::addsByResource()
                           "1 The instrument 'TGX-870, 100001' was already added."}));
 }
 
-void TestDlgInstrConfig::addsByHostName()
-{
-    SimulatorProcess simulator;
-    if (!simulator.start({"--address", "127.0.0.94", "--root", simulator.root()})) {
-        QSKIP("The port mapper's port needs special rights here.");
-    }
-    type(" 127.0.0.94 ");
-    QCOMPARE(rows(), QStringList{"online|TGX-870, 100001|TCPIP|"});
-    QCOMPARE(m_dialog->instruments().at(0).resource, "TCPIP::127.0.0.94::INSTR");
-    // The same instrument by another interface is another entry.
-    type(generator);
-    QCOMPARE(m_dialog->instruments().size(), 2);
-}
-
-void TestDlgInstrConfig::refusesWhatDoesNotAnswer_data()
-{
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<QString>("resource");
-    QTest::newRow("host that is off") << "127.0.0.99"
-                                      << "TCPIP::127.0.0.99::INSTR";
-    QTest::newRow("free address") << silent << silent;
-    QTest::newRow("no resource") << "nonsense::"
-                                 << "nonsense::";
-    QTest::newRow("nothing") << ""
-                             << "";
-}
-
 void TestDlgInstrConfig::refusesWhatDoesNotAnswer()
 {
-    QFETCH(const QString, text);
-    QFETCH(const QString, resource);
-    type(text);
-    const QStringList log = takeLog(allLevels);
-    if (resource.isEmpty()) {
-        QCOMPARE(log, QStringList{});
-    } else {
-        QCOMPARE(log.first(), "1 Trying to open device '" + resource + "'...");
-        QCOMPARE(log.last(), "4 The device '" + resource + "' was not added.");
-        const QString told = status();
-        QVERIFY2(told.contains(resource), qPrintable(told));
-    }
+    type("");
+    QCOMPARE(takeLog(allLevels), QStringList{});
+    struct Row
+    {
+        const char *name; ///< the text
+        QString resource;
+    };
+    forRows<Row>({{"127.0.0.99", "TCPIP::127.0.0.99::INSTR"}, {"nonsense::", "nonsense::"}},
+                 [this](const Row &row) {
+                     type(row.name);
+                     const QStringList log = takeLog(allLevels);
+                     QCOMPARE(log.first(), "1 Trying to open device '" + row.resource + "'...");
+                     QCOMPARE(log.last(), "4 The device '" + row.resource + "' was not added.");
+                     QVERIFY2(status().contains(row.resource), qPrintable(status()));
+                 });
     QCOMPARE(m_changes->size(), 0);
     QVERIFY(m_dialog->instruments().isEmpty());
     QVERIFY(hintIsVisible());
     QVERIFY(!QApplication::overrideCursor());
 }
 
-void TestDlgInstrConfig::capabilities_data()
-{
-    QTest::addColumn<QByteArray>("identity");
-    QTest::addColumn<QByteArray>("options");
-    QTest::addColumn<QString>("name");
-    QTest::addColumn<QStringList>("expected");
-    QTest::newRow("one path, disk")
-        << QByteArray("Halvorn,TGX-870,TGX870/123456/01,2.11")
-        << QByteArray("TGX870-R16,TGX870-P7,TGX870-P13,TGX870-K1") << "TGX-870, 123456"
-        << QStringList{
-               "VISA resource|GPIB0::1::INSTR", "Firmware|2.11",  "User data|/var/user/, /hdd/",
-               "RF 1| 9.0 kHz - 6.0 GHz",       "BB1 size|32 MS", "BB1 max. clock|120 MHz",
-               "BB1 bandwidth|150 MHz"};
-    QTest::newRow("two paths") << QByteArray("Halvorn,TGX-810,TGX810/7/01,1.0")
-                               << QByteArray("TGX810-R12,TGX810-R23,TGX810-P1,TGX810-P2,TGX810-K1")
-                               << "TGX-810, 7"
-                               << QStringList{"VISA resource|GPIB0::1::INSTR",
-                                              "Firmware|1.0",
-                                              "User data|D:",
-                                              "RF 1|100.0 kHz - 2.2 GHz",
-                                              "RF 2|100.0 kHz - 3.0 GHz",
-                                              "BB1 size|64 MS",
-                                              "BB1 max. clock|40 MHz",
-                                              "BB1 bandwidth|100 MHz",
-                                              "BB2 size|16 MS",
-                                              "BB2 max. clock|40 MHz",
-                                              "BB2 bandwidth|100 MHz"};
-    QTest::newRow("analyzer") << QByteArray("Halvorn,PAX-630,100005/003,5.10")
-                              << QByteArray("PAX630-K1,") << "PAX-630, 100005"
-                              << QStringList{"VISA resource|GPIB0::1::INSTR", "Firmware|5.10",
-                                             "User data|D:"};
-}
-
 void TestDlgInstrConfig::capabilities()
 {
-    QFETCH(const QByteArray, identity);
-    QFETCH(const QByteArray, options);
-    QFETCH(const QString, name);
-    QFETCH(const QStringList, expected);
     const FakeInstrument fake;
-    fake->identity = identity.toStdString();
-    fake->options = options.toStdString();
+    fake->identity = "Halvorn,TGX-810,TGX810/7/01,1.0";
+    fake->options = "TGX810-R12,TGX810-R23,TGX810-P1,TGX810-P2,TGX810-K1";
     type("GPIB0::1::INSTR");
-    QCOMPARE(item(0)->text(0), name);
+    QCOMPARE(item(0)->text(0), "TGX-810, 7");
+    const QStringList expected{"VISA resource|GPIB0::1::INSTR",
+                               "Firmware|1.0",
+                               "User data|D:",
+                               "RF 1|100.0 kHz - 2.2 GHz",
+                               "RF 2|100.0 kHz - 3.0 GHz",
+                               "BB1 size|64 MS",
+                               "BB1 max. clock|40 MHz",
+                               "BB1 bandwidth|100 MHz",
+                               "BB2 size|16 MS",
+                               "BB2 max. clock|40 MHz",
+                               "BB2 bandwidth|100 MHz"};
     QCOMPARE(childRows(), expected);
-    // A refresh shows the same.
     click("pb_refresh");
     QCOMPARE(childRows(), expected);
-    QCOMPARE(m_dialog->instruments().size(), 1);
+    // An instrument without these has no such rows.
+    fake->identity = "Halvorn,PAX-630,100005/003,5.10";
+    fake->options = "PAX630-K1,";
+    click("pb_refresh");
+    QCOMPARE(childRows(),
+             (QStringList{"VISA resource|GPIB0::1::INSTR", "Firmware|5.10", "User data|D:"}));
 }
 
 void TestDlgInstrConfig::scansGpib()

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "instrument/InstrumentList.h"
 #include "instrument/LogRecorder.h"
+#include "support/rows.h"
 
 #include <QFile>
 #include <QSettings>
@@ -27,10 +28,8 @@ class TestInstrumentList : public QObject
     Q_OBJECT
 
 private slots:
-    void add_data();
     void add();
     void identify();
-    void folderOfOneInstrument();
     void settingsRoundTrip();
     void shorterListLeavesNothingBehind();
     void readsWhatWasWrittenByHand();
@@ -41,45 +40,37 @@ private:
     QTemporaryDir m_folder;
 };
 
-void TestInstrumentList::add_data()
-{
-    QTest::addColumn<InstrConfigEntry>("added");
-    QTest::addColumn<int>("place");
-    QTest::addColumn<int>("count");
-    QTest::addColumn<QString>("words");
-    QTest::newRow("new") << entry("TGX-810", "2", "GPIB0::5::INSTR") << 1 << 2 << "";
-    // The panes tell them apart by the interface.
-    QTest::newRow("known, by another interface")
-        << entry("TGX-870", "1", "TCPIP::10.0.0.1::INSTR") << 1 << 2 << "";
-    QTest::newRow("twice") << entry("TGX-870", "1", "GPIB0::28::INSTR") << -1 << 1
-                           << "1 The instrument 'TGX-870, 1' was already added.";
-    QTest::newRow("known, at another address")
-        << entry("TGX-870", "1", "GPIB0::9::INSTR") << -1 << 1
-        << "1 The instrument 'TGX-870, 1' was already added.";
-    QTest::newRow("other instrument at a known address")
-        << entry("TGX-810", "2", "gpib0::28::instr") << 0 << 1
-        << "2 At 'GPIB0::28::INSTR' there is now the instrument 'TGX-810, 2'.";
-    // An empty resource marks the end of the stored list.
-    QTest::newRow("no resource") << entry("TGX-810", "2", "") << -1 << 1
-                                 << "4 The instrument 'TGX-810, 2' has no resource and was not "
-                                    "added.";
-}
-
 void TestInstrumentList::add()
 {
-    QFETCH(const InstrConfigEntry, added);
-    QFETCH(const int, place);
-    QFETCH(const int, count);
-    QFETCH(const QString, words);
-    InstrumentList list;
-    QCOMPARE(list.add(entry("TGX-870", "1", "GPIB0::28::INSTR")), 0);
-    (void)takeLog();
-    QCOMPARE(list.add(added), place);
-    QCOMPARE(list.entries().size(), count);
-    QCOMPARE(takeLog(Tracer::DefaultMask).join('\n'), words);
-    if (place >= 0) {
-        QCOMPARE(list.entries().at(place).model, added.model);
-    }
+    struct Row
+    {
+        const char *name;
+        InstrConfigEntry added;
+        int place;
+        int count;
+        QString words;
+    };
+    forRows<Row>(
+        {// The panes tell them apart by the interface.
+         {"known, by another interface", entry("TGX-870", "1", "TCPIP::10.0.0.1::INSTR"), 1, 2, ""},
+         {"known, at another address", entry("TGX-870", "1", "GPIB0::9::INSTR"), -1, 1,
+          "1 The instrument 'TGX-870, 1' was already added."},
+         {"other instrument at a known address", entry("TGX-810", "2", "gpib0::28::instr"), 0, 1,
+          "2 At 'GPIB0::28::INSTR' there is now the instrument 'TGX-810, 2'."},
+         // An empty resource marks the end of the stored list.
+         {"no resource", entry("TGX-810", "2", ""), -1, 1,
+          "4 The instrument 'TGX-810, 2' has no resource and was not added."}},
+        [](const Row &row) {
+            InstrumentList list;
+            QCOMPARE(list.add(entry("TGX-870", "1", "GPIB0::28::INSTR")), 0);
+            (void)takeLog();
+            QCOMPARE(list.add(row.added), row.place);
+            QCOMPARE(list.entries().size(), row.count);
+            QCOMPARE(takeLog(Tracer::DefaultMask).join('\n'), row.words);
+            if (row.place >= 0) {
+                QCOMPARE(list.entries().at(row.place).model, row.added.model);
+            }
+        });
 }
 
 void TestInstrumentList::identify()
@@ -95,18 +86,6 @@ void TestInstrumentList::identify()
     QCOMPARE(list.entries().at(0).folder, "Manually Added");
     QVERIFY(!list.identify(1, entry("TGX-870", "8", "GPIB0::28::INSTR")));
     QVERIFY(!list.identify(-1, entry("TGX-870", "8", "GPIB0::28::INSTR")));
-}
-
-void TestInstrumentList::folderOfOneInstrument()
-{
-    InstrumentList list;
-    list.add(entry("TGX-870", "1", "GPIB0::28::INSTR"));
-    list.add(entry("TGX-870", "2", "GPIB0::29::INSTR"));
-    list.add(entry("TGX-810", "1", "GPIB0::30::INSTR"));
-    list.setFolder("TGX-870", "2", "/var/user/waves/");
-    QCOMPARE(list.entries().at(0).folder, "Manually Added");
-    QCOMPARE(list.entries().at(1).folder, "/var/user/waves/");
-    QCOMPARE(list.entries().at(2).folder, "Manually Added");
 }
 
 void TestInstrumentList::settingsRoundTrip()
