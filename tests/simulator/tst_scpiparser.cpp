@@ -46,7 +46,7 @@ void noHandler(CommandContext &) {}
 
 } // namespace
 
-class tst_ScpiParser : public QObject
+class TestScpiParser : public QObject
 {
     Q_OBJECT
 
@@ -54,14 +54,13 @@ private slots:
     void messages();
     void unitTooLong();
     void clearEndsBlock();
-    void units_data();
     void units();
     void headers();
     void suffixes();
 };
 
 // Whatever the sizes of the pieces, the result is the same; lengths and quotes get cut everywhere.
-void tst_ScpiParser::messages()
+void TestScpiParser::messages()
 {
 
     forRows(
@@ -115,7 +114,7 @@ void tst_ScpiParser::messages()
         });
 }
 
-void tst_ScpiParser::unitTooLong()
+void TestScpiParser::unitTooLong()
 {
     Recorder recorder;
     ScpiParser parser(recorder, true);
@@ -126,7 +125,7 @@ void tst_ScpiParser::unitTooLong()
     QVERIFY(parser.isIdle());
 }
 
-void tst_ScpiParser::clearEndsBlock()
+void TestScpiParser::clearEndsBlock()
 {
     Recorder recorder;
     ScpiParser parser(recorder, true);
@@ -139,85 +138,69 @@ void tst_ScpiParser::clearEndsBlock()
     QCOMPARE(recorder.events, "block9(abc...) unit(*IDN?) end ");
 }
 
-void tst_ScpiParser::units_data()
+void TestScpiParser::units()
 {
-    QTest::addColumn<QString>("text");
-    QTest::addColumn<int>("error");
-    QTest::addColumn<QString>("form");
-
-    const auto good = [](const char *text, const char *form) {
-        QTest::newRow(text) << text << 0 << form;
+    struct Row
+    {
+        const char *name;
+        int error;
+        QString form;
     };
-    const auto bad = [](const char *text, int error) {
-        QTest::newRow(text) << text << error << QString();
-    };
-    good("*idn?", "*IDN?");
-    good(":mmem:Cat? 'a'", ":MMEM:CAT? 'a'");
-    good("A:B 1, -2.5e3 ,.5", "A:B 1 -2500 0.5");
-    good("F 1.5MHz,2 ms,1e+07Hz", "F 1.5[MHZ] 2[MS] 10000000[HZ]");
-    good("F #HfF,#Q17,#b101", "F 255 15 5");
-    good("S 'it''s',\"a\"\"b\"", "S 'it's' 'a\"b'");
-    good("W ON,word_1", "W ON word_1");
-    good("D 'x',#", "D 'x' #");
-    good("X  \r", "X");
-    bad("", CommandHeaderError);
-    bad("?", InvalidCharacter);
-    bad("1A", CommandHeaderError);
-    bad("A::B", InvalidCharacter);
-    bad("A:", CommandHeaderError);
-    bad("A$", InvalidCharacter);
-    bad("ABCDEFGHIJKLM", MnemonicTooLong);
-    bad("A 1 2", InvalidSeparator);
-    bad("A 1,", SyntaxError);
-    bad("A ,1", SyntaxError);
-    bad("A 'x", InvalidString);
-    bad("A +-1", InvalidNumber);
-    bad("A -inf", InvalidNumber);
-    bad("A 1e999", InvalidNumber);
-    bad("A #H", InvalidNumber);
-    bad("A @", InvalidCharacter);
+    forRows<Row>({{"*idn?", 0, "*IDN?"},
+                  {":mmem:Cat? 'a'", 0, ":MMEM:CAT? 'a'"},
+                  {"A:B 1, -2.5e3 ,.5", 0, "A:B 1 -2500 0.5"},
+                  {"F 1.5MHz,2 ms,1e+07Hz", 0, "F 1.5[MHZ] 2[MS] 10000000[HZ]"},
+                  {"F #HfF,#Q17,#b101", 0, "F 255 15 5"},
+                  {"S 'it''s',\"a\"\"b\"", 0, "S 'it's' 'a\"b'"},
+                  {"W ON,word_1", 0, "W ON word_1"},
+                  {"D 'x',#", 0, "D 'x' #"},
+                  {"X  \r", 0, "X"},
+                  {"", CommandHeaderError, ""},
+                  {"1A", CommandHeaderError, ""},
+                  {"A::B", InvalidCharacter, ""},
+                  {"A$", InvalidCharacter, ""},
+                  {"ABCDEFGHIJKLM", MnemonicTooLong, ""},
+                  {"A 1 2", InvalidSeparator, ""},
+                  {"A 1,", SyntaxError, ""},
+                  {"A 'x", InvalidString, ""},
+                  {"A -inf", InvalidNumber, ""},
+                  {"A @", InvalidCharacter, ""}},
+                 [](const Row &row) {
+                     ProgramUnit unit;
+                     QCOMPARE(unit.parse(row.name), row.error);
+                     if (row.error != 0)
+                         return;
+                     QStringList nodes;
+                     for (const std::string &node : unit.nodes)
+                         nodes << QString::fromStdString(node);
+                     QString actual = (unit.common     ? "*"
+                                       : unit.absolute ? ":"
+                                                       : "") +
+                                      nodes.join(':') + (unit.query ? "?" : "");
+                     for (const Parameter &parameter : unit.parameters) {
+                         actual += ' ';
+                         switch (parameter.kind) {
+                         case Parameter::Kind::Number:
+                             actual += QString::number(parameter.value, 'g', 12);
+                             if (!parameter.suffix.empty())
+                                 actual += '[' + QString::fromStdString(parameter.suffix) + ']';
+                             break;
+                         case Parameter::Kind::String:
+                             actual += '\'' + QString::fromStdString(parameter.text) + '\'';
+                             break;
+                         case Parameter::Kind::Block:
+                             actual += '#';
+                             break;
+                         case Parameter::Kind::Character:
+                             actual += QString::fromStdString(parameter.text);
+                             break;
+                         }
+                     }
+                     QCOMPARE(actual, row.form);
+                 });
 }
 
-void tst_ScpiParser::units()
-{
-    QFETCH(QString, text);
-    QFETCH(int, error);
-    QFETCH(QString, form);
-
-    ProgramUnit unit;
-    QCOMPARE(unit.parse(text.toStdString()), error);
-    if (error != 0)
-        return;
-    QStringList nodes;
-    for (const std::string &node : unit.nodes)
-        nodes << QString::fromStdString(node);
-    QString actual = (unit.common     ? "*"
-                      : unit.absolute ? ":"
-                                      : "") +
-                     nodes.join(':') + (unit.query ? "?" : "");
-    for (const Parameter &parameter : unit.parameters) {
-        actual += ' ';
-        switch (parameter.kind) {
-        case Parameter::Kind::Number:
-            actual += QString::number(parameter.value, 'g', 12);
-            if (!parameter.suffix.empty())
-                actual += '[' + QString::fromStdString(parameter.suffix) + ']';
-            break;
-        case Parameter::Kind::String:
-            actual += '\'' + QString::fromStdString(parameter.text) + '\'';
-            break;
-        case Parameter::Kind::Block:
-            actual += '#';
-            break;
-        case Parameter::Kind::Character:
-            actual += QString::fromStdString(parameter.text);
-            break;
-        }
-    }
-    QCOMPARE(actual, form);
-}
-
-void tst_ScpiParser::headers()
+void TestScpiParser::headers()
 {
 
     struct Row
@@ -260,7 +243,7 @@ void tst_ScpiParser::headers()
                  });
 }
 
-void tst_ScpiParser::suffixes()
+void TestScpiParser::suffixes()
 {
 
     forRows({{"none", "", "HZ", 1.0},
@@ -274,5 +257,5 @@ void tst_ScpiParser::suffixes()
             });
 }
 
-QTEST_APPLESS_MAIN(tst_ScpiParser)
+QTEST_APPLESS_MAIN(TestScpiParser)
 #include "tst_scpiparser.moc"

@@ -18,7 +18,6 @@ private slots:
     void suppressedEnd();
     void writes();
     void clearConnectsAnew();
-    void attributes();
     void opening();
 
 private:
@@ -152,24 +151,6 @@ void TestVisaSocket::clearConnectsAnew()
     QCOMPARE(viPrintf(session, "good?"), VI_SUCCESS);
     QCOMPARE(read(session, 100), std::pair(ViStatus{VI_SUCCESS}, QByteArray("good\n")));
     QCOMPARE(peer.connectionCount(), 2);
-}
-
-void TestVisaSocket::attributes()
-{
-    const ScriptedPeer peer([](PeerConnection &connection) { connection.waitForClose(); });
-    const ViSession session = open(peer);
-    ViUInt16 port = 0;
-    ViUInt16 type = 0;
-    char text[VI_FIND_BUFLEN] = "";
-    QCOMPARE(viGetAttribute(session, VI_ATTR_TCPIP_PORT, &port), VI_SUCCESS);
-    QCOMPARE(port, peer.port());
-    QCOMPARE(viGetAttribute(session, VI_ATTR_INTF_TYPE, &type), VI_SUCCESS);
-    QCOMPARE(int{type}, VI_INTF_TCPIP);
-    QCOMPARE(viGetAttribute(session, VI_ATTR_RSRC_CLASS, text), VI_SUCCESS);
-    QCOMPARE(text, "SOCKET");
-    QCOMPARE(viGetAttribute(session, VI_ATTR_GPIB_PRIMARY_ADDR, &port), VI_ERROR_NSUP_ATTR);
-    QCOMPARE(viSetAttribute(session, VI_ATTR_TCPIP_PORT, 1), VI_ERROR_ATTR_READONLY);
-    QCOMPARE(viGpibControlREN(session, VI_GPIB_REN_DEASSERT_GTL), VI_ERROR_NSUP_OPER);
 }
 
 void TestVisaSocket::opening()

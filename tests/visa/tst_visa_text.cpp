@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/files.h"
 #include "support/rows.h"
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
@@ -7,8 +8,6 @@
 #include "visa/statustext.h"
 
 #include <QElapsedTimer>
-#include <QFile>
-#include <QTemporaryDir>
 #include <QTest>
 
 using namespace visa;
@@ -212,35 +211,24 @@ void TestVisaText::configurationErrors()
 
 void TestVisaText::configurationFile()
 {
-    const QTemporaryDir folder;
-    const QString path = folder.filePath("corvane-visa.ini");
+    const TestFolder folder;
     std::string error;
-
     qunsetenv("CORVANE_VISA_CONFIG");
     qputenv("XDG_CONFIG_HOME", folder.path().toUtf8());
     QVERIFY2(loadConfiguration(error), "a missing default file is no fault");
+    QVERIFY(folder.store("corvane-visa.ini", "[GPIB3]\nhost = here\n"));
+    const auto configuration = loadConfiguration(error);
+    QVERIFY2(configuration && configuration->gateways.contains(3), "the default file is not read");
 
-    QFile file(path);
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.write("[GPIB3]\nhost = here\n");
-    file.close();
-    auto configuration = loadConfiguration(error);
-    QVERIFY(configuration);
-    QVERIFY2(configuration->gateways.contains(3), "the default file was not read");
-
-    qputenv("CORVANE_VISA_CONFIG", "/nowhere/visa.ini");
-    QVERIFY(!loadConfiguration(error));
-    QCOMPARE(error, std::string("The configuration file '/nowhere/visa.ini' cannot be read."));
-
-    qputenv("CORVANE_VISA_CONFIG", folder.path().toUtf8());
-    QVERIFY2(!loadConfiguration(error), "a folder was taken for a file");
-
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.write(QByteArray(2 << 20, ';'));
-    file.close();
-    qputenv("CORVANE_VISA_CONFIG", path.toUtf8());
-    QVERIFY(!loadConfiguration(error));
-    QVERIFY(QString::fromStdString(error).contains("above 1 MiB"));
+    QVERIFY(folder.store("large.ini", QByteArray(2 << 20, ';')));
+    forRows({{"missing", "/nowhere/visa.ini", "'/nowhere/visa.ini' cannot be read."},
+             {"folder", folder.path().toUtf8(), "cannot be read"},
+             {"large", folder.path("large.ini").toUtf8(), "above 1 MiB"}},
+            [&](QByteArray name, QString words) {
+                qputenv("CORVANE_VISA_CONFIG", name);
+                QVERIFY(!loadConfiguration(error));
+                QVERIFY2(QString::fromStdString(error).contains(words), error.c_str());
+            });
 }
 
 QTEST_APPLESS_MAIN(TestVisaText)

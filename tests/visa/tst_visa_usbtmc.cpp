@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/files.h"
 #include "support/rows.h"
 #include "visa/UsbtmcDevices.h"
 #include "visa/UsbtmcTransport.h"
 
 #include <QDir>
 #include <QFile>
+#include <QFileInfo>
 #include <QTemporaryDir>
 #include <QTest>
 
@@ -135,14 +137,10 @@ std::unique_ptr<Transport> openWith(DriverState &state)
 void makeFile(const QString &path, const QByteArray &content)
 {
     QDir().mkpath(QFileInfo(path).path());
-    QFile file(path);
-    if (!file.open(QIODevice::WriteOnly) || file.write(content) != content.size())
-        qFatal("cannot write %s", qPrintable(path));
+    QVERIFY(store(path, content));
 }
 
 } // namespace
-
-Q_DECLARE_METATYPE(DriverState::Answer)
 
 /// USB instruments: the devices in sysfs, and what the driver's answers become.
 class TestVisaUsbtmc : public QObject

@@ -39,63 +39,50 @@ private slots:
 
 void TestVisaVxi11::reads()
 {
+    // Replies: error, reason, data.
     using Reply = std::tuple<std::uint32_t, std::uint32_t, QByteArray>;
+    using Replies = QList<Reply>;
     constexpr auto Count = Vxi11Peer::ReasonCount, Character = Vxi11Peer::ReasonTerminator,
                    End = Vxi11Peer::ReasonEnd;
+    enum Mode { Plain, Terminator, NoEnd };
     forRows(
-        {{"end", {{0, End, "abc"}}, 10, {VI_SUCCESS, "abc"}, false, false},
-         {"end and count", {{0, End | Count, "abc"}}, 3, {VI_SUCCESS, "abc"}, false, false},
-         {"terminator and count",
-          {{0, Character | Count, "ab\n"}},
+        {{"end", Plain, 10, {{0, End, "abc"}}, VI_SUCCESS, "abc"},
+         {"end and count", Plain, 3, {{0, End | Count, "abc"}}, VI_SUCCESS, "abc"},
+         {"without reason", Plain, 3, {{0, 0, "abc"}}, VI_SUCCESS_MAX_CNT, "abc"},
+         {"terminator",
+          Terminator,
           3,
-          {VI_SUCCESS_TERM_CHAR, "ab\n"},
-          true,
-          false},
-         {"terminator and end",
-          {{0, Character | End, "ab\n"}},
-          10,
-          {VI_SUCCESS, "ab\n"},
-          true,
-          false},
+          {{0, Character | Count, "ab\n"}},
+          VI_SUCCESS_TERM_CHAR,
+          "ab\n"},
+         {"and end", Terminator, 9, {{0, Character | End, "a\n"}}, VI_SUCCESS, "a\n"},
          {"partial",
+          Plain,
+          10,
           {{0, 0, "ab"}, {0, 0, ""}, {0, Count, "c"}, {0, End, "d"}},
-          10,
-          {VI_SUCCESS, "abcd"},
-          false,
-          false},
-         {"end suppressed",
-          {{0, End, "ab"}, {0, End, "cd"}},
-          4,
-          {VI_SUCCESS_MAX_CNT, "abcd"},
-          false,
-          true},
-         {"error behind data",
-          {{0, 0, "ab"}, {17, 0, "c"}},
-          10,
-          {VI_ERROR_IO, "abc"},
-          false,
-          false},
-         {"instrument timed out", {{15, 0, ""}}, 10, {VI_ERROR_TMO, ""}, false, false},
-         {"more than asked", {{0, End, "abcdef"}}, 3, {VI_ERROR_IO, ""}, false, false},
-         {"nothing for ever", QList<Reply>(40, {0, 0, ""}), 10, {VI_ERROR_IO, ""}, false, false}},
-        [this](QList<Reply> replies, int size, Result result, bool hasTerminator,
-               bool suppressesEnd) {
+          VI_SUCCESS,
+          "abcd"},
+         {"end suppressed", NoEnd, 4, {{0, End, "ab"}, {0, End, "cd"}}, VI_SUCCESS_MAX_CNT, "abcd"},
+         {"error after data", Plain, 9, {{0, 0, "ab"}, {17, 0, "c"}}, VI_ERROR_IO, "abc"},
+         {"timed out there", Plain, 10, {{15, 0, ""}}, VI_ERROR_TMO, ""},
+         {"more than asked", Plain, 3, {{0, End, "abcdef"}}, VI_ERROR_IO, ""},
+         {"nothing for ever", Plain, 10, Replies(40, {0, 0, ""}), VI_ERROR_IO, ""}},
+        [this](Mode mode, ViUInt32 size, Replies replies, ViStatus status, QByteArray data) {
+            Replies left = replies;
             const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-                if (call.procedure != Vxi11Peer::Read || replies.isEmpty())
+                if (call.procedure != Vxi11Peer::Read || left.isEmpty()) {
                     return false;
-                const auto [error, reason, data] = replies.takeFirst();
-                connection.send(
-                    call.reply(Vxi11Peer::readReply(error, reason, data.toStdString())));
+                }
+                const auto [error, reason, bytes] = left.takeFirst();
+                const std::string text = bytes.toStdString();
+                connection.send(call.reply(Vxi11Peer::readReply(error, reason, text)));
                 return true;
             });
             const ViSession session = open(peer);
-            QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, hasTerminator ? 1 : 0),
-                     VI_SUCCESS);
-            QCOMPARE(viSetAttribute(session, VI_ATTR_SUPPRESS_END_EN, suppressesEnd ? 1 : 0),
-                     VI_SUCCESS);
-            const Result actual = read(session, ViUInt32(size));
-            QCOMPARE(actual.second, result.second);
-            QCOMPARE(actual.first, result.first);
+            QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, mode == Terminator), VI_SUCCESS);
+            QCOMPARE(viSetAttribute(session, VI_ATTR_SUPPRESS_END_EN, mode == NoEnd), VI_SUCCESS);
+            QCOMPARE(read(session, size), Result(status, data));
+            closeManager();
         });
 }
 
