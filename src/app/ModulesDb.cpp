@@ -2,6 +2,7 @@
 #include "ModulesDb.h"
 
 #include "DlgInfo.h"
+#include "composer/ui/DlgComposer.h"
 #include "instrument/remotepaths.h"
 #include "instrument/ui/DlgSpaImport.h"
 #include "log/Tracer.h"
@@ -42,6 +43,7 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
         toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
+        toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"}),
     };
 }
 

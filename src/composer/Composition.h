@@ -7,6 +7,9 @@
 #include <optional>
 #include <vector>
 
+class QDir;
+class QIODevice;
+
 /// How a segment's level rises and falls.
 enum FadeShape {
     FadeLinear = 0,
@@ -176,6 +179,11 @@ public:
     /// be opened or read as XML leaves the document untouched, one with another root empties it.
     [[nodiscard]] bool save(const QString &fileName) const;
     [[nodiscard]] bool load(const QString &fileName);
+
+    /// The same without the file: names are relative to `folder`. fromXml() returns what is wrong,
+    /// empty for nothing, and logs none of it.
+    [[nodiscard]] QByteArray toXml(const QDir &folder) const;
+    [[nodiscard]] QString fromXml(QIODevice &device, const QDir &folder);
 
 private:
     [[nodiscard]] qint64 scaledLength(const ComposerSegment &segment) const;

@@ -202,9 +202,8 @@ void repair(ComposerTarget &target)
 
 } // namespace
 
-bool Composition::save(const QString &fileName) const
+QByteArray Composition::toXml(const QDir &folder) const
 {
-    const QDir folder = QFileInfo(fileName).absoluteDir();
     QByteArray bytes;
     QXmlStreamWriter xml(&bytes);
     xml.setAutoFormatting(true);
@@ -223,7 +222,12 @@ bool Composition::save(const QString &fileName) const
     }
     xml.writeEndElement();
     xml.writeEndDocument();
-    bytes = bytes.trimmed() + '\n'; // the writer begins with an empty line
+    return bytes.trimmed() + '\n'; // the writer begins with an empty line
+}
+
+bool Composition::save(const QString &fileName) const
+{
+    const QByteArray bytes = toXml(QFileInfo(fileName).absoluteDir());
     OutputFile file(fileName, OutputFile::Unfinished::Vanishes);
     return (file.open() && file.write(bytes) && file.commit()) ||
            Tracer::fail(QStringLiteral("Cannot write '%1': %2").arg(fileName, file.errorString()));
@@ -247,16 +251,21 @@ bool Composition::load(const QString &fileName)
                         .arg(file.size())
                         .arg(MaxFileBytes));
     }
-    QXmlStreamReader xml(&file);
+    const QString problem = fromXml(file, QFileInfo(fileName).absoluteDir());
+    return problem.isEmpty() || fail(problem);
+}
+
+QString Composition::fromXml(QIODevice &device, const QDir &folder)
+{
+    QXmlStreamReader xml(&device);
     SettingsFile settings;
     if (!readSettings(xml, settings)) {
-        return fail(QStringLiteral("line %1: %2").arg(xml.lineNumber()).arg(xml.errorString()));
+        return QStringLiteral("line %1: %2").arg(xml.lineNumber()).arg(xml.errorString());
     }
     clear();
     if (!settings.hasRoot) {
-        return fail(QStringLiteral("it is no composition, since its root isn't \"Settings\"."));
+        return QStringLiteral("it is no composition, since its root isn't \"Settings\".");
     }
-    const QDir folder = QFileInfo(fileName).absoluteDir();
     const Attributes attributes(settings.target);
     target.sName =
         absoluteName(attributes.text("sName", QStringLiteral("composition.wv")), folder, "output");
@@ -277,5 +286,5 @@ bool Composition::load(const QString &fileName)
             track.segments.push_back(segmentFrom(segment, folder));
         }
     }
-    return true;
+    return {};
 }

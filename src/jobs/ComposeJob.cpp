@@ -27,21 +27,20 @@ ComposeJob::ComposeJob(ComposeRequest request, QObject *parent)
     send(&ComposerEngine::errorMessage, &ReportLine::failure);
 }
 
-bool ComposeJob::check()
+QString ComposeJob::problem() const
 {
     const Composition &document = m_request.composition;
     const ComposerTarget &target = document.target;
     if (target.sName.isEmpty()) {
-        return refuse(emptyFileNameText());
+        return emptyFileNameText();
     }
     const QFileInfo output(target.sName);
     const QFileInfo folder(output.absolutePath());
     if (output.isDir() || !folder.isDir() || !(output.exists() || folder.isWritable())) {
-        return refuse(QStringLiteral("The target file '%1' can't be written: %2")
-                          .arg(target.sName, output.isDir() ? QStringLiteral("it is a folder.")
-                                             : !folder.isDir()
-                                                 ? QStringLiteral("its folder doesn't exist.")
-                                                 : QStringLiteral("its folder is read-only.")));
+        return QStringLiteral("The target file '%1' can't be written: %2")
+            .arg(target.sName, output.isDir()    ? QStringLiteral("it is a folder.")
+                               : !folder.isDir() ? QStringLiteral("its folder doesn't exist.")
+                                                 : QStringLiteral("its folder is read-only."));
     }
     bool hasSamples = false;
     for (int track = 0; track < document.trackCount(); ++track) {
@@ -53,36 +52,36 @@ bool ComposeJob::check()
             hasSamples = hasSamples || segment.lSamples > 0;
             const QFileInfo source(segment.sName);
             if (!source.isFile()) {
-                return refuse(
-                    QStringLiteral("The source file '%1' of track %2, segment %3 is missing.")
-                        .arg(segment.sName)
-                        .arg(track + 1)
-                        .arg(i + 1));
+                return QStringLiteral("The source file '%1' of track %2, segment %3 is missing.")
+                    .arg(segment.sName)
+                    .arg(track + 1)
+                    .arg(i + 1);
             }
             // Rendered once more, the result would be another one.
             if (output.exists() && output.canonicalFilePath() == source.canonicalFilePath()) {
-                return refuse(QStringLiteral("The target file '%1' is also the source of track %2, "
-                                             "segment %3. Choose another name.")
-                                  .arg(target.sName)
-                                  .arg(track + 1)
-                                  .arg(i + 1));
+                return QStringLiteral("The target file '%1' is also the source of track %2, "
+                                      "segment %3. Choose another name.")
+                    .arg(target.sName)
+                    .arg(track + 1)
+                    .arg(i + 1);
             }
         }
     }
     if (!hasSamples) {
-        return refuse(
-            QStringLiteral("There is nothing to render: no enabled track has a segment."));
+        return QStringLiteral("There is nothing to render: no enabled track has a segment.");
     }
-    return target.lSamples > 0 ||
-           refuse(QStringLiteral("There is nothing to render: the target has a length of %1 "
-                                 "samples.")
-                      .arg(target.lSamples));
+    return target.lSamples > 0
+               ? QString()
+               : QStringLiteral(
+                     "There is nothing to render: the target has a length of %1 samples.")
+                     .arg(target.lSamples);
 }
 
 bool ComposeJob::work()
 {
-    if (!check()) {
-        return false;
+    m_refusal = problem();
+    if (!m_refusal.isEmpty()) {
+        return refuse(m_refusal);
     }
     emit stepStarted(QStringLiteral("Composing"));
     return m_engine.runComposer();

@@ -23,10 +23,15 @@ public:
 
     [[nodiscard]] const ComposerEngine &engine() const { return m_engine; }
 
+    /// Why the work didn't begin; empty if it did.
+    [[nodiscard]] const QString &refusal() const { return m_refusal; }
+
 private:
     [[nodiscard]] bool work() override;
-    [[nodiscard]] bool check();
+    /// Why there is nothing to begin with; empty if there is.
+    [[nodiscard]] QString problem() const;
 
     ComposeRequest m_request;
     ComposerEngine m_engine;
+    QString m_refusal;
 };
