@@ -2,7 +2,7 @@
 #pragma once
 
 #include "composer/Composition.h"
-#include "log/Tracer.h"
+#include "support/logreader.h"
 
 #include <QRegularExpression>
 #include <QStringList>
@@ -66,13 +66,8 @@ inline Composition documentOf(const QString &text)
     return document;
 }
 
-/// What has been logged since the last call, without the time of day, a line each.
-inline QString takeLog()
+/// What has been logged since the last call, a line each.
+inline QString loggedText()
 {
-    QStringList lines;
-    const QList<Tracer::Entry> entries = Tracer::takeEntries();
-    for (const auto &[text, level] : entries) {
-        lines.append(text.mid(text.indexOf(QStringLiteral("  ")) + 2));
-    }
-    return lines.join(QLatin1Char('\n'));
+    return takeMessages(Tracer::DebugMask).join(QLatin1Char('\n'));
 }

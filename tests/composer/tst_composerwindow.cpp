@@ -432,6 +432,7 @@ void tst_composerwindow::sixteenTracks()
     insert("long.wv", 0);
     insert("short.wv", 1000);
     m_tracks->setTargetName(m_folder.path("picture.wv"));
+    find<QLineEdit>("le_wvname")->clear();
     QTest::qWait(500);
     QVERIFY(m_window->grab().save(folder + "/composer.png"));
     press("pb_create");

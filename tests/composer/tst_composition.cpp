@@ -32,7 +32,7 @@ private slots:
 void tst_composition::init()
 {
     Tracer::setMask(Tracer::DebugMask);
-    takeLog();
+    loggedText();
 }
 
 void tst_composition::edits_data()
@@ -129,7 +129,7 @@ void tst_composition::edits()
     QCOMPARE(textOf(document), after);
     QCOMPARE(textOf(copy), before);
     if (!log.isEmpty()) {
-        QCOMPARE(takeLog(), log);
+        QCOMPARE(loggedText(), log);
     }
 }
 
@@ -167,7 +167,7 @@ void tst_composition::clockChange()
     QCOMPARE(textOf(document), "A@4:0+1|B@6:0+1");
     QVERIFY(!document.setTargetClock(0));
     QCOMPARE(document.target.dUsrClk, 2e6);
-    QVERIFY(takeLog().endsWith("Cannot set target clock rate. Invalid value specified."));
+    QVERIFY(loggedText().endsWith("Cannot set target clock rate. Invalid value specified."));
 }
 
 void tst_composition::playTimeFallsOnSamples()
@@ -187,10 +187,11 @@ void tst_composition::ends()
     QCOMPARE(document.longestSegmentEnd(), 8e-6);
     QCOMPARE(document.longestTrackEnd(), 15e-6);
     QCOMPARE(document.highestClock(), 3e6);
-    QCOMPARE(takeLog(), "Longest segment is 8e-06 s.\nLongest track play time is 1.5e-05 s.");
+    QCOMPARE(loggedText(), "Longest segment is 8e-06 s.\nLongest track play time is 1.5e-05 s.");
     document.segment(1, 0)->dSrcClk = 0;
     QVERIFY(document.longestTrackEnd() < 0);
-    QCOMPARE(takeLog(), "Cannot determine longest track. Invalid segment clock rate in track 2.");
+    QCOMPARE(loggedText(),
+             "Cannot determine longest track. Invalid segment clock rate in track 2.");
     const Composition empty;
     QCOMPARE(empty.longestTrackEnd(), 0.0);
     QCOMPARE(empty.longestSegmentEnd(), 0.0);

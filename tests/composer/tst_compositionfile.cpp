@@ -40,7 +40,7 @@ bool tst_compositionfile::load(Composition &document, const QByteArray &xml) con
 void tst_compositionfile::init()
 {
     Tracer::setMask(Tracer::DebugMask);
-    takeLog();
+    loggedText();
 }
 
 void tst_compositionfile::bytesOfAFile()
@@ -99,7 +99,7 @@ void tst_compositionfile::namesMoveWithTheFile()
     QVERIFY(document.load(path("two/test.cms")));
     QCOMPARE(document.segment(0, 0)->sName, path("two/a.wv"));
     QVERIFY(!document.segment(0, 0)->missing);
-    const QString log = takeLog();
+    const QString log = loggedText();
     QVERIFY2(log.contains("Relative input file 'a.wv'\n  converted to '" + path("two/a.wv") + "'"),
              qPrintable(log));
 }
@@ -128,9 +128,9 @@ void tst_compositionfile::repairs()
     QCOMPARE(document.target.dUsrClk, 1e6);
     QCOMPARE(document.target.dTime, 0.0);
     QCOMPARE(document.target.lSamples, 0);
-    QVERIFY(takeLog().endsWith("Invalid target clock rate. Setting to 1 MHz.\n"
-                               "Invalid target play time. Setting to 0.\n"
-                               "Invalid target sample count. Setting to 0."));
+    QVERIFY(loggedText().endsWith("Invalid target clock rate. Setting to 1 MHz.\n"
+                                  "Invalid target play time. Setting to 0.\n"
+                                  "Invalid target sample count. Setting to 0."));
 }
 
 void tst_compositionfile::surplusTracks()
@@ -146,7 +146,7 @@ void tst_compositionfile::surplusTracks()
     QCOMPARE(document.segmentCount(15), 10000 - 15);
     QCOMPARE(document.segment(15, 1)->lTarget, 17);
     QVERIFY(!document.tracks().back().bEnable);
-    QVERIFY(takeLog().contains("Cannot add more tracks.\nMaxumum number is 16 tracks."));
+    QVERIFY(loggedText().contains("Cannot add more tracks.\nMaxumum number is 16 tracks."));
 }
 
 void tst_compositionfile::hostile_data()
@@ -179,14 +179,14 @@ void tst_compositionfile::hostile()
     Composition document = documentOf("A@0:0+1");
     QVERIFY(!load(document, xml));
     QCOMPARE(document.trackCount(), emptied ? 0 : 1);
-    const QString log = takeLog();
+    const QString log = loggedText();
     QVERIFY2(log.contains(path("test.cms")) && log.contains(reason), qPrintable(log));
 }
 
 void tst_compositionfile::unwritable()
 {
     QVERIFY(!Composition().save(path("nowhere/test.cms")));
-    QVERIFY(takeLog().contains(path("nowhere/test.cms")));
+    QVERIFY(loggedText().contains(path("nowhere/test.cms")));
 }
 
 QTEST_GUILESS_MAIN(tst_compositionfile)
