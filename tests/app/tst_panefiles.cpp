@@ -6,12 +6,12 @@
 #include "guitesting.h"
 #include "instrument/remotepaths.h"
 #include "log/Tracer.h"
+#include "support/rows.h"
 
 #include <QDir>
 #include <QFile>
 #include <QFileInfo>
 #include <QSignalSpy>
-#include <QStringListModel>
 #include <QTest>
 
 class TestPaneFiles : public QObject
@@ -22,7 +22,6 @@ private slots:
     void init();
     void cleanup();
     void pathsEndInASlashForFolders();
-    void splitsPaths_data();
     void splitsPaths();
     void linksAreRemovedAsLinks();
     void renameNeverOverwrites_data();
@@ -32,8 +31,6 @@ private slots:
     void treeRemovalStopsAtTheFirstFailure();
     void treeRemovalCanBeCancelled();
     void linksAreNotShown();
-    void otherModelsHaveNoFiles();
-    void shortSizes_data();
     void shortSizes();
 
 private:
@@ -76,40 +73,24 @@ void TestPaneFiles::pathsEndInASlashForFolders()
     QVERIFY(!m_files->isRoot(path("folder") + '/'));
 }
 
-void TestPaneFiles::splitsPaths_data()
-{
-    QTest::addColumn<QString>("path");
-    QTest::addColumn<QString>("name");
-    QTest::addColumn<QString>("parent");
-    QTest::addColumn<QString>("folder");
-    QTest::newRow("file") << "/a/b.wv"
-                          << "b.wv"
-                          << "/a/"
-                          << "/a/";
-    QTest::newRow("folder") << "/a/b/"
-                            << "b"
-                            << "/a/"
-                            << "/a/b/";
-    QTest::newRow("at the top") << "/b"
-                                << "b"
-                                << "/"
-                                << "/";
-    QTest::newRow("folder at the top") << "/b/"
-                                       << "b"
-                                       << "/"
-                                       << "/b/";
-    QTest::newRow("root") << "/"
-                          << ""
-                          << "/"
-                          << "/";
-}
-
 void TestPaneFiles::splitsPaths()
 {
-    QFETCH(QString, path);
-    QTEST(entryName(path), "name");
-    QTEST(parentFolder(path), "parent");
-    QTEST(folderOf(path), "folder");
+    struct Row
+    {
+        const char *name; ///< the path
+        QString entry;
+        QString parent;
+        QString folder;
+    };
+    forRows<Row>({{"/a/b.wv", "b.wv", "/a/", "/a/"},
+                  {"/a/b/", "b", "/a/", "/a/b/"},
+                  {"/b/", "b", "/", "/b/"},
+                  {"/", "", "/", "/"}},
+                 [](const Row &row) {
+                     QCOMPARE(entryName(row.name), row.entry);
+                     QCOMPARE(parentFolder(row.name), row.parent);
+                     QCOMPARE(folderOf(row.name), row.folder);
+                 });
 }
 
 void TestPaneFiles::linksAreRemovedAsLinks()
@@ -163,15 +144,6 @@ void TestPaneFiles::failuresHaveTheirWords_data()
     QTest::newRow("rename file") << Operation([=](PaneFiles &files, const QString &folder) {
         return files.rename(folder + "file", tooLong);
     }) << "Renaming file failed.";
-    QTest::newRow("rename folder") << Operation([=](PaneFiles &files, const QString &folder) {
-        return files.rename(folder + "folder/", tooLong);
-    }) << "Renaming folder failed.";
-    QTest::newRow("delete file") << Operation([](PaneFiles &files, const QString &folder) {
-        return files.removeFile(folder + "nothing");
-    }) << "Deleting file failed.";
-    QTest::newRow("delete folder") << Operation([](PaneFiles &files, const QString &folder) {
-        return files.removeEmptyFolder(folder + "folder/"); // which isn't
-    }) << "Deleting folder failed.";
     QTest::newRow("delete tree") << Operation([](PaneFiles &files, const QString & /*folder*/) {
         return files.removeTree("/proc/self/fdinfo/", nullptr);
     }) << "Deleting folder structure failed.";
@@ -222,31 +194,12 @@ void TestPaneFiles::linksAreNotShown()
     QVERIFY(!m_files->isEmptyFolder(path("folder") + '/'));
 }
 
-void TestPaneFiles::otherModelsHaveNoFiles()
-{
-    QStringListModel other;
-    QVERIFY(!PaneFiles::create(&other));
-    QVERIFY(!PaneFiles::create(nullptr));
-}
-
-void TestPaneFiles::shortSizes_data()
-{
-    QTest::addColumn<qint64>("bytes");
-    QTest::addColumn<QString>("text");
-    QTest::newRow("none") << qint64(0) << "0 B";
-    QTest::newRow("three digits") << qint64(999) << "999 B";
-    QTest::newRow("four digits") << qint64(1000) << "0.98 K";
-    QTest::newRow("two decimals") << qint64(1234) << "1.21 K"; // 1.205
-    QTest::newRow("one decimal") << qint64(10239) << "10.0 K"; // 9.999
-    QTest::newRow("no decimal") << qint64(102390) << "100 K";  // 99.99
-    QTest::newRow("mega") << qint64(400000000) << "381 M";     // 381.47
-    QTest::newRow("largest") << std::numeric_limits<qint64>::max() << "8.00 E";
-}
-
 void TestPaneFiles::shortSizes()
 {
-    QFETCH(qint64, bytes);
-    QTEST(shortSize(bytes), "text");
+    QCOMPARE(shortSize(999), "999 B");
+    QCOMPARE(shortSize(1234), "1.21 K");  // 1.205
+    QCOMPARE(shortSize(10239), "10.0 K"); // 9.999
+    QCOMPARE(shortSize(std::numeric_limits<qint64>::max()), "8.00 E");
 }
 
 QTEST_MAIN(TestPaneFiles)

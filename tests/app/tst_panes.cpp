@@ -2,9 +2,9 @@
 #include "app/DlgInfo.h"
 #include "app/QCustomTreeView.h"
 #include "guitesting.h"
+#include "support/rows.h"
 
 #include <QApplication>
-#include <QContextMenuEvent>
 #include <QDir>
 #include <QFileInfo>
 #include <QMenu>
@@ -21,8 +21,6 @@ class TestPanes : public QObject
 
 private slots:
     void createsAFolder();
-    void cancelCreatesNothing();
-    void refusesNames_data();
     void refusesNames();
     void renames();
     void deletesAFile();
@@ -33,7 +31,6 @@ private slots:
     void tellsAFailedDelete();
     void keysMoveAndStart();
     void contextMenuFitsTheEntry();
-    void contextMenuByKey();
     void doubleClickStartsTheFirstTool();
     void localCopyIsRefused();
     void largeFolderStaysInOrder();
@@ -70,56 +67,36 @@ void TestPanes::createsAFolder()
     QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("captures") + '/');
 }
 
-void TestPanes::cancelCreatesNothing()
-{
-    Desk desk;
-    desk.open();
-    const QStringList before = QDir(desk.path("")).entryList();
-    QVERIFY(withModal([&] { pressKey(desk.tree(1), Qt::Key_F7); },
-                      [](QWidget &box) { QTest::keyClick(&box, Qt::Key_Escape); }));
-    QCOMPARE(QDir(desk.path("")).entryList(), before);
-}
-
-void TestPanes::refusesNames_data()
-{
-    QTest::addColumn<bool>("rename");
-    QTest::addColumn<QString>("name");
-    QTest::addColumn<QString>("words");
-    const QString taken = "An entry with this name already exists.";
-    const QString empty = "The new folder name cannot be empty.";
-    QTest::newRow("create: empty") << false << "" << empty;
-    QTest::newRow("create: blank") << false << "  " << empty;
-    QTest::newRow("create: taken by a file") << false << "data.txt" << taken;
-    QTest::newRow("create: the folder itself") << false << "." << taken;
-    QTest::newRow("rename: empty") << true << "" << empty;
-    QTest::newRow("rename: taken by a folder") << true << "sub" << taken;
-    QTest::newRow("rename: its own name") << true << "tone.wv" << taken;
-    for (const char character : QByteArray("*#+/\\&'\"?%")) {
-        const QString name = QString("a%1b").arg(character);
-        QTest::addRow("create: %c", character)
-            << false << name << "The new folder name contains invalid characters.";
-        QTest::addRow("rename: %c", character)
-            << true << name << "The new entry name contains invalid characters.";
-    }
-}
-
 void TestPanes::refusesNames()
 {
-    QFETCH(bool, rename);
-    QFETCH(QString, name);
-    QFETCH(QString, words);
+    struct Row
+    {
+        const char *name;
+        bool rename;
+        QString words;
+    };
+    const QString taken = "An entry with this name already exists.";
     Desk desk;
     desk.open();
     desk.select(1, "tone.wv");
     const QStringList before = QDir(desk.path("")).entryList();
-    Seen asked;
-    Seen refused;
-    QVERIFY(withModals([&] { pressKey(desk.tree(1), rename ? Qt::Key_F2 : Qt::Key_F7); },
-                       {typeName(name, asked), answer("OK", refused)}));
-    QCOMPARE(asked.title, rename ? "Rename entry" : "Create folder");
-    QCOMPARE(refused.title, "HV Corvane");
-    QCOMPARE(refused.text, words);
-    QCOMPARE(QDir(desk.path("")).entryList(), before);
+    forRows<Row>({{"  ", false, "The new folder name cannot be empty."},
+                  {"data.txt", false, taken},
+                  {".", false, taken},
+                  {"sub", true, taken},
+                  {"a%b", false, "The new folder name contains invalid characters."},
+                  {"a#b", true, "The new entry name contains invalid characters."}},
+                 [&](const Row &row) {
+                     Seen asked;
+                     Seen refused;
+                     QVERIFY(withModals(
+                         [&] { pressKey(desk.tree(1), row.rename ? Qt::Key_F2 : Qt::Key_F7); },
+                         {typeName(row.name, asked), answer("OK", refused)}));
+                     QCOMPARE(asked.title, row.rename ? "Rename entry" : "Create folder");
+                     QCOMPARE(refused.title, "HV Corvane");
+                     QCOMPARE(refused.text, row.words);
+                     QCOMPARE(QDir(desk.path("")).entryList(), before);
+                 });
 }
 
 void TestPanes::renames()
@@ -286,18 +263,6 @@ void TestPanes::contextMenuFitsTheEntry()
              fileEntries + QStringList({"-", "Waveform Info"}));
     QTest::keyClick(openMenu(), Qt::Key_S); // the mnemonic of "Set As Default Folder"
     QTRY_COMPARE(desk.log().last(), QString("Set local default folder '%1/'").arg(desk.path("")));
-}
-
-void TestPanes::contextMenuByKey()
-{
-    Desk desk;
-    desk.open();
-    desk.select(1, "tone.wv");
-    QContextMenuEvent event(QContextMenuEvent::Keyboard, QPoint(0, 0), QPoint(0, 0));
-    QApplication::sendEvent(desk.tree(1), &event);
-    QTRY_VERIFY(openMenu());
-    QCOMPARE(desk.tree(1)->currentPath(), desk.path("tone.wv"));
-    openMenu()->close();
 }
 
 void TestPanes::doubleClickStartsTheFirstTool()

@@ -41,11 +41,16 @@ Outcome outcomeOf(QProcess &process)
             QString::fromUtf8(process.readAllStandardError()).split('\n', Qt::SkipEmptyParts)};
 }
 
-Outcome run(const QStringList &arguments)
+Outcome runProgram(const QStringList &arguments)
 {
     QProcess process;
-    process.start(program(), QStringList{"instr"} + arguments);
+    process.start(program(), arguments);
     return outcomeOf(process);
+}
+
+Outcome run(const QStringList &arguments)
+{
+    return runProgram(QStringList{"instr"} + arguments);
 }
 
 const QString device = "GPIB0::28";
@@ -67,6 +72,7 @@ private slots:
     void getKeepsFiles();
     void failures();
     void play();
+    void capturedSignalPlaysBack();
     void interrupted();
     void withoutLibrary();
 
@@ -287,6 +293,32 @@ void TestInstrCommands::play()
     Outcome outcome = run({"run", device, "/var/user/x.WV", "--timeout", "2"});
     QCOMPARE(outcome.exitCode, 1);
     QCOMPARE(outcome.lastLine(), "error: ARB did not get ready in time.");
+}
+
+/// From the analyzer by way of the disk to the generator.
+void TestInstrCommands::capturedSignalPlaysBack()
+{
+    const QStringList capture{"capture",   "GPIB0::5", "-o",        local("c.wv"),
+                              "--samples", "20000",    "--scaling", "none",
+                              "--rate",    "2M",       "--comment", "two tones"};
+    Outcome outcome = run(capture);
+    QVERIFY2(outcome.exitCode == 0, qPrintable(outcome.log.join('\n')));
+    QVERIFY(outcome.log.contains("Reading I/Q Data Complete."));
+    QCOMPARE(outcome.log.last(), "Waveform File Created");
+    outcome = runProgram({"info", "--json", local("c.wv")});
+    const QJsonObject info = outcome.json().array().first().toObject();
+    QCOMPARE(info["clock"].toDouble(), 2e6);
+    QCOMPARE(info["samples"].toInt(), 20'000);
+    QCOMPARE(info["comment"].toString(), "two tones");
+    QCOMPARE(run(capture).exitCode, 1); // the file is there
+    QCOMPARE(runProgram({"plot", local("c.wv"), "-o", local("c.png")}).exitCode, 0);
+    outcome = runProgram(
+        {"wrap", local("c.wv"), "-o", local("t.wv"), "--start", "1001", "--end", "11000"});
+    QVERIFY2(outcome.exitCode == 0, qPrintable(outcome.log.join('\n')));
+    QCOMPARE(run({"put", device, local("t.wv"), "/var/user/"}).exitCode, 0);
+    QVERIFY(load(remote("t.wv")) == load(local("t.wv")));
+    QCOMPARE(run({"run", device, "/var/user/t.wv"}).exitCode, 0);
+    QCOMPARE(run({"query", device, "SOUR:BB:ARB:STAT?"}).output, "1\n");
 }
 
 void TestInstrCommands::interrupted()
