@@ -22,8 +22,9 @@ RpcStatus answer(std::uint32_t procedure, XdrReader &arguments, XdrWriter &resul
     results.number(arguments.number() != 0 ? 1 : 0);
     const std::string_view name = arguments.text();
     const std::span<const std::uint8_t> data = arguments.opaque();
-    if (!arguments.isGood())
+    if (!arguments.isGood()) {
         return RpcStatus::GarbageArguments;
+    }
     const std::span<std::uint8_t> room =
         results.openOpaque(std::min<std::size_t>(requested, LargestReply));
     const std::size_t count = std::min({room.size(), data.size() + name.size()});
@@ -47,16 +48,20 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const std::span call(data, size);
     const std::array<RpcProgram, 1> programs{{{CoreProgram, 1, answer}}};
     XdrWriter reply;
-    if (!answerRpcCall(call, programs, reply))
+    if (!answerRpcCall(call, programs, reply)) {
         return 0;
+    }
     const std::span<const std::uint8_t> bytes = reply.bytes();
     constexpr std::size_t SmallestReply = RecordMarkSize + 5 * 4;
     constexpr std::uint32_t LastFragment = 0x80000000U;
-    if (bytes.size() < SmallestReply || bytes.size() % 4 != 0)
+    if (bytes.size() < SmallestReply || bytes.size() % 4 != 0) {
         std::abort();
-    if (word(bytes, 0) != (LastFragment | (bytes.size() - RecordMarkSize)))
+    }
+    if (word(bytes, 0) != (LastFragment | (bytes.size() - RecordMarkSize))) {
         std::abort();
-    if (word(bytes, RecordMarkSize) != word(call, 0) || word(bytes, RecordMarkSize + 4) != 1)
+    }
+    if (word(bytes, RecordMarkSize) != word(call, 0) || word(bytes, RecordMarkSize + 4) != 1) {
         std::abort();
+    }
     return 0;
 }

@@ -15,17 +15,22 @@ namespace {
 void parseUnit(std::string_view text)
 {
     ProgramUnit unit;
-    if (unit.parse(text) != NoError)
+    if (unit.parse(text) != NoError) {
         return;
-    if (unit.nodes.empty())
+    }
+    if (unit.nodes.empty()) {
         std::abort();
+    }
     for (const std::string &node : unit.nodes) {
-        if (node.empty() || !matchesMnemonic(node, upperCase(node)))
+        if (node.empty() || !matchesMnemonic(node, upperCase(node))) {
             std::abort();
+        }
     }
     for (const Parameter &parameter : unit.parameters) {
-        if (!std::isfinite(parameter.value) || !std::isfinite(suffixFactor(parameter.suffix, "HZ")))
+        if (!std::isfinite(parameter.value) ||
+            !std::isfinite(suffixFactor(parameter.suffix, "HZ"))) {
             std::abort();
+        }
     }
 }
 
@@ -40,37 +45,42 @@ public:
 private:
     void onUnit(std::string_view text, bool hasBlock) override
     {
-        if (m_inBlock || text.size() > ScpiParser::MaxUnitLength + 1)
+        if (m_inBlock || text.size() > ScpiParser::MaxUnitLength + 1) {
             std::abort();
+        }
         parseUnit(text);
         events.append(hasBlock ? "B" : "U").append(text).push_back('\0');
     }
     void onBlockBegin(std::string_view text, std::optional<std::uint64_t> size) override
     {
-        if (std::exchange(m_inBlock, true))
+        if (std::exchange(m_inBlock, true)) {
             std::abort();
+        }
         m_size = size;
         m_received = 0;
         events.append("b").append(text).append(size ? std::to_string(*size) : "?").push_back('\0');
     }
     void onBlockData(std::span<const char> bytes) override
     {
-        if (!m_inBlock)
+        if (!m_inBlock) {
             std::abort();
+        }
         m_received += bytes.size();
         events.append(bytes.data(), bytes.size());
     }
     void onBlockEnd(bool complete) override
     {
-        if (!std::exchange(m_inBlock, false) || (m_size && complete != (m_received == *m_size)))
+        if (!std::exchange(m_inBlock, false) || (m_size && complete != (m_received == *m_size))) {
             std::abort();
+        }
         events.append(complete ? "e" : "i");
     }
     void onError(int number) override { events.append("E").append(std::to_string(number)); }
     void onMessageEnd() override
     {
-        if (m_inBlock)
+        if (m_inBlock) {
             std::abort();
+        }
         events.append("M");
     }
 
@@ -88,15 +98,18 @@ std::string eventsOf(std::span<const char> bytes, std::size_t pieceSize, bool ha
     while (!bytes.empty()) {
         const std::span<const char> piece = bytes.first(std::min(bytes.size(), pieceSize));
         const std::size_t taken = parser.feed(piece, hasEnd && piece.size() == bytes.size());
-        if (taken == 0 || taken > piece.size())
+        if (taken == 0 || taken > piece.size()) {
             std::abort();
+        }
         bytes = bytes.subspan(taken);
     }
-    if (hasEnd && !parser.isIdle())
+    if (hasEnd && !parser.isIdle()) {
         std::abort();
+    }
     parser.clear();
-    if (!parser.isIdle() || recorder.isInBlock())
+    if (!parser.isIdle() || recorder.isInBlock()) {
         std::abort();
+    }
     return recorder.events;
 }
 
@@ -106,14 +119,16 @@ std::string eventsOf(std::span<const char> bytes, std::size_t pieceSize, bool ha
 /// pieces must not matter.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
-    if (size < 2)
+    if (size < 2) {
         return 0;
+    }
     const std::size_t pieceSize = std::size_t{data[0]} + 1;
     const bool hasEnd = (data[1] & 1U) != 0;
     const bool lineFeedEnds = (data[1] & 2U) == 0 || !hasEnd;
     const std::span<const char> bytes(reinterpret_cast<const char *>(data) + 2, size - 2);
     if (eventsOf(bytes, bytes.size() + 1, hasEnd, lineFeedEnds) !=
-        eventsOf(bytes, pieceSize, hasEnd, lineFeedEnds))
+        eventsOf(bytes, pieceSize, hasEnd, lineFeedEnds)) {
         std::abort();
+    }
     return 0;
 }

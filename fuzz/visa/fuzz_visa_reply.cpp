@@ -28,29 +28,36 @@ bool decodes(XdrCode<T> *code, std::span<const std::uint8_t> results)
 void decodeRecord(std::span<const std::uint8_t> record)
 {
     std::uint32_t transaction = 0;
-    for (const std::uint8_t byte : record.first(std::min<std::size_t>(record.size(), 4)))
+    for (const std::uint8_t byte : record.first(std::min<std::size_t>(record.size(), 4))) {
         transaction = transaction << 8U | byte;
+    }
     const RpcReply reply = parseRpcReply(record, transaction);
-    if (reply.kind == RpcReplyKind::OtherCall && record.size() >= 4)
+    if (reply.kind == RpcReplyKind::OtherCall && record.size() >= 4) {
         std::abort();
-    if (reply.results.size() > record.size())
+    }
+    if (reply.results.size() > record.size()) {
         std::abort();
-    if (reply.kind != RpcReplyKind::Accepted)
+    }
+    if (reply.kind != RpcReplyKind::Accepted) {
         return;
+    }
 
     // Exactly as large as the target, so that the sanitizer sees a byte behind it.
     std::vector<std::uint8_t> target(reply.results.size() / 2);
     XdrValue<ReadReply> read(decodeReadReply, {.target = target});
-    if (!read.decode(reply.results) && read->size != 0)
+    if (!read.decode(reply.results) && read->size != 0) {
         std::abort();
-    if (read->size <= target.size() && read->size > reply.results.size())
+    }
+    if (read->size <= target.size() && read->size > reply.results.size()) {
         std::abort();
+    }
     XdrValue<Device_ReadResp> generated(xdr_Device_ReadResp);
     if (generated.decode(reply.results) && generated->data.data_len <= target.size() &&
         (read->size != generated->data.data_len ||
          !std::equal(target.begin(), target.begin() + read->size,
-                     reinterpret_cast<const std::uint8_t *>(generated->data.data_val))))
+                     reinterpret_cast<const std::uint8_t *>(generated->data.data_val)))) {
         std::abort();
+    }
     (void)decodes(xdr_Device_WriteResp, reply.results);
     (void)decodes(xdr_Create_LinkResp, reply.results);
     (void)decodes(xdr_Device_Error, reply.results);
@@ -67,12 +74,14 @@ void trackMessages(std::span<const std::uint8_t> bytes, std::size_t pieceSize)
         do {
             const auto rest = bytes.subspan(done);
             const std::size_t size = cut.advance(rest.first(std::min(rest.size(), pieceSize)));
-            if (size == 0)
+            if (size == 0) {
                 std::abort();
+            }
             done += size;
         } while (!cut.endedMessage() && done < bytes.size());
-        if (done != end || whole.endedMessage() != cut.endedMessage())
+        if (done != end || whole.endedMessage() != cut.endedMessage()) {
             std::abort();
+        }
         bytes = bytes.subspan(end);
     }
 }
@@ -82,8 +91,9 @@ void trackMessages(std::span<const std::uint8_t> bytes, std::size_t pieceSize)
 /// The first byte is the size of the pieces in which the others arrive.
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
-    if (size == 0)
+    if (size == 0) {
         return 0;
+    }
     const std::size_t pieceSize = std::size_t{data[0]} + 1;
     const std::span stream(data + 1, size - 1);
     trackMessages(stream, pieceSize);
@@ -92,8 +102,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     auto rest = stream;
     while (!rest.empty() && reader.state() != RpcRecordReader::State::Broken) {
         const std::size_t taken = reader.feed(rest.first(std::min(rest.size(), pieceSize)));
-        if (taken == 0 || reader.record().size() > LargestRecord)
+        if (taken == 0 || reader.record().size() > LargestRecord) {
             std::abort();
+        }
         rest = rest.subspan(taken);
         if (reader.state() == RpcRecordReader::State::Complete) {
             decodeRecord(reader.record());

@@ -14,19 +14,23 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const std::string text(reinterpret_cast<const char *>(data), size);
     std::string error;
     const auto configuration = parseConfiguration(text, error);
-    if (configuration.has_value() != error.empty())
+    if (configuration.has_value() != error.empty()) {
         std::abort();
+    }
     if (const auto name = parseResourceName(text)) {
         const std::string full = resourceText(*name);
-        if (full.size() >= VI_FIND_BUFLEN || parseResourceName(full) != name)
+        if (full.size() >= VI_FIND_BUFLEN || parseResourceName(full) != name) {
             std::abort();
+        }
     }
-    if (const auto pattern = FindExpression::parse(text))
+    if (const auto pattern = FindExpression::parse(text)) {
         (void)pattern->matches("TCPIP0::192.168.1.20::inst0::INSTR");
+    }
     if (const auto messages = formatMessages(text)) {
         for (const std::string &message : *messages) {
-            if (message.empty())
+            if (message.empty()) {
                 std::abort();
+            }
         }
     }
     return 0;

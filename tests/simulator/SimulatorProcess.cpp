@@ -14,8 +14,9 @@ constexpr int StartMilliseconds = 20000;
 
 SimulatorProcess::~SimulatorProcess()
 {
-    if (m_process.state() != QProcess::NotRunning)
+    if (m_process.state() != QProcess::NotRunning) {
         (void)stop(SIGTERM);
+    }
 }
 
 bool SimulatorProcess::start(const QStringList &arguments, int instrumentCount)
@@ -24,20 +25,24 @@ bool SimulatorProcess::start(const QStringList &arguments, int instrumentCount)
     QElapsedTimer timer;
     timer.start();
     while (m_ready.size() < instrumentCount && timer.elapsed() < StartMilliseconds) {
-        if (!m_process.canReadLine() && !m_process.waitForReadyRead(StartMilliseconds))
+        if (!m_process.canReadLine() && !m_process.waitForReadyRead(StartMilliseconds)) {
             break;
+        }
         while (m_process.canReadLine()) {
             const QString line = QString::fromUtf8(m_process.readLine()).trimmed();
-            if (line.startsWith("ready "))
+            if (line.startsWith("ready ")) {
                 m_ready << line.mid(6);
+            }
         }
     }
-    if (m_ready.size() == instrumentCount)
+    if (m_ready.size() == instrumentCount) {
         return true;
-    if (m_process.error() == QProcess::FailedToStart)
+    }
+    if (m_process.error() == QProcess::FailedToStart) {
         m_errorOutput = m_process.program() + ": " + m_process.errorString();
-    else
+    } else {
         m_process.waitForFinished(StartMilliseconds);
+    }
     m_errorOutput += QString::fromUtf8(m_process.readAllStandardError());
     return false;
 }
@@ -45,8 +50,9 @@ bool SimulatorProcess::start(const QStringList &arguments, int instrumentCount)
 bool SimulatorProcess::startConfig(const QString &config, int instrumentCount)
 {
     QFile file(path("simulator.ini"));
-    if (!file.open(QIODevice::WriteOnly))
+    if (!file.open(QIODevice::WriteOnly)) {
         return false;
+    }
     file.write(QString(config).replace("%ROOT%", root()).toUtf8());
     file.close();
     return start({"--config", file.fileName()}, instrumentCount);

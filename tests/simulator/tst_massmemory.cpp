@@ -164,17 +164,19 @@ void TestMassMemory::driveNames()
 
 void TestMassMemory::catalogOrderAndTypes()
 {
-    for (const char *name : {"b.wv", "a.TXT", "c.set", "noSuffix"})
+    for (const char *name : {"b.wv", "a.TXT", "c.set", "noSuffix"}) {
         writeFile(top(QString("var/user/") + name), "123");
+    }
     QDir(top("var/user")).mkdir("bb");
     MassMemory::Catalog catalog;
     QCOMPARE(m_unix->catalog("/var/user/", catalog), NoError);
     QStringList lines;
-    for (const MassMemory::Entry &entry : catalog.entries)
+    for (const MassMemory::Entry &entry : catalog.entries) {
         lines << QString("%1,%2,%3")
                      .arg(QString::fromStdString(entry.name),
                           QString::fromUtf8(entry.type.data(), static_cast<int>(entry.type.size())))
                      .arg(entry.size);
+    }
     QCOMPARE(lines, QStringList({"a.TXT,ASC,3", "b.wv,BIN,3", "bb,DIR,0", "c.set,SET,3",
                                  "noSuffix,BIN,3"}));
     QCOMPARE(catalog.usedBytes, 12U);

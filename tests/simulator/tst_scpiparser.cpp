@@ -168,11 +168,13 @@ void TestScpiParser::units()
                  [](const Row &row) {
                      ProgramUnit unit;
                      QCOMPARE(unit.parse(row.name), row.error);
-                     if (row.error != 0)
+                     if (row.error != 0) {
                          return;
+                     }
                      QStringList nodes;
-                     for (const std::string &node : unit.nodes)
+                     for (const std::string &node : unit.nodes) {
                          nodes << QString::fromStdString(node);
+                     }
                      QString actual = (unit.common     ? "*"
                                        : unit.absolute ? ":"
                                                        : "") +
@@ -182,8 +184,9 @@ void TestScpiParser::units()
                          switch (parameter.kind) {
                          case Parameter::Kind::Number:
                              actual += QString::number(parameter.value, 'g', 12);
-                             if (!parameter.suffix.empty())
+                             if (!parameter.suffix.empty()) {
                                  actual += '[' + QString::fromStdString(parameter.suffix) + ']';
+                             }
                              break;
                          case Parameter::Kind::String:
                              actual += '\'' + QString::fromStdString(parameter.text) + '\'';
@@ -230,8 +233,9 @@ void TestScpiParser::headers()
 
                      const bool common = QByteArray(row.name).startsWith('*');
                      std::vector<std::string> nodes;
-                     for (const QString &node : QString(row.name).mid(common ? 1 : 0).split(':'))
+                     for (const QString &node : QString(row.name).mid(common ? 1 : 0).split(':')) {
                          nodes.push_back(node.toUpper().toStdString());
+                     }
                      const CommandTable::Result result = table.find(nodes, common);
                      if (row.place < 0) {
                          QVERIFY(result.command == nullptr);

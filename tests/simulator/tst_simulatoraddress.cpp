@@ -69,9 +69,10 @@ void TestSimulatorAddress::initTestCase()
 {
     m_address = address(1);
     if (!m_program.start({"--address", m_address, "--root", m_program.root()})) {
-        if (m_program.errorOutput().contains("Permission denied"))
+        if (m_program.errorOutput().contains("Permission denied")) {
             QSKIP("the ports 111 and 5025 may not be opened by this user, so an instrument on an "
                   "address of its own cannot be tried");
+        }
         QFAIL(qPrintable(m_program.errorOutput()));
     }
     QCOMPARE(m_program.ready(), QStringList(m_address));
@@ -116,8 +117,9 @@ void TestSimulatorAddress::portMapperOverUdp()
     const QHostAddress host(m_address);
     socket.writeDatagram("nonsense", host, MapperPort); // unanswered
     socket.writeDatagram(call + arguments, host, MapperPort);
-    while (!socket.hasPendingDatagrams())
+    while (!socket.hasPendingDatagrams()) {
         QVERIFY(socket.waitForReadyRead(10000));
+    }
     QByteArray reply(100, '\0');
     reply.truncate(socket.readDatagram(reply.data(), reply.size()));
     QCOMPARE(reply.size(), 28);
@@ -137,8 +139,9 @@ QByteArray TestSimulatorAddress::askRaw(QTcpSocket &socket, const QByteArray &co
 {
     socket.write(command + '\n');
     while (!socket.canReadLine()) {
-        if (!socket.waitForReadyRead(10000))
+        if (!socket.waitForReadyRead(10000)) {
             return {};
+        }
     }
     return socket.readLine();
 }
@@ -186,8 +189,9 @@ void TestSimulatorAddress::rawFiles()
 void TestSimulatorAddress::lxiTools()
 {
     const QString program = QStandardPaths::findExecutable("lxi");
-    if (program.isEmpty())
+    if (program.isEmpty()) {
         QSKIP("the program lxi of lxi-tools is not installed");
+    }
     bool isRaw = false;
     const auto lxi = [&](const QString &command) {
         QStringList arguments{"scpi", "-a", m_address, command};

@@ -73,8 +73,9 @@ void TestSimulatorLinks::linkErrors()
 {
     Vxi11Client client;
     QVERIFY(client.open(m_program.gatewayPort()));
-    for (const char *name : {"gpib0,3", "gpib0", "inst0", "", "gpib0,1,1"})
+    for (const char *name : {"gpib0,3", "gpib0", "inst0", "", "gpib0,1,1"}) {
         QCOMPARE(client.link(name), 3U);
+    }
     QCOMPARE(client.write("*IDN?"), 4U); // no link yet
     QCOMPARE(client.read(10).error, 4U);
     QCOMPARE(client.linkOnly(destroy_link), 4U);
@@ -212,8 +213,9 @@ void TestSimulatorLinks::unknownCalls()
             socket.write(words({0x80000000U | (size - 10)}) + record.mid(10));
             const auto replySize = static_cast<quint32>(reply.size() + 4);
             const QByteArray expected = words({0x80000000U | replySize, 77}) + reply;
-            while (socket.bytesAvailable() < expected.size())
+            while (socket.bytesAvailable() < expected.size()) {
                 QVERIFY(socket.waitForReadyRead());
+            }
             QCOMPARE(socket.readAll().toHex(), expected.toHex());
         });
 }
@@ -272,13 +274,15 @@ void TestSimulatorLinks::manyConnections()
             QVERIFY(connectTo(*clients.back(), i % 3 == 0 ? "gpib0,2" : "gpib0,1"));
         }
         QVERIFY(countOf("task") >= Count);
-        for (const auto &client : clients)
+        for (const auto &client : clients) {
             QCOMPARE(client->ask("*OPC?"), "1\n");
+        }
         for (std::size_t i = 0; i < clients.size(); ++i) {
-            if (i % 2 == 0)
+            if (i % 2 == 0) {
                 QCOMPARE(clients[i]->linkOnly(destroy_link), 0U);
-            else
+            } else {
                 clients[i]->sendRead(9, 600000);
+            }
         }
     }
     QTRY_COMPARE(countOf("task"), m_idleThreads);
@@ -307,8 +311,9 @@ void TestSimulatorLinks::endsWhileClientsWait()
         Vxi11Client reading;
         Vxi11Client sending;
         Vxi11Client locked;
-        for (Vxi11Client *client : {&reading, &sending, &locked})
+        for (Vxi11Client *client : {&reading, &sending, &locked}) {
             QVERIFY(client->open(program.gatewayPort()) && client->link("gpib0,1") == 0);
+        }
         QCOMPARE(sending.write("MMEM:DATA '/var/user/x',#41000abc", 0), 0U);
         reading.sendRead(9, 600000);
         QCOMPARE(sending.lock(), 0U);

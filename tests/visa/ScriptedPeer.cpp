@@ -10,8 +10,9 @@ bool PeerConnection::send(std::string_view bytes)
 {
     while (!bytes.empty()) {
         const ssize_t count = ::send(m_descriptor, bytes.data(), bytes.size(), MSG_NOSIGNAL);
-        if (count <= 0)
+        if (count <= 0) {
             return false;
+        }
         bytes.remove_prefix(static_cast<std::size_t>(count));
     }
     return true;
@@ -23,8 +24,9 @@ std::string PeerConnection::receive(std::size_t size)
     std::size_t received = 0;
     while (received < size) {
         const ssize_t count = ::recv(m_descriptor, bytes.data() + received, size - received, 0);
-        if (count <= 0)
+        if (count <= 0) {
             break;
+        }
         received += static_cast<std::size_t>(count);
     }
     bytes.resize(received);
@@ -36,8 +38,9 @@ std::string PeerConnection::receiveUntil(char last)
     std::string bytes;
     do {
         const std::string byte = receive(1);
-        if (byte.empty())
+        if (byte.empty()) {
             break;
+        }
         bytes += byte;
     } while (bytes.back() != last);
     return bytes;
@@ -67,8 +70,9 @@ ScriptedPeer::ScriptedPeer(Script script, const std::string &address, std::uint1
     auto *generic = reinterpret_cast<sockaddr *>(&endpoint);
     socklen_t length = sizeof endpoint;
     if (::bind(m_listener, generic, length) != 0 || ::listen(m_listener, 8) != 0 ||
-        ::getsockname(m_listener, generic, &length) != 0)
+        ::getsockname(m_listener, generic, &length) != 0) {
         return;
+    }
     m_port = ntohs(endpoint.sin_port);
     m_acceptor = std::thread([this] { accept(); });
 }
@@ -79,8 +83,9 @@ void ScriptedPeer::accept()
         const int descriptor = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC);
         const std::lock_guard lock(m_mutex);
         if (descriptor < 0 || m_isStopping) {
-            if (descriptor >= 0)
+            if (descriptor >= 0) {
                 ::close(descriptor);
+            }
             return;
         }
         ++m_connectionCount;
@@ -98,13 +103,17 @@ ScriptedPeer::~ScriptedPeer()
 {
     m_isStopping = true;
     ::shutdown(m_listener, SHUT_RDWR);
-    if (m_acceptor.joinable())
+    if (m_acceptor.joinable()) {
         m_acceptor.join();
-    for (const int descriptor : m_descriptors)
+    }
+    for (const int descriptor : m_descriptors) {
         ::shutdown(descriptor, SHUT_RDWR);
-    for (std::thread &thread : m_threads)
+    }
+    for (std::thread &thread : m_threads) {
         thread.join();
-    for (const int descriptor : m_descriptors)
+    }
+    for (const int descriptor : m_descriptors) {
         ::close(descriptor);
+    }
     ::close(m_listener);
 }

@@ -13,18 +13,21 @@ VisaFixture::~VisaFixture()
 void VisaFixture::configure(const QByteArray &text)
 {
     QFile file(m_folder.filePath("visa.ini"));
-    if (!file.open(QIODevice::WriteOnly) || file.write(text) != text.size())
+    if (!file.open(QIODevice::WriteOnly) || file.write(text) != text.size()) {
         qFatal("cannot write the configuration");
+    }
     file.close();
     qputenv("CORVANE_VISA_CONFIG", file.fileName().toUtf8());
-    if (viOpenDefaultRM(&m_manager) != VI_SUCCESS)
+    if (viOpenDefaultRM(&m_manager) != VI_SUCCESS) {
         qFatal("cannot open the manager");
+    }
 }
 
 void VisaFixture::closeManager()
 {
-    if (m_manager != VI_NULL)
+    if (m_manager != VI_NULL) {
         viClose(m_manager);
+    }
     m_manager = VI_NULL;
 }
 
@@ -33,8 +36,9 @@ ViSession VisaFixture::open(const Vxi11Peer &peer, ViUInt32 timeoutMs)
     configure("[TCPIP0::127.0.0.1::inst0::INSTR]\nport = " + QByteArray::number(peer.port()));
     ViSession session = VI_NULL;
     if (viOpen(m_manager, "TCPIP::127.0.0.1::INSTR", VI_NO_LOCK, 0, &session) != VI_SUCCESS ||
-        viSetAttribute(session, VI_ATTR_TMO_VALUE, timeoutMs) != VI_SUCCESS)
+        viSetAttribute(session, VI_ATTR_TMO_VALUE, timeoutMs) != VI_SUCCESS) {
         qFatal("cannot open the peer");
+    }
     return session;
 }
 

@@ -12,8 +12,9 @@ constexpr std::size_t CallHeaderSize = 40;
 std::uint32_t wordAt(std::string_view bytes, std::size_t offset)
 {
     std::uint32_t word = 0;
-    for (std::size_t i = 0; i < 4 && offset + i < bytes.size(); ++i)
+    for (std::size_t i = 0; i < 4 && offset + i < bytes.size(); ++i) {
         word = word << 8U | static_cast<unsigned char>(bytes[offset + i]);
+    }
     return word;
 }
 
@@ -23,8 +24,9 @@ std::string bigEndian(std::initializer_list<std::uint32_t> words)
 {
     std::string bytes;
     for (const std::uint32_t word : words) {
-        for (int shift = 24; shift >= 0; shift -= 8)
+        for (int shift = 24; shift >= 0; shift -= 8) {
             bytes += static_cast<char>(word >> shift);
+        }
     }
     return bytes;
 }
@@ -66,11 +68,13 @@ void Vxi11Peer::serve(PeerConnection &connection)
 {
     for (;;) {
         const std::string mark = connection.receive(4);
-        if (mark.size() < 4)
+        if (mark.size() < 4) {
             return;
+        }
         const std::string record = connection.receive(wordAt(mark, 0) & ~LastFragment);
-        if (record.size() < CallHeaderSize)
+        if (record.size() < CallHeaderSize) {
             return;
+        }
         PeerCall call{wordAt(record, 0), wordAt(record, 12), wordAt(record, 20),
                       record.substr(CallHeaderSize)};
         {
@@ -78,8 +82,9 @@ void Vxi11Peer::serve(PeerConnection &connection)
             m_calls.push_back(call);
         }
         m_called.notify_all();
-        if (!m_handler || !m_handler(connection, call))
+        if (!m_handler || !m_handler(connection, call)) {
             answer(connection, call);
+        }
     }
 }
 

@@ -120,8 +120,9 @@ void TestVisaRecords::messageEnds()
                     QByteArrayList actual{QByteArray()};
                     auto rest = bytesOf(stream);
                     while (!rest.empty()) {
-                        if (tracker.endedMessage() && !actual.back().isEmpty())
+                        if (tracker.endedMessage() && !actual.back().isEmpty()) {
                             actual << QByteArray();
+                        }
                         const std::size_t size =
                             tracker.advance(rest.first(std::min(pieceSize, rest.size())));
                         QVERIFY(size > 0);

@@ -38,8 +38,9 @@ void TestVisaSession::badOpens()
              {"silent", "", VI_ERROR_TMO}},
             [this](std::string results, ViStatus status) {
                 const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-                    if (!results.empty())
+                    if (!results.empty()) {
                         connection.send(call.reply(results));
+                    }
                     return true;
                 });
                 configure(
@@ -65,15 +66,17 @@ void TestVisaSession::portMapper()
             const std::string call = connection.receive(4 + 40 + 16);
             const std::lock_guard lock(mutex);
             // Program, version, TCP.
-            if (call.substr(44, 12) != bigEndian({0x0607AF, 1, 6}))
+            if (call.substr(44, 12) != bigEndian({0x0607AF, 1, 6})) {
                 return;
+            }
             connection.send(bigEndian({0x8000'001CU}) + call.substr(4, 4) +
                             bigEndian({1, 0, 0, 0, 0}) + answer);
             connection.waitForClose();
         },
         "127.0.0.9", 111);
-    if (mapper.port() == 0)
+    if (mapper.port() == 0) {
         QSKIP("port 111 cannot be opened by this user");
+    }
     configure("");
     ViSession session = VI_NULL;
     const auto open = [&](std::uint32_t port) {
@@ -101,10 +104,12 @@ void TestVisaSession::gatewayAndFindList()
         ViUInt32 count = 0;
         char text[VI_FIND_BUFLEN] = "";
         ViStatus status = viFindRsrc(m_manager, expression, &list, &count, text);
-        for (; status == VI_SUCCESS; status = viFindNext(list, text))
+        for (; status == VI_SUCCESS; status = viFindNext(list, text)) {
             found << text;
-        if (status != VI_ERROR_RSRC_NFOUND || found.size() != qsizetype(count))
+        }
+        if (status != VI_ERROR_RSRC_NFOUND || found.size() != qsizetype(count)) {
             found << "status or count wrong";
+        }
         return found;
     };
     QCOMPARE(find("GPIB?*INSTR"), (QByteArrayList{"GPIB0::5::INSTR", "GPIB0::28::INSTR"}));

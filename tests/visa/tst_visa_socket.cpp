@@ -29,8 +29,9 @@ ViSession TestVisaSocket::open(const ScriptedPeer &peer, ViUInt32 timeoutMs)
     ViSession session = VI_NULL;
     const QByteArray name = "TCPIP::127.0.0.1::" + QByteArray::number(peer.port()) + "::SOCKET";
     if (viOpen(m_manager, name.data(), 0, 0, &session) != VI_SUCCESS ||
-        viSetAttribute(session, VI_ATTR_TMO_VALUE, timeoutMs) != VI_SUCCESS)
+        viSetAttribute(session, VI_ATTR_TMO_VALUE, timeoutMs) != VI_SUCCESS) {
         qFatal("cannot open %s", name.data());
+    }
     return session;
 }
 
@@ -65,8 +66,9 @@ void TestVisaSocket::reads()
                     const ScriptedPeer peer([&](PeerConnection &connection) {
                         const std::string bytes = all.toStdString();
                         const std::size_t step = isTrickled ? 1 : bytes.size();
-                        for (std::size_t i = 0; i < bytes.size(); i += step)
+                        for (std::size_t i = 0; i < bytes.size(); i += step) {
                             connection.send(bytes.substr(i, step));
+                        }
                     });
                     const ViSession session = open(peer);
                     if (terminator >= 0) {

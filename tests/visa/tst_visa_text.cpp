@@ -62,9 +62,10 @@ void TestVisaText::resourceNames()
                      const auto name = parseResourceName(row.name);
                      QCOMPARE(name ? QString::fromStdString(resourceText(*name)) : QString(),
                               row.fullText);
-                     if (name)
+                     if (name) {
                          QVERIFY2(parseResourceName(resourceText(*name)) == name,
                                   "full form means another resource");
+                     }
                  });
 }
 
@@ -141,8 +142,9 @@ void TestVisaText::formats()
                 QCOMPARE(result.has_value(), isValid);
                 QByteArrayList actual;
                 if (result) {
-                    for (const std::string &message : *result)
+                    for (const std::string &message : *result) {
                         actual << QByteArray::fromStdString(message);
+                    }
                 }
                 QCOMPARE(actual, messages);
             });

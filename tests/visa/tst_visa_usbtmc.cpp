@@ -60,8 +60,9 @@ public:
     int open(const std::string &) override
     {
         errno = m_state.openError;
-        if (m_state.openError != 0)
+        if (m_state.openError != 0) {
             return -1;
+        }
         ++m_state.openCount;
         return 42;
     }
@@ -76,8 +77,9 @@ public:
         const auto answer = m_state.answers.front();
         m_state.answers.pop_front();
         errno = answer.error;
-        if (answer.error != 0)
+        if (answer.error != 0) {
             return -1;
+        }
         const std::size_t count = std::min(size, std::size_t(answer.data.size()));
         std::memcpy(buffer, answer.data.data(), count);
         m_state.lastAttributes = answer.attributes;
@@ -96,8 +98,9 @@ public:
             return -1;
         }
         QByteArray bytes(static_cast<const char *>(data), limit);
-        if (m_state.setsEnd)
+        if (m_state.setsEnd) {
             bytes += '$';
+        }
         m_state.written << bytes;
         return limit;
     }
@@ -110,14 +113,15 @@ public:
             errno = refused->second;
             return -1;
         }
-        if (request == USBTMC_IOCTL_SET_TIMEOUT)
+        if (request == USBTMC_IOCTL_SET_TIMEOUT) {
             std::memcpy(&m_state.timeoutMs, argument, sizeof m_state.timeoutMs);
-        else if (request == USBTMC_IOCTL_EOM_ENABLE)
+        } else if (request == USBTMC_IOCTL_EOM_ENABLE) {
             m_state.setsEnd = *static_cast<std::uint8_t *>(argument) != 0;
-        else if (request == USBTMC_IOCTL_CONFIG_TERMCHAR)
+        } else if (request == USBTMC_IOCTL_CONFIG_TERMCHAR) {
             std::memcpy(&m_state.terminator, argument, sizeof m_state.terminator);
-        else if (request == USBTMC_IOCTL_MSG_IN_ATTR)
+        } else if (request == USBTMC_IOCTL_MSG_IN_ATTR) {
             *static_cast<std::uint8_t *>(argument) = m_state.lastAttributes;
+        }
         return 0;
     }
 
@@ -129,8 +133,9 @@ std::unique_ptr<Transport> openWith(DriverState &state)
 {
     std::unique_ptr<Transport> transport;
     if (UsbtmcTransport::open("/dev/usbtmc0", std::make_unique<ScriptedKernel>(state), transport) !=
-        VI_SUCCESS)
+        VI_SUCCESS) {
         qFatal("scripted device did not open");
+    }
     return transport;
 }
 
@@ -166,8 +171,9 @@ void TestVisaUsbtmc::devices()
         const QString path = root.filePath("sys/devices/" + folder);
         makeFile(path + "/idVendor", vendor);
         makeFile(path + "/idProduct", "00af\n");
-        if (*serial != '\0')
+        if (*serial != '\0') {
             makeFile(path + "/serial", serial);
+        }
     };
     const auto addNode = [&](const QString &node, const QString &interface, const char *number) {
         const QString path = root.filePath("sys/devices/" + interface);
@@ -188,8 +194,9 @@ void TestVisaUsbtmc::devices()
 
     const auto found = findUsbtmcDevices(root.path().toStdString());
     QStringList names;
-    for (const UsbtmcDevice &device : found)
+    for (const UsbtmcDevice &device : found) {
         names << QString::fromStdString(resourceText(device.name));
+    }
     QCOMPARE(names, (QStringList{"USB0::0x7FE3::0x00AF::100001::1::INSTR",
                                  "USB0::0x7FE3::0x00AF::100001::0::INSTR",
                                  "USB0::0x0ABC::0x00AF::X::INSTR"}));
@@ -241,8 +248,9 @@ void TestVisaUsbtmc::reads()
                 const auto transport = openWith(state);
                 std::vector<std::uint8_t> buffer(static_cast<std::size_t>(size));
                 ReadOptions options;
-                if (hasTerminator)
+                if (hasTerminator) {
                     options.terminator = '\n';
+                }
                 std::size_t count = 99;
                 QCOMPARE(transport->read(buffer, options, Deadline::after(5000), count), status);
                 QCOMPARE(QByteArray(reinterpret_cast<char *>(buffer.data()), qsizetype(count)),

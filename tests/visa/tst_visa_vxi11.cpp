@@ -112,8 +112,9 @@ void TestVisaVxi11::writes()
     // Takes 100 bytes of the second call only, and refuses the tenth and all behind it.
     int writeCount = 0;
     Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Write)
+        if (call.procedure != Vxi11Peer::Write) {
             return false;
+        }
         ++writeCount;
         const std::uint32_t error = writeCount < 10 ? 0 : 15;
         const std::uint32_t taken = writeCount == 2 ? 100 : (writeCount == 10 ? 5 : call.word(4));
@@ -123,8 +124,9 @@ void TestVisaVxi11::writes()
     peer.maxReceiveSize = 1000;
     const ViSession session = open(peer);
     QByteArray data;
-    for (int i = 0; i < 2500; ++i)
+    for (int i = 0; i < 2500; ++i) {
         data += char(i);
+    }
     ViUInt32 count = 0;
     QCOMPARE(write(session, data, &count), VI_SUCCESS);
     QCOMPARE(count, 2500U);
@@ -158,8 +160,9 @@ void TestVisaVxi11::deviceErrors()
              {"unknown", 0xFFFF'FFFFU, VI_ERROR_IO}},
             [this](std::uint32_t error, ViStatus status) {
                 const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-                    if (call.procedure != Vxi11Peer::Clear && call.procedure != Vxi11Peer::Write)
+                    if (call.procedure != Vxi11Peer::Clear && call.procedure != Vxi11Peer::Write) {
                         return false;
+                    }
                     connection.send(call.reply(bigEndian({error, 0})));
                     return true;
                 });
@@ -191,8 +194,9 @@ void TestVisaVxi11::brokenReplies()
           VI_ERROR_IO}},
         [this](QByteArray bytes, ViStatus status) {
             const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-                if (call.procedure != Vxi11Peer::Read)
+                if (call.procedure != Vxi11Peer::Read) {
                     return false;
+                }
                 const QByteArray transaction =
                     QByteArray::fromStdString(bigEndian({call.transaction}));
                 const QByteArray hex = QByteArray(bytes).replace("%T", transaction.toHex());
@@ -219,8 +223,9 @@ void TestVisaVxi11::stalledReplies()
              {"empty fragments", QByteArray(4000, '\0')}},
             [this](QByteArray bytes) {
                 const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-                    if (call.procedure == Vxi11Peer::CreateLink || call.program != 0x0607AF)
+                    if (call.procedure == Vxi11Peer::CreateLink || call.program != 0x0607AF) {
                         return false;
+                    }
                     connection.send(bytes.toStdString());
                     return true;
                 });
@@ -244,11 +249,13 @@ void TestVisaVxi11::trickledReply()
 {
     // Bytes come all the time, but the reply never gets complete: the time-out is for the whole.
     const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Read)
+        if (call.procedure != Vxi11Peer::Read) {
             return false;
+        }
         connection.send(bigEndian({0x800F'0000U}));
-        while (connection.send("x"))
+        while (connection.send("x")) {
             std::this_thread::yield();
+        }
         return true;
     });
     const ViSession session = open(peer, 300);
@@ -264,8 +271,9 @@ void TestVisaVxi11::lateReplyIsDropped()
     // The first read is answered only when the second comes, in two fragments, with its answer.
     std::string late;
     const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
-        if (call.procedure != Vxi11Peer::Read)
+        if (call.procedure != Vxi11Peer::Read) {
             return false;
+        }
         const std::string reply = call.reply(Vxi11Peer::readReply(0, 4, late.empty() ? "1" : "2"));
         if (late.empty()) {
             late = fragment(reply.substr(4, 10), false) + fragment(reply.substr(14), true);
