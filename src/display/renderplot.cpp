@@ -97,7 +97,7 @@ bool readLines(SampleSource &source, int rows, SpectrumScene &scene)
                 scene.mean[bin] += lines[k].level[bin] / static_cast<double>(lineCount);
             }
             if (!looked[k]) {
-                lines[k].level = {};
+                lines[k].level = std::vector<double>(); // gives the memory back, as {} doesn't
             }
         }
         pending.erase(pending.begin(), pending.begin() + static_cast<std::ptrdiff_t>(offset));

@@ -25,6 +25,7 @@ bool EditJob::work()
     if (!read()) {
         return false;
     }
+    source().tellDroppedTags();
     m_output.record() = source().writeJob();
     return edit();
 }

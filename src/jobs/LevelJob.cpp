@@ -59,6 +59,7 @@ bool LevelJob::write(double peakDb, double peakToRmsDb)
     WvWriteJob &record = output().record();
     record.peakOffset = writtenDb(-peakDb);
     record.rmsOffset = writtenDb(peakToRmsDb - peakDb);
+    output().keepLevelsAsStated();
     const WvStreams streams{source().data(), source().markers(), source().tags()};
     if (!output().save(streams, "Saving waveform...")) {
         return false;

@@ -55,6 +55,7 @@ bool MarkerJob::edit()
         }
     }
     Tracer::Trace(Tracer::Information, "Creating modified waveform...");
+    output().record().markerLists = true;
     const WvStreams streams{source().data(), m_markers.stream(), source().tags()};
     if (!output().save(streams, "Saving Waveform...")) {
         return false;

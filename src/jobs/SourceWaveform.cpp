@@ -143,6 +143,15 @@ void SourceWaveform::dropTags()
     m_hasTags = false;
 }
 
+void SourceWaveform::tellDroppedTags() const
+{
+    if (!m_info.droppedTags.isEmpty()) {
+        Tracer::Trace(Tracer::Information,
+                      QString("Tags of the source that are not carried on to the result: %1.")
+                          .arg(m_info.droppedTags.join(", ")));
+    }
+}
+
 WvWriteJob SourceWaveform::writeJob() const
 {
     WvWriteJob job;
@@ -151,6 +160,7 @@ WvWriteJob SourceWaveform::writeJob() const
     job.markerClock = m_info.clock;
     job.samples = m_info.samples;
     job.rmsOffset = m_info.rmsOffset;
+    job.markerLists = m_info.hasMarkers;
     job.peakOffset = m_info.peakOffset;
     job.comment = m_info.comment;
     job.copyright = m_info.copyright;

@@ -28,6 +28,9 @@ public:
     /// once that they don't come along.
     void dropTags();
 
+    /// Says which known tags of the source no result carries on.
+    void tellDroppedTags() const;
+
     /// A write job with the clock, count, comment, copyright and type of the source; the offsets
     /// are those measured.
     [[nodiscard]] WvWriteJob writeJob() const;

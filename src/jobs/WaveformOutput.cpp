@@ -5,6 +5,8 @@
 #include "ToolJob.h"
 
 #include "log/Tracer.h"
+#include "streams/levels.h"
+#include "streams/samplestream.h"
 #include "wvfile/HvFileIO.h"
 
 #include <algorithm>
@@ -67,16 +69,51 @@ bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
 {
     m_record.comment = tagText("comment", m_options.comment.value_or(m_record.comment));
     m_record.copyright = tagText("copyright", m_options.copyright.value_or(m_record.copyright));
-    HvFileIO file;
-    const JobStep step(m_job, stepLabel, file);
-    if (!file.writeWaveform(m_record, fileName(), streams.data, streams.markers, streams.tags)) {
-        return Tracer::fail("Waveform generation failed.");
+    if (!write(streams, stepLabel)) {
+        return false;
     }
+    const bool writerClipped = m_record.clippedValues > 0;
     m_record.clippedValues += m_clipped.values;
     m_record.largestValue = std::max(m_record.largestValue, m_clipped.largest);
     if (m_record.clippedValues > 0) {
         emit m_job.report(ReportLine::warning(clippingText(m_record)));
     }
+    if (!writerClipped || m_levelsAsStated || streams.data == nullptr) {
+        return true;
+    }
+    // The tags come before the samples in the file, so they are known too late only here.
+    if (!measureClipped(*streams.data) || !write(streams, stepLabel)) {
+        return false;
+    }
+    emit m_job.report(ReportLine::plain("Levels after clipping"));
+    reportLevels();
+    return true;
+}
+
+bool WaveformOutput::write(const WvStreams &streams, const QString &stepLabel)
+{
+    HvFileIO file;
+    const JobStep step(m_job, stepLabel, file);
+    return file.writeWaveform(m_record, fileName(), streams.data, streams.markers, streams.tags) ||
+           Tracer::fail("Waveform generation failed.");
+}
+
+bool WaveformOutput::measureClipped(BufferedIO &data)
+{
+    LevelSums levels;
+    const auto measure = [&levels](std::span<float> iq, qint64) {
+        for (float &value : iq) {
+            value = std::clamp(value, -1.0F, 1.0F);
+        }
+        addLevels(iq, levels);
+        return true;
+    };
+    const auto stop = [this](qint64) { return m_job.isCancelled(); };
+    if (!data.checkHeader(BufferedIO::DataHeader) ||
+        forEachBlock(data, m_record.samples, stop, measure).end != BlockLoop::Done) {
+        return m_job.mayProceed() && Tracer::fail("Cannot read I/Q data.");
+    }
+    setLevels(levels.peakLevel(), levels.rmsLevel(m_record.samples));
     return true;
 }
 

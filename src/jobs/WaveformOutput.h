@@ -28,6 +28,9 @@ public:
     /// Sets the level offsets of the record from linear levels of full scale 1.
     void setLevels(double peak, double rms);
 
+    /// The level offsets are what the user wants them to be, whatever the samples have.
+    void keepLevelsAsStated() { m_levelsAsStated = true; }
+
     /// Reports the row with the file name.
     void reportFile();
 
@@ -41,12 +44,17 @@ public:
     void addClipped(const ClipCount &clipped) { m_clipped = clipped; }
 
     /// Writes the file as a step of this label. Tells in the report how many values lay beyond full
-    /// scale. False, with the reason logged, if it fails or the job is cancelled; a file that stood
-    /// there is then left as it was.
+    /// scale; the level tags are then those of the samples as they were written. False, with the
+    /// reason logged, if it fails or the job is cancelled; a file that stood there is then left as
+    /// it was.
     [[nodiscard]] bool save(const WvStreams &streams, const QString &stepLabel);
 
 private:
+    [[nodiscard]] bool write(const WvStreams &streams, const QString &stepLabel);
+    [[nodiscard]] bool measureClipped(BufferedIO &data);
+
     ToolJob &m_job;
+    bool m_levelsAsStated = false;
     OutputOptions m_options;
     WvWriteJob m_record;
     ClipCount m_clipped; ///< before the writing

@@ -88,7 +88,7 @@ bool ByteSource::skipPast(char mark)
     return false;
 }
 
-bool ByteSource::readText(char delimiter, TagText &result)
+bool ByteSource::readText(char delimiter, TagText &result, int maxLength)
 {
     result = TagText();
     int byte = next();
@@ -103,7 +103,7 @@ bool ByteSource::readText(char delimiter, TagText &result)
         if (result.endedOnBrace || result.endedOnDelimiter || !isText(byte)) {
             break;
         }
-        if (text.size() >= MaxTextLength) {
+        if (text.size() >= maxLength) {
             Tracer::Trace(Tracer::Error, "Tag content exceeds limit.");
             return false;
         }

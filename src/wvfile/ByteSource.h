@@ -61,7 +61,7 @@ public:
     /// Skips blanks, then collects up to the delimiter, a closing brace, the end of the file, or a
     /// byte that is no text; that byte is taken too. Logs and returns false if the text passes
     /// MaxTextLength; false too if the device has failed.
-    [[nodiscard]] bool readText(char delimiter, TagText &result);
+    [[nodiscard]] bool readText(char delimiter, TagText &result, int maxLength = MaxTextLength);
 
 private:
     [[nodiscard]] bool fill();

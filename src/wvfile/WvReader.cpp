@@ -81,7 +81,13 @@ bool WvReader::processTag(const QString &name)
         return processType();
     }
     if (name.contains("MARKER LIST ")) {
+        m_info.hasMarkers = true;
         return m_markers.mergeList(m_source, name);
+    }
+    for (const char *dropped : {"CRESTFACTOR", "SI COMPENSATED", "SYSTEM"}) {
+        if (name == QLatin1String(dropped) && !m_info.droppedTags.contains(name)) {
+            m_info.droppedTags << name;
+        }
     }
     if (name == "CRESTFACTOR") {
         return m_source.skipPast('}') || Tracer::fail("Invalid tag. '}' is missing.");
@@ -281,7 +287,8 @@ bool WvReader::openSampleBlock(const QString &name)
         }
     }
     if (m_info.controlLength == 0) {
-        Tracer::Trace(Tracer::Warning,
+        // Without marker lists nothing depends on it.
+        Tracer::Trace(m_info.hasMarkers ? Tracer::Warning : Tracer::Information,
                       QString("No CONTROL LENGTH tag found. Using sample count instead (%1).")
                           .arg(m_info.samples));
         m_info.controlLength = m_info.samples;

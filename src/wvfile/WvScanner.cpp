@@ -14,6 +14,9 @@
 
 namespace {
 
+/// Characters of a list of segments; hundreds of file names are long.
+constexpr int MaxSegmentsText = 64 * 1024;
+
 constexpr int maxNameLength = 1024;
 
 /// Blocks of more samples than this are taken for damaged.
@@ -127,15 +130,20 @@ bool WvScanner::processTag(ByteSource &source, const QString &name)
         return true;
     }
     TagText content;
+    if (isSegments) {
+        // One list that is too long leaves the rest of the report as it is.
+        if (source.readText('}', content, MaxSegmentsText)) {
+            return processSegments(name, content.text);
+        }
+        Tracer::Trace(Tracer::Error, "Invalid " + name + " tag.");
+        return source.skipPast('}');
+    }
     if (!source.readText('}', content)) {
         return Tracer::fail("Invalid " + name + " tag.");
     }
     if (isText) {
         m_summary.*(textTag->text) = textTag->quoted ? withoutQuotes(content.text) : content.text;
         return true;
-    }
-    if (isSegments) {
-        return processSegments(name, content.text);
     }
     if (name == "TYPE") {
         return processType(content.text);

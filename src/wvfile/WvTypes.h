@@ -5,6 +5,7 @@
 
 #include <QList>
 #include <QString>
+#include <QStringList>
 #include <QtGlobal>
 
 class BufferedIO;
@@ -40,6 +41,8 @@ struct WvFileInfo
     double clock = 0;         ///< CLOCK tag, Hz
     int samples = 0;          ///< from the SAMPLES tag, overruled by the sample block
     int controlLength = 0;    ///< positions covered by the marker lists, else the sample count
+    bool hasMarkers = false;  ///< there are marker lists
+    QStringList droppedTags;  ///< known ones that no written file carries on
     int prefixNumber = 0;     ///< number before a comma in the sample block's prefix, else 0
     double rmsOffset = 0;     ///< measured, dB below full scale
     double peakOffset = 0;    ///< measured, dB below full scale
@@ -77,6 +80,7 @@ struct WvWriteJob
     double peakOffset = 0;    ///< dB; in, and out when computed by the writer
     QString comment;          ///< empty: no tag
     QString copyright;        ///< empty: no tag
+    bool markerLists = true;  ///< what the marker stream holds is written, too
     bool levelsValid = false; ///< the two offsets are given and are not to be computed
     QList<float> iSamples;    ///< I values in memory, or empty
     QList<float> qSamples;    ///< Q values in memory, or empty

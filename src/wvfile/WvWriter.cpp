@@ -75,7 +75,7 @@ WvWriter::WvWriter(WvWriteJob &job, const WvStreams &streams, ProgressClock &pro
     , m_progress(progress)
     , m_report(std::move(report))
     , m_markersFromMemory(!job.markers.isEmpty() && streams.markers == nullptr)
-    , m_markersFromStream(job.markers.isEmpty() && streams.markers != nullptr)
+    , m_markersFromStream(job.markers.isEmpty() && job.markerLists && streams.markers != nullptr)
 {
 }
 
