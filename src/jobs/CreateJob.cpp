@@ -104,7 +104,7 @@ bool CreateJob::save(TempStream &data)
     m_output.setLevels(facts().peak, facts().rms);
     WvWriteJob &record = m_output.record();
     if (request().zeroCrest) {
-        record.rmsOffset = record.peakOffset;
+        m_output.stateZeroCrest();
     }
     emit report(ReportLine::heading("Signal statistics"));
     ReportLines rows = levelRows(record);

@@ -46,6 +46,12 @@ void WaveformOutput::setLevels(double peak, double rms)
     m_record.rmsOffset = offsetDb(rms);
 }
 
+void WaveformOutput::stateZeroCrest()
+{
+    m_zeroCrest = true;
+    m_record.rmsOffset = m_record.peakOffset;
+}
+
 void WaveformOutput::reportFile()
 {
     emit m_job.report(fileRow(fileName()));
@@ -114,6 +120,9 @@ bool WaveformOutput::measureClipped(BufferedIO &data)
         return m_job.mayProceed() && Tracer::fail("Cannot read I/Q data.");
     }
     setLevels(levels.peakLevel(), levels.rmsLevel(m_record.samples));
+    if (m_zeroCrest) {
+        stateZeroCrest();
+    }
     return true;
 }
 

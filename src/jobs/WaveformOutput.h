@@ -31,6 +31,9 @@ public:
     /// The level offsets are what the user wants them to be, whatever the samples have.
     void keepLevelsAsStated() { m_levelsAsStated = true; }
 
+    /// States a crest of 0 dB: the RMS offset is that of the peak.
+    void stateZeroCrest();
+
     /// Reports the row with the file name.
     void reportFile();
 
@@ -55,6 +58,7 @@ private:
 
     ToolJob &m_job;
     bool m_levelsAsStated = false;
+    bool m_zeroCrest = false;
     OutputOptions m_options;
     WvWriteJob m_record;
     ClipCount m_clipped; ///< before the writing

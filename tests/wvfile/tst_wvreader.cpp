@@ -51,7 +51,7 @@ void TestWvReader::accepted()
     const QByteArray block = sampleBlock(words({1, 2}));
     // The warnings.
     forRows(
-        {{"smallest file", block, {noSamples, disagree, takesBlock, noControl}},
+        {{"smallest file", block, {noSamples, disagree, takesBlock}},
          {"block overrules SAMPLES",
           "{SAMPLES:7}{CONTROL LENGTH:1}" + block,
           {disagree, takesBlock}},
@@ -61,7 +61,7 @@ void TestWvReader::accepted()
           '{' + QByteArray(99, 'x') + ":}{COMMENT:" + QByteArray(1024, 'x') + '}' + one,
           {}},
          {"CONTROL LENGTH 0 counts as absent",
-          "{SAMPLES:1}{CONTROL LENGTH:0}" + block,
+          "{SAMPLES:1}{MARKER LIST 1:0:1}{CONTROL LENGTH:0}" + block,
           {noControl}},
          {"bytes of an incomplete sample are dropped",
           "{SAMPLES:1}{CONTROL LENGTH:1}{WAVEFORM-8: #abcdefg}",

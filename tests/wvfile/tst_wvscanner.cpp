@@ -105,12 +105,17 @@ void TestWvScanner::refused()
         });
     for (const char *tag :
          {"TYPE", "COMMENT", "COPYRIGHT", "DATE", "CLOCK", "SAMPLES", "LEVEL OFFS", "WAVEFORM-1",
-          "MWV_SEGMENT_SETTINGS_FILE", "MWV_SEGMENT_LEVEL_MODE", "MWV_SEGMENT_CLOCK_MODE",
-          "MWV_SEGMENT_COUNT", "MWV_SEGMENT_DURATION", "MWV_SEGMENT_CLOCK", "MWV_SEGMENT_START",
-          "MWV_SEGMENT_LENGTH", "MWV_SEGMENT_FILES", "MWV_SEGMENT_LEVEL_OFFS"}) {
+          "MWV_SEGMENT_SETTINGS_FILE", "MWV_SEGMENT_LEVEL_MODE", "MWV_SEGMENT_CLOCK_MODE"}) {
         const QString name = QString(tag).section('-', 0, 0);
         QCOMPARE(scan(clocked + '{' + tag + ':' + QByteArray(1025, '1') + '}').log,
                  QStringList({"4|Tag content exceeds limit.", "4|Invalid " + name + " tag."}));
+    }
+    // Lists of many segments are long; one that is too long costs its own row alone.
+    for (const auto &[length, complaints] : {std::pair{65536, 0}, {65537, 2}}) {
+        const Scan result =
+            scan(clocked + "{MWV_SEGMENT_COUNT:1}{MWV_SEGMENT_FILES:" + QByteArray(length, 'n') +
+                 "}{COMMENT:c}");
+        QCOMPARE(result.log.filter(QRegularExpression("^4")).size(), complaints);
     }
 }
 
