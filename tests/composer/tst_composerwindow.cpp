@@ -124,6 +124,7 @@ void tst_composerwindow::fromNothingToFile()
     QCOMPARE(names(), "-short.wv@0:0+1000|-short.wv@0:0+1000|short.wv@0:0+1000 "
                       "long.wv@1000:0+4000");
     QCOMPARE(find<QLabel>("l_duration")->text(), "Signal Duration: 5 ms");
+    QVERIFY(!m_tracks->composition().segment(2, 1)->selected); // the cursor stands behind it
     QVERIFY(m_window->isWindowModified());
     m_tracks->setTargetName(m_folder.path("result.wv"));
     press("pb_create");
@@ -431,6 +432,7 @@ void tst_composerwindow::sixteenTracks()
     }
     insert("long.wv", 0);
     insert("short.wv", 1000);
+    m_tracks->setCsrSample(3000);
     m_tracks->setTargetName(m_folder.path("picture.wv"));
     find<QLineEdit>("le_wvname")->clear();
     QTest::qWait(500);

@@ -129,6 +129,7 @@ void CWidgetTrackEdit::tellCursor()
 
 void CWidgetTrackEdit::edited()
 {
+    m_editor.composition().markAt(cursor());
     update();
     emit targetChanged();
     tellCursor();
