@@ -34,7 +34,9 @@ void Pass23::run()
     setOwnThreadLimit(m_job.processors);
     m_ok = !m_cancelled && work();
     // A full disk may show only now.
-    m_ok = buffers().release() && m_ok;
+    if (!buffers().release() && m_ok) {
+        m_ok = Tracer::fail(QStringLiteral("Cannot write the temporary data of %1.").arg(place()));
+    }
 }
 
 QString Pass23::place() const
