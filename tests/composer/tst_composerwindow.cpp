@@ -61,6 +61,7 @@ private:
     void insert(const char *file, qint64 at) const;
     [[nodiscard]] QPoint pointAt(int track, qint64 sample) const;
     [[nodiscard]] QString names() const;
+    void awaitOutlines() const;
 
     TestFolder m_folder;
     std::unique_ptr<DlgComposer> m_window;
@@ -94,6 +95,15 @@ void tst_composerwindow::insert(const char *file, qint64 at) const
     m_tracks->setCsrSample(static_cast<double>(at));
     find<QLineEdit>("le_wvname")->setText(m_folder.path(file));
     press("pb_insert");
+}
+
+/// For a picture: lets the outlines of the files come, which are read in the background after the
+/// first paint; without any they are awaited in vain.
+void tst_composerwindow::awaitOutlines() const
+{
+    constexpr int LimitMs = 2000;
+    const QImage before = m_tracks->grab().toImage();
+    (void)QTest::qWaitFor([&] { return m_tracks->grab().toImage() != before; }, LimitMs);
 }
 
 QPoint tst_composerwindow::pointAt(int track, qint64 sample) const
@@ -408,7 +418,7 @@ void tst_composerwindow::sixteenTracks()
     if (folder.isEmpty()) {
         return;
     }
-    QTest::qWait(500); // the outlines of the files are read in the background
+    awaitOutlines();
     m_tracks->setCsrSample(4000);
     QVERIFY(m_window->grab().save(folder + "/composer-16.png"));
     QVERIFY(withModal([this] { press("pb_settings"); },
@@ -435,7 +445,7 @@ void tst_composerwindow::sixteenTracks()
     m_tracks->setCsrSample(3000);
     m_tracks->setTargetName(m_folder.path("picture.wv"));
     find<QLineEdit>("le_wvname")->clear();
-    QTest::qWait(500);
+    awaitOutlines();
     QVERIFY(m_window->grab().save(folder + "/composer.png"));
     press("pb_create");
     QVERIFY(m_window->findChild<DlgProgress *>()->grab().save(folder + "/composer-status.png"));
