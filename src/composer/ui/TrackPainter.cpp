@@ -2,6 +2,7 @@
 #include "TrackPainter.h"
 
 #include "base/EngineeringNumber.h"
+#include "composer/wholenumbers.h"
 #include "display/plotdraw.h"
 #include "view/plotscale.h"
 
@@ -68,7 +69,7 @@ bool TrackGeometry::isValid() const
 
 int TrackGeometry::xOf(qint64 sample) const
 {
-    const double share = static_cast<double>(sample - firstSample) *
+    const double share = (static_cast<double>(sample) - static_cast<double>(firstSample)) *
                          static_cast<double>(axisWidth()) /
                          static_cast<double>(lastSample - firstSample);
     // Far outside the widget one pixel is as good as another.
@@ -180,7 +181,8 @@ void TrackPainter::drawRow(QPainter &painter, int track) const
         drawBlock(painter, track, i, *borders);
         const qint64 length = m_scene.composition->target.lSamples;
         if (segment.bWrap && borders->last >= length) {
-            drawBlock(painter, track, i, {borders->first - length, borders->last - length});
+            drawBlock(painter, track, i,
+                      {boundedDifference(borders->first, length), borders->last - length});
         }
     }
     painter.restore();
