@@ -3,6 +3,10 @@
 
 #include "DlgInfo.h"
 #include "composer/ui/DlgComposer.h"
+#include "import/ui/DlgWvFromData.h"
+#include "import/ui/DlgWvFromMat.h"
+#include "import/ui/DlgWvFromRiq.h"
+#include "import/ui/DlgWvFromWav.h"
 #include "instrument/remotepaths.h"
 #include "instrument/ui/DlgSpaImport.h"
 #include "log/Tracer.h"
@@ -37,10 +41,16 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
 QList<ToolInfo> toolTable()
 {
     using enum ToolInfo::Selection;
+    ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {});
+    importData.preferredFor = {"TXT", "CSV", "DAT", "BIN", "WFM", "I", "Q"};
     return {
         toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),
         toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}),
         toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
+        importData,
+        toolInfo<DlgWvFromMat>("Import MATLAB", "/Import/From MATLAB", File, {"MAT"}),
+        toolInfo<DlgWvFromRiq>("Import RIQ", "/Import/From RIQ", File, {"RIQ"}),
+        toolInfo<DlgWvFromWav>("Import WAV", "/Import/From WAV", File, {"WAV"}),
         toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
         toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"}),
@@ -107,7 +117,16 @@ QList<const ToolInfo *> ModulesDb::allAllowed(const QString &path, bool local) c
 
 const ToolInfo *ModulesDb::firstAllowed(const QString &path, bool local) const
 {
-    return allAllowed(path, local).value(0, nullptr);
+    const ToolInfo *made = firstMadeFor(path, local);
+    return made ? made : allAllowed(path, local).value(0, nullptr);
+}
+
+const ToolInfo *ModulesDb::firstMadeFor(const QString &path, bool local) const
+{
+    const QList<const ToolInfo *> tools = allAllowed(path, local);
+    const auto tool = std::find_if(tools.begin(), tools.end(),
+                                   [&path](const ToolInfo *one) { return one->isMadeFor(path); });
+    return tool != tools.end() ? *tool : nullptr;
 }
 
 DlgBase &ModulesDb::dialog(const ToolInfo &info)

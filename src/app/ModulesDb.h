@@ -39,8 +39,12 @@ public:
     /// One new action for each tool, owned by `parent`, with the tool's name as its text.
     [[nodiscard]] QList<ToolAction> contextActions(QObject *parent) const;
 
-    /// The first tool that accepts an entry; null if there is none.
+    /// The tool that Enter starts for an entry: one that is made for its type, or else the first
+    /// that accepts it; null if there is none.
     [[nodiscard]] const ToolInfo *firstAllowed(const QString &path, bool local) const;
+
+    /// The first tool that is made for an entry's type and accepts it; null if there is none.
+    [[nodiscard]] const ToolInfo *firstMadeFor(const QString &path, bool local) const;
 
     /// All tools that accept an entry, in order.
     [[nodiscard]] QList<const ToolInfo *> allAllowed(const QString &path, bool local) const;

@@ -134,6 +134,7 @@ private:
     void revealCurrent();
     void fitSizeColumn();
     void startFirstTool();
+    [[nodiscard]] QString toolFile(const QDropEvent &event) const;
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
     [[nodiscard]] bool acceptsName(const QString &parent, const QString &name,
                                    const QString &forbiddenText);

@@ -2,6 +2,7 @@
 // Copies between the panes: by drag and drop, by the clipboard, by a key.
 #include "QCustomTreeView.h"
 
+#include "ModulesDb.h"
 #include "PaneFiles.h"
 #include "deviceactions.h"
 #include "instrument/VisaDevice.h"
@@ -18,6 +19,7 @@
 #include <QMenu>
 #include <QMimeData>
 #include <QMouseEvent>
+#include <QUrl>
 
 namespace {
 
@@ -68,8 +70,20 @@ void QCustomTreeView::dragEnterEvent(QDragEnterEvent *event)
     dragMoveEvent(event);
 }
 
+/// The file that a drag from another program carries, if a tool is made for its type.
+QString QCustomTreeView::toolFile(const QDropEvent &event) const
+{
+    const QList<QUrl> urls = event.source() ? QList<QUrl>() : event.mimeData()->urls();
+    const QString path = urls.size() == 1 ? urls.first().toLocalFile() : QString();
+    return m_modules && m_modules->firstMadeFor(path, true) ? path : QString();
+}
+
 void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
 {
+    if (!toolFile(*event).isEmpty()) {
+        event->acceptProposedAction();
+        return;
+    }
     if (!comesFromOtherPane(*event)) {
         event->ignore();
         return;
@@ -89,6 +103,11 @@ void QCustomTreeView::dragMoveEvent(QDragMoveEvent *event)
 
 void QCustomTreeView::dropEvent(QDropEvent *event)
 {
+    if (const QString path = toolFile(*event); !path.isEmpty()) {
+        event->acceptProposedAction();
+        m_modules->start(*m_modules->firstMadeFor(path, true), path);
+        return;
+    }
     if (!comesFromOtherPane(*event)) {
         event->ignore();
         return;

@@ -20,6 +20,16 @@ struct ToolInfo
     QStringList extensions; ///< upper case, such as "WV"; empty for files of any type
     std::function<std::unique_ptr<DlgBase>()> make;
 
+    /// Types, upper case, for which a tool that takes files of any type is the one to start.
+    QStringList preferredFor = {};
+
+    /// Whether the tool is made for files of this one's type.
+    [[nodiscard]] bool isMadeFor(const QString &path) const
+    {
+        const QString type = path.toUpper().section('.', -1);
+        return extensions.contains(type) || preferredFor.contains(type);
+    }
+
     /// Whether the tool works on an entry of a pane. A path that ends in "/" is a folder. All tools
     /// work on the local file system only.
     [[nodiscard]] bool accepts(const QString &path, bool local) const

@@ -2,10 +2,10 @@
 #include "DlgWvCreate.h"
 
 #include "CreateTypePages.h"
-#include "toolpages.h"
 #include "ui_DlgWvCreate.h"
 
 #include "jobs/CreateJob.h"
+#include "toolframe/toolpages.h"
 
 #include <QDir>
 #include <QFileInfo>

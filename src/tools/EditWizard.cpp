@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "EditWizard.h"
 
-#include "toolpages.h"
-
 #include "base/EngineeringNumber.h"
 #include "log/Tracer.h"
+#include "toolframe/toolpages.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QLabel>
