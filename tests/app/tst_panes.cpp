@@ -277,8 +277,8 @@ void TestPanes::doubleClickStartsTheFirstTool()
         QTest::mouseDClick(tree->viewport(), Qt::LeftButton, {}, position);
     };
     doubleClick();
-    // Only the making of a signal takes a file of any type.
-    QTRY_COMPARE(QApplication::activeWindow()->windowTitle(), "Create Signal");
+    // Of the tools that take files of any type, one is made for text.
+    QTRY_COMPARE(QApplication::activeWindow()->windowTitle(), "Create Waveform From Data");
     QApplication::activeWindow()->close();
     desk.select(1, "tone.wv");
     doubleClick();

@@ -206,13 +206,19 @@ bool ImportWizard::startModule(const QString &path)
     const QFileInfo info(name);
     m_output->setText(info.path() + '/' + info.completeBaseName() + ".wv");
     m_source.clear();
+    m_shownInput.clear();
     showPage(0);
     slot_infile1();
     return true;
 }
 
+/// The field has lost the focus, too, where its name stays: what was checked in the file stays.
 void ImportWizard::slot_infile1()
 {
+    if (m_input->text() == m_shownInput) {
+        return;
+    }
+    m_shownInput = m_input->text();
     m_problem->setVisible(false);
     inputChanged();
     updateButtons();

@@ -109,4 +109,5 @@ private:
     QtNumericEdit *m_clock = nullptr;
     qint64 m_previewSamples = 10000;
     QString m_source;
+    QString m_shownInput; ///< the name that inputChanged() has seen last
 };
