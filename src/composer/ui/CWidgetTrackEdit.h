@@ -101,7 +101,7 @@ private:
     void zoom(double factor, const char *words);
     void moveCursor(qint64 sample);
     void tellCursor();
-    void grab(int track, qint64 sample);
+    void beginDrag(int track, qint64 sample);
     [[nodiscard]] qint64 snapped(qint64 target) const;
 
     CompositionEditor m_editor;

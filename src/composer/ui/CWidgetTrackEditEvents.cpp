@@ -26,14 +26,14 @@ void CWidgetTrackEdit::mousePressEvent(QMouseEvent *event)
     if (!m_pressedEnable && !m_pressedSelect) {
         const qint64 sample = std::max<qint64>(geometry.sampleAt(event->pos().x()), 0);
         const bool snaps = m_ctrlHeld || (event->modifiers() & Qt::ControlModifier) != 0;
-        grab(track, sample);
+        beginDrag(track, sample);
         moveCursor(snaps ? composition().nearestBorder(sample) : sample);
         tellCursor();
     }
     update();
 }
 
-void CWidgetTrackEdit::grab(int track, qint64 sample)
+void CWidgetTrackEdit::beginDrag(int track, qint64 sample)
 {
     m_dragged = DraggedSegment();
     if (const auto place = composition().segmentAt(track, sample)) {
