@@ -102,8 +102,8 @@ void tst_composerwindow::insert(const char *file, qint64 at) const
 void tst_composerwindow::awaitOutlines() const
 {
     constexpr int LimitMs = 2000;
-    const QImage before = m_tracks->grab().toImage();
-    (void)QTest::qWaitFor([&] { return m_tracks->grab().toImage() != before; }, LimitMs);
+    const QImage before = m_tracks->QWidget::grab().toImage();
+    (void)QTest::qWaitFor([&] { return m_tracks->QWidget::grab().toImage() != before; }, LimitMs);
 }
 
 QPoint tst_composerwindow::pointAt(int track, qint64 sample) const
