@@ -4,6 +4,7 @@
 // guard. These functions stand in the place of Qt's, call them, and tell the sanitizer.
 #include <QRecursiveMutex>
 #include <QSemaphore>
+#include <QThread>
 #include <QThreadPool>
 
 #include <atomic>
@@ -57,6 +58,37 @@ void QRecursiveMutex::unlock() noexcept
     static const auto original = next<void (*)(QRecursiveMutex *)>("_ZN15QRecursiveMutex6unlockEv");
     __tsan_release(this);
     original(this);
+}
+
+void QThread::start(Priority priority)
+{
+    static const auto original =
+        next<void (*)(QThread *, Priority)>("_ZN7QThread5startENS_8PriorityE");
+    // Emitted by the thread itself, before anybody can see that it has ended.
+    connect(
+        this, &QThread::finished, this, [this] { __tsan_release(this); }, Qt::DirectConnection);
+    original(this, priority);
+}
+
+bool QThread::wait(QDeadlineTimer deadline)
+{
+    static const auto original =
+        next<bool (*)(QThread *, QDeadlineTimer)>("_ZN7QThread4waitE14QDeadlineTimer");
+    const bool ended = original(this, deadline);
+    if (ended) {
+        __tsan_acquire(this);
+    }
+    return ended;
+}
+
+bool QThread::isRunning() const
+{
+    static const auto original = next<bool (*)(const QThread *)>("_ZNK7QThread9isRunningEv");
+    const bool running = original(this);
+    if (!running) {
+        __tsan_acquire(const_cast<QThread *>(this));
+    }
+    return running;
 }
 
 /// A thread of its own for each task: what a pool does among its own threads would be reported,
