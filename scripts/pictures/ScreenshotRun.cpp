@@ -175,10 +175,10 @@ bool ScreenshotRun::offersInstruments() const
 /// A large file of zeros, which takes no room on the disk. Made before the panes are read.
 bool ScreenshotRun::makeTransferFile()
 {
-    constexpr qint64 fileSize = 500'000'000;
+    constexpr qint64 FileSize = 500'000'000;
     m_transferFile.setFileName(
         QFileInfo(QDir(m_folder).filePath("noise-100-MHz.wv")).absoluteFilePath());
-    if (!m_transferFile.open(QIODevice::WriteOnly) || !m_transferFile.resize(fileSize)) {
+    if (!m_transferFile.open(QIODevice::WriteOnly) || !m_transferFile.resize(FileSize)) {
         complain(QString("the file '%1' cannot be written").arg(m_transferFile.fileName()));
         return false;
     }

@@ -168,11 +168,11 @@ void QCustomTreeView::updateAndExpandTree(const QString &sDir)
 
 void QCustomTreeView::fitSizeColumn()
 {
-    constexpr int sizeColumn = 1;
+    constexpr int SizeColumn = 1;
     // The sizes of an instrument's files are longer than those of local ones.
-    if (!isLocal() && ColumnWidths::isUntouched(m_files->settingsName(), *header(), sizeColumn) &&
-        sizeHintForColumn(sizeColumn) > columnWidth(sizeColumn)) {
-        resizeColumnToContents(sizeColumn);
+    if (!isLocal() && ColumnWidths::isUntouched(m_files->settingsName(), *header(), SizeColumn) &&
+        sizeHintForColumn(SizeColumn) > columnWidth(SizeColumn)) {
+        resizeColumnToContents(SizeColumn);
     }
 }
 

@@ -24,8 +24,8 @@ bool askBetween(const Question &question)
 
 QString proceedText(qsizetype files, qint64 bytes)
 {
-    constexpr double megabyte = 1024.0 * 1024.0;
-    const QString size = QString("%1 MB").arg(static_cast<double>(bytes) / megabyte, 0, 'f', 2);
+    constexpr double Megabyte = 1024.0 * 1024.0;
+    const QString size = QString("%1 MB").arg(static_cast<double>(bytes) / Megabyte, 0, 'f', 2);
     return QString("%1 files found.\nThe total file size is %2.\nDo you really want to proceed?")
         .arg(files)
         .arg(size);

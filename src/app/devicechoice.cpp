@@ -26,9 +26,9 @@ void fillDeviceChoice(QComboBox &choice, const QList<InstrConfigEntry> &instrume
 
 bool isSameInstrument(const QComboBox &one, const QComboBox &other)
 {
-    constexpr int comparedLength = 6;
+    constexpr int ComparedLength = 6;
     const auto first = one.currentData(EntryRole).value<InstrConfigEntry>();
     const auto second = other.currentData(EntryRole).value<InstrConfigEntry>();
     return !first.resource.isEmpty() && first.model == second.model &&
-           first.serial.left(comparedLength) == second.serial.left(comparedLength);
+           first.serial.left(ComparedLength) == second.serial.left(ComparedLength);
 }

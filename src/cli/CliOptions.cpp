@@ -63,15 +63,15 @@ double parse(const std::string &name, const std::string &text, const NumberRange
 /// A longer text can be written, but the file can't be read again; so the user is told.
 QString parseTagText(const std::string &name, const std::string &text)
 {
-    constexpr qsizetype maxLength = 1024;
+    constexpr qsizetype MaxLength = 1024;
     QString tag = QString::fromLocal8Bit(text);
     const qsizetype length = stripBraces(tag).size();
-    if (length > maxLength) {
+    if (length > MaxLength) {
         Tracer::Trace(Tracer::Warning,
                       QString("%1: a file with a text of more than %2 characters can't be read; "
                               "this one has %3.")
                           .arg(QString::fromStdString(name))
-                          .arg(maxLength)
+                          .arg(MaxLength)
                           .arg(length));
     }
     return tag;

@@ -29,8 +29,8 @@ extern "C" void onInterrupt(int)
     const auto second = static_cast<std::sig_atomic_t>(now.tv_sec);
     // Nothing to be cancelled, or a job that hangs in a write to a reader that doesn't read: a
     // user who asks again gets the terminal back. One key press may come as two signals, though.
-    constexpr int patience = 2;
-    if (jobRuns == 0 || (interruptedAt != 0 && second - interruptedAt >= patience)) {
+    constexpr int Patience = 2;
+    if (jobRuns == 0 || (interruptedAt != 0 && second - interruptedAt >= Patience)) {
         _exit(ExitCancelled);
     }
     if (interruptedAt == 0) {
@@ -121,13 +121,13 @@ void Console::printReport(const ReportLine &line)
 void Console::drawProgress(int percent)
 {
     // A job that is done in a moment shows no bar at all.
-    constexpr qint64 quietMs = 500;
-    if (!m_showProgress || m_jobTime.elapsed() < quietMs || isatty(STDERR_FILENO) == 0) {
+    constexpr qint64 QuietMs = 500;
+    if (!m_showProgress || m_jobTime.elapsed() < QuietMs || isatty(STDERR_FILENO) == 0) {
         return;
     }
-    constexpr int width = 30;
-    const int filled = qBound(0, percent, 100) * width / 100;
-    const QString bar = QString(filled, '#').leftJustified(width, '.');
+    constexpr int Width = 30;
+    const int filled = qBound(0, percent, 100) * Width / 100;
+    const QString bar = QString(filled, '#').leftJustified(Width, '.');
     std::fprintf(stderr, "\r\033[K%s [%s] %3d %%", m_stepLabel.toLocal8Bit().constData(),
                  bar.toLocal8Bit().constData(), percent);
     std::fflush(stderr);

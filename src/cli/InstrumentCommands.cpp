@@ -358,8 +358,8 @@ void addInstrumentCommands(CommandSet &commands)
                 "File on the instrument, which is replaced if it is there; a folder ends in /");
     auto [start, started] = addOnDevice("run", "Play a waveform file of the instrument", runStart);
     addArgument(start, "remote", started.first, "REMOTE", "Waveform file on the instrument");
-    constexpr double maxSeconds = 86400;
-    addInteger(start, "--timeout", started.seconds, {"s", 1, maxSeconds},
+    constexpr double MaxSeconds = 86400;
+    addInteger(start, "--timeout", started.seconds, {"s", 1, MaxSeconds},
                "Longest wait for the instrument to load it (default: 100 s)");
 
     addCaptureCommand(*instr, commands);

@@ -118,11 +118,11 @@ void addSize(CLI::App &command, QSize &size)
     const auto take = [&size](const std::string &text) {
         static const QRegularExpression form("^(\\d{1,5})[xX](\\d{1,5})$");
         const auto match = form.match(QString::fromStdString(text));
-        constexpr int smallest = 64;
-        constexpr int largest = 16384;
+        constexpr int Smallest = 64;
+        constexpr int Largest = 16384;
         const QSize wanted(match.captured(1).toInt(), match.captured(2).toInt());
-        if (!match.hasMatch() || wanted.width() < smallest || wanted.height() < smallest ||
-            wanted.width() > largest || wanted.height() > largest) {
+        if (!match.hasMatch() || wanted.width() < Smallest || wanted.height() < Smallest ||
+            wanted.width() > Largest || wanted.height() > Largest) {
             throw CLI::ValidationError("--size: " + text +
                                        " is not permitted; permitted: 64x64 to 16384x16384");
         }

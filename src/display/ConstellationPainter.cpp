@@ -25,17 +25,17 @@ struct CellRange
 /// not in equal parts, or else a sample at full scale would stand 4 % too far in.
 CellRange cellRange(int cell)
 {
-    constexpr int middle = ConstellationGrid::Size / 2;
-    constexpr double width = 1.0 / middle;
-    constexpr double outermost = width / 4; // these cells hold full scale alone
-    const int distance = std::abs(cell - middle);
+    constexpr int Middle = ConstellationGrid::Size / 2;
+    constexpr double Width = 1.0 / Middle;
+    constexpr double Outermost = Width / 4; // these cells hold full scale alone
+    const int distance = std::abs(cell - Middle);
     if (distance == 0) {
-        return {-width, width};
+        return {-Width, Width};
     }
-    const CellRange range = distance == middle
-                                ? CellRange{1 - outermost, 1}
-                                : CellRange{distance * width, (distance + 1) * width};
-    return cell > middle ? range : CellRange{-range.high, -range.low};
+    const CellRange range = distance == Middle
+                                ? CellRange{1 - Outermost, 1}
+                                : CellRange{distance * Width, (distance + 1) * Width};
+    return cell > Middle ? range : CellRange{-range.high, -range.low};
 }
 
 QString axisText(double value)
@@ -101,14 +101,14 @@ void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
 void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels,
                                       const QRectF &plot) const
 {
-    constexpr int size = ConstellationGrid::Size;
+    constexpr int CellCount = ConstellationGrid::Size;
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
-    for (int row = 0; row < size; ++row) {
+    for (int row = 0; row < CellCount; ++row) {
         const CellRange i = cellRange(row);
         const double left = pixels.snap(center.x() + i.low * half);
         const double right = pixels.snap(center.x() + i.high * half);
-        for (int column = 0; column < size; ++column) {
+        for (int column = 0; column < CellCount; ++column) {
             if (m_scene.grid.count(row, column) <= 0) {
                 continue;
             }
@@ -125,7 +125,7 @@ void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels
 void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
                                      const QRectF &plot) const
 {
-    constexpr double size = 3;
+    constexpr double DotSize = 3;
     const QColor color = m_style.color(ColorSlot::AverageTrace);
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
@@ -135,8 +135,8 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
         const double q = sample.q / m_scene.scaleQ;
         if (i >= -1 && i <= 1 && q >= -1 && q <= 1) {
             fillArea(painter,
-                     QRectF(pixels.snap(center.x() + i * half - size / 2),
-                            pixels.snap(center.y() - q * half - size / 2), size, size),
+                     QRectF(pixels.snap(center.x() + i * half - DotSize / 2),
+                            pixels.snap(center.y() - q * half - DotSize / 2), DotSize, DotSize),
                      color);
         }
     }
@@ -194,14 +194,14 @@ void ConstellationPainter::paintValueBox(QPainter &painter, const QRectF &area) 
     if (!value) {
         return;
     }
-    constexpr double widthToHeight = 3.5;
+    constexpr double WidthToHeight = 3.5;
     const double level = magnitudeToDb(std::sqrt(value->i * value->i + value->q * value->q));
     ValueBox box;
     box.lines = {QString("I %1 V").arg(value->i, 0, 'f', 3),
                  QString("Q %1 V").arg(value->q, 0, 'f', 3),
                  QString("P %1 dB").arg(level, 0, 'f', 2)};
     box.leastWidth =
-        widthToHeight * QFontMetricsF(m_style.font).boundingRect(" Q -Q.QQQ V").height();
+        WidthToHeight * QFontMetricsF(m_style.font).boundingRect(" Q -Q.QQQ V").height();
     box.cornerRadius = 5;
     drawValueBoxWhereRoom(painter, m_style, *m_scene.mouse, box, area);
 }

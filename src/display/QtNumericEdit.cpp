@@ -36,11 +36,11 @@ QtNumericEdit::QtNumericEdit(QWidget *parent)
 
 qlonglong QtNumericEdit::getValInt() const
 {
-    constexpr double limit = 9.2e18; // stays inside 64 bits, where the conversion is defined
+    constexpr double Limit = 9.2e18; // stays inside 64 bits, where the conversion is defined
     if (std::isnan(m_value)) {
         return 0;
     }
-    return std::llround(std::fmin(std::fmax(m_value, -limit), limit));
+    return std::llround(std::fmin(std::fmax(m_value, -Limit), Limit));
 }
 
 void QtNumericEdit::setUnit(const QString &unit)

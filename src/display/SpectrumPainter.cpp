@@ -167,11 +167,11 @@ void SpectrumPainter::paintColorBar(QPainter &painter, const PixelGrid &pixels, 
     pixels.frame(bar, m_style.color(ColorSlot::GridLines));
     painter.setPen(m_style.color(ColorSlot::Text));
     const double height = QFontMetricsF(m_style.font).height();
-    constexpr int labelCount = 4;
-    const int stride = labelStride(plot.height() / (labelCount - 1), height);
-    for (int k = 0; k < labelCount; k += stride) {
-        const double level = k * ColorTable::LowestDb / (labelCount - 1);
-        const double y = bar.top() + bar.height() * k / (labelCount - 1) - height / 2;
+    constexpr int LabelCount = 4;
+    const int stride = labelStride(plot.height() / (LabelCount - 1), height);
+    for (int k = 0; k < LabelCount; k += stride) {
+        const double level = k * ColorTable::LowestDb / (LabelCount - 1);
+        const double y = bar.top() + bar.height() * k / (LabelCount - 1) - height / 2;
         painter.drawText(QRectF(bar.right() + 3, y, area.right() - bar.right() - 3, height),
                          Qt::AlignLeft | Qt::AlignVCenter,
                          QString("%1 dB").arg(k == 0 ? 0.0 : level));
@@ -189,14 +189,14 @@ void SpectrumPainter::paintFrequencyAxis(QPainter &painter, const PixelGrid &pix
     const QFontMetricsF metrics(m_style.font);
     const double spacing = step / bandwidth() * plot.width();
     const int stride = labelStride(spacing, metrics.horizontalAdvance(AxisTemplate));
-    constexpr double tick = 3;
+    constexpr double Tick = 3;
     painter.setPen(m_style.color(ColorSlot::Text));
     for (int k = -divisions; k <= divisions; ++k) {
         const double frequency = k * step;
         // The centres of the bins end half a bin before the upper edge.
         const double x =
             std::min(xOf(plot, frequency / bandwidth() * Bins + Bins / 2.0), plot.right());
-        pixels.vertical(x, plot.bottom(), plot.bottom() + tick,
+        pixels.vertical(x, plot.bottom(), plot.bottom() + Tick,
                         m_style.color(ColorSlot::GridLines));
         if (gridAlpha > 0) {
             pixels.vertical(x, plot.top(), plot.bottom(),
@@ -220,13 +220,13 @@ void SpectrumPainter::paintTimeAxis(QPainter &painter, const PixelGrid &pixels, 
     if (lines.empty()) {
         return;
     }
-    constexpr int wantedLabels = 5;
-    constexpr double tick = 3;
+    constexpr int WantedLabels = 5;
+    constexpr double Tick = 3;
     const bool inSeconds = m_scene.clockHz > 0;
     const double unit = inSeconds ? 1 / m_scene.clockHz : 1;
     const double start = static_cast<double>(lines.front().position) * unit;
     const double duration = static_cast<double>(lines.size()) * SpectrumLines::FrameStep * unit;
-    const double step = niceStep(duration / wantedLabels);
+    const double step = niceStep(duration / WantedLabels);
     const double height = QFontMetricsF(m_style.font).height();
     const int stride = labelStride(step / duration * plot.height(), height);
     painter.setPen(m_style.color(ColorSlot::Text));
@@ -234,13 +234,13 @@ void SpectrumPainter::paintTimeAxis(QPainter &painter, const PixelGrid &pixels, 
     for (qint64 k = firstTick; static_cast<double>(k) * step < start + duration; ++k) {
         const double time = static_cast<double>(k) * step;
         const double y = plot.top() + (time - start) / duration * plot.height();
-        pixels.horizontal(y, plot.left() - tick, plot.left(), m_style.color(ColorSlot::GridLines));
+        pixels.horizontal(y, plot.left() - Tick, plot.left(), m_style.color(ColorSlot::GridLines));
         if (k % stride == 0) {
             const QString text = inSeconds
                                      ? formatNumber(time, NumberFormat{.unit = "s", .precision = 3})
                                      : QString::number(time, 'f', 0);
             painter.drawText(
-                QRectF(area.left(), y - height / 2, plot.left() - tick - 2 - area.left(), height),
+                QRectF(area.left(), y - height / 2, plot.left() - Tick - 2 - area.left(), height),
                 Qt::AlignRight | Qt::AlignVCenter, text);
         }
     }

@@ -26,8 +26,8 @@ constexpr double PaneInset = 10; ///< pixels left free above and below the value
 /// Keeps what lies far off the pane within the range that a rasteriser can handle.
 double drawable(double fraction)
 {
-    constexpr double farOff = 4;
-    return fraction > -farOff ? std::min(fraction, farOff + 1) : -farOff;
+    constexpr double FarOff = 4;
+    return fraction > -FarOff ? std::min(fraction, FarOff + 1) : -FarOff;
 }
 
 double logFraction(double magnitude, double zoom)
@@ -297,11 +297,11 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
         painter.drawPolyline(upperEdge);
     }
     if (m_scene.bins.isSparse()) {
-        constexpr double radius = 1.75;
+        constexpr double Radius = 1.75;
         painter.setPen(Qt::NoPen);
         painter.setBrush(m_style.color(ColorSlot::CursorLine));
         for (const QPointF &dot : dots) {
-            painter.drawEllipse(dot, radius, radius);
+            painter.drawEllipse(dot, Radius, Radius);
         }
     }
     painter.restore();
@@ -350,32 +350,32 @@ void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const
 void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,
                                 const QList<QRectF> &panes) const
 {
-    constexpr double serif = 3;
-    constexpr double flagSize = 7;
-    constexpr int reference = 1;
+    constexpr double Serif = 3;
+    constexpr double FlagSize = 7;
+    constexpr int Reference = 1;
     for (int which = 0; which < 2; ++which) {
         const int bin = m_scene.cursorBins[static_cast<std::size_t>(which)];
         if (bin < 0 || bin >= TraceBins::BinCount) {
             continue;
         }
         const double x = grid.snap(xOf(plot, bin));
-        const QColor color = m_style.color(which == reference ? ColorSlot::SecondaryMarker
+        const QColor color = m_style.color(which == Reference ? ColorSlot::SecondaryMarker
                                                               : ColorSlot::PrimaryMarker);
         for (const QRectF &pane : panes) {
             const double top = yOf(pane, 0.95);
             const double bottom = yOf(pane, 0.05);
             grid.vertical(x, top, bottom, color);
-            if (which == reference) {
-                grid.horizontal(top, x - serif, x + serif + grid.lineWidth(), color);
-                grid.horizontal(bottom, x - serif, x + serif + grid.lineWidth(), color);
+            if (which == Reference) {
+                grid.horizontal(top, x - Serif, x + Serif + grid.lineWidth(), color);
+                grid.horizontal(bottom, x - Serif, x + Serif + grid.lineWidth(), color);
             }
         }
     }
     if (m_scene.mouseBin >= 0 && m_scene.mouseBin < TraceBins::BinCount) {
         const double x = xOf(plot, m_scene.mouseBin);
         grid.dashedVertical(x, plot.top(), plot.bottom(), m_style.color(ColorSlot::CursorLine));
-        drawFlag(painter, x + grid.lineWidth() / 2, plot.bottom() - flagSize, FlagShape::Bottom,
-                 flagSize, m_style.color(ColorSlot::TriggerSymbol));
+        drawFlag(painter, x + grid.lineWidth() / 2, plot.bottom() - FlagSize, FlagShape::Bottom,
+                 FlagSize, m_style.color(ColorSlot::TriggerSymbol));
     }
 }
 

@@ -116,12 +116,12 @@ void PixelGrid::frame(const QRectF &rect, const QColor &color) const
 
 void PixelGrid::dashedVertical(qreal x, qreal fromY, qreal toY, const QColor &color) const
 {
-    constexpr qreal dash = 4;
-    constexpr qreal period = 7;
-    const int dashes = static_cast<int>(std::ceil((toY - fromY) / period));
+    constexpr qreal Dash = 4;
+    constexpr qreal Period = 7;
+    const int dashes = static_cast<int>(std::ceil((toY - fromY) / Period));
     for (int k = 0; k < dashes; ++k) {
-        const qreal y = fromY + k * period;
-        vertical(x, y, std::min(y + dash, toY), color);
+        const qreal y = fromY + k * Period;
+        vertical(x, y, std::min(y + Dash, toY), color);
     }
 }
 

@@ -95,31 +95,31 @@ void writeSampleTable(QTextStream &stream, std::span<const IqSample> samples,
 
 void writeSpectrumTable(QTextStream &stream, const SpectrumScene &scene)
 {
-    constexpr int bins = SpectrumLines::FrameSize;
-    constexpr int digits = 6;
+    constexpr int Bins = SpectrumLines::FrameSize;
+    constexpr int Digits = 6;
     const bool hasClock = scene.clockHz > 0;
     const auto frequency = [&](int bin) {
-        const double share = static_cast<double>(bin) / bins - 0.5;
+        const double share = static_cast<double>(bin) / Bins - 0.5;
         return QString::number(hasClock ? share * scene.clockHz : share, 'g', SampleDigits);
     };
     if (scene.mode == SpectrumMode::Spectrum) {
         stream << (hasClock ? "frequency_hz" : "frequency") << ",level_db\n";
-        for (int bin = 0; bin < bins && !scene.mean.empty(); ++bin) {
+        for (int bin = 0; bin < Bins && !scene.mean.empty(); ++bin) {
             stream << frequency(bin) << ','
-                   << QString::number(scene.mean[static_cast<std::size_t>(bin)], 'g', digits)
+                   << QString::number(scene.mean[static_cast<std::size_t>(bin)], 'g', Digits)
                    << '\n';
         }
         return;
     }
     stream << "sample";
-    for (int bin = 0; bin < bins; ++bin) {
+    for (int bin = 0; bin < Bins; ++bin) {
         stream << ',' << frequency(bin);
     }
     stream << '\n';
     for (const SpectrumLines::Line &line : scene.lines.lines()) {
         stream << line.position;
         for (const double level : line.level) {
-            stream << ',' << QString::number(level, 'g', digits);
+            stream << ',' << QString::number(level, 'g', Digits);
         }
         stream << '\n';
     }

@@ -60,8 +60,8 @@ bool hasDecimalCommas(std::string_view line)
 /// A level offset in dB that stays finite for silence, as everywhere in files.
 double offsetOf(double level)
 {
-    constexpr double silence = 1e-12;
-    return levelOffset(level > 0 ? level : silence);
+    constexpr double Silence = 1e-12;
+    return levelOffset(level > 0 ? level : Silence);
 }
 
 bool open(QFile &file, const char *missingText, const char *unreadableText)
@@ -76,10 +76,10 @@ bool open(QFile &file, const char *missingText, const char *unreadableText)
 /// Checks the magnitude of raw numbers: wrong settings make numbers of any size.
 bool checkMagnitudes(std::span<const float> iq, qint64 firstSample)
 {
-    constexpr float largest = 1000;
+    constexpr float Largest = 1000;
     for (size_t i = 0; i + 1 < iq.size(); i += 2) {
         // A number that is none fails, too.
-        if (!(std::fabs(iq[i]) <= largest && std::fabs(iq[i + 1]) <= largest)) {
+        if (!(std::fabs(iq[i]) <= Largest && std::fabs(iq[i + 1]) <= Largest)) {
             Tracer::Trace(Tracer::Error,
                           "Numbers appear to be too large. Check conversion settings!");
             return Tracer::fail(QString::asprintf(
@@ -278,14 +278,14 @@ bool DataFileAccess::takeTagLine(std::string_view line, qint64 lineNumber)
         m_copyright = value;
     }
     if (name.contains("CLOCKRATE")) {
-        constexpr double lowest = 400;
+        constexpr double Lowest = 400;
         bool plain = false;
         double clock = value.toDouble(&plain);
         if (!plain) {
             const std::optional<ParsedNumber> number = parseNumber(value, "Hz", true);
             clock = number ? number->value : 0;
         }
-        if (!(clock >= lowest && clock <= MaxClockHz)) {
+        if (!(clock >= Lowest && clock <= MaxClockHz)) {
             return Tracer::fail(QString("Line %1: Number for CLOCKRATE is out of range. Aborting.")
                                     .arg(lineNumber));
         }

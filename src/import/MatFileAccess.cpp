@@ -16,10 +16,10 @@
 
 namespace {
 
-constexpr int textSize = 116;
-constexpr quint16 levelFiveVersion = 0x0100;
-constexpr quint16 endianIndicator = 0x4D49;
-constexpr quint16 swappedIndicator = 0x494D;
+constexpr int TextSize = 116;
+constexpr quint16 LevelFiveVersion = 0x0100;
+constexpr quint16 EndianIndicator = 0x4D49;
+constexpr quint16 SwappedIndicator = 0x494D;
 
 void say(const QString &text)
 {
@@ -121,15 +121,15 @@ void MatFileAccess::forget()
 bool MatFileAccess::readHeader()
 {
     say("Reading file header...");
-    std::array<char, textSize> text{};
-    constexpr qint64 startSize = 4;
-    if (!device()->seek(0) || device()->read(text.data(), startSize) < startSize) {
+    std::array<char, TextSize> text{};
+    constexpr qint64 StartSize = 4;
+    if (!device()->seek(0) || device()->read(text.data(), StartSize) < StartSize) {
         return Tracer::fail("Cannot read inital 4 bytes from file.");
     }
-    if (std::all_of(text.begin(), text.begin() + startSize, [](char c) { return c == 0; })) {
+    if (std::all_of(text.begin(), text.begin() + StartSize, [](char c) { return c == 0; })) {
         return Tracer::fail(wrongLevelText({}));
     }
-    if (device()->read(text.data() + startSize, textSize - startSize) < textSize - startSize) {
+    if (device()->read(text.data() + StartSize, TextSize - StartSize) < TextSize - StartSize) {
         return Tracer::fail("Cannot read descriptive text.");
     }
     const auto *const end = std::find(text.begin(), text.end(), '\0');
@@ -144,7 +144,7 @@ bool MatFileAccess::readHeader()
     if (!source.readNumber(version)) {
         return Tracer::fail("Cannot read version tag.");
     }
-    if (version != levelFiveVersion) {
+    if (version != LevelFiveVersion) {
         return Tracer::fail(wrongLevelText(m_description));
     }
     m_level = 5;
@@ -152,13 +152,13 @@ bool MatFileAccess::readHeader()
     if (!source.readNumber(indicator)) {
         return Tracer::fail("Cannot read endian indicator tag.");
     }
-    if (indicator == swappedIndicator) {
+    if (indicator == SwappedIndicator) {
         // Other programs' files of this order have been refused by their version.
         m_swap = true;
         say("Swapping byte order.");
         return true;
     }
-    return indicator == endianIndicator || Tracer::fail("Invalid endian indicator tag.");
+    return indicator == EndianIndicator || Tracer::fail("Invalid endian indicator tag.");
 }
 
 bool MatFileAccess::readDirectory()
@@ -209,8 +209,8 @@ bool MatFileAccess::addSmallElement(quint32 tag, MatSource &source)
     say("Evaluating small data element...");
     const quint32 type = tag & 0xFFFFU;
     const quint32 length = tag >> 16U;
-    constexpr quint32 lastType = 18;
-    if (type > lastType) {
+    constexpr quint32 LastType = 18;
+    if (type > LastType) {
         return Tracer::fail(QString("Invalid data type: %1").arg(type));
     }
     if (length > 4) {
@@ -318,20 +318,20 @@ void MatFileAccess::dumpBytes(qint64 start) const
     if (!Tracer::isEnabled(Tracer::Debug)) {
         return;
     }
-    constexpr int rowLength = 16;
-    constexpr int rows = 8;
+    constexpr int RowLength = 16;
+    constexpr int Rows = 8;
     const qint64 position = device()->pos();
     Tracer::Trace(Tracer::Debug, QString::asprintf("Current pos: %08llX , start: %08llX",
                                                    static_cast<unsigned long long>(position),
                                                    static_cast<unsigned long long>(start)));
-    qint64 at = std::max<qint64>(position - rows / 2 * rowLength, 0);
+    qint64 at = std::max<qint64>(position - Rows / 2 * RowLength, 0);
     if (!device()->seek(at)) {
         return;
     }
-    const QByteArray bytes = device()->read(static_cast<qint64>(rows) * rowLength);
-    for (qsizetype row = 0; row < bytes.size(); row += rowLength, at += rowLength) {
+    const QByteArray bytes = device()->read(static_cast<qint64>(Rows) * RowLength);
+    for (qsizetype row = 0; row < bytes.size(); row += RowLength, at += RowLength) {
         QString line = QString::asprintf("%08llX:  ", static_cast<unsigned long long>(at));
-        for (const char byte : bytes.mid(row, rowLength)) {
+        for (const char byte : bytes.mid(row, RowLength)) {
             line += QString::asprintf("%02X ", static_cast<unsigned char>(byte));
         }
         Tracer::Trace(Tracer::Debug, line);
@@ -422,13 +422,13 @@ bool MatFileAccess::copySamples(const MatEntry &entry, qint64 samples, BufferedI
         return found || Tracer::fail(inflated.hasFailed() ? "Decompressing data failed."
                                                           : "Data index is out of range.");
     };
-    constexpr int floatSize = sizeof(float);
+    constexpr int FloatSize = sizeof(float);
     const auto keep = [&](int count) {
-        return realPart->writeBytes(count * floatSize, values.data());
+        return realPart->writeBytes(count * FloatSize, values.data());
     };
     const auto combine = [&](int count) {
         std::vector<float> real(static_cast<size_t>(count));
-        if (realPart->readBlock(count * floatSize, real.data()) != count * floatSize) {
+        if (realPart->readBlock(count * FloatSize, real.data()) != count * FloatSize) {
             return false;
         }
         for (size_t i = 0; i < real.size(); ++i) {

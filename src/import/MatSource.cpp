@@ -11,7 +11,7 @@
 
 namespace {
 
-constexpr qint64 blockSize = 256 * 1024;
+constexpr qint64 BlockSize = 256 * 1024;
 
 } // namespace
 
@@ -40,7 +40,7 @@ InflateSource::InflateSource(QIODevice &device, qint64 size, std::function<bool(
     : m_device(device)
     , m_missing(size)
     , m_shouldStop(std::move(shouldStop))
-    , m_input(static_cast<size_t>(std::min(size, blockSize)))
+    , m_input(static_cast<size_t>(std::min(size, BlockSize)))
     , m_bound(std::numeric_limits<qint64>::max())
 {
     m_failed = inflateInit(&m_stream) != Z_OK && !fail();
@@ -60,7 +60,7 @@ bool InflateSource::fail()
 /// Reads the next compressed block. False at their end or on a failure.
 bool InflateSource::feed()
 {
-    const qint64 wanted = std::min(m_missing, blockSize);
+    const qint64 wanted = std::min(m_missing, BlockSize);
     if (wanted == 0) {
         return false;
     }
@@ -113,9 +113,9 @@ qint64 InflateSource::read(char *bytes, qint64 size)
 
 bool InflateSource::seek(qint64 position)
 {
-    m_skipped.resize(blockSize);
+    m_skipped.resize(BlockSize);
     while (m_position < position) {
-        if (read(m_skipped.data(), std::min(blockSize, position - m_position)) == 0) {
+        if (read(m_skipped.data(), std::min(BlockSize, position - m_position)) == 0) {
             return false;
         }
     }
@@ -124,8 +124,8 @@ bool InflateSource::seek(qint64 position)
 
 bool InflateSource::finish()
 {
-    m_skipped.resize(blockSize);
-    while (read(m_skipped.data(), blockSize) > 0) {
+    m_skipped.resize(BlockSize);
+    while (read(m_skipped.data(), BlockSize) > 0) {
     }
     return !m_failed;
 }

@@ -14,16 +14,16 @@
 
 namespace {
 
-constexpr qint32 magicNumber = 0x000C4D70;
-constexpr qint16 ifDataTag = 901;
-constexpr quint32 hasOptionalHeader = 0x80000000U;
-constexpr quint32 isLittleEndian = 0x20000000U;
-constexpr int fixedHeaderSize = 28; ///< common and attribute header
-constexpr int optionalHeaderSize = 56;
-constexpr int traceLengthOffset = 20;
-constexpr int sampleSize = 4;
+constexpr qint32 MagicNumber = 0x000C4D70;
+constexpr qint16 IfDataTag = 901;
+constexpr quint32 HasOptionalHeader = 0x80000000U;
+constexpr quint32 IsLittleEndian = 0x20000000U;
+constexpr int FixedHeaderSize = 28; ///< common and attribute header
+constexpr int OptionalHeaderSize = 56;
+constexpr int TraceLengthOffset = 20;
+constexpr int SampleSize = 4;
 
-using Header = std::array<char, fixedHeaderSize + optionalHeaderSize>;
+using Header = std::array<char, FixedHeaderSize + OptionalHeaderSize>;
 
 template <typename T>
 T big(const Header &header, size_t offset)
@@ -40,8 +40,8 @@ T ordered(const Header &header, size_t offset, bool littleEndian)
 /// The size in bytes of a block with all of its headers.
 qint64 blockSize(const RiqEntry &block)
 {
-    return fixedHeaderSize + block.optionalHeaderLength +
-           static_cast<qint64>(sampleSize) * block.traceLength;
+    return FixedHeaderSize + block.optionalHeaderLength +
+           static_cast<qint64>(SampleSize) * block.traceLength;
 }
 
 bool refuse(const QString &text, qint64 position)
@@ -56,31 +56,31 @@ bool takeFixedHeaders(const Header &header, RiqEntry &block)
     block.versionFirst = big<qint16>(header, 4);
     block.versionSecond = big<qint16>(header, 6);
     block.attributeTag = big<qint16>(header, 16);
-    block.traceLength = big<qint16>(header, traceLengthOffset);
+    block.traceLength = big<qint16>(header, TraceLengthOffset);
     block.optionalHeaderLength = static_cast<qint8>(header[23]);
     block.selectorFlags = big<qint32>(header, 24);
     const auto flags = static_cast<quint32>(block.selectorFlags);
-    block.littleEndian = (flags & isLittleEndian) != 0;
-    if (block.magic != magicNumber) {
+    block.littleEndian = (flags & IsLittleEndian) != 0;
+    if (block.magic != MagicNumber) {
         Tracer::Trace(Tracer::Error, "Invalid magic number in common header.");
         return Tracer::fail(QString::asprintf("Found pattern 0x%08X at position %lld.",
                                               static_cast<quint32>(block.magic), block.position));
     }
-    if (block.attributeTag != ifDataTag) {
+    if (block.attributeTag != IfDataTag) {
         Tracer::Trace(Tracer::Error, "Invalid attribute tag in common header.");
         return Tracer::fail(
-            QString::asprintf("Found: %d     Expected: %d (IF)", block.attributeTag, ifDataTag));
+            QString::asprintf("Found: %d     Expected: %d (IF)", block.attributeTag, IfDataTag));
     }
     if (block.versionFirst == 0 && block.versionSecond == 0) {
         return refuse("Invalid version numbers in data", block.position);
     }
-    if ((flags & hasOptionalHeader) == 0) {
+    if ((flags & HasOptionalHeader) == 0) {
         return refuse("No optional header in data", block.position);
     }
     if (block.traceLength <= 0) {
         return refuse("Invalid trace length set in data", block.position);
     }
-    return block.optionalHeaderLength >= optionalHeaderSize ||
+    return block.optionalHeaderLength >= OptionalHeaderSize ||
            refuse("Invalid opt. data block length found in data", block.position);
 }
 
@@ -92,12 +92,12 @@ bool takeOptionalHeader(const Header &header, RiqEntry &block)
     block.sampleRate = ordered<qint32>(header, 32, little);
     block.ifBandwidth = ordered<qint32>(header, 40, little);
     block.count = ordered<qint64>(header, 60, little);
-    constexpr double highWordWeight = 65536; // the recorder's own, though the low word has 32 bits
-    block.ifFrequency = ordered<quint32>(header, 68, little) * highWordWeight +
+    constexpr double HighWordWeight = 65536; // the recorder's own, though the low word has 32 bits
+    block.ifFrequency = ordered<quint32>(header, 68, little) * HighWordWeight +
                         ordered<quint32>(header, 36, little);
-    constexpr qint64 nsPerMs = 1'000'000;
-    block.timeStamp = QDateTime::fromMSecsSinceEpoch(ordered<qint64>(header, 76, little) / nsPerMs);
-    if (block.bytesPerSample != sampleSize) {
+    constexpr qint64 NsPerMs = 1'000'000;
+    block.timeStamp = QDateTime::fromMSecsSinceEpoch(ordered<qint64>(header, 76, little) / NsPerMs);
+    if (block.bytesPerSample != SampleSize) {
         return refuse("Invalid number of bytes/sample set in data", block.position);
     }
     if (block.sampleRate <= 0) {
@@ -179,7 +179,7 @@ bool RiqFileAccess::walk()
             return Tracer::fail("*** Action aborted by user.");
         }
         const qint64 got = device()->read(header.data(), header.size());
-        if (got < fixedHeaderSize) {
+        if (got < FixedHeaderSize) {
             break;
         }
         RiqEntry block;
@@ -243,11 +243,11 @@ bool RiqFileAccess::readSamples(qsizetype index, BufferedIO *stream, qint64 limi
     Tracer::Trace(Tracer::Information, QString("  Samples to read : %1").arg(entry.samples));
 
     ProgressClock progress = startProgress();
-    const int headSize = fixedHeaderSize + entry.optionalHeaderLength;
-    constexpr size_t maxSamples = 32767;
+    const int headSize = FixedHeaderSize + entry.optionalHeaderLength;
+    constexpr size_t MaxSamples = 32767;
     std::vector<char> head(static_cast<size_t>(headSize));
-    std::vector<qint16> words(2 * maxSamples);
-    std::vector<float> values(2 * maxSamples);
+    std::vector<qint16> words(2 * MaxSamples);
+    std::vector<float> values(2 * MaxSamples);
     qint64 position = entry.position;
     qint64 samples = 0;
     quint32 block = 0;
@@ -259,8 +259,8 @@ bool RiqFileAccess::readSamples(qsizetype index, BufferedIO *stream, qint64 limi
             return Tracer::fail("Cannot set start position of UDP block.");
         }
         const qint64 headRead = device()->read(head.data(), headSize);
-        const qint16 length = headRead >= traceLengthOffset + qint64(sizeof(qint16))
-                                  ? qFromBigEndian<qint16>(head.data() + traceLengthOffset)
+        const qint16 length = headRead >= TraceLengthOffset + qint64(sizeof(qint16))
+                                  ? qFromBigEndian<qint16>(head.data() + TraceLengthOffset)
                                   : qint16(-1);
         if (length < 0) {
             return Tracer::fail(QString("Invalid trace length in UDP block %1.").arg(block));
@@ -273,10 +273,10 @@ bool RiqFileAccess::readSamples(qsizetype index, BufferedIO *stream, qint64 limi
         if (headRead < headSize) {
             return Tracer::fail("Cannot set start position of UDP data block.");
         }
-        position += headSize + static_cast<qint64>(sampleSize) * length;
+        position += headSize + static_cast<qint64>(SampleSize) * length;
         const qint64 wanted = limit > 0 ? std::min<qint64>(length, limit - samples) : length;
-        if (device()->read(reinterpret_cast<char *>(words.data()), wanted * sampleSize) <
-            wanted * sampleSize) {
+        if (device()->read(reinterpret_cast<char *>(words.data()), wanted * SampleSize) <
+            wanted * SampleSize) {
             return Tracer::fail("Cannot read data from .riq file.");
         }
         convertWords(std::span(words).first(2 * static_cast<size_t>(wanted)), entry.littleEndian,

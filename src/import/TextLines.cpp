@@ -11,14 +11,14 @@
 
 namespace {
 
-constexpr size_t blockSize = 1024 * 1024;
+constexpr size_t BlockSize = 1024 * 1024;
 
 } // namespace
 
 TextLines::TextLines(QIODevice &device, ProgressClock &progress)
     : m_device(device)
     , m_progress(progress)
-    , m_buffer(blockSize + MaxLength + 1)
+    , m_buffer(BlockSize + MaxLength + 1)
 {
 }
 
@@ -37,7 +37,7 @@ bool TextLines::refill()
     std::memmove(m_buffer.data(), m_buffer.data() + m_begin, m_end - m_begin);
     m_end -= m_begin;
     m_begin = 0;
-    const qint64 got = m_device.read(m_buffer.data() + m_end, blockSize);
+    const qint64 got = m_device.read(m_buffer.data() + m_end, BlockSize);
     if (got < 0) {
         return fail("Error reading input file.");
     }

@@ -13,9 +13,9 @@
 
 namespace {
 
-constexpr qint64 chunkIdSize = 4;
-constexpr qint64 chunkHeadSize = 8;
-constexpr int blockSamples = 64 * 1024;
+constexpr qint64 ChunkIdSize = 4;
+constexpr qint64 ChunkHeadSize = 8;
+constexpr int BlockSamples = 64 * 1024;
 
 } // namespace
 
@@ -44,7 +44,7 @@ bool WavFileAccess::readHeader()
 bool WavFileAccess::checkHeader()
 {
     Tracer::Trace(Tracer::Debug, "Checking .wav file header.");
-    if (!device()->seek(0) || device()->read(chunkIdSize) != "RIFF") {
+    if (!device()->seek(0) || device()->read(ChunkIdSize) != "RIFF") {
         return Tracer::fail("This is not a valid RIFF waveform file.");
     }
     QDataStream stream(device());
@@ -54,15 +54,15 @@ bool WavFileAccess::checkHeader()
     if (stream.status() != QDataStream::Ok || fileSize < 8) {
         return Tracer::fail("The file size seems to be invalid.");
     }
-    if (device()->read(chunkIdSize) != "WAVE") {
+    if (device()->read(ChunkIdSize) != "WAVE") {
         return Tracer::fail("This is not a valid WAVE waveform file.");
     }
     Tracer::Trace(Tracer::Debug, "Evaluating chunks...");
     bool formatFound = false;
     bool dataFound = false;
     for (;;) {
-        const QByteArray id = device()->read(chunkIdSize);
-        if (id.size() < chunkIdSize) {
+        const QByteArray id = device()->read(ChunkIdSize);
+        if (id.size() < ChunkIdSize) {
             Tracer::Trace(Tracer::Debug, "No more header signatures available in .wav file.");
             break;
         }
@@ -75,7 +75,7 @@ bool WavFileAccess::checkHeader()
         if (id == "fmt ") {
             Tracer::Trace(
                 Tracer::Debug,
-                QString("  Found 'fmt' chunk at position %1.").arg(position - chunkHeadSize));
+                QString("  Found 'fmt' chunk at position %1.").arg(position - ChunkHeadSize));
             if (!checkFormatChunk(length)) {
                 return false;
             }
@@ -83,7 +83,7 @@ bool WavFileAccess::checkHeader()
         } else if (id == "data") {
             Tracer::Trace(
                 Tracer::Debug,
-                QString("  Found 'data' chunk at position %1.").arg(position - chunkHeadSize));
+                QString("  Found 'data' chunk at position %1.").arg(position - ChunkHeadSize));
             m_header.dataLength = length;
             m_header.dataPosition = position;
             dataFound = true;
@@ -106,15 +106,15 @@ bool WavFileAccess::checkHeader()
 
 bool WavFileAccess::checkFormatChunk(quint32 length)
 {
-    constexpr quint32 pcmChunkSize = 16;
-    constexpr qint16 pcm = 1;
-    if (length != pcmChunkSize) {
+    constexpr quint32 PcmChunkSize = 16;
+    constexpr qint16 Pcm = 1;
+    if (length != PcmChunkSize) {
         return Tracer::fail("Format chunk has invalid length.");
     }
     QDataStream stream(device());
     stream.setByteOrder(QDataStream::LittleEndian);
     stream >> m_header.formatTag;
-    if (m_header.formatTag != pcm) {
+    if (m_header.formatTag != Pcm) {
         return Tracer::fail("Data Format must be PCM.");
     }
     stream >> m_header.channels;
@@ -139,7 +139,7 @@ void WavFileAccess::logUnknownChunk(const QByteArray &id, quint32 length) const
 {
     Tracer::Trace(
         Tracer::Debug,
-        QString("  Found unknown chunk at position %1.").arg(device()->pos() - chunkHeadSize));
+        QString("  Found unknown chunk at position %1.").arg(device()->pos() - ChunkHeadSize));
     Tracer::Trace(Tracer::Debug, "  - ID is '" + QString::fromLatin1(id) + "'.");
     Tracer::Trace(Tracer::Debug, QString("  - Chunk Length is %1 bytes.").arg(length));
 }
@@ -160,13 +160,13 @@ bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
         return Tracer::fail("Cannot set start position data section.");
     }
     ProgressClock progress = startProgress();
-    std::vector<qint16> words(2 * static_cast<size_t>(std::min<qint64>(total, blockSamples)));
+    std::vector<qint16> words(2 * static_cast<size_t>(std::min<qint64>(total, BlockSamples)));
     std::vector<float> values(words.size());
     for (qint64 done = 0; done < total;) {
         if (progress.shouldStop(done, total)) {
             return Tracer::fail("*** Action aborted by user.");
         }
-        const qint64 wanted = std::min<qint64>(total - done, blockSamples);
+        const qint64 wanted = std::min<qint64>(total - done, BlockSamples);
         const qint64 got = device()->read(reinterpret_cast<char *>(words.data()), 4 * wanted);
         const auto count = static_cast<size_t>(std::max<qint64>(got, 0) / 4);
         convertWords(std::span(words).first(2 * count), true, values.data());

@@ -11,7 +11,7 @@
 namespace {
 
 /// The numbers of control characters that have long been taken for text here.
-constexpr char extraControls[] = {9, 16, 19};
+constexpr char ExtraControls[] = {9, 16, 19};
 
 bool isLetterOrDigit(char c)
 {
@@ -20,11 +20,11 @@ bool isLetterOrDigit(char c)
 
 bool isTextByte(char c)
 {
-    constexpr char others[] = {' ', '\n', '\v', '\f', '\r', '.', ',', '+', '-'};
+    constexpr char Others[] = {' ', '\n', '\v', '\f', '\r', '.', ',', '+', '-'};
     const auto isIn = [c](const auto &list) {
         return std::find(std::begin(list), std::end(list), c) != std::end(list);
     };
-    return isLetterOrDigit(c) || isIn(others) || isIn(extraControls);
+    return isLetterOrDigit(c) || isIn(Others) || isIn(ExtraControls);
 }
 
 /// A file that holds Q where this one holds I, told by one letter of the names.
@@ -50,17 +50,17 @@ QString findPartner(const QString &path)
 
 QString hexDump(const QByteArray &bytes)
 {
-    constexpr qsizetype rowLength = 7;
+    constexpr qsizetype RowLength = 7;
     QString text;
-    for (qsizetype row = 0; row < bytes.size(); row += rowLength) {
-        const QByteArray part = bytes.mid(row, rowLength);
+    for (qsizetype row = 0; row < bytes.size(); row += RowLength) {
+        const QByteArray part = bytes.mid(row, RowLength);
         QString line;
         QString characters;
         for (const char byte : part) {
             line += QString::asprintf("%02X ", static_cast<unsigned char>(byte));
             characters += isLetterOrDigit(byte) ? QLatin1Char(byte) : QLatin1Char('.');
         }
-        text += line.leftJustified(3 * rowLength) + characters + '\n';
+        text += line.leftJustified(3 * RowLength) + characters + '\n';
     }
     return text;
 }
@@ -94,10 +94,10 @@ bool guessData(const QString &fileName, DataGuess &guess)
 QString previewText(const QByteArray &head, bool binary)
 {
     if (binary) {
-        constexpr qsizetype shownBytes = 80;
-        return hexDump(head.left(shownBytes));
+        constexpr qsizetype ShownBytes = 80;
+        return hexDump(head.left(ShownBytes));
     }
-    constexpr qsizetype shownLines = 100;
+    constexpr qsizetype ShownLines = 100;
     QString text = QString::fromLatin1(head).replace("\r\n", "\n").replace('\r', '\n');
-    return text.section('\n', 0, shownLines - 1);
+    return text.section('\n', 0, ShownLines - 1);
 }

@@ -11,10 +11,10 @@
 
 namespace {
 
-constexpr double full8 = 127;
-constexpr double full14 = 8191;
-constexpr double full16 = 32767;
-constexpr double full32 = 2147483647;
+constexpr double Full8 = 127;
+constexpr double Full14 = 8191;
+constexpr double Full16 = 32767;
+constexpr double Full32 = 2147483647;
 
 bool isSeparator(char c)
 {
@@ -85,17 +85,17 @@ bool unsupported(const QString &what)
 
 bool convertHex(std::string_view text, double &value, const ValueFormat &format)
 {
-    constexpr double half = 0.5;
+    constexpr double Half = 0.5;
     if (format.precision == DataPrecision::Bits16) {
         const auto word = readHex<quint16>(text);
-        value = format.isSigned ? (static_cast<qint16>(word) - half) / full16
-                                : (word - half) / full16 - 1;
+        value = format.isSigned ? (static_cast<qint16>(word) - Half) / Full16
+                                : (word - Half) / Full16 - 1;
         return true;
     }
     if (format.precision == DataPrecision::Bits32) {
         const auto word = readHex<quint32>(text);
-        value = format.isSigned ? (static_cast<qint32>(word) - half) / full32
-                                : (word - half) / full32 - 1;
+        value = format.isSigned ? (static_cast<qint32>(word) - Half) / Full32
+                                : (word - Half) / Full32 - 1;
         return true;
     }
     return unsupported("hexadecimal text is read with 16 or 32 bits only.");
@@ -106,13 +106,13 @@ double integerFullScale(const ValueFormat &format)
 {
     switch (format.precision) {
     case DataPrecision::Bits8:
-        return full8;
+        return Full8;
     case DataPrecision::Bits14:
-        return format.isSigned ? 0 : full14;
+        return format.isSigned ? 0 : Full14;
     case DataPrecision::Bits16:
-        return full16;
+        return Full16;
     case DataPrecision::Bits32:
-        return full32;
+        return Full32;
     default:
         return 0;
     }
@@ -137,8 +137,8 @@ bool convertText(std::string_view text, double &value, const ValueFormat &format
                                ? "integers of 14 bits are read unsigned from text only."
                                : "integers are read with 8, 14, 16 or 32 bits.");
     }
-    constexpr double half = 0.5;
-    value = (value - half) / fullScale - (format.isSigned ? 0 : 1);
+    constexpr double Half = 0.5;
+    value = (value - Half) / fullScale - (format.isSigned ? 0 : 1);
     return true;
 }
 

@@ -8,7 +8,7 @@
 
 namespace {
 
-constexpr char presetGroup[] = "WvImport";
+constexpr char PresetGroup[] = "WvImport";
 
 /// A number of an enumeration whose last value is `last`; the old one if the key doesn't hold one.
 template <typename T>
@@ -76,7 +76,7 @@ void readPreset(const QSettings &settings, ImportPreset &preset)
 bool savePreset(const QString &fileName, const ImportPreset &preset)
 {
     QSettings settings(fileName, QSettings::IniFormat);
-    settings.beginGroup(presetGroup);
+    settings.beginGroup(PresetGroup);
     writePreset(settings, preset);
     settings.endGroup();
     settings.sync();
@@ -91,7 +91,7 @@ bool loadPreset(const QString &fileName, ImportPreset &preset)
         return Tracer::fail("The settings file cannot be read.\n" + fileName);
     }
     readPreset(settings, preset);
-    settings.beginGroup(presetGroup);
+    settings.beginGroup(PresetGroup);
     readPreset(settings, preset);
     settings.endGroup();
     return true;

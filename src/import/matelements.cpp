@@ -45,8 +45,8 @@ bool takeFlags(MatSource &source, SubElement &sub, MatEntry &entry)
     entry.global = (flags & 0x400U) != 0;
     entry.logical = (flags & 0x200U) != 0;
     entry.classId = flags & 0xFFU;
-    constexpr quint32 lastClass = 13;
-    if (entry.classId > lastClass) {
+    constexpr quint32 LastClass = 13;
+    if (entry.classId > LastClass) {
         return Tracer::fail("Invalid class ID in array flags subelement.");
     }
     if (!source.readNumber(unused)) {
@@ -59,8 +59,8 @@ bool takeFlags(MatSource &source, SubElement &sub, MatEntry &entry)
 bool takeName(MatSource &source, const SubElement &sub, MatEntry &entry)
 {
     say(QString("    Evaluating array name (%1 bytes).").arg(sub.size));
-    constexpr qint64 maxLength = 1024;
-    if (sub.size > maxLength) {
+    constexpr qint64 MaxLength = 1024;
+    if (sub.size > MaxLength) {
         return Tracer::fail("Length of name subelement is > 1024 characters.");
     }
     QByteArray name(sub.size, '\0');
@@ -85,8 +85,8 @@ void takeSmallName(SubElement &sub, MatEntry &entry)
 bool takeDimensions(MatSource &source, const SubElement &sub, MatEntry &entry)
 {
     say(QString("    Evaluating dimensions array (%1 bytes).").arg(sub.size));
-    constexpr qint64 maxDimensions = 256;
-    if (sub.size / 4 > maxDimensions) {
+    constexpr qint64 MaxDimensions = 256;
+    if (sub.size / 4 > MaxDimensions) {
         return Tracer::fail("Cannot read dimension information from subelement.");
     }
     for (qint64 i = 0; i < sub.size / 4; ++i) {
@@ -165,8 +165,8 @@ void convert(const char *bytes, qint64 count, float *values)
 
 quint32 typeSize(quint32 type)
 {
-    constexpr std::array<quint32, 14> sizes{0, 1, 1, 2, 2, 4, 4, 4, 0, 8, 0, 0, 8, 8};
-    return type < sizes.size() ? sizes.at(type) : 0;
+    constexpr std::array<quint32, 14> Sizes{0, 1, 1, 2, 2, 4, 4, 4, 0, 8, 0, 0, 8, 8};
+    return type < Sizes.size() ? Sizes.at(type) : 0;
 }
 
 void toFloats(quint32 type, const char *bytes, qint64 count, float *values)

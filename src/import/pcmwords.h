@@ -15,8 +15,8 @@ inline void convertWords(std::span<qint16> words, bool littleEndian, float *valu
     } else {
         qFromBigEndian<qint16>(words.data(), count, words.data());
     }
-    constexpr float scale = 1.0F / 32768.0F;
+    constexpr float Scale = 1.0F / 32768.0F;
     for (const qint16 word : words) {
-        *values++ = static_cast<float>(word) * scale;
+        *values++ = static_cast<float>(word) * Scale;
     }
 }

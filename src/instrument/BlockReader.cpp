@@ -15,14 +15,14 @@
 
 namespace {
 
-constexpr qint64 fileBlockBytes = 32768;
+constexpr qint64 FileBlockBytes = 32768;
 /// Blocks that go to the local file at once: a write for each would hold up the next request.
-constexpr qint64 blocksPerWrite = 8;
-constexpr qint64 streamBlockBytes = 2048;
+constexpr qint64 BlocksPerWrite = 8;
+constexpr qint64 StreamBlockBytes = 2048;
 /// Short reads in a row that are taken for a slow instrument.
-constexpr int maxRetries = 3;
+constexpr int MaxRetries = 3;
 /// Digits of the byte count; one digit tells their number.
-constexpr quint32 maxDigits = 9;
+constexpr quint32 MaxDigits = 9;
 
 const char *const queryFailed = "Cannot query file from instrument.";
 const char *const localWriteFailed = "Writing data to local file failed.";
@@ -126,7 +126,7 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
 
 std::optional<qint64> BlockReader::readFileLength() const
 {
-    std::array<char, maxDigits> text{};
+    std::array<char, MaxDigits> text{};
     quint32 count = 0;
     ViStatus status = m_session.read(text.data(), 2, count);
     if (!VisaSession::isGoodRead(status)) {
@@ -159,13 +159,13 @@ std::optional<qint64> BlockReader::readFileLength() const
 
 bool BlockReader::receiveFile(OutputFile &file, qint64 length)
 {
-    note(QString("Read block size is %1 bytes.").arg(fileBlockBytes));
-    m_buffer.resize(blocksPerWrite * fileBlockBytes);
+    note(QString("Read block size is %1 bytes.").arg(FileBlockBytes));
+    m_buffer.resize(BlocksPerWrite * FileBlockBytes);
     m_pending = 0;
     ProgressClock progress(m_control.report, m_control.cancelled);
     int retries = 0;
     for (qint64 remaining = length; remaining > 0;) {
-        const auto wanted = static_cast<quint32>(std::min(remaining, fileBlockBytes));
+        const auto wanted = static_cast<quint32>(std::min(remaining, FileBlockBytes));
         quint32 count = 0;
         const ViStatus status = m_session.read(m_buffer.data() + m_pending, wanted, count);
         if (!VisaSession::isGoodRead(status)) {
@@ -177,7 +177,7 @@ bool BlockReader::receiveFile(OutputFile &file, qint64 length)
             return false;
         }
         if (count != wanted) {
-            if (retries == maxRetries) {
+            if (retries == MaxRetries) {
                 const QByteArray block(m_buffer.constData() + m_pending, count);
                 return failIncomplete(length - remaining, length, block, status);
             }
@@ -188,7 +188,7 @@ bool BlockReader::receiveFile(OutputFile &file, qint64 length)
             retries = 0;
         }
         m_pending += count;
-        if (m_pending + fileBlockBytes > m_buffer.size() && !writePending(file)) {
+        if (m_pending + FileBlockBytes > m_buffer.size() && !writePending(file)) {
             return fail(localWriteFailed);
         }
         remaining -= count;
@@ -208,15 +208,15 @@ bool BlockReader::writePending(OutputFile &file)
 bool BlockReader::failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
                                  ViStatus status) const
 {
-    constexpr qsizetype shownBytes = 6;
+    constexpr qsizetype ShownBytes = 6;
     (void)fail("viRead(): Binary data transfer incomplete.");
     Tracer::Trace(
         Tracer::Error,
         QString("viRead(): Received %1 bytes but expected %2 bytes.").arg(total).arg(length));
     Tracer::Trace(Tracer::Error, QString("%1 bytes received.").arg(lastBlock.size()));
-    if (lastBlock.size() >= shownBytes) {
+    if (lastBlock.size() >= ShownBytes) {
         QString text = "Last received data: ";
-        for (const char byte : lastBlock.last(shownBytes)) {
+        for (const char byte : lastBlock.last(ShownBytes)) {
             text += QString::asprintf("%02X ", static_cast<unsigned char>(byte));
         }
         Tracer::Trace(Tracer::Error, text);
@@ -249,7 +249,7 @@ bool BlockReader::readStream(BufferedIO &stream, qint64 maximum)
     }
     if (Tracer::isEnabled(Tracer::Debug)) {
         Tracer::Trace(Tracer::Debug,
-                      QString("Reading with binary block size of %1 bytes.").arg(streamBlockBytes));
+                      QString("Reading with binary block size of %1 bytes.").arg(StreamBlockBytes));
     }
     ViBoolean usesTerminator = VI_FALSE;
     ViStatus status = m_session.getAttribute(VI_ATTR_TERMCHAR_EN, usesTerminator);
@@ -304,7 +304,7 @@ std::optional<qint64> BlockReader::readStreamLength() const
     if (Tracer::isEnabled(Tracer::Debug)) {
         Tracer::Trace(Tracer::Debug, QString("The header length is %1 bytes.").arg(digits));
     }
-    std::array<char, maxDigits> text{};
+    std::array<char, MaxDigits> text{};
     status = m_session.read(text.data(), digits, count);
     if (!VisaSession::isGoodRead(status)) {
         return failed("Cannot read binary data length information.", status);
@@ -320,13 +320,13 @@ std::optional<qint64> BlockReader::readStreamLength() const
 
 std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 length, qint64 maximum)
 {
-    m_buffer.resize(streamBlockBytes);
+    m_buffer.resize(StreamBlockBytes);
     m_control.report(0);
     QElapsedTimer progress;
     progress.start();
     qint64 received = 0;
     while (received < length) {
-        const auto wanted = static_cast<quint32>(std::min(length - received, streamBlockBytes));
+        const auto wanted = static_cast<quint32>(std::min(length - received, StreamBlockBytes));
         quint32 count = 0;
         if (!VisaSession::isGoodRead(m_session.read(m_buffer.data(), wanted, count))) {
             (void)fail("Reading failed.");

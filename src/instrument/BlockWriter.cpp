@@ -18,11 +18,11 @@
 
 namespace {
 
-constexpr qint64 blockBytes = 1024;
+constexpr qint64 BlockBytes = 1024;
 /// Largest byte count that fits in the nine digits of the definite form.
-constexpr qint64 maxDefiniteBytes = 999'999'999;
+constexpr qint64 MaxDefiniteBytes = 999'999'999;
 /// The instrument's byte count is a signed 32-bit number.
-constexpr qint64 maxFileBytes = std::numeric_limits<qint32>::max();
+constexpr qint64 MaxFileBytes = std::numeric_limits<qint32>::max();
 
 void note(const QString &text)
 {
@@ -35,14 +35,14 @@ BlockWriter::BlockWriter(VisaSession &session, InstrumentFiles &files, Operation
     : m_session(session)
     , m_files(files)
     , m_control(control)
-    , m_buffer(blockBytes, '\0')
+    , m_buffer(BlockBytes, '\0')
 {
 }
 
 QString BlockWriter::header(const QString &remotePath, qint64 size)
 {
     const QString count = QString::number(size);
-    const QString head = size <= maxDefiniteBytes ? QString("#%1%2").arg(count.size()).arg(count)
+    const QString head = size <= MaxDefiniteBytes ? QString("#%1%2").arg(count.size()).arg(count)
                                                   : "#(" + count + ')';
     return ":MMEM:DATA '" + remotePath + "'," + head;
 }
@@ -53,12 +53,12 @@ bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
     if (size == 0) {
         return Tracer::fail("Local file has zero size.");
     }
-    if (size > maxFileBytes) {
+    if (size > MaxFileBytes) {
         return Tracer::fail(QString("The local file '%1' has %2 bytes; an instrument takes at most "
                                     "%3.")
                                 .arg(localPath)
                                 .arg(size)
-                                .arg(maxFileBytes));
+                                .arg(MaxFileBytes));
     }
     const QString head = header(remotePath, size);
     const std::optional<QByteArray> headBytes = toInstrument(head);
@@ -150,8 +150,8 @@ bool BlockWriter::sendFile(QFile &file, qint64 size)
 {
     ProgressClock progress(m_control.report, m_control.cancelled);
     for (qint64 remaining = size; remaining > 0;) {
-        const qint64 wanted = std::min(remaining, blockBytes);
-        if (remaining <= blockBytes) {
+        const qint64 wanted = std::min(remaining, BlockBytes);
+        if (remaining <= BlockBytes) {
             Tracer::Trace(Tracer::Debug, "VISA >> Sending last data block.");
             if (!setSendEnd(VI_TRUE)) {
                 return false;

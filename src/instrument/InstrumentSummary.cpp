@@ -31,7 +31,7 @@ InstrumentSummary summaryOf(const VisaDevice &device)
 
 QList<QPair<QString, QString>> summaryRows(const InstrumentSummary &summary)
 {
-    constexpr int samplesPerMega = 1024 * 1024;
+    constexpr int SamplesPerMega = 1024 * 1024;
     QList<QPair<QString, QString>> rows{{"VISA resource", summary.resource},
                                         {"Firmware", summary.firmware},
                                         {"User data", summary.roots.join(", ")}};
@@ -45,7 +45,7 @@ QList<QPair<QString, QString>> summaryRows(const InstrumentSummary &summary)
     for (size_t i = 0; i < summary.baseband.size(); ++i) {
         if (const auto &limits = summary.baseband[i]) {
             const QString name = QString("BB%1 ").arg(i + 1);
-            rows.append({name + "size", QString("%1 MS").arg(limits->size / samplesPerMega)});
+            rows.append({name + "size", QString("%1 MS").arg(limits->size / SamplesPerMega)});
             rows.append({name + "max. clock", QString("%1 MHz").arg(limits->clock / 1e6)});
             rows.append({name + "bandwidth", QString("%1 MHz").arg(limits->bandwidth / 1e6)});
         }

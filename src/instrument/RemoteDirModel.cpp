@@ -22,14 +22,14 @@ QString cutNumber(double value)
 
 QString sizeText(qint64 bytes)
 {
-    constexpr qint64 kilobyte = 1024;
-    constexpr qint64 megabyte = kilobyte * kilobyte;
-    if (bytes < kilobyte) {
+    constexpr qint64 Kilobyte = 1024;
+    constexpr qint64 Megabyte = Kilobyte * Kilobyte;
+    if (bytes < Kilobyte) {
         return QString("%1 bytes").arg(bytes);
     }
     const auto size = static_cast<double>(bytes);
-    return bytes < megabyte ? cutNumber(size / kilobyte) + " KB"
-                            : cutNumber(size / megabyte) + " MB";
+    return bytes < Megabyte ? cutNumber(size / Kilobyte) + " KB"
+                            : cutNumber(size / Megabyte) + " MB";
 }
 
 QString typeText(const QString &owner)
@@ -190,7 +190,7 @@ QVariant RemoteDirModel::data(const QModelIndex &index, int role) const
 
 QVariant RemoteDirModel::entryData(const RemoteEntry &entry, int column, int role) const
 {
-    constexpr int rightAligned = Qt::AlignRight | Qt::AlignVCenter;
+    constexpr int RightAligned = Qt::AlignRight | Qt::AlignVCenter;
     if (column == NameColumn) {
         switch (role) {
         case Qt::DisplayRole:
@@ -206,7 +206,7 @@ QVariant RemoteDirModel::entryData(const RemoteEntry &entry, int column, int rol
         }
     }
     if (column == SizeColumn && role == Qt::TextAlignmentRole) {
-        return rightAligned;
+        return RightAligned;
     }
     if (role != Qt::DisplayRole) {
         return {};

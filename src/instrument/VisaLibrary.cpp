@@ -23,9 +23,9 @@ QStringList candidates()
     QStringList names{"visa32", "visa"};
     // Beside the program, in the bin folder of a build whose tests stand elsewhere, and where an
     // installation puts libraries.
-    constexpr const char *ownFolder = CORVANE_LIBRARY_FOLDER "/corvane";
+    constexpr const char *OwnFolder = CORVANE_LIBRARY_FOLDER "/corvane";
     for (const char *folder :
-         {".", "../bin", ownFolder, CORVANE_LIBRARY_FOLDER, "../lib/corvane", "../lib"}) {
+         {".", "../bin", OwnFolder, CORVANE_LIBRARY_FOLDER, "../lib/corvane", "../lib"}) {
         const QString name = QDir::cleanPath(QCoreApplication::applicationDirPath() + "/" + folder +
                                              "/libcorvane_visa.so");
         if (QFileInfo::exists(name) && !names.contains(name)) {

@@ -9,7 +9,7 @@
 
 namespace {
 
-constexpr std::array<InstrumentModel, 28> models{{
+constexpr std::array<InstrumentModel, 28> Models{{
     // name, Unix paths, roots, disk option, coder, reserved, analyzer
     {"TGX-830", false, "D:", "", true, false, false},
     {"TGX-810", false, "D:", "", true, false, false},
@@ -77,7 +77,7 @@ struct BasebandOption
 
 // In the order of the search. Some texts hold the comma behind them, which keeps "-P1," from being
 // found in "-P10,"; those of the last place in an answer have none.
-constexpr std::array<BasebandOption, 21> basebandOptions{{
+constexpr std::array<BasebandOption, 21> BasebandOptions{{
     {"TGX810-P1,", 2},  {"TGX810-P2,", 1}, {"TGX810-P3,", 3},  {"TGX830-P1,", 2},
     {"TGX830-P2,", 1},  {"TGX830-P3,", 3}, {"TGX820-P1,", 2},  {"TGX820-P2,", 1},
     {"TGX820-P3,", 3},  {"TBX300-P4,", 4}, {"TBX300-P5,", 5},  {"TBX300-P6,", 6},
@@ -95,10 +95,10 @@ struct FoundBaseband
 /// The at most two basebands that the options name, in the order in which they are named there.
 QList<FoundBaseband> findBasebands(QString options)
 {
-    constexpr int maxBasebands = 2;
+    constexpr int MaxBasebands = 2;
     QList<FoundBaseband> found;
-    for (int round = 0; round < maxBasebands; ++round) {
-        for (const BasebandOption &option : basebandOptions) {
+    for (int round = 0; round < MaxBasebands; ++round) {
+        for (const BasebandOption &option : BasebandOptions) {
             const QLatin1String text(option.text);
             const qsizetype position = options.indexOf(text);
             if (position >= 0) {
@@ -136,7 +136,7 @@ int sizeOf(int code, std::initializer_list<MemorySize> sizes)
 
 int findModel(const QString &modelField)
 {
-    for (int row = 0; row < static_cast<int>(models.size()); ++row) {
+    for (int row = 0; row < static_cast<int>(Models.size()); ++row) {
         if (modelField.contains(QLatin1String(modelRow(row)->name))) {
             return row;
         }
@@ -146,8 +146,8 @@ int findModel(const QString &modelField)
 
 const InstrumentModel *modelRow(int index)
 {
-    return index >= 0 && index < static_cast<int>(models.size())
-               ? &models[static_cast<size_t>(index)]
+    return index >= 0 && index < static_cast<int>(Models.size())
+               ? &Models[static_cast<size_t>(index)]
                : nullptr;
 }
 
@@ -167,20 +167,20 @@ QStringList rootsOf(int modelIndex, const QString &options)
 
 std::optional<FrequencyRange> rfRangeOf(int modelIndex, const QString &options, int path)
 {
-    constexpr double low = 100e3;
+    constexpr double Low = 100e3;
     switch (modelIndex) {
     case Tgx830:
     case Tgx810:
     case Tgx820:
         if (path == 1) {
-            return firstRange(options, {{"-R12,", {low, 2.2e9}},
-                                        {"-R13,", {low, 3e9}},
-                                        {"-R14,", {low, 4e9}},
-                                        {"-R16,", {low, 6e9}}});
+            return firstRange(options, {{"-R12,", {Low, 2.2e9}},
+                                        {"-R13,", {Low, 3e9}},
+                                        {"-R14,", {Low, 4e9}},
+                                        {"-R16,", {Low, 6e9}}});
         }
         if (path == 2 && modelIndex != Tgx830) {
             return firstRange(
-                options, {{"-R22,", {low, 2.2e9}}, {"-R23,", {low, 3e9}}, {"-R26,", {low, 6e9}}});
+                options, {{"-R22,", {Low, 2.2e9}}, {"-R23,", {Low, 3e9}}, {"-R26,", {Low, 6e9}}});
         }
         break;
     case Tgx870:

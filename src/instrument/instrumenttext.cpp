@@ -7,9 +7,9 @@
 
 std::optional<QByteArray> toInstrument(const QString &command)
 {
-    constexpr char16_t lastCharacter = 0xFF;
+    constexpr char16_t LastCharacter = 0xFF;
     const auto found = std::find_if(command.cbegin(), command.cend(), [](QChar character) {
-        return character.unicode() > lastCharacter;
+        return character.unicode() > LastCharacter;
     });
     if (found != command.cend()) {
         Tracer::Trace(Tracer::Error,

@@ -17,7 +17,7 @@
 
 namespace {
 
-constexpr int connectTimeoutMs = 5000;
+constexpr int ConnectTimeoutMs = 5000;
 
 /// Whether the socket gets connected in time. Windows are painted meanwhile; what the user does
 /// waits, so that nothing is started on a device that is being opened.
@@ -65,18 +65,18 @@ bool isHostReachable(const QString &resource)
         address = info.addresses().first();
     }
     // Both at once: a host that is switched off costs the time of one.
-    constexpr std::array<quint16, 2> ports{111, 5025};
-    std::array<QTcpSocket, ports.size()> sockets;
-    for (std::size_t i = 0; i < ports.size(); ++i) {
+    constexpr std::array<quint16, 2> Ports{111, 5025};
+    std::array<QTcpSocket, Ports.size()> sockets;
+    for (std::size_t i = 0; i < Ports.size(); ++i) {
         // The test is about this very machine, which no proxy may stand for.
         sockets.at(i).setProxy(QNetworkProxy::NoProxy);
-        sockets.at(i).connectToHost(address, ports.at(i), QIODevice::ReadWrite);
+        sockets.at(i).connectToHost(address, Ports.at(i), QIODevice::ReadWrite);
     }
-    const QDeadlineTimer deadline(connectTimeoutMs);
+    const QDeadlineTimer deadline(ConnectTimeoutMs);
     bool areOpen = true;
-    for (std::size_t i = 0; i < ports.size(); ++i) {
+    for (std::size_t i = 0; i < Ports.size(); ++i) {
         const bool isOpen = waitForConnection(sockets.at(i), deadline);
-        report(ports.at(i), isOpen);
+        report(Ports.at(i), isOpen);
         areOpen = areOpen && isOpen;
         sockets.at(i).abort();
     }

@@ -16,15 +16,15 @@
 
 namespace {
 
-constexpr qint64 blockSamples = 16 * 1024;
+constexpr qint64 BlockSamples = 16 * 1024;
 
 /// The shortest form of up to nine significant digits: enough to tell any two floats apart.
 void appendNumber(QByteArray &line, float value)
 {
-    constexpr int significantDigits = 9;
+    constexpr int SignificantDigits = 9;
     std::array<char, 32> text;
     const auto end = std::to_chars(text.data(), text.data() + text.size(), value,
-                                   std::chars_format::general, significantDigits);
+                                   std::chars_format::general, SignificantDigits);
     line.append(text.data(), end.ptr - text.data());
 }
 
@@ -46,11 +46,11 @@ QByteArray toCsvLines(qint64 begin, std::span<const float> values, std::span<con
 /// Writing the digits takes far longer than reading the samples, so the processors share it.
 QByteArray toCsv(qint64 begin, std::span<const float> values, std::span<const char> markers)
 {
-    constexpr size_t partSamples = 2048;
-    std::vector<QByteArray> parts((markers.size() + partSamples - 1) / partSamples);
+    constexpr size_t PartSamples = 2048;
+    std::vector<QByteArray> parts((markers.size() + PartSamples - 1) / PartSamples);
     parallelFor(parts.size(), [&](size_t part) {
-        const size_t first = part * partSamples;
-        const size_t count = std::min(partSamples, markers.size() - first);
+        const size_t first = part * PartSamples;
+        const size_t count = std::min(PartSamples, markers.size() - first);
         parts[part] =
             toCsvLines(begin + static_cast<qint64>(first), values.subspan(2 * first, 2 * count),
                        markers.subspan(first, count));
@@ -102,13 +102,13 @@ bool DumpJob::process(SourceWaveform &source, qint64 begin, qint64 count)
     }
     emit stepStarted("Writing Samples...");
     ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, cancelFlag());
-    std::vector<float> values(2 * static_cast<size_t>(std::min(count, blockSamples)));
+    std::vector<float> values(2 * static_cast<size_t>(std::min(count, BlockSamples)));
     std::vector<char> markers(values.size() / 2);
     for (qint64 done = 0; done < count;) {
         if (progress.shouldStop(done, count)) {
             return Tracer::fail("Action aborted by user.");
         }
-        const auto wanted = static_cast<int>(std::min(count - done, blockSamples));
+        const auto wanted = static_cast<int>(std::min(count - done, BlockSamples));
         const int bytes = wanted * BufferedIO::RecordSize;
         if (source.data()->readBlock(bytes, values.data()) != bytes ||
             source.markers()->readBlock(wanted, markers.data()) != wanted) {

@@ -22,8 +22,8 @@ float clipped(float value)
 
 double onGrid(float value)
 {
-    constexpr double fullWord = 32767;
-    return std::trunc(static_cast<double>(clipped(value)) * fullWord) / fullWord;
+    constexpr double FullWord = 32767;
+    return std::trunc(static_cast<double>(clipped(value)) * FullWord) / FullWord;
 }
 
 } // namespace

@@ -81,6 +81,6 @@ double offsetDb(double level)
 
 double writtenDb(double offset)
 {
-    constexpr double halfDigit = 5e-7;
-    return std::fabs(offset) < halfDigit ? 0.0 : offset;
+    constexpr double HalfDigit = 5e-7;
+    return std::fabs(offset) < HalfDigit ? 0.0 : offset;
 }

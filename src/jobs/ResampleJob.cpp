@@ -56,9 +56,9 @@ bool ResampleJob::convert()
     const qint64 sourceSamples = source().info().samples;
     const qint64 targetSamples = m_request.target.samples;
     emit report(ReportLine::heading("Resampling"));
-    constexpr qsizetype labelWidth = 13;
-    emit report(ReportLine::row("IN-samples", QString::number(sourceSamples), labelWidth));
-    emit report(ReportLine::row("OUT-samples", QString::number(targetSamples), labelWidth));
+    constexpr qsizetype LabelWidth = 13;
+    emit report(ReportLine::row("IN-samples", QString::number(sourceSamples), LabelWidth));
+    emit report(ReportLine::row("OUT-samples", QString::number(targetSamples), LabelWidth));
     if (!m_data.open()) {
         return Tracer::fail("Cannot create temporary data buffer for resampled data.");
     }
@@ -66,11 +66,11 @@ bool ResampleJob::convert()
         return Tracer::fail("Cannot create temporary marker buffer for resampled data.");
     }
     // A sinc over 50 samples with its corner just below the source's half clock.
-    constexpr double cutOff = 0.45;
-    constexpr int filterLength = 50;
+    constexpr double CutOff = 0.45;
+    constexpr int FilterLength = 50;
     Resample resampler;
-    resampler.setFilterFrequency(1.0, cutOff);
-    resampler.setFilterLength(filterLength);
+    resampler.setFilterFrequency(1.0, CutOff);
+    resampler.setFilterLength(FilterLength);
     if (!resampler.setFilterType(0, 0.5) || !resampler.setWindowType(1)) {
         return false;
     }

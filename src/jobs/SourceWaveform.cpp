@@ -14,7 +14,7 @@
 
 namespace {
 
-constexpr int blockSize = 64 * 1024;
+constexpr int BlockSize = 64 * 1024;
 
 /// Copies a tags stream without the tags that begin with a given text. Works on what comes, since
 /// a tag may be as long as its file.
@@ -121,9 +121,9 @@ bool SourceWaveform::filterTags(TempStream &unknownTags)
     }
     // The writer states the marker clock itself; a second one would follow with every copy.
     TagFilter filter(*m_tags.stream(), "{CLOCK MARKER:");
-    std::vector<char> block(blockSize);
+    std::vector<char> block(BlockSize);
     for (;;) {
-        const int got = unknownTags->readBlock(blockSize, block.data());
+        const int got = unknownTags->readBlock(BlockSize, block.data());
         if (got == 0) {
             m_hasTags = filter.hasKept();
             return true;

@@ -16,6 +16,9 @@ struct SignalField
 /// The numbers, by kind of signal. Some texts are odd; they are established as they stand.
 namespace signalfields {
 
+// Named as the fields of a request.
+// NOLINTBEGIN(readability-identifier-naming)
+
 inline constexpr SignalField maxClock{"Maximum permissible ARB clock rate", "Hz", 1e7, MaxClockHz,
                                       1e8};
 inline constexpr SignalField minClock{"Minimum permissible ARB clock rate", "Hz", 1000, 1e7, 1e5};
@@ -67,5 +70,7 @@ inline constexpr SignalField pmDeviation{"Deviation", "deg", -180, 180, 180};
 
 inline constexpr SignalField noiseBandwidth{"Total Noise Bandwidth", "Hz", 100, 2e7, 1e6};
 inline constexpr SignalField noiseDuration{"Duration of Noise Signal", "s", 1e-4, 1, 0.01};
+
+// NOLINTEND(readability-identifier-naming)
 
 } // namespace signalfields

@@ -15,7 +15,7 @@
 namespace {
 
 /// Without a taker the waiting lines stay within this many; the oldest go first.
-constexpr qsizetype maxPending = 100'000;
+constexpr qsizetype MaxPending = 100'000;
 
 struct LogState
 {
@@ -70,8 +70,8 @@ void Tracer::Trace(int level, const QString &text)
     {
         const QMutexLocker locker(&state().queueMutex);
         QList<Entry> &pending = state().pending;
-        if (pending.size() >= maxPending) {
-            pending.remove(0, maxPending / 10);
+        if (pending.size() >= MaxPending) {
+            pending.remove(0, MaxPending / 10);
         }
         pending.append({line, level});
     }

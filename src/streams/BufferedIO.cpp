@@ -13,7 +13,7 @@
 namespace {
 
 /// Reads of this size and above go past the read buffer: the copy would cost more than the call.
-constexpr int directReadSize = 256 * 1024;
+constexpr int DirectReadSize = 256 * 1024;
 
 QIODevice::OpenMode openModeOf(int mode)
 {
@@ -216,7 +216,7 @@ int BufferedIO::readBlock(int len, void *buffer)
             return -1;
         }
         // Only while nothing is being written: then it doesn't matter how far reads look ahead.
-        const bool direct = missing >= directReadSize && m_writePosition == -1 && m_writeFill == 0;
+        const bool direct = missing >= DirectReadSize && m_writePosition == -1 && m_writeFill == 0;
         const qint64 window =
             m_readPosition < m_windowEnd ? m_windowEnd - m_readPosition : m_bufferSize;
         const qint64 got =

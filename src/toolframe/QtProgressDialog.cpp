@@ -253,8 +253,8 @@ void QtProgressDialog::showTimes()
 
 QString QtProgressDialog::transferText() const
 {
-    constexpr double megabyte = 1024.0 * 1024.0;
-    const auto megabytes = [](double bytes) { return QString::number(bytes / megabyte, 'f', 1); };
+    constexpr double Megabyte = 1024.0 * 1024.0;
+    const auto megabytes = [](double bytes) { return QString::number(bytes / Megabyte, 'f', 1); };
     const auto done = static_cast<double>(m_bytesDone);
     const auto total = static_cast<double>(m_bytesTotal);
     QString text = QString(", %1 of %2 MB").arg(megabytes(done), megabytes(total));

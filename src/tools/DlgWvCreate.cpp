@@ -43,9 +43,9 @@ const QList<Waveform> &waveforms()
     return list;
 }
 
-constexpr int chirpData = static_cast<int>(PulseKind::Chirp);
-constexpr double settingsVersion = 1.0;
-constexpr int shortWaveform = 512;
+constexpr int ChirpData = static_cast<int>(PulseKind::Chirp);
+constexpr double SettingsVersion = 1.0;
+constexpr int ShortWaveform = 512;
 
 } // namespace
 
@@ -112,7 +112,7 @@ bool DlgWvCreate::startModule(const QString &path)
 
 void DlgWvCreate::writeFields(QSettings &settings) const
 {
-    settings.setValue("ver", settingsVersion);
+    settings.setValue("ver", SettingsVersion);
     m_pages->writeSettings(settings);
     settings.setValue("wv.main", m_ui->cb_waveform->currentIndex());
     settings.setValue("wv.sub", m_ui->cb_wtype->currentIndex());
@@ -123,7 +123,7 @@ void DlgWvCreate::writeFields(QSettings &settings) const
 
 void DlgWvCreate::readFields(const QSettings &settings)
 {
-    if (settings.value("ver", 0.0).toDouble() < settingsVersion) {
+    if (settings.value("ver", 0.0).toDouble() < SettingsVersion) {
         return;
     }
     m_pages->readSettings(settings);
@@ -140,7 +140,7 @@ void DlgWvCreate::readFields(const QSettings &settings)
 CreateKind DlgWvCreate::kind() const
 {
     const CreateKind chosen = waveforms().at(m_ui->cb_waveform->currentIndex()).kind;
-    return chosen == CreateKind::Pulse && subKind() == chirpData ? CreateKind::Chirp : chosen;
+    return chosen == CreateKind::Pulse && subKind() == ChirpData ? CreateKind::Chirp : chosen;
 }
 
 int DlgWvCreate::subKind() const
@@ -175,7 +175,7 @@ void DlgWvCreate::slot_waveform(int index)
     m_ui->cb_wtype->clear();
     for (int number = 0; number < waveform.variants.size(); ++number) {
         const bool isChirp = waveform.kind == CreateKind::Pulse && number == 1;
-        m_ui->cb_wtype->addItem(waveform.variants.at(number), isChirp ? chirpData : number);
+        m_ui->cb_wtype->addItem(waveform.variants.at(number), isChirp ? ChirpData : number);
     }
     m_ui->cb_wtype->setVisible(!waveform.variants.isEmpty());
     m_ui->t_cb_wtype->setVisible(!waveform.variants.isEmpty());
@@ -212,7 +212,7 @@ bool DlgWvCreate::preview()
     m_ui->w_spectrum->setClock(facts.clockHz);
     m_ui->w_spectrum->setData(samples);
     m_ui->w_constellation->setData(samples);
-    m_ui->l_warn->setVisible(facts.samples < shortWaveform);
+    m_ui->l_warn->setVisible(facts.samples < ShortWaveform);
     m_ui->le_samples->setVal(facts.samples);
     m_ui->le_arbclock->setVal(facts.clockHz);
     m_ui->le_peak->setVal(facts.peak);

@@ -64,18 +64,18 @@ void ViewFrame::addNavigation()
         {"pb_zoomout_y", QString("Y") + QChar(0x2212), "Y Zoom Out", "Ctrl+-",
          &ViewFrame::slot_zoomout_y},
     };
-    constexpr int side = 30;
-    constexpr int gap = 12;
+    constexpr int Side = 30;
+    constexpr int Gap = 12;
     for (const Button &button : buttons) {
         if (button.slot == &ViewFrame::slot_zoomin) {
-            m_buttons->addSpacing(gap);
+            m_buttons->addSpacing(Gap);
         }
         auto *made = new QToolButton;
         made->setObjectName(button.name);
         made->setText(button.text);
         made->setToolTip(button.toolTip);
         made->setShortcut(QKeySequence(button.shortcut));
-        made->setMinimumSize(side, side);
+        made->setMinimumSize(Side, Side);
         connect(made, &QToolButton::clicked, this, button.slot);
         m_buttons->addWidget(made);
     }

@@ -43,9 +43,9 @@ double niceStep(double value)
         mantissa *= 10;
         exponent -= 1;
     }
-    constexpr double tolerance = 1e-12; // 2 arrives as 2.0000000000000004 from a division
+    constexpr double Tolerance = 1e-12; // 2 arrives as 2.0000000000000004 from a division
     for (const double step : {1.0, 2.0, 5.0}) {
-        if (mantissa <= step * (1 + tolerance)) {
+        if (mantissa <= step * (1 + Tolerance)) {
             return step * std::pow(10.0, exponent);
         }
     }
@@ -90,8 +90,8 @@ double magnitudeToDb(double magnitude)
 {
     // The natural logarithm is several times as fast as the decimal one, and a spectrum takes 512
     // of them a line; the results agree to the last digits.
-    constexpr double nepersToDb = 20 / std::numbers::ln10;
-    return nepersToDb * std::log(magnitude + 1e-32);
+    constexpr double NepersToDb = 20 / std::numbers::ln10;
+    return NepersToDb * std::log(magnitude + 1e-32);
 }
 
 int labelStride(double spacing, double extent)

@@ -11,7 +11,7 @@
 namespace {
 
 /// Small enough that a scan, which looks at tags only, reads little; large enough for marker lists.
-constexpr int bufferSize = 32 * 1024;
+constexpr int BufferSize = 32 * 1024;
 
 /// Text is what lies between the blank and the closing brace of ASCII.
 bool isText(int byte)
@@ -23,7 +23,7 @@ bool isText(int byte)
 
 ByteSource::ByteSource(QIODevice &device)
     : m_device(device)
-    , m_buffer(bufferSize, Qt::Uninitialized)
+    , m_buffer(BufferSize, Qt::Uninitialized)
     , m_size(device.size())
 {
 }
@@ -33,7 +33,7 @@ bool ByteSource::fill()
     m_bufferStart += m_fill;
     m_index = 0;
     m_fill = 0;
-    const qint64 got = m_device.read(m_buffer.data(), bufferSize);
+    const qint64 got = m_device.read(m_buffer.data(), BufferSize);
     m_failed = m_failed || got < 0;
     m_fill = static_cast<int>(std::max<qint64>(got, 0));
     return m_fill > 0;

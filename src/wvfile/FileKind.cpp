@@ -8,7 +8,7 @@
 
 namespace {
 
-constexpr std::array<FileKind, 9> fileKinds{{
+constexpr std::array<FileKind, 9> FileKinds{{
     {"TGX-WV", "TGX Waveform File", WvFormatTgx, "Format is TGX waveform."},
     {"TBX-WV", "TBX Waveform File", WvFormatTbx, "Format is TBX waveform."},
     {"TVX-WV", "TVX Waveform File", WvFormatTvx, "Format is TVX waveform."},
@@ -26,8 +26,8 @@ constexpr std::array<FileKind, 9> fileKinds{{
 const FileKind *findFileKind(const QString &typeField)
 {
     const QString name = typeField.simplified().toUpper();
-    const auto *found = std::find_if(fileKinds.begin(), fileKinds.end(), [&](const FileKind &kind) {
+    const auto *found = std::find_if(FileKinds.begin(), FileKinds.end(), [&](const FileKind &kind) {
         return name == QLatin1String(kind.name);
     });
-    return found == fileKinds.end() ? nullptr : found;
+    return found == FileKinds.end() ? nullptr : found;
 }

@@ -10,10 +10,10 @@
 
 namespace {
 
-constexpr qint64 blockSize = 262'144;
+constexpr qint64 BlockSize = 262'144;
 
 /// Some 4 MiB for each side: little beside the buffers of the streams.
-constexpr size_t maxRuns = 524'288;
+constexpr size_t MaxRuns = 524'288;
 
 } // namespace
 
@@ -73,7 +73,7 @@ MarkerStore::Result MarkerStore::copy(qint64 count, quint8 mask)
             ++m_readRun;
         }
         left -= size;
-        if (m_new.size() > maxRuns) {
+        if (m_new.size() > MaxRuns) {
             const Result moved = moveToStream();
             if (moved != Result::Done) {
                 return moved;
@@ -107,7 +107,7 @@ MarkerStore::Result MarkerStore::write(qint64 count, quint8 byte)
         return result;
     }
     append(count, byte);
-    return m_new.size() > maxRuns ? moveToStream() : Result::Done;
+    return m_new.size() > MaxRuns ? moveToStream() : Result::Done;
 }
 
 MarkerStore::Result MarkerStore::finish()
@@ -149,12 +149,12 @@ MarkerStore::Result MarkerStore::writeRuns(const Runs &runs)
 
 MarkerStore::Result MarkerStore::copyInStream(qint64 count, quint8 mask)
 {
-    m_block.resize(std::max(m_block.size(), static_cast<size_t>(std::min(count, blockSize))));
+    m_block.resize(std::max(m_block.size(), static_cast<size_t>(std::min(count, BlockSize))));
     while (count > 0) {
-        if (count >= blockSize && m_progress.shouldStop(0)) {
+        if (count >= BlockSize && m_progress.shouldStop(0)) {
             return failed(Result::Cancelled, m_writePos);
         }
-        const int wanted = static_cast<int>(std::min(count, blockSize));
+        const int wanted = static_cast<int>(std::min(count, BlockSize));
         const int got = m_stream.readBlock(wanted, m_block.data());
         if (got < wanted) {
             return failed(Result::CannotRead, m_writePos + std::max(got, 0));
@@ -173,15 +173,15 @@ MarkerStore::Result MarkerStore::copyInStream(qint64 count, quint8 mask)
 
 MarkerStore::Result MarkerStore::writeToStream(qint64 position, qint64 count, quint8 byte)
 {
-    const auto size = static_cast<size_t>(std::min(count, blockSize));
+    const auto size = static_cast<size_t>(std::min(count, BlockSize));
     m_block.resize(std::max(m_block.size(), size));
     std::fill_n(m_block.begin(), size, byte);
     const qint64 end = position + count;
     while (position < end) {
-        if (end - position >= blockSize && m_progress.shouldStop(0)) {
+        if (end - position >= BlockSize && m_progress.shouldStop(0)) {
             return failed(Result::Cancelled, position);
         }
-        const int part = static_cast<int>(std::min(end - position, blockSize));
+        const int part = static_cast<int>(std::min(end - position, BlockSize));
         if (!m_stream.writeBytes(part, m_block.data())) {
             return failed(Result::CannotWrite, position);
         }

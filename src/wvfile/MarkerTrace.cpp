@@ -13,16 +13,16 @@
 
 namespace {
 
-constexpr qint64 blockSize = 262'144;
+constexpr qint64 BlockSize = 262'144;
 
 /// A file can repeat its lists at will; each costs a pass over the bytes. This many passes over
 /// the longest possible stream are far beyond any honest file and still proportional to its size.
-constexpr qint64 maxPasses = 64;
+constexpr qint64 MaxPasses = 64;
 
 /// Transitions between two looks at the clock.
-constexpr int transitionsPerTick = 1024;
+constexpr int TransitionsPerTick = 1024;
 
-constexpr const char *abortText = "Action aborted by user.";
+constexpr const char *AbortText = "Action aborted by user.";
 
 } // namespace
 
@@ -31,7 +31,7 @@ MarkerTrace::MarkerTrace(BufferedIO &stream, qint64 fileLimit, ProgressClock &pr
     , m_progress(progress)
     , m_store(stream, progress)
     , m_fileLimit(fileLimit)
-    , m_workLeft(maxPasses * std::max<qint64>(fileLimit, BufferedIO::BufferSize / maxPasses))
+    , m_workLeft(MaxPasses * std::max<qint64>(fileLimit, BufferedIO::BufferSize / MaxPasses))
 {
     m_cutAt.fill(-1);
 }
@@ -64,8 +64,8 @@ bool MarkerTrace::mergeList(ByteSource &source, const QString &name)
     Transition transition;
     TagText token;
     for (int count = 1; !transition.endedOnBrace; ++count) {
-        if (count % transitionsPerTick == 0 && m_progress.shouldStop(0)) {
-            return Tracer::fail(abortText);
+        if (count % TransitionsPerTick == 0 && m_progress.shouldStop(0)) {
+            return Tracer::fail(AbortText);
         }
         if (!takeTransition(source, transition)) {
             if (!source.readText(';', token)) {
@@ -213,7 +213,7 @@ bool MarkerTrace::report(MarkerStore::Result result, Part part, qint64 target) c
     case MarkerStore::Result::Done:
         return true;
     case MarkerStore::Result::Cancelled:
-        return Tracer::fail(abortText);
+        return Tracer::fail(AbortText);
     case MarkerStore::Result::CannotWrite:
         return Tracer::fail((part == Part::LowCompletion
                                  ? QString("Writing marker stream failed at position %1")
@@ -280,12 +280,12 @@ bool MarkerTrace::extendTo(qint64 length)
     if (m_written >= length) {
         return true;
     }
-    const std::vector<quint8> block(static_cast<size_t>(std::min(length - m_written, blockSize)),
+    const std::vector<quint8> block(static_cast<size_t>(std::min(length - m_written, BlockSize)),
                                     m_lastByte);
     while (m_written < length) {
-        const int size = static_cast<int>(std::min(length - m_written, blockSize));
+        const int size = static_cast<int>(std::min(length - m_written, BlockSize));
         if (m_progress.shouldStop(0)) {
-            return Tracer::fail(abortText);
+            return Tracer::fail(AbortText);
         }
         if (!m_stream.writeBytes(size, block.data())) {
             return Tracer::fail(
@@ -301,9 +301,9 @@ bool MarkerTrace::pad(qint64 count)
     if (count <= 0) {
         return true;
     }
-    const std::vector<quint8> block(static_cast<size_t>(std::min(count, blockSize)), m_lastByte);
+    const std::vector<quint8> block(static_cast<size_t>(std::min(count, BlockSize)), m_lastByte);
     for (qint64 done = 0; done < count;) {
-        const int size = static_cast<int>(std::min(count - done, blockSize));
+        const int size = static_cast<int>(std::min(count - done, BlockSize));
         if (!m_stream.writeBytes(size, block.data())) {
             return Tracer::fail("Cannot write to marker file!");
         }

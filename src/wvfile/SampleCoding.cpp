@@ -14,19 +14,19 @@
 
 namespace {
 
-constexpr float fullScale = 32767.0F;
+constexpr float FullScale = 32767.0F;
 
 CORVANE_CLONES void decodeA(const qint16 *words, float *values, size_t count, float gain)
 {
     for (size_t i = 0; i < count; ++i) {
-        values[i] = (static_cast<float>(words[i]) - 0.5F) / fullScale * gain;
+        values[i] = (static_cast<float>(words[i]) - 0.5F) / FullScale * gain;
     }
 }
 
 CORVANE_CLONES void decodeB(const qint16 *words, float *values, size_t count, float gain)
 {
     for (size_t i = 0; i < count; ++i) {
-        values[i] = static_cast<float>(words[i]) / fullScale * gain;
+        values[i] = static_cast<float>(words[i]) / FullScale * gain;
     }
 }
 
@@ -34,7 +34,7 @@ CORVANE_CLONES void decodeC(const qint16 *words, float *values, size_t count, fl
 {
     for (size_t i = 0; i < count; ++i) {
         const auto word = static_cast<qint16>(words[i] ^ qint16(-0x8000));
-        values[i] = static_cast<float>(word) / fullScale * gain;
+        values[i] = static_cast<float>(word) / FullScale * gain;
     }
 }
 
@@ -48,10 +48,10 @@ CORVANE_CLONES void decodeD(const qint16 *words, float *values, size_t count, fl
 
 inline float scaledToWord(float value)
 {
-    float scaled = value * fullScale + 0.5F;
-    scaled = value < -1.0F ? -fullScale : scaled;
+    float scaled = value * FullScale + 0.5F;
+    scaled = value < -1.0F ? -FullScale : scaled;
     // Written so that a NaN, which compares false, takes the upper limit.
-    return value <= 1.0F ? scaled : fullScale;
+    return value <= 1.0F ? scaled : FullScale;
 }
 
 CORVANE_CLONES void encodeA(const float *values, qint16 *words, size_t count)
@@ -65,9 +65,9 @@ CORVANE_CLONES quint32 clippedAmong(const float *values, size_t count)
 {
     quint32 clipped = 0;
     for (size_t i = 0; i < count; ++i) {
-        const float scaled = values[i] * fullScale + 0.5F;
+        const float scaled = values[i] * FullScale + 0.5F;
         // Written so that a NaN, which compares false, counts.
-        const bool fits = scaled < fullScale + 1 && scaled > -(fullScale + 1);
+        const bool fits = scaled < FullScale + 1 && scaled > -(FullScale + 1);
         clipped += fits ? 0U : 1U;
     }
     return clipped;
@@ -79,10 +79,10 @@ void decodeWords(SampleCoding coding, std::span<const std::byte> words, float ga
                  std::span<float> values)
 {
     // Blocks come from buffers of bytes; a copy through an aligned block keeps the access defined.
-    constexpr size_t blockWords = 4096;
-    std::array<qint16, blockWords> block;
-    for (size_t done = 0; done < values.size(); done += blockWords) {
-        const size_t count = std::min(blockWords, values.size() - done);
+    constexpr size_t BlockWords = 4096;
+    std::array<qint16, BlockWords> block;
+    for (size_t done = 0; done < values.size(); done += BlockWords) {
+        const size_t count = std::min(BlockWords, values.size() - done);
         std::memcpy(block.data(), words.data() + 2 * done, 2 * count);
         float *target = values.data() + done;
         switch (coding) {
@@ -104,10 +104,10 @@ void decodeWords(SampleCoding coding, std::span<const std::byte> words, float ga
 
 void encodeWords(std::span<const float> values, std::span<std::byte> words)
 {
-    constexpr size_t blockWords = 4096;
-    std::array<qint16, blockWords> block;
-    for (size_t done = 0; done < values.size(); done += blockWords) {
-        const size_t count = std::min(blockWords, values.size() - done);
+    constexpr size_t BlockWords = 4096;
+    std::array<qint16, BlockWords> block;
+    for (size_t done = 0; done < values.size(); done += BlockWords) {
+        const size_t count = std::min(BlockWords, values.size() - done);
         encodeA(values.data() + done, block.data(), count);
         std::memcpy(words.data() + 2 * done, block.data(), 2 * count);
     }

@@ -16,8 +16,8 @@
 
 namespace {
 
-constexpr int maxNameLength = 99;
-constexpr int blockSamples = 64 * 1024;
+constexpr int MaxNameLength = 99;
+constexpr int BlockSamples = 64 * 1024;
 
 } // namespace
 
@@ -57,12 +57,12 @@ WvReader::Round WvReader::readTag(QString &name)
     }
     QByteArray bytes;
     int byte = m_source.next();
-    for (; byte != ':' && byte != ByteSource::NoByte && bytes.size() <= maxNameLength;
+    for (; byte != ':' && byte != ByteSource::NoByte && bytes.size() <= MaxNameLength;
          byte = m_source.next()) {
         bytes.append(static_cast<char>(byte));
     }
     name = QString::fromLatin1(bytes);
-    if (byte != ':' || bytes.size() > maxNameLength) {
+    if (byte != ':' || bytes.size() > MaxNameLength) {
         Tracer::fail("Tag name '" + name + "' is invalid.");
         return Round::Failed;
     }
@@ -100,7 +100,7 @@ bool WvReader::processTag(const QString &name)
         Content content;
         QString WvFileInfo::*text;
     };
-    static constexpr Known knownTags[] = {
+    static constexpr Known KnownTags[] = {
         {"SI COMPENSATED", Content::Ignored, nullptr},
         {"RESOLUTION", Content::Resolution, nullptr},
         {"SYSTEM", Content::Text, &WvFileInfo::system},
@@ -114,9 +114,9 @@ bool WvReader::processTag(const QString &name)
         {"CONTROL LENGTH", Content::ControlLength, nullptr},
     };
     const auto *known =
-        std::find_if(std::begin(knownTags), std::end(knownTags),
+        std::find_if(std::begin(KnownTags), std::end(KnownTags),
                      [&](const Known &tag) { return name == QLatin1String(tag.name); });
-    if (known == std::end(knownTags)) {
+    if (known == std::end(KnownTags)) {
         return keepUnknownTag(name);
     }
     TagText content;
@@ -239,7 +239,7 @@ bool WvReader::keepUnknownTag(const QString &name)
             return Tracer::fail("Invalid tag. '}' is missing.");
         }
         bytes.append(static_cast<char>(byte));
-        if (bytes.size() >= blockSamples) {
+        if (bytes.size() >= BlockSamples) {
             if (!keep(bytes)) {
                 return false;
             }
@@ -345,16 +345,16 @@ bool WvReader::readBlocks()
 {
     const auto gain = static_cast<float>(std::pow(10.0, m_info.gainDb / 20));
     const qint64 total = m_info.samples;
-    const auto blockLength = static_cast<size_t>(std::min<qint64>(total, blockSamples));
+    const auto blockLength = static_cast<size_t>(std::min<qint64>(total, BlockSamples));
     std::vector<std::byte> words(4 * blockLength);
     m_values[0].resize(2 * blockLength);
-    m_values[1].resize(total > blockSamples ? 2 * blockLength : 0);
+    m_values[1].resize(total > BlockSamples ? 2 * blockLength : 0);
     size_t current = 0;
     for (qint64 done = 0; done < total;) {
         if (m_progress.shouldStop(done, total)) {
             return Tracer::fail("Action aborted by user.");
         }
-        const auto wanted = static_cast<size_t>(std::min<qint64>(total - done, blockSamples));
+        const auto wanted = static_cast<size_t>(std::min<qint64>(total - done, BlockSamples));
         const size_t got = m_source.read(std::span(words).first(4 * wanted)) / 4;
         const auto block = std::span(m_values[current]).first(2 * got);
         decodeWords(coding(), std::span(words).first(4 * got), gain, block);
@@ -375,7 +375,7 @@ bool WvReader::storeBlock(qint64 begin, std::span<const float> values)
     // The sum is bound by the latency of its additions, which have to keep their order; beside it
     // there is time to write.
     const auto measure = [this, values] { addLevels(values, m_levels); };
-    if (m_info.samples > blockSamples) {
+    if (m_info.samples > BlockSamples) {
         m_measuring.start(measure);
     } else {
         measure();

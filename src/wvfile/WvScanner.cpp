@@ -17,10 +17,10 @@ namespace {
 /// Characters of a list of segments; hundreds of file names are long.
 constexpr int MaxSegmentsText = 64 * 1024;
 
-constexpr int maxNameLength = 1024;
+constexpr int MaxNameLength = 1024;
 
 /// Blocks of more samples than this are taken for damaged.
-constexpr qint64 maxScannedSamples = 4'000'000'000;
+constexpr qint64 MaxScannedSamples = 4'000'000'000;
 
 QString withoutQuotes(QString text)
 {
@@ -75,7 +75,7 @@ bool WvScanner::scan(QIODevice &device)
 bool WvScanner::readName(ByteSource &source, QString &name)
 {
     QByteArray bytes;
-    while (bytes.size() < maxNameLength) {
+    while (bytes.size() < MaxNameLength) {
         const int byte = source.next();
         if (byte == ':') {
             name = QString::fromLatin1(bytes);
@@ -109,7 +109,7 @@ bool WvScanner::processTag(ByteSource &source, const QString &name)
         QString WvFileSummary::*text;
         bool quoted;
     };
-    static constexpr TextTag textTags[] = {
+    static constexpr TextTag TextTags[] = {
         {"COMMENT", &WvFileSummary::comment, false},
         {"COPYRIGHT", &WvFileSummary::copyright, false},
         {"DATE", &WvFileSummary::date, false},
@@ -122,9 +122,9 @@ bool WvScanner::processTag(ByteSource &source, const QString &name)
         "MWV_SEGMENT_CLOCK", "MWV_SEGMENT_DURATION", "MWV_SEGMENT_LEVEL_OFFS"};
     static const QStringList otherTags{"TYPE", "CLOCK", "SAMPLES", "LEVEL OFFS"};
     const auto *textTag =
-        std::find_if(std::begin(textTags), std::end(textTags),
+        std::find_if(std::begin(TextTags), std::end(TextTags),
                      [&](const TextTag &tag) { return name == QLatin1String(tag.name); });
-    const bool isText = textTag != std::end(textTags);
+    const bool isText = textTag != std::end(TextTags);
     const bool isSegments = segmentTags.contains(name);
     if (!isText && !isSegments && !otherTags.contains(name)) {
         return true;
@@ -232,7 +232,7 @@ bool WvScanner::processSegments(const QString &name, const QString &text)
         const char *name;
         Setter set;
     };
-    static constexpr ListTag listTags[] = {
+    static constexpr ListTag ListTags[] = {
         {"MWV_SEGMENT_DURATION",
          [](WvSegment &s, const QString &t, bool *ok) { s.duration = toFiniteDouble(t, ok); }},
         {"MWV_SEGMENT_CLOCK",
@@ -247,7 +247,7 @@ bool WvScanner::processSegments(const QString &name, const QString &text)
              *ok = true;
          }},
     };
-    for (const ListTag &tag : listTags) {
+    for (const ListTag &tag : ListTags) {
         if (name != QLatin1String(tag.name)) {
             continue;
         }
@@ -281,7 +281,7 @@ bool WvScanner::processSampleBlock(ByteSource &source, const QString &name)
                  .arg(prefix.consumed));
     }
     const qint64 count = dataBytes / 4;
-    if (count < 1 || count > maxScannedSamples) {
+    if (count < 1 || count > MaxScannedSamples) {
         warn(QString("Invalid number of samples in WAVEFORM tag: %1").arg(count));
     }
     if (count != m_summary.samples) {

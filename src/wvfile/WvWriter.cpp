@@ -21,7 +21,7 @@
 
 namespace {
 
-constexpr int blockSamples = 64 * 1024;
+constexpr int BlockSamples = 64 * 1024;
 
 const char *typeName(int type)
 {
@@ -94,10 +94,10 @@ void WvWriter::prepareLevels()
             peak = std::max(peak, static_cast<double>(std::sqrt(power)));
         }
         // Silence is given the level of -100 dB, which is told apart from any real signal.
-        constexpr double silence = 1e-5;
+        constexpr double Silence = 1e-5;
         rms = std::sqrt(sum / m_job.samples);
-        rms = rms == 0 ? silence : rms;
-        peak = peak == 0 ? silence : peak;
+        rms = rms == 0 ? Silence : rms;
+        peak = peak == 0 ? Silence : peak;
         m_job.rmsOffset = levelOffset(rms);
         m_job.peakOffset = levelOffset(peak);
     }
@@ -159,7 +159,7 @@ bool WvWriter::copyTagsStream(OutputFile &file)
     if (!m_streams.tags->restartAtBegining()) {
         return warn();
     }
-    QByteArray block(blockSamples, Qt::Uninitialized);
+    QByteArray block(BlockSamples, Qt::Uninitialized);
     for (;;) {
         const int got = m_streams.tags->readBlock(static_cast<int>(block.size()), block.data());
         if (got <= 0) {
@@ -198,10 +198,10 @@ bool WvWriter::writeMarkerList(OutputFile &file, int marker)
     }
     const auto mask = static_cast<quint8>(1U << (marker - 1));
     QByteArray text = "{MARKER LIST " + QByteArray::number(marker) + ": ";
-    std::vector<quint8> block(static_cast<size_t>(std::min(m_job.samples, blockSamples)));
+    std::vector<quint8> block(static_cast<size_t>(std::min(m_job.samples, BlockSamples)));
     quint8 state = 0;
     for (int begin = 0; begin < m_job.samples;) {
-        const int count = std::min(m_job.samples - begin, blockSamples);
+        const int count = std::min(m_job.samples - begin, BlockSamples);
         const auto bytes = std::span(block).first(static_cast<size_t>(count));
         if (!fetchMarkers(begin, bytes)) {
             return false;
@@ -215,7 +215,7 @@ bool WvWriter::writeMarkerList(OutputFile &file, int marker)
             i = findChange(bytes, i, mask, state);
         }
         begin += count;
-        if (text.size() > blockSamples) {
+        if (text.size() > BlockSamples) {
             if (!put(file, text)) {
                 return false;
             }
@@ -257,14 +257,14 @@ int WvWriter::fetchSamples(int begin, std::span<float> values)
 
 bool WvWriter::writeSamples(OutputFile &file)
 {
-    std::vector<float> values(2 * static_cast<size_t>(std::min(m_job.samples, blockSamples)));
+    std::vector<float> values(2 * static_cast<size_t>(std::min(m_job.samples, BlockSamples)));
     std::vector<std::byte> words(2 * values.size());
     ClipCount clipped;
     for (int done = 0; done < m_job.samples;) {
         if (m_progress.shouldStop(done, m_job.samples, 50, 100)) {
             return Tracer::fail("Action aborted by user.");
         }
-        const int wanted = std::min(m_job.samples - done, blockSamples);
+        const int wanted = std::min(m_job.samples - done, BlockSamples);
         const int got =
             fetchSamples(done, std::span(values).first(2 * static_cast<size_t>(wanted)));
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));

@@ -23,8 +23,8 @@
 
 namespace {
 
-constexpr qint64 previewSamples = 10240;
-constexpr char presetFilter[] = "Settings File (*.ini)";
+constexpr qint64 PreviewSamples = 10240;
+constexpr char PresetFilter[] = "Settings File (*.ini)";
 
 QComboBox *comboBox(const char *name, const QStringList &items)
 {
@@ -54,7 +54,7 @@ DlgWvFromData::DlgWvFromData(QWidget *parent)
     addInputPage();
     addFormatPage();
     addSharedPages();
-    setPreviewSamples(previewSamples);
+    setPreviewSamples(PreviewSamples);
     setUpWizard();
     fillPrecisions();
     enableChoices();
@@ -265,7 +265,7 @@ void DlgWvFromData::readFields(const QSettings &settings)
 
 void DlgWvFromData::slot_Load()
 {
-    const QString name = QFileDialog::getOpenFileName(this, "Select settings", {}, presetFilter);
+    const QString name = QFileDialog::getOpenFileName(this, "Select settings", {}, PresetFilter);
     if (name.isEmpty()) {
         return;
     }
@@ -285,7 +285,7 @@ void DlgWvFromData::slot_Load()
 
 void DlgWvFromData::slot_Save()
 {
-    QString name = QFileDialog::getSaveFileName(this, "Save Settings", {}, presetFilter);
+    QString name = QFileDialog::getSaveFileName(this, "Save Settings", {}, PresetFilter);
     if (name.isEmpty()) {
         return;
     }

@@ -11,8 +11,8 @@
 
 namespace {
 
-constexpr double mostSeconds = 1e9;
-constexpr double mostSamples = 1e9;
+constexpr double MostSeconds = 1e9;
+constexpr double MostSamples = 1e9;
 
 } // namespace
 
@@ -34,8 +34,8 @@ DlgWvFromWav::DlgWvFromWav(QWidget *parent)
     m_dataClock = addFact(*grid, "le_dataclock", "Data Clockrate", "Hz", ImportTarget::MinClockHz,
                           ImportTarget::MaxClockHz);
     m_dataClock->setVal(ImportTarget().clockHz);
-    m_samples = addFact(*grid, "le_samples", "Number of Samples", {}, 0, mostSamples);
-    m_playTime = addFact(*grid, "le_playtime", "Play Time", "s", 0, mostSeconds);
+    m_samples = addFact(*grid, "le_samples", "Number of Samples", {}, 0, MostSamples);
+    m_playTime = addFact(*grid, "le_playtime", "Play Time", "s", 0, MostSeconds);
     column->addWidget(header);
     m_error->setObjectName("l_error");
     m_error->setWordWrap(true);

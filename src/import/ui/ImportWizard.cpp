@@ -34,7 +34,7 @@ Widget *named(const char *name)
     return widget;
 }
 
-constexpr int plotHeight = 120;
+constexpr int PlotHeight = 120;
 
 } // namespace
 
@@ -127,9 +127,9 @@ void ImportWizard::addPreviewPage()
     m_trace = named<CWidgetIQTrace>("w_iq");
     m_spectrum = named<CWidgetSpectrum>("w_spectrum");
     m_constellation = named<CWidgetConstellation>("w_constellation");
-    m_trace->setMinimumHeight(plotHeight);
-    m_spectrum->setMinimumHeight(plotHeight);
-    m_constellation->setMinimumHeight(plotHeight);
+    m_trace->setMinimumHeight(PlotHeight);
+    m_spectrum->setMinimumHeight(PlotHeight);
+    m_constellation->setMinimumHeight(PlotHeight);
     m_trace->setView(0);
     m_spectrum->setView(0);
     auto *plots = new QHBoxLayout;
@@ -171,8 +171,8 @@ void ImportWizard::addOutputPage()
     connect(browse, &QPushButton::clicked, this, &ImportWizard::slot_outfile);
     m_comment = named<QPlainTextEdit>("te_comment");
     m_comment->setTabChangesFocus(true);
-    constexpr int commentHeight = 90;
-    m_comment->setMaximumHeight(commentHeight);
+    constexpr int CommentHeight = 90;
+    m_comment->setMaximumHeight(CommentHeight);
     addRow(*grid, "Co&mment", m_comment, "Comment of the file");
     m_copyright = named<QLineEdit>("le_copyright");
     addRow(*grid, "C&opyright", m_copyright, "Copyright note of the file");

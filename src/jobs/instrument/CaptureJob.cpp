@@ -243,8 +243,8 @@ bool CaptureJob::measure()
     if (!std::isfinite(m_capture->peak) || !std::isfinite(m_capture->rms)) {
         return Tracer::fail("The analyzer sent samples that are no numbers.");
     }
-    constexpr double silence = 1e-15;
-    say(QString("  Peak Level Offset:    \t%1 dB").arg(levelOffset(m_capture->peak, silence)));
+    constexpr double Silence = 1e-15;
+    say(QString("  Peak Level Offset:    \t%1 dB").arg(levelOffset(m_capture->peak, Silence)));
     return true;
 }
 

@@ -13,8 +13,8 @@ namespace {
 
 double decibels(double level)
 {
-    constexpr double silence = 1e-12;
-    return 20 * std::log10(level + silence);
+    constexpr double Silence = 1e-12;
+    return 20 * std::log10(level + Silence);
 }
 
 } // namespace

@@ -15,7 +15,7 @@
 
 namespace {
 
-constexpr const char *sendingFailed = "Sending file to instrument failed.";
+constexpr const char *SendingFailed = "Sending file to instrument failed.";
 
 QString nativePathOn(const VisaDevice &device, const QString &path)
 {
@@ -227,12 +227,12 @@ bool CopyJob::send(const QString &local, const QString &remote)
     const QString name = remote.mid(m_request.targetFolder.size());
     if (const QString problem = sendingProblem(name); !problem.isEmpty()) {
         Tracer::Trace(Tracer::Error, problem);
-        return Tracer::fail(sendingFailed);
+        return Tracer::fail(SendingFailed);
     }
     VisaDevice *device = m_request.targetDevice;
     const QString label =
         QString("Sending file %1\nto instrument %2").arg(entryName(remote), deviceName(*device));
-    return transfer(device, label, sendingFailed, [&] {
+    return transfer(device, label, SendingFailed, [&] {
         return makeRemoteFolder(folderOf(remote)) &&
                device->writeRemoteFile(local, nativePathOn(*device, remote));
     });

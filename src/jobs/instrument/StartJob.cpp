@@ -16,9 +16,9 @@ StartJob::StartJob(InstrumentRef instrument, QString path, int seconds, QObject 
 
 bool StartJob::talk(VisaDevice &device)
 {
-    constexpr quint32 answerTimeoutMs = 5000;
+    constexpr quint32 AnswerTimeoutMs = 5000;
     const quint32 savedTimeoutMs = device.timeoutMs();
-    (void)device.setTimeoutMs(answerTimeoutMs);
+    (void)device.setTimeoutMs(AnswerTimeoutMs);
     const bool started = device.startArb(nativePath(m_path, device.pathSeparator()), m_seconds);
     if (!started) {
         Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
