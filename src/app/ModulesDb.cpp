@@ -12,8 +12,11 @@
 #include "log/Tracer.h"
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
+#include "tools/DlgFilter.h"
+#include "tools/DlgPolar.h"
 #include "tools/DlgResample.h"
 #include "tools/DlgView.h"
+#include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
 
 #include <QAction>
@@ -53,7 +56,10 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgWvFromWav>("Import WAV", "/Import/From WAV", File, {"WAV"}),
         toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
+        toolInfo<DlgFilter>("Filter", "/Edit/Filter", File, {"WV"}),
+        toolInfo<DlgPolar>("To Polar", "/Edit/To Polar", File, {"WV"}),
         toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"}),
+        toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}),
     };
 }
 

@@ -8,6 +8,12 @@
 
 #include <utility>
 
+QString PolarRequest::levelProblem() const
+{
+    const bool fits = offset + gain <= 1.0 && offset - gain >= -1.0;
+    return fits ? QString() : "Invalid amplitude level settings.";
+}
+
 PolarJob::PolarJob(PolarRequest request, QObject *parent)
     : EditJob(request.inputFile, request.phase, Reading::Reported, parent)
     , m_request(std::move(request))
@@ -18,8 +24,8 @@ PolarJob::PolarJob(PolarRequest request, QObject *parent)
 
 QString PolarJob::refusal() const
 {
-    if (m_request.offset + m_request.gain > 1.0 || m_request.offset - m_request.gain < -1.0) {
-        return "Invalid amplitude level settings.";
+    if (const QString problem = m_request.levelProblem(); !problem.isEmpty()) {
+        return problem;
     }
     if (m_request.phase.fileName.isEmpty()) {
         return "Output file name for phase is empty.";

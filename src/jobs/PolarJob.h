@@ -11,6 +11,9 @@ struct PolarRequest
     double offset = 0;       ///< of the amplitude, -1 to 1
     double gain = 1;         ///< of the amplitude, -1 to 1
     std::optional<double> clockHz; ///< of the files written; nothing: that of the source
+
+    /// Why amplitudes would leave full scale with this offset and gain; empty if they don't.
+    [[nodiscard]] QString levelProblem() const;
 };
 
 /// Splits a waveform into one of constant envelope and one of its magnitude, for instruments with

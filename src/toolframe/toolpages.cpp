@@ -7,17 +7,17 @@
 
 namespace {
 
-QString waveformTitle()
-{
-    return "Select waveform file";
-}
-
 QString waveformFilter()
 {
     return "Waveform File (*.wv)";
 }
 
 } // namespace
+
+QString waveformTitle()
+{
+    return "Select waveform file";
+}
 
 bool chooseSourceFile(QWidget *parent, QLineEdit &field)
 {
@@ -29,11 +29,10 @@ bool chooseSourceFile(QWidget *parent, QLineEdit &field)
     return !fileName.isEmpty();
 }
 
-void chooseTargetFile(QWidget *parent, QLineEdit &field)
+void chooseTargetFile(QWidget *parent, QLineEdit &field, const QString &title)
 {
-    const QString fileName =
-        QFileDialog::getSaveFileName(parent, waveformTitle(), field.text(), waveformFilter(),
-                                     nullptr, QFileDialog::DontConfirmOverwrite);
+    const QString fileName = QFileDialog::getSaveFileName(
+        parent, title, field.text(), waveformFilter(), nullptr, QFileDialog::DontConfirmOverwrite);
     if (!fileName.isEmpty()) {
         field.setText(fileName);
     }

@@ -9,7 +9,7 @@
 
 namespace {
 
-constexpr int SourcePage = 0;
+constexpr int FirstPage = 0;
 
 } // namespace
 
@@ -33,11 +33,10 @@ DlgResample::DlgResample(QWidget *parent)
     samples.setName("Target File Samples");
     samples.setMax(static_cast<double>(ResampleTarget::MaxSamples));
     samples.setMin(1);
-    QtNumericEdit &outputClock = *m_ui->le_clockrate;
+    QtNumericEdit &outputClock = m_ui->page_output->clockRate();
     outputClock.setName("ARB Clockrate");
-    outputClock.setUnit("Hz");
-    outputClock.setScaled(true);
-    outputClock.setMax(ResampleTarget::MaxClockHz);
+    outputClock.setReadOnly(true);
+    outputClock.setMin(0);
 
     connect(m_ui->rb_clock, &QRadioButton::toggled, this, &DlgResample::slot_mode);
     connect(&clock, &QtNumericEdit::valueUpdated, this, &DlgResample::slot_updatesettings);
@@ -96,7 +95,7 @@ void DlgResample::slot_updatesettings()
     } else {
         m_ui->le_target_clock->setVal(wanted.clockHz);
     }
-    m_ui->le_clockrate->setVal(wanted.clockHz);
+    m_ui->page_output->clockRate().setVal(wanted.clockHz);
     const QString problem = wanted.problem();
     m_ui->l_warn->setText(problem);
     m_ui->l_warn->setVisible(!problem.isEmpty());
@@ -115,7 +114,7 @@ std::unique_ptr<ToolJob> DlgResample::makeJob() const
 
 bool DlgResample::isComplete(int page) const
 {
-    return EditWizard::isComplete(page) && (page == SourcePage || m_ui->l_warn->text().isEmpty());
+    return EditWizard::isComplete(page) && (page == FirstPage || m_ui->l_warn->text().isEmpty());
 }
 
 void DlgResample::jobEnded(JobOutcome outcome)

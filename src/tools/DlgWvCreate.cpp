@@ -78,7 +78,7 @@ DlgWvCreate::DlgWvCreate(QWidget *parent)
     connect(m_ui->rb_sc_no, &QRadioButton::clicked, this, &DlgWvCreate::slot_scaling);
     connect(m_ui->cb_zerocrf, &QCheckBox::stateChanged, this, &DlgWvCreate::slot_crf);
     connect(m_ui->pb_outfile, &QPushButton::clicked, this,
-            [this] { chooseTargetFile(this, *m_ui->le_outfile); });
+            [this] { chooseTargetFile(this, *m_ui->le_outfile, waveformTitle()); });
     m_ui->le_outfile->setText(QDir::homePath() + "/NewSignal.wv");
     slot_waveform(0);
     slot_over_enable(m_pages->oversamplingBox().checkState());

@@ -20,14 +20,16 @@ EditWizard::EditWizard(Frame frame, QString suffix, QWidget *parent)
 {
 }
 
-void EditWizard::setUpEditWizard()
+void EditWizard::setUpEditWizard(const QString &targetTitle)
 {
     setUpWizard();
     connect(findChild<QPushButton *>("pb_infile"), &QPushButton::clicked, this,
             &EditWizard::chooseSource);
     auto *output = findChild<QLineEdit *>("le_outfile");
     connect(findChild<QPushButton *>("pb_outfile"), &QPushButton::clicked, this,
-            [this, output] { chooseTargetFile(this, *output); });
+            [this, output, title = targetTitle.isEmpty() ? waveformTitle() : targetTitle] {
+                chooseTargetFile(this, *output, title);
+            });
 }
 
 bool EditWizard::startModule(const QString &path)

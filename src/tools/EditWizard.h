@@ -19,8 +19,9 @@ protected:
     /// "_resample" as a suffix makes "/data/noise_resample.wv" out of "/data/noise.wv".
     EditWizard(Frame frame, QString suffix, QWidget *parent);
 
-    /// Calls setUpWizard() and wires the two Browse buttons.
-    void setUpEditWizard();
+    /// Calls setUpWizard() and wires the two Browse buttons; the title is that of the question for
+    /// the file to be written.
+    void setUpEditWizard(const QString &targetTitle = {});
 
     /// The fields were filled for another source, whose clock and length are known.
     virtual void sourceChanged() = 0;

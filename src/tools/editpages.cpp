@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "editpages.h"
+
+#include "ui_OutputPage.h"
+#include "ui_SourcePage.h"
+#include "ui_StatusPage.h"
+#include "ui_WizardButtons.h"
+
+#include "jobs/ResampleJob.h"
+
+SourcePage::SourcePage(QWidget *parent)
+    : QWidget(parent)
+{
+    Ui::SourcePage().setupUi(this);
+}
+
+OutputPage::OutputPage(QWidget *parent)
+    : QWidget(parent)
+{
+    Ui::OutputPage().setupUi(this);
+    QtNumericEdit &clock = clockRate();
+    clock.setUnit("Hz");
+    clock.setScaled(true);
+    clock.setMax(ResampleTarget::MaxClockHz);
+    clock.setMin(ResampleTarget::MinClockHz);
+    clock.setVal(ResampleTarget().clockHz);
+}
+
+QtNumericEdit &OutputPage::clockRate() const
+{
+    return *findChild<QtNumericEdit *>("le_clockrate");
+}
+
+StatusPage::StatusPage(QWidget *parent)
+    : QWidget(parent)
+{
+    Ui::StatusPage().setupUi(this);
+}
+
+WizardButtons::WizardButtons(QWidget *parent)
+    : QWidget(parent)
+{
+    Ui::WizardButtons().setupUi(this);
+}
