@@ -29,7 +29,7 @@ IqList changedPart(const Joint &joint, int range)
 
 QString stepText(double before, double after)
 {
-    return QString("%1 → %2 of full scale").arg(before, 0, 'f', 4).arg(after, 0, 'f', 4);
+    return QString("%1 → %2").arg(before, 0, 'f', 4).arg(after, 0, 'f', 4);
 }
 
 } // namespace

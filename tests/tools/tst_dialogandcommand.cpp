@@ -6,14 +6,31 @@
 #include "toolwindow.h"
 
 #include "display/QtNumericEdit.h"
+#include "tools/DlgFilter.h"
+#include "tools/DlgPolar.h"
 #include "tools/DlgResample.h"
+#include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
 
 #include <QComboBox>
 #include <QTest>
 #include <QTextEdit>
 
+#include <functional>
+
 using namespace toolwindow;
+
+namespace {
+
+/// For a look at a window: its picture goes to the folder of CORVANE_PICTURES, if that is set.
+void keepPicture(QWidget &window, const QString &name)
+{
+    if (const QString folder = qEnvironmentVariable("CORVANE_PICTURES"); !folder.isEmpty()) {
+        QVERIFY(window.grab().save(folder + '/' + name + ".png"));
+    }
+}
+
+} // namespace
 
 /// The window and the command line write the same file for the same wish.
 class TestDialogAndCommand : public QObject
@@ -23,6 +40,7 @@ class TestDialogAndCommand : public QObject
 private slots:
     void create();
     void resample();
+    void edits();
 
 private:
     /// Runs a command that writes "command.wv", and compares that with "dialog.wv", but for the
@@ -80,6 +98,57 @@ void TestDialogAndCommand::resample()
     type(child<QLineEdit>(dialog, "le_outfile"), m_folder.path("dialog.wv"));
     click(dialog, "pb_next");
     compareWith({"resample", "tone.wv", "--clock", "1.7M"});
+}
+
+void TestDialogAndCommand::edits()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4321)));
+    const QString source = m_folder.path("tone.wv");
+    const auto throughPages = [&](DlgBase &dialog, const std::function<void()> &setFields) {
+        QVERIFY(dialog.startModule(source));
+        dialog.show();
+        click(dialog, "pb_next");
+        setFields();
+        click(dialog, "pb_next");
+        type(child<QLineEdit>(dialog, "le_outfile"), m_folder.path("dialog.wv"));
+    };
+    {
+        DlgFilter dialog;
+        throughPages(dialog, [&dialog] {
+            child<QComboBox>(dialog, "cb_filtertype")->setCurrentText("Root Cosine");
+            child<QComboBox>(dialog, "cb_windowtype")->setCurrentText("Hann");
+            type(child<QtNumericEdit>(dialog, "le_filterfreq"), "200k");
+            type(child<QtNumericEdit>(dialog, "le_filterlength"), "101");
+            keepPicture(dialog, "filter");
+        });
+        click(dialog, "pb_next");
+        compareWith({"filter", "tone.wv", "--type", "root-cosine", "--window", "hann",
+                     "--bandwidth", "200k", "--length", "101"});
+    }
+    {
+        DlgWrapAround dialog;
+        throughPages(dialog, [&dialog] {
+            type(child<QtNumericEdit>(dialog, "le_filterrange"), "50");
+            type(child<QtNumericEdit>(dialog, "le_filterfreq"), "20k");
+            keepPicture(dialog, "wrap");
+        });
+        click(dialog, "pb_next");
+        compareWith({"wrap", "tone.wv", "--range", "50", "--cutoff", "20k"});
+    }
+    DlgPolar dialog;
+    throughPages(dialog, [&dialog] {
+        type(child<QtNumericEdit>(dialog, "le_am_amplitude"), "0.5");
+        keepPicture(dialog, "polar");
+    });
+    type(child<QLineEdit>(dialog, "le_outfile_2"), m_folder.path("amplitude.wv"));
+    click(dialog, "pb_next");
+    const CliRun run = CliRun::in(m_folder.path(), {"polar", "tone.wv", "--gain", "0.5", "--phase",
+                                                    "p.wv", "--amplitude", "a.wv"});
+    QCOMPARE(run.exitCode, 0);
+    QVERIFY(sampleWords(m_folder.load("dialog.wv")) == sampleWords(m_folder.load("p.wv")));
+    QVERIFY(sampleWords(m_folder.load("amplitude.wv")) == sampleWords(m_folder.load("a.wv")));
+    QCOMPARE(tag(m_folder.load("amplitude.wv"), "LEVEL OFFS"),
+             tag(m_folder.load("a.wv"), "LEVEL OFFS"));
 }
 
 QTEST_MAIN(TestDialogAndCommand)
