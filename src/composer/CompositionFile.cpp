@@ -108,7 +108,7 @@ QString absoluteName(const QString &name, const QDir &folder, const char *what)
     if (!QFileInfo(name).isRelative()) {
         return name;
     }
-    const QString absolute = QDir::cleanPath(folder.absoluteFilePath(name));
+    QString absolute = QDir::cleanPath(folder.absoluteFilePath(name));
     Tracer::Trace(Tracer::Debug,
                   QStringLiteral("Relative %1 file '%2'").arg(QLatin1String(what), name));
     Tracer::Trace(Tracer::Debug, QStringLiteral("  converted to '%1'").arg(absolute));

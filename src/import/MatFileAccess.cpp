@@ -91,7 +91,7 @@ QString MatEntry::obstacle() const
     if (name.isEmpty()) {
         return "It has no readable name: names of 1, 2 and 4 letters are not read. Rename it.";
     }
-    const QString text = refusal(*this);
+    QString text = refusal(*this);
     if (!text.isEmpty()) {
         return text;
     }

@@ -39,7 +39,7 @@ QString findPartner(const QString &path)
         QString candidate = name;
         candidate[i] = name[i] == 'i' ? 'q' : 'Q';
         Tracer::Trace(Tracer::Information, QString("Trying to find file '%1'").arg(candidate));
-        const QString candidatePath = info.path() + '/' + candidate;
+        QString candidatePath = info.path() + '/' + candidate;
         if (QFileInfo(candidatePath).isFile()) {
             Tracer::Trace(Tracer::Information, "  File exists.");
             return candidatePath;

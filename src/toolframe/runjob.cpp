@@ -12,7 +12,7 @@ namespace {
 /// The line as HTML in which blanks and tabs stay what they are.
 QString dressed(const ReportLine &line)
 {
-    const QString text = line.text.toHtmlEscaped();
+    QString text = line.text.toHtmlEscaped();
     const auto colored = [&text](const char *color) {
         return QString("<font color=\"%1\"><b>%2</b></font>").arg(color, text);
     };
