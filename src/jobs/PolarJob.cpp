@@ -24,7 +24,7 @@ PolarJob::PolarJob(PolarRequest request, QObject *parent)
 
 QString PolarJob::refusal() const
 {
-    if (const QString problem = m_request.levelProblem(); !problem.isEmpty()) {
+    if (QString problem = m_request.levelProblem(); !problem.isEmpty()) {
         return problem;
     }
     if (m_request.phase.fileName.isEmpty()) {
