@@ -61,10 +61,10 @@ void DlgView::addPlots()
     auto *plots = new QWidget;
     auto *row = new QHBoxLayout(plots);
     row->setContentsMargins(0, 0, 0, 0);
-    constexpr QSize smallest(200, 140);
+    constexpr QSize Smallest(200, 140);
     for (const auto &[plot, stretch] : {std::pair<QWidget *, int>(m_spectrum, 3),
                                         std::pair<QWidget *, int>(m_constellation, 2)}) {
-        plot->setMinimumSize(smallest);
+        plot->setMinimumSize(Smallest);
         row->addWidget(plot, stretch);
     }
     m_ui->w_view->addPlots(plots);

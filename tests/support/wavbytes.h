@@ -16,7 +16,8 @@
                                             int alignment = 4, int bits = 16)
 {
     return chunk("fmt ", words({tag, channels}) + littleEndian(rate) +
-                             littleEndian(rate * alignment) + words({alignment, bits}));
+                             littleEndian(static_cast<quint32>(qint64(rate) * alignment)) +
+                             words({alignment, bits}));
 }
 
 [[nodiscard]] inline QByteArray wavFile(const QByteArray &chunks)
