@@ -198,7 +198,10 @@ bool DataFileAccess::addSecondText(const ValueFormat &format, QIODevice &second,
                                          "%2 Q values in the second.")
                                      .arg(m_samples)
                                      .arg(count));
-    return count < m_samples || Tracer::fail("2nd file contains more data than first file.");
+    if (count > m_samples) {
+        Tracer::Trace(Tracer::Error, "2nd file contains more data than first file.");
+    }
+    return false;
 }
 
 /// Reads lines of `columns` values each and hands them on in blocks.
