@@ -5,7 +5,6 @@
 
 #include "base/parallel.h"
 #include "dsp/Resample.h"
-#include "streams/TempStream.h"
 
 #include <benchmark/benchmark.h>
 
@@ -22,8 +21,7 @@ constexpr double Cutoff = 0.25;
     TempStream in;
     TempStream out;
     const int count = static_cast<int>(input.size());
-    if (!in.open() || !out.open() || !in->writeHeader("IQF") ||
-        !in->writeBytes(count * 8, input.data())) {
+    if (!openStreams(input, in, out)) {
         return false;
     }
     Resample resample;
@@ -41,10 +39,22 @@ constexpr double Cutoff = 0.25;
         return false;
     }
     output.resize(input.size());
-    return out->checkHeader("IQF") && out->readBytes(count * 8, output.data());
+    return readStream(out, output);
 }
 
 } // namespace
+
+bool filtercase::openStreams(const Samples &input, TempStream &in, TempStream &out)
+{
+    return in.open() && out.open() && in->writeHeader(BufferedIO::DataHeader) &&
+           in->writeBytes(static_cast<int>(8 * input.size()), input.data());
+}
+
+bool filtercase::readStream(TempStream &stream, Samples &output)
+{
+    return stream->checkHeader(BufferedIO::DataHeader) &&
+           stream->readBytes(static_cast<int>(8 * output.size()), output.data());
+}
 
 const Samples &filtercase::source()
 {
