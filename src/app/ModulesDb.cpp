@@ -46,6 +46,9 @@ QList<ToolInfo> toolTable()
     using enum ToolInfo::Selection;
     ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {});
     importData.preferredFor = {"TXT", "CSV", "DAT", "BIN", "WFM", "I", "Q"};
+    ToolInfo composer =
+        toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"});
+    composer.hasLeftWork = &DlgComposer::hasLeftWork;
     return {
         toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),
         toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}),
@@ -58,7 +61,7 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
         toolInfo<DlgFilter>("Filter", "/Edit/Filter", File, {"WV"}),
         toolInfo<DlgPolar>("To Polar", "/Edit/To Polar", File, {"WV"}),
-        toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"}),
+        composer,
         toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}),
     };
 }
@@ -162,6 +165,15 @@ bool ModulesDb::start(const ToolInfo &tool, const QString &path)
     window.raise();
     window.activateWindow();
     return true;
+}
+
+void ModulesDb::offerLeftWork(const QString &folder)
+{
+    for (const Tool &tool : m_tools) {
+        if (tool.info.hasLeftWork && tool.info.hasLeftWork()) {
+            start(tool.info, folder);
+        }
+    }
 }
 
 void ModulesDb::setSelection(const QString &path, bool local)

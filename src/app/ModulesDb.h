@@ -53,6 +53,9 @@ public:
     /// start; logged.
     bool start(const ToolInfo &tool, const QString &path);
 
+    /// Starts, with a folder, each tool that has work to offer which a crash has left.
+    void offerLeftWork(const QString &folder);
+
     /// The dialog of a tool of this registry, made now if there was none. Owned by the registry.
     [[nodiscard]] DlgBase &dialog(const ToolInfo &tool);
 

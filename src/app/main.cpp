@@ -5,6 +5,8 @@
 
 #include <QApplication>
 #include <QCommandLineParser>
+#include <QDir>
+#include <QTimer>
 
 #include <cstdio>
 
@@ -50,5 +52,7 @@ int main(int argc, char **argv)
     const auto colorStore = prepareApplication();
     auto *window = new MainWindow; // deletes itself when closed
     window->show();
+    QTimer::singleShot(0, window,
+                       [window] { window->modules().offerLeftWork(QDir::homePath() + '/'); });
     return QApplication::exec();
 }

@@ -23,6 +23,9 @@ struct ToolInfo
     /// Types, upper case, for which a tool that takes files of any type is the one to start.
     QStringList preferredFor = {};
 
+    /// Whether a crash has left work of the tool that it offers at its next start; may be empty.
+    std::function<bool()> hasLeftWork = {};
+
     /// Whether the tool is made for files of this one's type.
     [[nodiscard]] bool isMadeFor(const QString &path) const
     {

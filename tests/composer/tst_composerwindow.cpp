@@ -356,7 +356,9 @@ void tst_composerwindow::autosave()
     press("pb_addtrack");
     insert("short.wv", 0);
     QTRY_VERIFY(QFile::exists(DlgComposer::autosaveFile()));
+    QVERIFY(!DlgComposer::hasLeftWork());
     m_window.reset();
+    QVERIFY(DlgComposer::hasLeftWork());
     m_window = std::make_unique<DlgComposer>();
     m_tracks = &m_window->tracks();
     QVERIFY(withModal([this] { QVERIFY(m_window->startModule(m_folder.path() + '/')); },

@@ -412,6 +412,17 @@ QString DlgComposer::autosaveFile()
            "/composer-autosave.cms";
 }
 
+bool DlgComposer::hasLeftWork()
+{
+    if (!QFileInfo::exists(autosaveFile())) {
+        return false;
+    }
+    QLockFile lock(autosaveFile() + ".lock");
+    lock.setStaleLockTime(0);
+    // Else another window of the program keeps its changes there.
+    return lock.tryLock(0);
+}
+
 void DlgComposer::offerAutosave()
 {
     if (std::exchange(m_autosaveOffered, true)) {

@@ -34,6 +34,9 @@ public:
     /// Where unsaved changes are kept.
     [[nodiscard]] static QString autosaveFile();
 
+    /// Whether a crash has left unsaved changes, which the next start of the tool offers.
+    [[nodiscard]] static bool hasLeftWork();
+
 public slots:
     void slot_set_xcsr(qlonglong sample, double seconds);
     void slot_bufsize(int states);
