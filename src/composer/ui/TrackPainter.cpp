@@ -322,7 +322,13 @@ void TrackPainter::drawTexts(QPainter &painter, const ComposerSegment &segment,
         inner.height() < metrics.ascent()) {
         return;
     }
-    painter.setPen(m_style.color(ColorSlot::Text));
+    // An envelope may be as light as the text.
+    const auto draw = [&](const QRect &area, int alignment, const QString &text) {
+        const QRect plate = metrics.boundingRect(area, alignment, text).adjusted(-3, 0, 3, 0);
+        painter.fillRect(plate & block, m_style.color(ColorSlot::PanelBackground, 150));
+        painter.setPen(m_style.color(ColorSlot::Text));
+        painter.drawText(area, alignment, text);
+    };
     const QString marks = marksOf(segment).join(QLatin1Char(' '));
     const QString info = infoText(segment);
     const QString name = (segment.missing ? QStringLiteral("missing: ") : QString()) +
@@ -338,28 +344,29 @@ void TrackPainter::drawTexts(QPainter &painter, const ComposerSegment &segment,
     const QRect nameLine = twoLines ? line.translated(0, -metrics.height()) : line;
     int room = inner.width();
     if (markWidth > 0 && markWidth < room) {
-        painter.drawText(line, Qt::AlignRight | Qt::AlignVCenter, marks);
+        draw(line, Qt::AlignRight | Qt::AlignVCenter, marks);
         room -= markWidth + 6;
     }
     if (twoLines) {
-        painter.drawText(nameLine, Qt::AlignHCenter | Qt::AlignVCenter,
-                         metrics.elidedText(name, Qt::ElideMiddle, inner.width()));
+        draw(nameLine, Qt::AlignHCenter | Qt::AlignVCenter,
+             metrics.elidedText(name, Qt::ElideMiddle, inner.width()));
+        // Below the name, if the marks leave the room for it there.
+        const int taken = inner.width() - room;
+        const bool centred = infoWidth + 2 * taken <= inner.width();
         if (infoWidth <= room) {
-            painter.drawText(line.adjusted(0, 0, room - inner.width(), 0), Qt::AlignCenter, info);
+            draw(centred ? line : line.adjusted(0, 0, -taken, 0), Qt::AlignCenter, info);
         }
         return;
     }
     // In one line the centre belongs to the information, and the name takes what is left of it.
     if (infoWidth <= room) {
         const int left = inner.left() + (room - infoWidth) / 2;
-        painter.drawText(QRect(left, line.top(), infoWidth + 1, line.height()), Qt::AlignCenter,
-                         info);
+        draw(QRect(left, line.top(), infoWidth + 1, line.height()), Qt::AlignCenter, info);
         room = left - inner.left() - 8;
     }
     if (room > metrics.horizontalAdvance(QStringLiteral("QQQ"))) {
-        painter.drawText(QRect(inner.left(), line.top(), room, line.height()),
-                         Qt::AlignLeft | Qt::AlignVCenter,
-                         metrics.elidedText(name, Qt::ElideMiddle, room));
+        draw(QRect(inner.left(), line.top(), room, line.height()), Qt::AlignLeft | Qt::AlignVCenter,
+             metrics.elidedText(name, Qt::ElideMiddle, room));
     }
 }
 
