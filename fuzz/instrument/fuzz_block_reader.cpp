@@ -103,7 +103,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
         }
     } else {
         // Not to a disk; a device is written in place.
-        OutputFile file("/dev/null", OutputFile::Unfinished::Stays);
+        OutputFile file("/dev/null");
         const bool ok = reader.readFile("/var/user/a.wv", "a.wv", file);
         require(!ok || all.starts_with('#'));
         (void)takeErrors();

@@ -46,8 +46,7 @@ QList<ToolInfo> toolTable()
     using enum ToolInfo::Selection;
     ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {});
     importData.preferredFor = {"TXT", "CSV", "DAT", "BIN", "WFM", "I", "Q"};
-    ToolInfo composer =
-        toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"});
+    ToolInfo composer = toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"});
     composer.hasLeftWork = &DlgComposer::hasLeftWork;
     return {
         toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),

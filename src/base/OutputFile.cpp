@@ -7,9 +7,8 @@
 
 #include <utility>
 
-OutputFile::OutputFile(QString fileName, Unfinished unfinished)
+OutputFile::OutputFile(QString fileName)
     : m_fileName(std::move(fileName))
-    , m_unfinished(unfinished)
 {
 }
 
@@ -20,9 +19,9 @@ bool OutputFile::isReplaced() const
     const QFileInfo target(m_fileName);
     if (!target.exists()) {
         // The target of a link to nowhere is made where the link leads.
-        return m_unfinished == Unfinished::Vanishes && !target.isSymLink();
+        return !target.isSymLink();
     }
-    return target.isFile() && (m_unfinished == Unfinished::Vanishes || target.size() > 0);
+    return target.isFile();
 }
 
 bool OutputFile::open()

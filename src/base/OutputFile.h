@@ -8,20 +8,16 @@
 
 class QFileDevice;
 
-/// A file to be written that keeps what stood under its name until all of it is there: a file with
-/// content is replaced by commit() alone, by way of a temporary file beside it, and stays as it
+/// A file to be written that keeps what stood under its name until all of it is there: a file is
+/// replaced by commit() alone, by way of a temporary file beside it, and stays as it
 /// was when the object goes without one. It keeps its permissions, and links to it lead to the new
-/// content.
+/// content. Without a commit nothing is left of a file that was not there before.
 ///
 /// Written in place are devices and pipes, and files in a folder where nothing can be added.
 class OutputFile
 {
 public:
-    /// What an object that goes without commit() leaves of a file that was not there before, or
-    /// was empty.
-    enum class Unfinished { Stays, Vanishes };
-
-    OutputFile(QString fileName, Unfinished unfinished);
+    explicit OutputFile(QString fileName);
     ~OutputFile();
 
     OutputFile(const OutputFile &) = delete;
@@ -46,6 +42,5 @@ private:
     [[nodiscard]] bool isReplaced() const;
 
     QString m_fileName;
-    Unfinished m_unfinished;
     std::unique_ptr<QFileDevice> m_file;
 };

@@ -63,7 +63,7 @@ int runDump(DumpArguments &arguments)
     }
     DumpJob::Sink sink = [&console](const QByteArray &bytes) { return console.print(bytes); };
     // Nothing in a dump tells a cut one from a whole one.
-    OutputFile file(arguments.output, OutputFile::Unfinished::Vanishes);
+    OutputFile file(arguments.output);
     const auto cannotWrite = [&](const char *what) {
         return Tracer::fail(
             QString("Cannot %1 '%2': %3").arg(what, arguments.output, file.errorString()));

@@ -90,7 +90,7 @@ protected:
         if (!picture.save(&png, "PNG")) {
             return Tracer::fail("Cannot make the picture for '" + m_arguments.output + "'.");
         }
-        OutputFile file(m_arguments.output, OutputFile::Unfinished::Vanishes);
+        OutputFile file(m_arguments.output);
         return (file.open() && file.write(png.data()) && file.commit()) ||
                Tracer::fail("Cannot write '" + m_arguments.output + "': " + file.errorString());
     }

@@ -228,7 +228,7 @@ QByteArray Composition::toXml(const QDir &folder) const
 bool Composition::save(const QString &fileName) const
 {
     const QByteArray bytes = toXml(QFileInfo(fileName).absoluteDir());
-    OutputFile file(fileName, OutputFile::Unfinished::Vanishes);
+    OutputFile file(fileName);
     return (file.open() && file.write(bytes) && file.commit()) ||
            Tracer::fail(QStringLiteral("Cannot write '%1': %2").arg(fileName, file.errorString()));
 }

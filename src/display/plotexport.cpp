@@ -18,7 +18,7 @@ constexpr int SampleDigits = 9; ///< a 32-bit float comes back unchanged
 
 bool writeFile(const QString &fileName, const QByteArray &bytes)
 {
-    OutputFile file(fileName, OutputFile::Unfinished::Vanishes);
+    OutputFile file(fileName);
     if (file.open() && file.write(bytes) && file.commit()) {
         return true;
     }

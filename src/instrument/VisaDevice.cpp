@@ -266,8 +266,7 @@ bool VisaDevice::scanResources(QList<VisaDevice *> &found, int kind)
 
 // Transfers
 
-bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localPath,
-                                OutputFile::Unfinished unfinished)
+bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localPath)
 {
     m_parts->control.cancelled = false;
     if (!areNamed(localPath, remotePath) ||
@@ -275,7 +274,7 @@ bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localP
                             &VisaFunctions::viRead) == nullptr) {
         return false;
     }
-    OutputFile file(localPath, unfinished);
+    OutputFile file(localPath);
     return BlockReader(m_parts->session, m_parts->control).readFile(remotePath, localPath, file);
 }
 

@@ -101,11 +101,9 @@ public:
 
     // Transfers
 
-    /// Instrument to local file. After a failure a file with content is as it was before, and a new
-    /// one stays as far as it came or vanishes.
-    [[nodiscard]] bool
-    readRemoteFile(const QString &remotePath, const QString &localPath,
-                   OutputFile::Unfinished unfinished = OutputFile::Unfinished::Stays);
+    /// Instrument to local file. After a failure a file that was there is as it was before, and
+    /// none is new.
+    [[nodiscard]] bool readRemoteFile(const QString &remotePath, const QString &localPath);
     /// Local file to instrument; replaces a file there. After a failure there is none.
     [[nodiscard]] bool writeRemoteFile(const QString &localPath, const QString &remotePath);
     /// Reads the block that a command sent before has asked for, of at most `maximum` bytes; the

@@ -3,12 +3,14 @@
 
 #include "log/Tracer.h"
 
-#include <QIODevice>
+#include <QDir>
+#include <QTemporaryFile>
 
 #include <algorithm>
 #include <array>
 #include <cstring>
 #include <new>
+#include <utility>
 
 namespace {
 
@@ -60,6 +62,7 @@ bool BufferedIO::initBuf(QIODevice *device, int mode)
     }
     m_device = device;
     m_mode = mode;
+    m_failureTold = false;
     const QIODevice::OpenMode openMode = openModeOf(mode);
     if (openMode == QIODevice::NotOpen || device == nullptr) {
         if (m_debug) {
@@ -258,12 +261,39 @@ bool BufferedIO::seekForWrite()
     return m_readPosition == -1 || m_device->seek(m_writePosition);
 }
 
+/// Writes all bytes, or names the folder and the system's reason: callers know just what they
+/// wanted to write.
+bool BufferedIO::put(const char *bytes, int count)
+{
+    const auto *file = qobject_cast<const QTemporaryFile *>(m_device);
+    int done = 0;
+    while (done < count) {
+        const auto written = static_cast<int>(m_device->write(bytes + done, count - done));
+        if (written <= 0) {
+            // Buffered bytes are tried again when the stream goes.
+            if (file != nullptr && !std::exchange(m_failureTold, true)) {
+                // Asking for its own name would give it one, and it might stay after a crash.
+                Tracer::Trace(Tracer::Error,
+                              QString("Cannot write to the temporary folder '%1': %2")
+                                  .arg(QDir::tempPath(), file->errorString()));
+            }
+            return false;
+        }
+        done += written;
+        if (file == nullptr) {
+            break;
+        }
+        // A file on a full disk takes what still fits; the next write tells the reason.
+    }
+    return done == count;
+}
+
 bool BufferedIO::writeToDevice(const char *bytes, int count)
 {
     if (!completeWindow() || !seekForWrite()) {
         return false;
     }
-    if (m_device->write(bytes, count) != count) {
+    if (!put(bytes, count)) {
         if (m_debug) {
             debug(Tracer::Error, "writeBytes() : W Incorrect number of bytes written.");
         }
@@ -316,7 +346,7 @@ bool BufferedIO::flush()
     if (m_debug) {
         debug(Tracer::Debug, QString("flush() : W len=%1").arg(m_writeFill));
     }
-    return seekForWrite() && m_device->write(m_writeBuffer.get(), m_writeFill) == m_writeFill;
+    return seekForWrite() && put(m_writeBuffer.get(), m_writeFill);
 }
 
 bool BufferedIO::restartAtBegining()

@@ -100,6 +100,7 @@ private:
     [[nodiscard]] bool flush();
     [[nodiscard]] bool writeToDevice(const char *bytes, int count);
     [[nodiscard]] bool seekForWrite();
+    [[nodiscard]] bool put(const char *bytes, int count);
     [[nodiscard]] bool isUsable() const;
     void debug(int level, const QString &text) const;
 
@@ -108,6 +109,7 @@ private:
     bool m_initialised = false;
     QIODevice *m_device = nullptr;
     int m_mode = 0;
+    bool m_failureTold = false;
     std::unique_ptr<char[]> m_readBuffer;
     std::unique_ptr<char[]> m_writeBuffer;
     int m_readIndex = 0;

@@ -120,7 +120,7 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
     WvWriter writer(job, {.data = dataStream, .markers = markerStream, .tags = tagsStream},
                     progress, report);
     writer.prepareLevels();
-    OutputFile file(fileName, OutputFile::Unfinished::Stays);
+    OutputFile file(fileName);
     if (!file.open()) {
         return Tracer::fail("Error opening output file.");
     }

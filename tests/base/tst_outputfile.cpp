@@ -28,31 +28,24 @@ private:
 
 void TestOutputFile::keepsWhatStoodThere()
 {
-    // What was there, null for no file, and what is left without a commit.
-    using enum OutputFile::Unfinished;
-    forRows(
-        {{"new, stays", {}, Stays, "new"},
-         {"new, vanishes", {}, Vanishes, {}},
-         {"empty, stays", QByteArray(""), Stays, "new"},
-         {"empty, vanishes", QByteArray(""), Vanishes, QByteArray("")},
-         {"old, stays", "old one", Stays, "old one"},
-         {"old, vanishes", "old one", Vanishes, "old one"}},
-        [&](const QByteArray &before, OutputFile::Unfinished unfinished, const QByteArray &left) {
-            init();
-            const bool exists = !before.isNull();
-            QVERIFY(!exists || m_folder->store("out", before));
-            for (const bool commits : {false, true}) {
-                {
-                    OutputFile file(m_folder->path("out"), unfinished);
-                    QVERIFY(!file.isOpen());
-                    QVERIFY(file.open() && file.isOpen() && file.write(QByteArrayView("new")));
-                    QVERIFY(!commits || file.commit());
+    // What was there, null for no file.
+    forRows({{"new", QByteArray()}, {"empty", QByteArray("")}, {"old", QByteArray("old one")}},
+            [&](const QByteArray &before) {
+                init();
+                const bool exists = !before.isNull();
+                QVERIFY(!exists || m_folder->store("out", before));
+                for (const bool commits : {false, true}) {
+                    {
+                        OutputFile file(m_folder->path("out"));
+                        QVERIFY(!file.isOpen());
+                        QVERIFY(file.open() && file.isOpen() && file.write(QByteArrayView("new")));
+                        QVERIFY(!commits || file.commit());
+                    }
+                    QCOMPARE(m_folder->load("out"), commits ? QByteArray("new") : before);
+                    // Nothing is left beside it.
+                    QVERIFY(m_folder->entries().size() <= 1);
                 }
-                QCOMPARE(m_folder->load("out"), commits ? QByteArray("new") : left);
-                // Nothing is left beside it.
-                QVERIFY(m_folder->entries().size() <= 1);
-            }
-        });
+            });
 }
 
 void TestOutputFile::keepsPermissionsAndLinks()
@@ -62,7 +55,7 @@ void TestOutputFile::keepsPermissionsAndLinks()
     QVERIFY(QFile::setPermissions(m_folder->path("sub/real"), permissions));
     QVERIFY(QFile::link("sub/real", m_folder->path("near")) &&
             QFile::link("near", m_folder->path("far")));
-    OutputFile file(m_folder->path("far"), OutputFile::Unfinished::Stays);
+    OutputFile file(m_folder->path("far"));
     QVERIFY(file.open() && file.write(QByteArrayView("new")));
     QCOMPARE(m_folder->load("sub/real"), QByteArray("old"));
     QVERIFY(file.commit());
@@ -76,20 +69,17 @@ void TestOutputFile::keepsPermissionsAndLinks()
 void TestOutputFile::writesToDevices()
 {
     // Replacing it by a file would break every other program.
-    for (const auto unfinished :
-         {OutputFile::Unfinished::Stays, OutputFile::Unfinished::Vanishes}) {
-        OutputFile file("/dev/null", unfinished);
-        QVERIFY(file.open() && file.write(QByteArrayView("new")) && file.commit());
-        QVERIFY(QFileInfo::exists("/dev/null") && !QFileInfo("/dev/null").isFile());
-    }
+    OutputFile file("/dev/null");
+    QVERIFY(file.open() && file.write(QByteArrayView("new")) && file.commit());
+    QVERIFY(QFileInfo::exists("/dev/null") && !QFileInfo("/dev/null").isFile());
 }
 
 void TestOutputFile::tellsWhy()
 {
-    OutputFile nowhere(m_folder->path("none/out"), OutputFile::Unfinished::Vanishes);
+    OutputFile nowhere(m_folder->path("none/out"));
     QVERIFY(!nowhere.open());
     QCOMPARE(nowhere.errorString(), QString("No such file or directory"));
-    OutputFile full("/dev/full", OutputFile::Unfinished::Stays);
+    OutputFile full("/dev/full");
     QVERIFY(full.open() && !full.write(QByteArrayView("new")));
     QCOMPARE(full.errorString(), QString("No space left on device"));
 }

@@ -100,14 +100,14 @@ void TestBlockTransfer::readFile()
           good,
           {-1, -1, 1, 1, 1, 1},
           false,
-          "he\n",
+          "",
           {"4 viRead(): Binary data transfer incomplete.", received, "4 1 bytes received.",
            "4 ERROR: status 0"}},
          {"short block",
           "#15he",
           {},
           false,
-          "he",
+          "",
           {"4 Reading binary data block failed.", "4 2 bytes already received.",
            "4 3 bytes remaining.", timeoutReport}}},
         [&](const Row &row) {
@@ -185,7 +185,7 @@ void TestBlockTransfer::fetchKeepsOldFile()
         return message.rfind(":MMEM:DATA?", 0) == 0 ? answer : std::string();
     };
     QVERIFY(store(local(), "old"));
-    QVERIFY(!m_device->readRemoteFile(remoteName, local(), OutputFile::Unfinished::Vanishes));
+    QVERIFY(!m_device->readRemoteFile(remoteName, local()));
     QCOMPARE(load(local()), "old");
     QCOMPARE(QDir(m_folder.path()).entryList(QDir::Files), QStringList{"local"});
     answer = "#15hello\n";

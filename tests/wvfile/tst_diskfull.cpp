@@ -130,12 +130,8 @@ void TestDiskFull::writingAFile()
                 QVERIFY(!HvFileIO().writeWaveform(job, path, nullptr, nullptr, nullptr));
                 QCOMPARE(log.take(Tracer::Error),
                          QStringList("4|Error writing output file: No space left on device"));
-                if (before.isEmpty()) {
-                    QVERIFY2(QFileInfo(path).size() <= freeBytes, "what fitted stays");
-                } else {
-                    QCOMPARE(load(path), before);
-                }
-                QVERIFY(QFile::remove(path));
+                QVERIFY(before.isEmpty() ? !QFile::exists(path)
+                                         : load(path) == before && QFile::remove(path));
                 QVERIFY2(QFile::remove(filler), "and nothing else");
             });
 }
@@ -172,7 +168,13 @@ void TestDiskFull::readingIntoStreams()
                     info.tagsStream = tags.stream();
                     QVERIFY(!HvFileIO().readWaveform(&info));
                 }
-                QCOMPARE(log.take(Tracer::Error), words);
+                // Each stream says so, some when they go.
+                const QString reason = "4|Cannot write to the temporary folder '" + m_disk +
+                                       "': No space left on device";
+                QStringList errors = log.take(Tracer::Error);
+                QCOMPARE(errors.value(0), reason);
+                errors.removeAll(reason);
+                QCOMPARE(errors, words);
                 QCOMPARE(freeBytes(), m_freeAtStart);
                 QVERIFY(source.remove());
             });

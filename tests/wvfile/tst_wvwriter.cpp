@@ -199,7 +199,6 @@ void TestWvWriter::failures()
     WriteRun markers;
     QVERIFY(!markers.write(job, nullptr, few.stream()));
     QVERIFY(markers.log.contains("4|Error reading marker data from temporary file."));
-    QVERIFY2(markers.bytes.contains("{SAMPLES:2}"), "the part so far stays");
     Filled unreadable("ab");
     unreadable.device().canSeek = false;
     WriteRun tags;
@@ -294,10 +293,8 @@ void TestWvWriter::cancelSparesWhatStoodThere()
         CapturedLog log;
         QVERIFY(!io.writeWaveform(job, folder.path("out.wv"), &data, nullptr, nullptr));
         QCOMPARE(log.take().last(), QString("4|Action aborted by user."));
-        QCOMPARE(folder.entries(), QStringList("out.wv"));
-        const QByteArray left = folder.load("out.wv");
-        // Without an old file the part so far stays.
-        QVERIFY(before.isNull() ? !left.isEmpty() && left.size() < 4 * samples : left == before);
+        QCOMPARE(folder.entries().size(), before.isNull() ? 0 : 1);
+        QCOMPARE(folder.load("out.wv"), before);
     }
 }
 

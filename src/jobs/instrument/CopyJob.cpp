@@ -252,10 +252,7 @@ bool CopyJob::fetch(const QString &remote, const QString &local)
         QString("Reading file %1\nfrom instrument %2").arg(entryName(remote), deviceName(*device));
     return transfer(device, label, "Reading file from instrument failed.", [&] {
         const QString source = nativePathOn(*device, remote);
-        // A file on its way to an instrument replaces nothing here.
-        return device->readRemoteFile(source, local,
-                                      m_request.targetDevice ? OutputFile::Unfinished::Stays
-                                                             : OutputFile::Unfinished::Vanishes);
+        return device->readRemoteFile(source, local);
     });
 }
 
