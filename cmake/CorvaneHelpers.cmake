@@ -13,7 +13,9 @@ set(CMAKE_LIBRARY_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/bin")
 
 find_program(CCACHE_PROGRAM ccache)
 if(CCACHE_PROGRAM)
-  set(CMAKE_CXX_COMPILER_LAUNCHER "${CCACHE_PROGRAM}")
+  # It takes precompiled headers only if told that these settle what a file defines.
+  set(CMAKE_CXX_COMPILER_LAUNCHER
+    "${CMAKE_COMMAND}" -E env CCACHE_SLOPPINESS=pch_defines,time_macros "${CCACHE_PROGRAM}")
   set(CMAKE_C_COMPILER_LAUNCHER "${CCACHE_PROGRAM}")
 endif()
 
@@ -69,12 +71,57 @@ function(corvane_end_configuration)
   file(WRITE "${configuration_marker}" "tests=${CORVANE_TESTS}\n")
 endfunction()
 
+# Parsing the headers of Qt takes most of a compilation. Object libraries hold them ready: for
+# what works without a window, for windows, and for the command line. A target that uses one compiles
+# with the flags of that library.
+option(CORVANE_PCH "Precompile the headers of Qt and of the standard library" ON)
+
+function(corvane_precompile_headers)
+  if(NOT CORVANE_PCH)
+    return()
+  endif()
+  set(core <algorithm> <array> <atomic> <chrono> <cmath> <complex> <functional> <map> <memory>
+    <optional> <span> <string> <string_view> <thread> <vector>
+    <QByteArray> <QCoreApplication> <QDir> <QFile> <QFileInfo> <QJsonArray> <QJsonDocument>
+    <QJsonObject> <QList> <QMutex> <QObject> <QRegularExpression> <QSettings> <QString>
+    <QStringList> <QTextStream> <QThread> <QTimer> <QVariant>)
+  set(window <QAction> <QApplication> <QBoxLayout> <QButtonGroup> <QCheckBox> <QComboBox> <QDialog>
+    <QFileDialog> <QFormLayout> <QGridLayout> <QGroupBox> <QHeaderView> <QImage> <QKeyEvent> <QLabel>
+    <QLineEdit> <QMenu> <QMessageBox> <QPainter> <QPlainTextEdit> <QPushButton> <QRadioButton>
+    <QStackedWidget> <QTableWidget> <QToolButton> <QTreeWidget>)
+  set(empty "${CMAKE_BINARY_DIR}/empty.cpp")
+  file(WRITE "${empty}" "")
+  foreach(kind IN ITEMS core window commands)
+    add_library(corvane_headers_${kind} OBJECT EXCLUDE_FROM_ALL "${empty}")
+    target_link_libraries(corvane_headers_${kind} PRIVATE Qt6::Core corvane_settings)
+    target_precompile_headers(corvane_headers_${kind} PRIVATE ${core})
+    if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+      target_compile_options(corvane_headers_${kind} PRIVATE -fpch-preprocess)
+    endif()
+  endforeach()
+  target_link_libraries(corvane_headers_window PRIVATE Qt6::Widgets)
+  target_precompile_headers(corvane_headers_window PRIVATE ${window})
+  target_precompile_headers(corvane_headers_commands PRIVATE <CLI/CLI.hpp>)
+endfunction()
+
+# corvane_use_headers(NAME core|window|commands): compiles a target with precompiled headers, if they are on.
+function(corvane_use_headers name kind)
+  if(TARGET corvane_headers_${kind})
+    target_precompile_headers(${name} REUSE_FROM corvane_headers_${kind})
+    if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+      target_compile_options(${name} PRIVATE -fpch-preprocess)
+    endif()
+  endif()
+endfunction()
+
 # corvane_add_folders(TABLE): adds the folders of a table, those that are there, in its order.
 function(corvane_add_folders table)
   set_property(DIRECTORY APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS "${table}")
   file(STRINGS "${table}" lines REGEX "^[^#]")
   foreach(line IN LISTS lines)
-    string(REGEX REPLACE " .*" "" folder "${line}")
+    string(REGEX MATCH "^[^ ]+" folder "${line}")
+    # corvane_add_library reads the kind.
+    string(REGEX MATCH "[a-z]+$" corvane_folder_kind "${line}")
     if(EXISTS "${CMAKE_CURRENT_SOURCE_DIR}/${folder}/CMakeLists.txt")
       add_subdirectory(${folder})
     endif()
@@ -98,6 +145,7 @@ function(corvane_add_library name)
   set_target_properties(${name} PROPERTIES AUTOMOC ON AUTOUIC ON AUTORCC ON)
   target_include_directories(${name} PUBLIC "${CMAKE_SOURCE_DIR}/src")
   target_link_libraries(${name} PUBLIC ${arg_LINK} PRIVATE corvane_settings)
+  corvane_use_headers(${name} ${corvane_folder_kind})
 endfunction()
 
 # corvane_add_program(NAME SOURCES ... LINK ...): an executable in the build's bin folder.
@@ -117,10 +165,13 @@ endfunction()
 function(corvane_add_test name)
   cmake_parse_arguments(arg "THREADED" "LABEL" "SOURCES;LINK;ENVIRONMENT" ${ARGN})
   set(support corvane_test_support)
+  set(headers core)
   if(arg_LABEL STREQUAL "gui")
     list(PREPEND support corvane_test_windows)
+    set(headers window)
   endif()
   corvane_add_program(${name} SOURCES ${arg_SOURCES} LINK ${arg_LINK} ${support} Qt6::Test)
+  corvane_use_headers(${name} ${headers})
   target_include_directories(${name} PRIVATE "${CMAKE_SOURCE_DIR}/tests")
   set_target_properties(${name} PROPERTIES RUNTIME_OUTPUT_DIRECTORY "${CMAKE_BINARY_DIR}/tests")
   add_test(NAME ${name} COMMAND ${name})
