@@ -13,8 +13,10 @@
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
 #include "tools/DlgFilter.h"
+#include "tools/DlgMarker.h"
 #include "tools/DlgPolar.h"
 #include "tools/DlgResample.h"
+#include "tools/DlgRescale.h"
 #include "tools/DlgView.h"
 #include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
@@ -59,6 +61,8 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
         toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
         toolInfo<DlgFilter>("Filter", "/Edit/Filter", File, {"WV"}),
+        toolInfo<DlgRescale>("Level", "/Edit/Level", File, {"WV"}),
+        toolInfo<DlgMarker>("Edit Markers", "/Edit/Markers", File, {"WV"}),
         toolInfo<DlgPolar>("To Polar", "/Edit/To Polar", File, {"WV"}),
         composer,
         toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}),

@@ -64,6 +64,18 @@ void CWidgetIQTrace::setCursor(int which, int sample)
     update();
 }
 
+void CWidgetIQTrace::setRange(qint64 first, qint64 last)
+{
+    const qint64 count = m_samples.size();
+    if (first < count && last >= 0 && first <= last) {
+        m_scene.rangeBins = {binOf(std::max<qint64>(first, 0), count),
+                             binOf(std::min(last, count - 1), count)};
+    } else {
+        m_scene.rangeBins = {-1, -1};
+    }
+    update();
+}
+
 void CWidgetIQTrace::setShowMarkers(bool show)
 {
     m_scene.showMarkers = show;
@@ -88,6 +100,7 @@ void CWidgetIQTrace::clear()
     m_scene.bins.clear();
     m_scene.mouseBin = -1;
     m_scene.cursorBins = {-1, -1};
+    m_scene.rangeBins = {-1, -1};
 }
 
 void CWidgetIQTrace::zoomInY()

@@ -28,6 +28,10 @@ public:
     void setCursor(int which, int sample);
     using QWidget::setCursor;
 
+    /// Marks the samples from `first` to `last`, both included, as far as they lie in the data;
+    /// none if they don't.
+    void setRange(qint64 first, qint64 last);
+
     void setShowMarkers(bool show);
     /// Clock rate in Hz, so that the axis shows time; 0 shows samples.
     void setClock(double hz);

@@ -170,6 +170,7 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
     if (plot.width() > 0 && plot.height() > 0) {
         const PixelGrid grid(painter);
         const QList<QRectF> rects = panes(plot);
+        paintRange(painter, plot);
         const qsizetype valuePanes = rects.size() - (m_scene.showMarkers ? 1 : 0);
         for (qsizetype k = 0; k < rects.size(); ++k) {
             QList<Label> texts = labels();
@@ -345,6 +346,18 @@ void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const
             grid.horizontal(level == 1 ? highY : lowY, lineStart, plot.right(), color);
         }
     }
+}
+
+void TracePainter::paintRange(QPainter &painter, const QRectF &plot) const
+{
+    const auto [first, last] = m_scene.rangeBins;
+    if (first < 0) {
+        return;
+    }
+    const double left = xOf(plot, first);
+    const double right = std::max(xOf(plot, last), left + 1);
+    fillArea(painter, QRectF(left, plot.top(), right - left, plot.height()),
+             m_style.color(ColorSlot::PeakTrace, 50));
 }
 
 void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,

@@ -36,6 +36,7 @@ struct TraceScene
     double zoomY = 1;   ///< magnifies the value axis: about zero, for the log modes about 0 dB
     int mouseBin = -1;  ///< bin numbers of the cursors, -1 for none
     std::array<int, 2> cursorBins{-1, -1}; ///< the measuring and the reference cursor
+    std::array<int, 2> rangeBins{-1, -1};  ///< first and last of a range to be marked
 };
 
 /// Draws a scene into any painter: one or two value panes and, if wanted, the pane of the four
@@ -76,6 +77,7 @@ private:
     void paintPaneOfMode(QPainter &painter, const QRectF &plot, const QRectF &pane,
                          int index) const;
     void paintMarkers(const PixelGrid &grid, const QRectF &plot, const QRectF &pane) const;
+    void paintRange(QPainter &painter, const QRectF &plot) const;
     void paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,
                       const QList<QRectF> &panes) const;
     void paintCaptions(QPainter &painter, const QRectF &plot, const QList<QRectF> &panes) const;

@@ -65,6 +65,22 @@ bool MarkerJob::edit()
     return true;
 }
 
+MarkerPreviewJob::MarkerPreviewJob(SourceWaveform &source, BufferedIO &target,
+                                   QList<MarkerEdit> edits, QObject *parent)
+    : ToolJob(parent)
+    , m_source(source)
+    , m_target(target)
+    , m_edits(std::move(edits))
+{
+}
+
+bool MarkerPreviewJob::work()
+{
+    MarkerEditor editor;
+    const JobStep step(*this, "Changing Markers...", editor);
+    return editor.run(*m_source.markers(), m_target, m_source.info().samples, m_edits);
+}
+
 bool MarkerEditor::run(BufferedIO &source, BufferedIO &target, qint64 samples,
                        const QList<MarkerEdit> &edits)
 {

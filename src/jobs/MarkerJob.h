@@ -33,6 +33,25 @@ private:
     TempStream m_markers;
 };
 
+/// Shows what edits make of the markers of a waveform that a tool has read: they go to a stream of
+/// their own.
+class MarkerPreviewJob : public ToolJob
+{
+    Q_OBJECT
+
+public:
+    /// Waveform and target outlive the job; the ranges are in order and lie in the waveform.
+    MarkerPreviewJob(SourceWaveform &source, BufferedIO &target, QList<MarkerEdit> edits,
+                     QObject *parent = nullptr);
+
+private:
+    [[nodiscard]] bool work() override;
+
+    SourceWaveform &m_source;
+    BufferedIO &m_target;
+    QList<MarkerEdit> m_edits;
+};
+
 /// Copies the marker bytes of `samples` samples from one stream to another and applies edits, whose
 /// ranges are in order and lie in the waveform, on the way. The target holds them from its start.
 class MarkerEditor : public QObject

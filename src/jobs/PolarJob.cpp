@@ -6,6 +6,8 @@
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
 
+#include <QFileInfo>
+
 #include <utility>
 
 QString PolarRequest::levelProblem() const
@@ -32,6 +34,10 @@ QString PolarJob::refusal() const
     }
     if (m_request.amplitude.fileName.isEmpty()) {
         return "Output file name for amplitude is empty.";
+    }
+    if (QFileInfo(m_request.phase.fileName) == QFileInfo(m_request.amplitude.fileName)) {
+        return QString("The files for phase and amplitude are the same: \"%1\".")
+            .arg(m_request.phase.fileName);
     }
     return {};
 }

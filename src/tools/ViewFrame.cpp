@@ -114,14 +114,21 @@ void ViewFrame::clear()
     m_window.release();
     m_clockHz = 0;
     m_cursors.fill(NoSample);
+    m_range.fill(NoSample);
     m_trace->clear();
     m_timeline->setWaveform(0, 0);
     placeCursors();
 }
 
-void ViewFrame::reload()
+void ViewFrame::setRange(qint64 first, qint64 last)
 {
-    m_window.invalidate();
+    m_range = {first, last};
+    placeCursors();
+}
+
+void ViewFrame::showMarkers(BufferedIO *markerStream)
+{
+    m_window.setMarkers(markerStream);
     if (!isEmpty() && m_window.show(m_window.first())) {
         refresh();
     }
@@ -147,6 +154,7 @@ void ViewFrame::placeCursors()
         m_trace->setCursor(which, visible ? static_cast<int>(sample - first) : -1);
         m_timeline->setCursor(which, sample);
     }
+    m_trace->setRange(m_range[0] - first, m_range[1] - first);
 }
 
 void ViewFrame::hideEvent(QHideEvent *event)

@@ -35,8 +35,12 @@ public:
                                    double clockHz);
     void clear();
 
-    /// Reads the shown samples and markers anew, after their streams were written.
-    void reload();
+    /// Shows the markers of another stream, or those of the same one after it was written, with
+    /// the window where it is.
+    void showMarkers(BufferedIO *markerStream);
+
+    /// Marks the samples from `first` to `last`, both included.
+    void setRange(qint64 first, qint64 last);
 
     /// Places a widget between trace and overview bar, for displays that follow the window.
     void addPlots(QWidget *plots);
@@ -107,5 +111,6 @@ private:
     PlayInterval m_playInterval;
     double m_clockHz = 0;
     std::array<qint64, 2> m_cursors{NoSample, NoSample};
+    std::array<qint64, 2> m_range{NoSample, NoSample};
     bool m_resumePlayback = false;
 };

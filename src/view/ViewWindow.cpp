@@ -18,6 +18,12 @@ void ViewWindow::setSource(BufferedIO *data, BufferedIO *markers, qint64 sampleC
     invalidate();
 }
 
+void ViewWindow::setMarkers(BufferedIO *markers)
+{
+    m_markerStream = markers;
+    invalidate();
+}
+
 void ViewWindow::invalidate()
 {
     m_samples.clear();

@@ -28,6 +28,9 @@ public:
     /// invalidate must follow when they were written.
     void setSource(BufferedIO *data, BufferedIO *markers, qint64 sampleCount);
 
+    /// Takes the markers from another stream, with the window where it is.
+    void setMarkers(BufferedIO *markers);
+
     /// Forgets source and samples.
     void release() { setSource(nullptr, nullptr, 0); }
 

@@ -7,15 +7,21 @@
 
 #include "display/QtNumericEdit.h"
 #include "tools/DlgFilter.h"
+#include "tools/DlgMarker.h"
 #include "tools/DlgPolar.h"
 #include "tools/DlgResample.h"
+#include "tools/DlgRescale.h"
 #include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
+#include "tools/ViewFrame.h"
 
 #include <QComboBox>
+#include <QLabel>
+#include <QLineEdit>
 #include <QTest>
 #include <QTextEdit>
 
+#include <cmath>
 #include <functional>
 
 using namespace toolwindow;
@@ -41,6 +47,8 @@ private slots:
     void create();
     void resample();
     void edits();
+    void markers();
+    void levels();
 
 private:
     /// Runs a command that writes "command.wv", and compares that with "dialog.wv", but for the
@@ -57,6 +65,13 @@ private:
         QVERIFY(!undated("dialog.wv").isEmpty());
         QVERIFY(undated("dialog.wv") == undated("command.wv"));
         QVERIFY(QFile::remove(m_folder.path("dialog.wv")));
+    }
+
+    /// Of a tool that names its file itself.
+    [[nodiscard]] bool takeFile(const QString &name) const
+    {
+        QFile::remove(m_folder.path("dialog.wv"));
+        return QFile::rename(m_folder.path(name), m_folder.path("dialog.wv"));
     }
 
     TestFolder m_folder;
@@ -149,6 +164,90 @@ void TestDialogAndCommand::edits()
     QVERIFY(sampleWords(m_folder.load("amplitude.wv")) == sampleWords(m_folder.load("a.wv")));
     QCOMPARE(tag(m_folder.load("amplitude.wv"), "LEVEL OFFS"),
              tag(m_folder.load("a.wv"), "LEVEL OFFS"));
+}
+
+void TestDialogAndCommand::markers()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4321)));
+    DlgMarker dialog;
+    dialog.resize(960, 700);
+    QVERIFY(dialog.startModule(m_folder.path("tone.wv")));
+    dialog.show();
+    const auto apply = [&](const QString &marker, const QString &action, const QString &first,
+                           const QString &last) {
+        type(child<QtNumericEdit>(dialog, "le_mkrpos_1"), first);
+        type(child<QtNumericEdit>(dialog, "le_mkrpos_2"), last);
+        child<QComboBox>(dialog, "cb_markers")->setCurrentText(marker);
+        child<QComboBox>(dialog, "cb_maction")->setCurrentText(action);
+        click(dialog, "pb_apply");
+    };
+    const auto shown = [&](qsizetype from, qsizetype count) {
+        QByteArray bytes;
+        for (const quint8 marker :
+             child<ViewFrame>(dialog, "w_view")->window().markers().mid(from, count)) {
+            bytes += static_cast<char>('0' + marker);
+        }
+        return bytes;
+    };
+    QCOMPARE(shown(0, 8), "11111111");
+    apply("M 3", "Toggle 1010...", "8", "2");
+    QCOMPARE(shown(0, 9), "151515151");
+    apply("M 1", "Pattern", "1", "7");
+    QCOMPARE(shown(0, 9), "151515151"); // no pattern yet
+    type(child<QLineEdit>(dialog, "le_pattern"), "1x10");
+    apply("M 1", "Pattern", "1", "7");
+    QCOMPARE(shown(0, 9), "150514151");
+    apply("M 1", "Low", "1", "4321");
+    keepPicture(dialog, "markers");
+    click(dialog, "rb_before");
+    QCOMPARE(shown(0, 9), "111111111");
+    click(dialog, "rb_after");
+    QCOMPARE(shown(0, 9), "040404040");
+    click(dialog, "pb_undo");
+    QCOMPARE(shown(0, 9), "150514151");
+    click(dialog, "pb_run");
+    QVERIFY(takeFile("tone_mkr.wv"));
+    compareWith({"markers", "tone.wv",  "--marker", "3",        "--from",    "2",      "--to",
+                 "8",       "--action", "toggle",   "--marker", "1",         "--from", "1",
+                 "--to",    "7",        "--action", "pattern",  "--pattern", "110"});
+}
+
+void TestDialogAndCommand::levels()
+{
+    // 1000 samples at half of full scale, then 3000 at a quarter.
+    const QByteArray half = words(QList<int>{16384, 0}).repeated(1000);
+    const QByteArray quarter = words(QList<int>{8192, 0}).repeated(3000);
+    QVERIFY(m_folder.store("steps.wv", wvFile("{TYPE:TGX-WV, 0}{CLOCK:1000000}{SAMPLES:4000}"
+                                              "{LEVEL OFFS:7.5,6}",
+                                              half + quarter)));
+    DlgRescale dialog;
+    QVERIFY(dialog.startModule(m_folder.path("steps.wv")));
+    dialog.resize(960, 700);
+    dialog.show();
+    auto *peak = child<QtNumericEdit>(dialog, "le_peak");
+    auto *crest = child<QtNumericEdit>(dialog, "le_pkrms");
+    auto *warning = child<QLabel>(dialog, "l_warn");
+    const double fullRms = 20 * std::log10(1 / std::sqrt((0.25 + 3 * 0.0625) / 4));
+    QVERIFY(std::abs(peak->getVal() + 6.0206) < 1e-3);
+    QVERIFY(std::abs(crest->getVal() - (fullRms - 6.0206)) < 1e-3);
+    QVERIFY(warning->text().isEmpty());
+    // Samples 1001 to 4000, in either order.
+    type(child<QtNumericEdit>(dialog, "le_mkrpostime_1"), "4m");
+    type(child<QtNumericEdit>(dialog, "le_mkrpos_2"), "1001");
+    QCOMPARE(child<QtNumericEdit>(dialog, "le_mkrpos_1")->getValInt(), 4000);
+    click(dialog, "pb_update");
+    QCOMPARE(peak->getVal(), -6.0);
+    QVERIFY(std::abs(crest->getVal() - (12.0412 - 7.5)) < 1e-3);
+    QVERIFY(warning->text().startsWith("Warning: The crest factor"));
+    type(crest, "-1");
+    QVERIFY(warning->text().contains("below 0 dB"));
+    keepPicture(dialog, "level");
+    type(peak, "-3");
+    type(crest, "2.5");
+    click(dialog, "pb_run");
+    QVERIFY(takeFile("steps_rescale.wv"));
+    QCOMPARE(tag(m_folder.load("dialog.wv"), "LEVEL OFFS"), "5.500000,3.000000");
+    compareWith({"level", "steps.wv", "--peak", "-3", "--pkrms", "2.5"});
 }
 
 QTEST_MAIN(TestDialogAndCommand)
