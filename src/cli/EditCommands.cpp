@@ -81,7 +81,8 @@ void addEditCommands(CommandSet &commands)
     addText(command, "file", level->request.inputFile, "Waveform file to read")->required();
     const NumberRange range{"dB", LevelRequest::MinDb, LevelRequest::MaxDb};
     addNumber(command, "--peak", level->request.peakDb, range,
-              "Peak level; negative values decrease the level");
-    addNumber(command, "--pkrms", level->request.peakToRmsDb, range, "Peak to RMS ratio");
+              "Peak level; negative values decrease the level (default: as measured)");
+    addNumber(command, "--pkrms", level->request.peakToRmsDb, range,
+              "Peak to RMS ratio (default: as measured)");
     addOutputArguments(command, level->output);
 }

@@ -13,9 +13,13 @@ struct LevelRequest
 
     QString inputFile;
     OutputOptions output;
-    std::optional<double> peakDb;      ///< level of the peak; nothing: that of the source's tag
-    std::optional<double> peakToRmsDb; ///< nothing: from the source's tag and its samples
+    std::optional<double> peakDb;      ///< level of the peak; nothing: as measured
+    std::optional<double> peakToRmsDb; ///< crest factor; nothing: as measured
 };
+
+/// Why a crest factor in dB shouldn't be written for samples with the measured one, as a sentence;
+/// empty if it may. An instrument sets the RMS level of its output by it.
+[[nodiscard]] QString crestProblem(double wantedDb, double measuredDb);
 
 /// Copies a waveform with new level tags; its samples stay as they are. The samples keep their
 /// length and clock, so unknown tags come along.
@@ -28,8 +32,6 @@ public:
 
 private:
     [[nodiscard]] bool edit() override;
-    [[nodiscard]] bool defaultPeakToRms(double &peakToRmsDb);
-    [[nodiscard]] bool write(double peakDb, double peakToRmsDb);
 
     LevelRequest m_request;
 };

@@ -6,6 +6,7 @@
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
 
+#include <QDir>
 #include <QFileInfo>
 
 #include <utility>
@@ -35,7 +36,9 @@ QString PolarJob::refusal() const
     if (m_request.amplitude.fileName.isEmpty()) {
         return "Output file name for amplitude is empty.";
     }
-    if (QFileInfo(m_request.phase.fileName) == QFileInfo(m_request.amplitude.fileName)) {
+    // Neither is there yet, which leaves no more than the names to be compared.
+    if (QDir::cleanPath(QFileInfo(m_request.phase.fileName).absoluteFilePath()) ==
+        QDir::cleanPath(QFileInfo(m_request.amplitude.fileName).absoluteFilePath())) {
         return QString("The files for phase and amplitude are the same: \"%1\".")
             .arg(m_request.phase.fileName);
     }

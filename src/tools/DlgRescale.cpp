@@ -12,8 +12,6 @@
 #include <QLabel>
 #include <QPushButton>
 
-#include <cmath>
-
 namespace {
 
 QLabel *makeValue(const char *name)
@@ -163,23 +161,11 @@ void DlgRescale::slot_update()
     checkCrest();
 }
 
-/// An instrument takes the RMS level from the tags: a wrong crest factor is a wrong level at its
-/// output.
 void DlgRescale::checkCrest()
 {
-    constexpr double ToleranceDb = 0.1;
     const WvFileInfo &info = source()->info();
-    const double measured = info.rmsOffset - info.peakOffset;
-    const double written = le_pkrms->getVal();
-    QString warning;
-    if (written < 0) {
-        warning = QString("A crest factor of %1 is below 0 dB, which no signal has.")
-                      .arg(levelText(written));
-    } else if (std::fabs(written - measured) > ToleranceDb) {
-        warning = QString("The crest factor to be written, %1, isn't that of the samples, %2.")
-                      .arg(levelText(written), levelText(measured));
-    }
-    l_warn->setText(warning.isEmpty() ? warning : "Warning: " + warning);
+    const QString problem = crestProblem(le_pkrms->getVal(), info.rmsOffset - info.peakOffset);
+    l_warn->setText(problem.isEmpty() ? problem : "Warning: " + problem);
 }
 
 std::unique_ptr<EditJob> DlgRescale::makeJob(const QString &inputFile,

@@ -211,7 +211,7 @@ void TestJobs::cancelKeepsLaterStepsFromStarting()
         m_folder.store("in.wav", wavFile(formatChunk() + chunk("data", QByteArray(400, '\1')))));
     // The step in which the wish comes, none for one before the run, and the steps that begin.
     forRows({{"level, before", true, "", 0},
-             {"level, measuring", true, "Calculating...", 2},
+             {"level, reading", true, "Reading Waveform...", 1},
              {"import, before", false, "", 1},
              {"import, reading", false, "Reading WAV-File Data...", 1},
              {"import, scaling", false, "Rescaling...", 3}},
