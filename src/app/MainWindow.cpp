@@ -21,6 +21,7 @@
 #include <QPointer>
 #include <QShortcut>
 #include <QSignalBlocker>
+#include <QStatusTipEvent>
 
 namespace {
 
@@ -149,6 +150,7 @@ void MainWindow::connectPane(Pane &pane)
     connect(pane.tree, &QCustomTreeView::remoteDefaultFolderSet, this,
             &MainWindow::slot_remoteDefaultFolderSet);
     connect(pane.tree, &QCustomTreeView::itemSelected, this, &MainWindow::slot_itemSelected);
+    connect(pane.tree, &QCustomTreeView::selectionLost, this, &MainWindow::slot_selectionLost);
     connect(pane.tree, &QCustomTreeView::otherPaneRequested, this,
             [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
     connect(pane.history, &QComboBox::currentTextChanged, this, &MainWindow::slot_set_item);
@@ -167,7 +169,9 @@ void MainWindow::TraceDataAvailable()
         while (m_ui->lw_log->count() >= MaxLogLines) {
             delete m_ui->lw_log->takeItem(0);
         }
-        new QListWidgetItem(levelIcon(level), text, m_ui->lw_log);
+        // All rows have the height of one line.
+        auto *row = new QListWidgetItem(levelIcon(level), text.simplified(), m_ui->lw_log);
+        row->setToolTip(text);
     }
     m_ui->lw_log->scrollToBottom();
 }
@@ -175,6 +179,16 @@ void MainWindow::TraceDataAvailable()
 void MainWindow::errMsg(const QString &sTxt)
 {
     statusBar()->showMessage(sTxt);
+}
+
+bool MainWindow::event(QEvent *event)
+{
+    // An opened menu without a tip of its own leaves the last message.
+    if (event->type() == QEvent::StatusTip &&
+        static_cast<QStatusTipEvent *>(event)->tip().isEmpty()) {
+        return true;
+    }
+    return QMainWindow::event(event);
 }
 
 void MainWindow::menu_about()
@@ -199,6 +213,7 @@ void MainWindow::slot_infoTextAvailable(const QString &sInfoText)
 void MainWindow::slot_localDefaultFolderSet(const QString &sDefaultFolder)
 {
     m_locPath = sDefaultFolder;
+    m_absentLocPath.clear();
     Tracer::Trace(Tracer::Information,
                   QString("Set local default folder '%1'").arg(sDefaultFolder));
 }
@@ -220,10 +235,25 @@ void MainWindow::slot_itemSelected(const QString &sItem)
     markActive(pane);
 }
 
+/// The filter has hidden what was selected: no tool may run on it unseen.
+void MainWindow::slot_selectionLost()
+{
+    const Pane &pane = paneOf(sender());
+    if (m_activePane == &pane) {
+        m_modules.setSelection({}, pane.tree->isLocal());
+    }
+}
+
 void MainWindow::slot_set_item(const QString &sItem)
 {
     const Pane &pane = paneOf(sender());
     pane.tree->updateAndExpandTree(sItem);
+    if (const QString shown = pane.tree->currentPath(); shown != sItem) {
+        // What is gone leaves the list, which names again what the tree shows.
+        const QSignalBlocker blocker(pane.history);
+        pane.history->removeItem(pane.history->findText(sItem));
+        pane.history->setCurrentIndex(pane.history->findText(shown));
+    }
     markActive(pane);
 }
 
@@ -256,6 +286,10 @@ void MainWindow::loadSettings()
     readSplitter(*settings, "h", *m_ui->sp_h);
     m_locPath = settings->value("locpath", QDir::homePath()).toString();
     if (!QFileInfo::exists(m_locPath)) {
+        // It may lie on a share or a stick that will be there the next time.
+        m_absentLocPath = m_locPath;
+        Tracer::Trace(Tracer::Warning,
+                      QString("The local default folder '%1' is not there.").arg(m_locPath));
         m_locPath = QDir::homePath();
     }
     for (int pane = 0; pane < 2; ++pane) {
@@ -271,7 +305,7 @@ void MainWindow::saveSettings()
     writeWindowPlace(*settings, *this);
     writeSplitter(*settings, "v", *m_ui->sp_dev);
     writeSplitter(*settings, "h", *m_ui->sp_h);
-    settings->setValue("locpath", m_locPath);
+    settings->setValue("locpath", m_absentLocPath.isEmpty() ? m_locPath : m_absentLocPath);
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->writeSettings(*settings, pane + 1);
     }
@@ -320,6 +354,7 @@ bool MainWindow::mayClose()
 
 void MainWindow::hideEvent(QHideEvent *event)
 {
+    m_showsInstrConfig = m_instrConfig->isVisible();
     m_instrConfig->hide();
     m_modules.hideAll();
     QMainWindow::hideEvent(event);
@@ -329,4 +364,7 @@ void MainWindow::showEvent(QShowEvent *event)
 {
     QMainWindow::showEvent(event);
     m_modules.showAgain();
+    if (m_showsInstrConfig) {
+        m_instrConfig->show();
+    }
 }

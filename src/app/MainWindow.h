@@ -39,6 +39,7 @@ public:
     [[nodiscard]] ModulesDb &modules() { return m_modules; }
 
 protected:
+    bool event(QEvent *event) override;
     void closeEvent(QCloseEvent *event) override;
     void hideEvent(QHideEvent *event) override;
     void showEvent(QShowEvent *event) override;
@@ -54,6 +55,7 @@ private slots:
     void slot_infoTextAvailable(const QString &sInfoText);
     void slot_localDefaultFolderSet(const QString &sDefaultFolder);
     void slot_remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
+    void slot_selectionLost();
     void slot_itemSelected(const QString &sItem);
     void slot_set_item(const QString &sItem);
 
@@ -97,5 +99,7 @@ private:
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;
+    QString m_absentLocPath;         ///< the default folder while it isn't there
+    bool m_showsInstrConfig = false; ///< again when the window comes back
     bool m_noVisa = false;
 };

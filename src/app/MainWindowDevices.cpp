@@ -19,18 +19,19 @@
 void MainWindow::createDevices()
 {
     QString failures;
-    bool failed = false;
+    QString failure;
     for (std::size_t i = 0; i < m_panes.size(); ++i) {
         auto device = std::make_unique<VisaDevice>(m_noVisa);
         device->setQuestion([this](const QString &title, const QString &text) {
             return askYesNo(this, title, text);
         });
-        const QString failure = device->takeLastError();
+        // Both use the same library, of whose failure the first one tells.
+        const QString reported = device->takeLastError();
+        failure = reported.isEmpty() ? failure : reported;
         failures += QString("  Device %1 : %2\n").arg(i + 1).arg(failure);
-        failed = failed || !failure.isEmpty();
         m_panes.at(i).instrument = std::move(device);
     }
-    if (failed) {
+    if (!failure.isEmpty()) {
         QMessageBox::critical(this, windowTitle(),
                               "The VISA interfaces failed to initialize:\n" + failures);
     }

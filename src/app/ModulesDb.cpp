@@ -164,6 +164,7 @@ bool ModulesDb::start(const ToolInfo &tool, const QString &path)
     if (!window.startModule(path)) {
         return Tracer::fail("Cannot initialize module.");
     }
+    window.setWindowState(window.windowState() & ~Qt::WindowMinimized);
     window.show();
     window.raise();
     window.activateWindow();

@@ -158,7 +158,10 @@ void QCustomTreeView::updateAndExpandTree(const QString &sDir)
         return;
     }
     for (QModelIndex level = target; level.isValid(); level = level.parent()) {
-        open(level);
+        // A file that counted as an open folder would be missed at the next reload.
+        if (isLocal() || isFolderPath(m_files->pathOf(level))) {
+            open(level);
+        }
     }
     setCurrentIndex(target);
     m_revealedPath = m_files->pathOf(target);
@@ -249,7 +252,11 @@ void QCustomTreeView::filterChanged(const QString &sNewFilter)
 void QCustomTreeView::currentChanged(const QModelIndex &current, const QModelIndex &previous)
 {
     QTreeView::currentChanged(current, previous);
-    if (!m_files || !current.isValid()) {
+    if (!m_files) {
+        return;
+    }
+    if (!current.isValid()) {
+        emit selectionLost();
         return;
     }
     const QString path = m_files->pathOf(current);

@@ -104,6 +104,9 @@ signals:
     /// The user wants to go on in the other pane.
     void otherPaneRequested();
 
+    /// No entry is the current one any more.
+    void selectionLost();
+
 protected:
     void currentChanged(const QModelIndex &current, const QModelIndex &previous) override;
     void contextMenuEvent(QContextMenuEvent *event) override;

@@ -122,7 +122,7 @@ std::optional<ParsedNumber> parseNumber(const QString &text, const QString &unit
     if (!unit.isEmpty() && rest.endsWith(unit, Qt::CaseInsensitive)) {
         rest.chop(unit.size());
     }
-    static const QRegularExpression prefixLetters("[TGMKUNP]",
+    static const QRegularExpression prefixLetters("[TGMKUNPF]",
                                                   QRegularExpression::CaseInsensitiveOption);
     const qsizetype split = rest.indexOf(prefixLetters);
     QString number = split < 0 ? rest : rest.left(split);
@@ -170,8 +170,11 @@ std::optional<ParsedNumber> parseNumber(const QString &text, const QString &unit
     case 'p':
         result.value *= 1e-12;
         break;
+    case 'f':
+        result.value *= 1e-15;
+        break;
     default:
-        // An upper-case U, N or P is no prefix of the field; the number stands as it is.
+        // An upper-case U, N, P or F is no prefix of the field; the number stands as it is.
         break;
     }
     return result;

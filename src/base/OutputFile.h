@@ -7,6 +7,7 @@
 #include <span>
 
 class QFileDevice;
+class QSaveFile;
 
 /// A file to be written that keeps what stood under its name until all of it is there: a file is
 /// replaced by commit() alone, by way of a temporary file beside it, and stays as it
@@ -17,7 +18,12 @@ class QFileDevice;
 class OutputFile
 {
 public:
-    explicit OutputFile(QString fileName);
+    /// What becomes of a file that stands under the name when the new one is complete.
+    enum class Existing { Replaced, Kept };
+
+    /// With Existing::Kept open() refuses a name that is taken, and commit() one that was taken
+    /// meanwhile.
+    explicit OutputFile(QString fileName, Existing existing = Existing::Replaced);
     ~OutputFile();
 
     OutputFile(const OutputFile &) = delete;
@@ -39,8 +45,13 @@ public:
     [[nodiscard]] QString errorString() const;
 
 private:
-    [[nodiscard]] bool isReplaced() const;
+    [[nodiscard]] bool commitBesides(QSaveFile &file);
 
     QString m_fileName;
+    Existing m_existing;
+    QString m_problem; ///< one that the system has no words for
     std::unique_ptr<QFileDevice> m_file;
 };
+
+/// Whether two names, links included, lead to one and the same file on disk.
+[[nodiscard]] bool isSameFile(const QString &one, const QString &other);

@@ -4,7 +4,6 @@
 #include "Console.h"
 
 #include "base/EngineeringNumber.h"
-#include "jobs/ReportText.h"
 
 #include <QFileInfo>
 #include <QRegularExpression>
@@ -37,7 +36,7 @@ std::optional<double> numberIn(const QString &text, const QString &unit)
     if (!unit.isEmpty() && prefix.endsWith(unit, Qt::CaseInsensitive)) {
         prefix.chop(unit.size());
     }
-    static const QRegularExpression unknownPrefix("[UNP] *$");
+    static const QRegularExpression unknownPrefix("[UNPF] *$");
     return prefix.contains(unknownPrefix) ? std::nullopt : std::optional(number->value);
 }
 
@@ -58,23 +57,6 @@ double parse(const std::string &name, const std::string &text, const NumberRange
                                    .arg(QString::fromStdString(name), QString::fromLocal8Bit(text),
                                         problem, rangeText(range, whole))
                                    .toStdString());
-}
-
-/// A longer text can be written, but the file can't be read again; so the user is told.
-QString parseTagText(const std::string &name, const std::string &text)
-{
-    constexpr qsizetype MaxLength = 1024;
-    QString tag = QString::fromLocal8Bit(text);
-    const qsizetype length = stripBraces(tag).size();
-    if (length > MaxLength) {
-        Tracer::Trace(Tracer::Warning,
-                      QString("%1: a file with a text of more than %2 characters can't be read; "
-                              "this one has %3.")
-                          .arg(QString::fromStdString(name))
-                          .arg(MaxLength)
-                          .arg(length));
-    }
-    return tag;
 }
 
 /// An option whose number goes to `take`.
@@ -166,13 +148,14 @@ void addOutputTexts(CLI::App &command, OutputArguments &arguments)
                             const std::string &help) {
         command
             .add_option_function<std::string>(
-                name, [&tag, name](const std::string &text) { tag = parseTagText(name, text); },
-                help)
+                name, [&tag](const std::string &text) { tag = QString::fromLocal8Bit(text); }, help)
             ->type_name("TEXT");
     };
     addTag("--comment", options.comment, "Comment of the new file");
     addTag("--copyright", options.copyright, "Copyright note of the new file");
-    command.add_flag("--force", arguments.force, "Overwrite an existing file");
+    options.overwrite = false;
+    const auto force = [&arguments] { arguments.force = arguments.options.overwrite = true; };
+    command.add_flag_callback("--force", force, "Overwrite an existing file");
 }
 
 bool mayWrite(Console &console, const QString &fileName, bool force)
@@ -185,5 +168,14 @@ bool mayWrite(Console &console, const QString &fileName, bool force)
         return true;
     }
     console.error("The output file '" + fileName + "' already exists; --force overwrites it.");
+    return false;
+}
+
+bool isNoSource(Console &console, const QString &output, const QString &source)
+{
+    if (!isSameFile(output, source)) {
+        return true;
+    }
+    console.error("The output file '" + output + "' is the source; give it another name.");
     return false;
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "base/OutputFile.h"
 #include "jobs/OutputOptions.h"
 
 #include <CLI/CLI.hpp>
@@ -76,4 +77,14 @@ CLI::App &addCommand(CLI::App &parent, const std::string &name, const std::strin
     CLI::App *command = parent.add_subcommand(name, help);
     command->callback([&action, state, run] { action = [state, run] { return run(*state); }; });
     return *command;
+}
+
+/// Whether the output is another file than the source; logs so if it isn't. For results that are
+/// no waveforms.
+[[nodiscard]] bool isNoSource(Console &console, const QString &output, const QString &source);
+
+/// What `force` lets an output do with a file that appeared under its name meanwhile.
+[[nodiscard]] inline OutputFile::Existing existingFile(bool force)
+{
+    return force ? OutputFile::Existing::Replaced : OutputFile::Existing::Kept;
 }

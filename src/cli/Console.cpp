@@ -68,7 +68,10 @@ Console::Console(QObject *parent)
 {
     connect(&m_tracer, &Tracer::TraceDataAvailable, this, &Console::printLog);
     if (pipe2(interruptPipe.data(), O_CLOEXEC | O_NONBLOCK) == 0) {
-        std::signal(SIGINT, onInterrupt);
+        // Whoever ends the program, nothing unfinished is to stay.
+        for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+            std::signal(signal, onInterrupt);
+        }
     }
     // A closed reader of standard output is to end in a message, not in a silent death.
     std::signal(SIGPIPE, SIG_IGN);

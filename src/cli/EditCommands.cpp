@@ -84,5 +84,7 @@ void addEditCommands(CommandSet &commands)
               "Peak level; negative values decrease the level (default: as measured)");
     addNumber(command, "--pkrms", level->request.peakToRmsDb, range,
               "Peak to RMS ratio (default: as measured)");
+    addNumber(command, "--clock", level->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
+              "Clock of the result (default: that of the source)");
     addOutputArguments(command, level->output);
 }

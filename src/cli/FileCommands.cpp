@@ -63,13 +63,14 @@ int runDump(DumpArguments &arguments)
     }
     DumpJob::Sink sink = [&console](const QByteArray &bytes) { return console.print(bytes); };
     // Nothing in a dump tells a cut one from a whole one.
-    OutputFile file(arguments.output);
+    OutputFile file(arguments.output, existingFile(arguments.force));
     const auto cannotWrite = [&](const char *what) {
         return Tracer::fail(
             QString("Cannot %1 '%2': %3").arg(what, arguments.output, file.errorString()));
     };
     if (!arguments.output.isEmpty()) {
-        if (!mayWrite(console, arguments.output, arguments.force)) {
+        if (!mayWrite(console, arguments.output, arguments.force) ||
+            !isNoSource(console, arguments.output, arguments.range.fileName)) {
             return console.failed();
         }
         // Opened with the first bytes, so that a source that can't be read touches nothing.
@@ -81,12 +82,8 @@ int runDump(DumpArguments &arguments)
         };
     }
     DumpJob job(arguments.range, static_cast<DumpFormat>(arguments.format), sink);
-    exitCode = console.run(job);
-    if (exitCode == ExitDone && file.isOpen() && !file.commit()) {
-        static_cast<void>(cannotWrite("write"));
-        exitCode = console.failed();
-    }
-    return exitCode;
+    job.setFinish([&] { return !file.isOpen() || file.commit() || cannotWrite("write"); });
+    return console.run(job);
 }
 
 struct MeasureArguments

@@ -114,6 +114,7 @@ int runPolar(PolarArguments &arguments)
     request.offset = arguments.offset.value_or(request.offset);
     request.gain = arguments.gain.value_or(request.gain);
     for (OutputOptions *part : {&request.phase, &request.amplitude}) {
+        part->overwrite = arguments.output.force;
         part->comment = arguments.output.options.comment;
         part->copyright = arguments.output.options.copyright;
     }

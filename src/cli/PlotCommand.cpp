@@ -90,7 +90,12 @@ protected:
         if (!picture.save(&png, "PNG")) {
             return Tracer::fail("Cannot make the picture for '" + m_arguments.output + "'.");
         }
-        OutputFile file(m_arguments.output);
+        // A cancel that came with the painting counts, too.
+        ProgressClock::runEvents();
+        if (!mayProceed()) {
+            return false;
+        }
+        OutputFile file(m_arguments.output, existingFile(m_arguments.force));
         return (file.open() && file.write(png.data()) && file.commit()) ||
                Tracer::fail("Cannot write '" + m_arguments.output + "': " + file.errorString());
     }
@@ -102,7 +107,8 @@ private:
 int runPlot(PlotArguments &arguments)
 {
     Console &console = arguments.console;
-    if (!mayWrite(console, arguments.output, arguments.force)) {
+    if (!mayWrite(console, arguments.output, arguments.force) ||
+        !isNoSource(console, arguments.output, arguments.range.fileName)) {
         return console.failed();
     }
     int exitCode = ExitDone;

@@ -212,7 +212,18 @@ void QtNumericEdit::wheelEvent(QWheelEvent *event)
 {
     const int delta = event->angleDelta().y();
     // What the field doesn't take goes to the parent, so that a page under it scrolls on.
-    event->setAccepted(m_hasStep && !isReadOnly() && delta != 0 && stepBy(delta > 0 ? 1 : -1));
+    const bool takes = m_hasStep && !isReadOnly() && hasFocus() && delta != 0;
+    event->setAccepted(takes);
+    if (!takes) {
+        return;
+    }
+    // Touch pads turn one notch into many small events.
+    m_wheelAngle = (m_wheelAngle > 0) == (delta > 0) ? m_wheelAngle + delta : delta;
+    const int notches = m_wheelAngle / QWheelEvent::DefaultDeltasPerStep;
+    m_wheelAngle %= QWheelEvent::DefaultDeltasPerStep;
+    if (notches != 0) {
+        event->setAccepted(stepBy(notches));
+    }
 }
 
 void QtNumericEdit::contextMenuEvent(QContextMenuEvent *event)

@@ -114,6 +114,7 @@ private:
     int m_precision = 0;
     QString m_name;
     bool m_hasStep = false;
+    int m_wheelAngle = 0; ///< turned since the last step, eighths of a degree
     double m_cursorStep = 0;
     bool m_hasCursorStep = false;
     double m_step = 0;

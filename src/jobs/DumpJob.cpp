@@ -121,5 +121,7 @@ bool DumpJob::process(SourceWaveform &source, qint64 begin, qint64 count)
         }
         done += wanted;
     }
-    return true;
+    // A cancel that came with the last samples counts, too.
+    ProgressClock::runEvents();
+    return mayProceed() && (!m_finish || m_finish());
 }

@@ -23,6 +23,10 @@ public:
 
     DumpJob(SampleRange range, DumpFormat format, Sink sink, QObject *parent = nullptr);
 
+    /// What puts the dump in its place once all samples have gone to the sink, and the work was not
+    /// cancelled; false, with the reason logged, fails the job.
+    void setFinish(std::function<bool()> finish) { m_finish = std::move(finish); }
+
 protected:
     [[nodiscard]] bool process(SourceWaveform &source, qint64 begin, qint64 count) override;
 
@@ -32,4 +36,5 @@ private:
 
     DumpFormat m_format;
     Sink m_sink;
+    std::function<bool()> m_finish;
 };

@@ -3,8 +3,11 @@
 
 #include "ReportText.h"
 
+#include "base/OutputFile.h"
 #include "dsp/Resample.h"
 #include "log/Tracer.h"
+
+#include <QFileInfo>
 
 #include <cmath>
 #include <utility>
@@ -36,13 +39,23 @@ bool EditJob::read()
     if (reported) {
         emit report(ReportLine::heading("Reading waveform"));
     }
-    if ((m_loaded || m_source.read(*this, m_inputFile)) && mayProceed()) {
+    if ((m_loaded || m_source.read(*this, m_inputFile, sampleReading())) && mayProceed()) {
         return true;
     }
     if (reported) {
         Tracer::Trace(Tracer::Error, "Reading failed.");
     }
     return false;
+}
+
+/// A result that has to be written over its source, in a folder where nothing can be added, needs
+/// the samples elsewhere; all others leave them in the file.
+SampleReading EditJob::sampleReading() const
+{
+    const bool overwritten =
+        isSameFile(m_inputFile, m_output.fileName()) &&
+        !QFileInfo(QFileInfo(m_output.fileName()).canonicalPath()).isWritable();
+    return overwritten ? SampleReading::Unpacked : SampleReading::Measured;
 }
 
 QString EditJob::refusal() const
@@ -76,7 +89,7 @@ std::optional<double> EditJob::clockOr(std::optional<double> wantedHz)
     if (!(clockHz > 0)) {
         Tracer::Trace(Tracer::Error,
                       QString("The waveform \"%1\" states no clock rate. Give the clock rate of "
-                              "the result.")
+                              "the result in the field ARB Clockrate, or by --clock.")
                           .arg(m_inputFile));
         return std::nullopt;
     }

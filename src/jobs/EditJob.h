@@ -54,6 +54,7 @@ protected:
 private:
     [[nodiscard]] bool work() final;
     [[nodiscard]] bool read();
+    [[nodiscard]] SampleReading sampleReading() const;
 
     QString m_inputFile;
     Reading m_reading;

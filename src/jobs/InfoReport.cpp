@@ -25,6 +25,26 @@ QString quoted(const QString &text)
     return '\'' + text + '\'';
 }
 
+/// Empty for what the file doesn't tell, which is shown as a negative number.
+QString known(double value, const QString &unit = {})
+{
+    return value < 0 ? QString() : engineeringText(value, unit);
+}
+
+QJsonValue knownOrNull(double value)
+{
+    return value < 0 ? QJsonValue(QJsonValue::Null) : QJsonValue(value);
+}
+
+QString samplesText(const WvFileSummary &summary)
+{
+    const QString count = known(static_cast<double>(summary.samples));
+    return summary.missingSamples == 0
+               ? count
+               : QString("%1, the file is cut off: %2 are missing")
+                     .arg(count, engineeringText(static_cast<double>(summary.missingSamples)));
+}
+
 InfoRow detail(const QString &label, const QString &value)
 {
     return {label, value, InfoRow::Kind::Detail};
@@ -41,11 +61,12 @@ QList<InfoRow> fileRows(const WvFileSummary &summary)
         {"Comment", quoted(summary.comment)},
         {"Copyright", quoted(summary.copyright)},
         {"Date Info", quoted(summary.date)},
-        {"Samples", engineeringText(static_cast<double>(summary.samples))},
-        {"Clock", engineeringText(summary.clock, "Hz")},
-        {"Play Time", engineeringText(summary.playTime, "s")},
-        {"Peak Offset (Tag)", decibels(summary.peakOffset)},
-        {"Peak / RMS (Tag)", decibels(summary.rmsOffset - summary.peakOffset)},
+        {"Samples", samplesText(summary)},
+        {"Clock", known(summary.clock, "Hz")},
+        {"Play Time", known(summary.playTime, "s")},
+        {"Peak Offset (Tag)", summary.levelsValid ? decibels(summary.peakOffset) : QString()},
+        {"Peak / RMS (Tag)",
+         summary.levelsValid ? decibels(summary.rmsOffset - summary.peakOffset) : QString()},
         {"Checksum", yesNo(summary.hasChecksum)},
         {"Markers", yesNo(summary.hasMarkers)},
     };
@@ -116,14 +137,17 @@ QJsonObject infoJson(const WvFileSummary &summary)
         {"comment", summary.comment},
         {"copyright", summary.copyright},
         {"date", summary.date},
-        {"samples", summary.samples},
-        {"clock", summary.clock},
-        {"playTime", summary.playTime},
+        {"samples", knownOrNull(static_cast<double>(summary.samples))},
+        {"clock", knownOrNull(summary.clock)},
+        {"playTime", knownOrNull(summary.playTime)},
         {"levelsValid", summary.levelsValid},
-        {"peakOffset", summary.peakOffset},
-        {"rmsOffset", summary.rmsOffset},
+        {"peakOffset",
+         summary.levelsValid ? QJsonValue(summary.peakOffset) : QJsonValue(QJsonValue::Null)},
+        {"rmsOffset",
+         summary.levelsValid ? QJsonValue(summary.rmsOffset) : QJsonValue(QJsonValue::Null)},
         {"hasChecksum", summary.hasChecksum},
         {"hasMarkers", summary.hasMarkers},
+        {"missingSamples", summary.missingSamples},
         {"segmentCount", summary.segmentCount},
         {"segments", segments},
     };

@@ -31,6 +31,11 @@ LevelJob::LevelJob(LevelRequest request, QObject *parent)
 
 bool LevelJob::edit()
 {
+    const std::optional<double> clock = clockOr(m_request.clockHz);
+    if (!clock) {
+        return false;
+    }
+    output().setLength(*clock, source().info().samples);
     const WvFileInfo &info = source().info();
     const double crest = info.rmsOffset - info.peakOffset;
     const double peakDb = m_request.peakDb.value_or(-info.peakOffset);

@@ -13,8 +13,9 @@ struct LevelRequest
 
     QString inputFile;
     OutputOptions output;
-    std::optional<double> peakDb;      ///< level of the peak; nothing: as measured
-    std::optional<double> peakToRmsDb; ///< crest factor; nothing: as measured
+    std::optional<double> peakDb;       ///< level of the peak; nothing: as measured
+    std::optional<double> peakToRmsDb;  ///< crest factor; nothing: as measured
+    std::optional<double> clockHz = {}; ///< clock of the result; nothing: that of the source
 };
 
 /// Why a crest factor in dB shouldn't be written for samples with the measured one, as a sentence;

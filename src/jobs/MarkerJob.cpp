@@ -43,20 +43,25 @@ bool MarkerJob::edit()
                                                .arg(edit.first + 1)
                                                .arg(edit.last + 1));
     }
-    if (!m_markers.open()) {
+    const std::optional<double> clock = clockOr(m_request.clockHz);
+    if (!clock) {
+        return false;
+    }
+    output().setLength(*clock, samples);
+    if (!m_markers.initBuf(&m_markerBytes, BufferedIO::ReadWrite)) {
         return Tracer::fail("Cannot create temporary marker buffer.");
     }
     {
         MarkerEditor editor;
         const JobStep step(*this, "Changing Markers...", editor);
-        if (!editor.run(*source().markers(), *m_markers.stream(), samples, m_request.edits) ||
+        if (!editor.run(*source().markers(), m_markers, samples, m_request.edits) ||
             !mayProceed()) {
             return false;
         }
     }
     Tracer::Trace(Tracer::Information, "Creating modified waveform...");
     output().record().markerLists = true;
-    const WvStreams streams{source().data(), m_markers.stream(), source().tags()};
+    const WvStreams streams{source().data(), &m_markers, source().tags()};
     if (!output().save(streams, "Saving Waveform...")) {
         return false;
     }

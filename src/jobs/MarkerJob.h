@@ -7,11 +7,14 @@
 
 #include <QList>
 
+#include <optional>
+
 struct MarkerRequest
 {
     QString inputFile;
     OutputOptions output;
-    QList<MarkerEdit> edits; ///< applied in this order; their ranges may run either way
+    QList<MarkerEdit> edits;            ///< applied in this order; their ranges may run either way
+    std::optional<double> clockHz = {}; ///< clock of the result; nothing: that of the source
 };
 
 /// Puts the range of an edit in order. Why it can't be applied to a waveform of so many samples;
@@ -30,7 +33,8 @@ private:
     [[nodiscard]] bool edit() override;
 
     MarkerRequest m_request;
-    TempStream m_markers;
+    RunLengthDevice m_markerBytes;
+    BufferedIO m_markers{1024 * 1024}; // destroyed before its device
 };
 
 /// Shows what edits make of the markers of a waveform that a tool has read: they go to a stream of

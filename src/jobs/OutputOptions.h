@@ -11,4 +11,5 @@ struct OutputOptions
     QString fileName;
     std::optional<QString> comment;   ///< nothing: that of the source, or none
     std::optional<QString> copyright; ///< nothing: that of the source, or none
+    bool overwrite = true;            ///< a file that stands under the name may be replaced
 };

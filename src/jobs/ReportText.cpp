@@ -59,6 +59,14 @@ QString stripBraces(const QString &text)
 QString tagText(const QString &tag, const QString &text)
 {
     QString kept = stripBraces(text);
+    if (kept.size() > MaxTagText) {
+        Tracer::Trace(Tracer::Warning,
+                      QString("The %1 has %2 characters; the file takes the first %3.")
+                          .arg(tag)
+                          .arg(kept.size())
+                          .arg(MaxTagText));
+        kept.truncate(MaxTagText);
+    }
     const auto canStand = [](QChar character) {
         return character >= QChar(' ') && character < QChar('}');
     };

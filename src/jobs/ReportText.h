@@ -24,6 +24,9 @@ struct WvWriteJob;
 /// Removes each brace with the character after it, so that a text can't break a file's tags.
 [[nodiscard]] QString stripBraces(const QString &text);
 
+/// Characters of a tag; what is longer the reader refuses, and the whole file with it.
+inline constexpr qsizetype MaxTagText = 1024;
+
 /// The text for a comment or copyright tag, without braces. Warns, naming the tag, of characters
 /// that the file can't give back: tags are read as ASCII from the blank to the closing brace.
 [[nodiscard]] QString tagText(const QString &tag, const QString &text);

@@ -41,6 +41,12 @@ ResampleJob::ResampleJob(ResampleRequest request, QObject *parent)
 bool ResampleJob::edit()
 {
     const WvFileInfo &info = source().info();
+    if (!(info.clock > 0)) {
+        return Tracer::fail(
+            QString("The waveform \"%1\" states no clock rate to convert from. Give "
+                    "it one first, as by \"level --clock\".")
+                .arg(inputFile()));
+    }
     m_request.target.follow(info.clock, info.samples);
     const QString problem = m_request.target.problem();
     if (!problem.isEmpty()) {

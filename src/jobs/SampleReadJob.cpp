@@ -32,7 +32,7 @@ SampleReadJob::SampleReadJob(SampleRange range, QObject *parent)
 
 bool SampleReadJob::work()
 {
-    if (!m_source.read(*this, m_range.fileName)) {
+    if (!m_source.read(*this, m_range.fileName, SampleReading::Located)) {
         return false;
     }
     const qint64 samples = m_source.info().samples;

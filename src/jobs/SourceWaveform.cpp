@@ -4,7 +4,6 @@
 #include "ToolJob.h"
 
 #include "log/Tracer.h"
-#include "streams/markerstream.h"
 #include "wvfile/HvFileIO.h"
 
 #include <algorithm>
@@ -90,27 +89,37 @@ private:
 
 } // namespace
 
-bool SourceWaveform::read(ToolJob &job, const QString &fileName)
+bool SourceWaveform::read(ToolJob &job, const QString &fileName, SampleReading reading)
 {
     if (!job.mayProceed()) {
         return false;
     }
     TempStream unknownTags;
-    if (!m_data.open() || !unknownTags.open() || !m_tags.open()) {
+    const bool unpacks = reading == SampleReading::Unpacked;
+    if ((unpacks && !m_data.open()) || !unknownTags.open() || !m_tags.open()) {
         return Tracer::fail("Cannot create temporary data buffer.");
     }
-    if (!m_markers.open()) {
+    if (!m_markers.initBuf(&m_markerBytes, BufferedIO::ReadWrite)) {
         return Tracer::fail("Cannot create temporary marker buffer.");
     }
     m_info = WvFileInfo();
     m_info.fileName = fileName;
-    m_info.dataStream = m_data.stream();
-    m_info.markerStream = m_markers.stream();
+    m_info.reading = reading;
+    m_info.dataStream = unpacks ? m_data.stream() : nullptr;
+    m_info.markerStream = &m_markers;
     m_info.tagsStream = unknownTags.stream();
     HvFileIO file;
     const JobStep step(job, "Reading Waveform...", file);
-    return file.readWaveform(&m_info) && completeMarkers(*m_markers.stream(), m_info.samples) &&
-           filterTags(unknownTags);
+    if (!file.readWaveform(&m_info)) {
+        return false;
+    }
+    m_markerBytes.extendTo(m_info.samples);
+    if (!m_markers.restartAtBegining() || !filterTags(unknownTags)) {
+        return false;
+    }
+    return unpacks ||
+           (m_samples.setSource(m_info) && (m_decoded.initBuf(&m_samples, BufferedIO::Read) ||
+                                            Tracer::fail("Cannot open waveform input file.")));
 }
 
 bool SourceWaveform::filterTags(TempStream &unknownTags)

@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "streams/RunLengthDevice.h"
 #include "streams/TempStream.h"
+#include "wvfile/SampleDevice.h"
 #include "wvfile/WvTypes.h"
 
 #include <QString>
@@ -14,11 +16,18 @@ class SourceWaveform
 public:
     /// Reads the file under the step label "Reading Waveform...". The marker stream is completed to
     /// one byte for each sample. The reason of a failure has been logged.
-    [[nodiscard]] bool read(ToolJob &job, const QString &fileName);
+    ///
+    /// Samples that aren't unpacked are decoded whenever data() is read, which takes no room on the
+    /// disk; the file must stay as it is meanwhile, and data() can't be written.
+    [[nodiscard]] bool read(ToolJob &job, const QString &fileName,
+                            SampleReading reading = SampleReading::Unpacked);
 
     [[nodiscard]] const WvFileInfo &info() const { return m_info; }
-    [[nodiscard]] BufferedIO *data() { return m_data.stream(); }
-    [[nodiscard]] BufferedIO *markers() { return m_markers.stream(); }
+    [[nodiscard]] BufferedIO *data()
+    {
+        return m_info.reading == SampleReading::Unpacked ? m_data.stream() : &m_decoded;
+    }
+    [[nodiscard]] BufferedIO *markers() { return &m_markers; }
 
     /// The unknown tags, for a result with the same length and clock; null if there are none.
     /// Tags that the writer writes by itself aren't among them.
@@ -38,8 +47,14 @@ public:
 private:
     [[nodiscard]] bool filterTags(TempStream &unknownTags);
 
+    /// For what is read from a file or from memory, which needs no large buffers.
+    static constexpr int SmallBuffer = 1024 * 1024;
+
     TempStream m_data;
-    TempStream m_markers;
+    SampleDevice m_samples;
+    BufferedIO m_decoded{SmallBuffer}; // destroyed before its device, as those below
+    RunLengthDevice m_markerBytes;
+    BufferedIO m_markers{SmallBuffer};
     TempStream m_tags;
     bool m_hasTags = false;
     WvFileInfo m_info;

@@ -78,6 +78,7 @@ bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
     if (!write(streams, stepLabel)) {
         return false;
     }
+    m_options.overwrite = true; // what stands there now is this job's own
     const bool writerClipped = m_record.clippedValues > 0;
     m_record.clippedValues += m_clipped.values;
     m_record.largestValue = std::max(m_record.largestValue, m_clipped.largest);
@@ -99,6 +100,7 @@ bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
 bool WaveformOutput::write(const WvStreams &streams, const QString &stepLabel)
 {
     HvFileIO file;
+    m_record.overwrite = m_options.overwrite;
     const JobStep step(m_job, stepLabel, file);
     return file.writeWaveform(m_record, fileName(), streams.data, streams.markers, streams.tags) ||
            Tracer::fail("Waveform generation failed.");

@@ -22,7 +22,7 @@ namespace signalfields {
 inline constexpr SignalField maxClock{"Maximum permissible ARB clock rate", "Hz", 1e7, MaxClockHz,
                                       1e8};
 inline constexpr SignalField minClock{"Minimum permissible ARB clock rate", "Hz", 1000, 1e7, 1e5};
-inline constexpr SignalField clockRate{"ARB Clockrate", "Hz", 1000, MaxClockHz, 1e8};
+inline constexpr SignalField clockRate{"ARB Clockrate", "Hz", MinClockHz, MaxClockHz, 1e8};
 
 inline constexpr SignalField frequency{"Frequency", "Hz", 100, 2e7, 10000};
 inline constexpr SignalField amplitudeI{"I Signal Amplitude", "", 0, 1, 0.707};

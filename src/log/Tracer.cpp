@@ -62,7 +62,7 @@ void Tracer::Trace(int level, const char *text)
 
 void Tracer::Trace(int level, const QString &text)
 {
-    if (!isEnabled(level)) {
+    if (!isEnabled(level) || text.isEmpty()) {
         return;
     }
     const QString line =

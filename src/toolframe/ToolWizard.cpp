@@ -1,18 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ToolWizard.h"
 
+#include "jobs/ReportText.h"
 #include "questions.h"
 #include "runjob.h"
 #include "windowplace.h"
 
+#include <QFileInfo>
 #include <QLineEdit>
 #include <QPlainTextEdit>
 #include <QPushButton>
+#include <QRegularExpression>
 #include <QScopedValueRollback>
 #include <QSettings>
 #include <QStackedWidget>
 #include <QTextEdit>
 
+#include <algorithm>
 #include <utility>
 
 ToolWizard::ToolWizard(Frame frame, QWidget *parent)
@@ -29,10 +33,35 @@ void ToolWizard::setUpWizard()
     m_close = findChild<QPushButton *>("cb_close");
     m_report = findChild<QTextEdit *>("te_result");
     Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
+    limitTagTexts();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
     connect(m_close, &QPushButton::clicked, this, &ToolWizard::reject);
     showPage(0);
+}
+
+/// A file can't be read with longer texts, nor with line breaks in them.
+void ToolWizard::limitTagTexts()
+{
+    if (auto *copyright = findChild<QLineEdit *>("le_copyright")) {
+        copyright->setMaxLength(static_cast<int>(MaxTagText));
+    }
+    auto *comment = findChild<QPlainTextEdit *>("te_comment");
+    if (comment == nullptr) {
+        return;
+    }
+    connect(comment, &QPlainTextEdit::textChanged, this, [comment] {
+        static const QRegularExpression lineBreaks("[\\r\\n]+");
+        QString text = comment->toPlainText();
+        text.replace(lineBreaks, " ").truncate(MaxTagText);
+        if (text != comment->toPlainText()) {
+            const int position = comment->textCursor().position();
+            comment->setPlainText(text);
+            QTextCursor cursor = comment->textCursor();
+            cursor.setPosition(std::min(position, static_cast<int>(text.size())));
+            comment->setTextCursor(cursor);
+        }
+    });
 }
 
 int ToolWizard::pageAfter(int page)
@@ -83,6 +112,8 @@ OutputOptions ToolWizard::outputOptions() const
     OutputOptions options;
     if (const auto *name = findChild<QLineEdit *>("le_outfile")) {
         options.fileName = name->text();
+        // The user was asked about the one that stands there, not about one that appears later.
+        options.overwrite = QFileInfo::exists(options.fileName);
     }
     if (const auto *comment = findChild<QPlainTextEdit *>("te_comment")) {
         options.comment = comment->toPlainText();

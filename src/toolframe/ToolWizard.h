@@ -92,6 +92,7 @@ private:
     void goOn();
     void goBack();
     void run();
+    void limitTagTexts();
     void takeTypedValues() const;
 
     Frame m_frame;

@@ -1,9 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "toolpages.h"
 
+#include "display/QtNumericEdit.h"
+
 #include <QFileDialog>
 #include <QFileInfo>
 #include <QLineEdit>
+
+#include <cmath>
 
 namespace {
 
@@ -44,4 +48,13 @@ QString fileNameWithSuffix(const QString &fileName, const QString &suffix)
     const QString extension = file.suffix();
     return file.path() + '/' + file.completeBaseName() + suffix +
            (extension.isEmpty() ? QString() : '.' + extension);
+}
+
+void roundInput(QtNumericEdit &edit)
+{
+    QObject::connect(&edit, &QtNumericEdit::valueUpdated, &edit, [&edit](double value) {
+        if (value != std::round(value)) {
+            edit.setVal(std::round(value));
+        }
+    });
 }

@@ -4,6 +4,7 @@
 #include <QString>
 
 class QLineEdit;
+class QtNumericEdit;
 class QWidget;
 
 /// What the tools' pages share.
@@ -20,3 +21,6 @@ void chooseTargetFile(QWidget *parent, QLineEdit &field, const QString &title = 
 
 /// "/data/noise.wv" with "_resample" becomes "/data/noise_resample.wv".
 [[nodiscard]] QString fileNameWithSuffix(const QString &fileName, const QString &suffix);
+
+/// Lets a field for whole numbers round what is typed, so that it shows what is used.
+void roundInput(QtNumericEdit &edit);

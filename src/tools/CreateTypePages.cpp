@@ -4,6 +4,8 @@
 #include "DlgWvCreate.h"
 #include "ui_DlgWvCreate.h"
 
+#include "toolframe/toolpages.h"
+
 #include <QFormLayout>
 #include <QSettings>
 
@@ -29,6 +31,9 @@ void CreateTypePages::setUp(QtNumericEdit &edit, const SignalField &field, const
     edit.setMin(field.min);
     edit.setVal(field.start);
     m_fields[&field] = {&edit, key};
+    if (&field == &signalfields::oversampling || &field == &signalfields::carriers) {
+        roundInput(edit);
+    }
 }
 
 QFormLayout *CreateTypePages::layoutOf(QWidget *page, const QString &title)
@@ -69,7 +74,7 @@ void CreateTypePages::fillFunctionPage(const Ui::DlgWvCreate &form)
     add(layout, "&I Amplitude", amplitudeI, "le_ampi", "fn.ampi");
     add(layout, "&Q Amplitude", amplitudeQ, "le_ampq", "fn.ampq");
     add(layout, "I &Offset", offsetI, "le_ofsi", "fn.ofsi");
-    add(layout, "Q O&ffset", offsetQ, "le_ofsq", "fn.ofsq");
+    add(layout, "Q Offs&et", offsetQ, "le_ofsq", "fn.ofsq");
     add(layout, "Q P&hase Offset", phaseQ, "le_phaseq", "fn.phsq");
     m_oversampling = new QCheckBox("&Custom\nOversampling");
     m_oversampling->setObjectName("cb_over");
@@ -183,7 +188,9 @@ void CreateTypePages::readSettings(const QSettings &settings) const
 {
     for (const auto &[field, shown] : m_fields) {
         if (shown.key) {
-            shown.edit->setVal(settings.value(shown.key, field->start).toDouble());
+            bool isNumber = false;
+            const double value = settings.value(shown.key, field->start).toDouble(&isNumber);
+            shown.edit->setVal(isNumber ? value : field->start);
         }
     }
     m_oversampling->setChecked(settings.value("fn.overen", false).toBool());

@@ -4,6 +4,7 @@
 #include "ui_DlgResample.h"
 
 #include "log/Tracer.h"
+#include "toolframe/toolpages.h"
 
 #include <QSettings>
 
@@ -33,6 +34,7 @@ DlgResample::DlgResample(QWidget *parent)
     samples.setName("Target File Samples");
     samples.setMax(static_cast<double>(ResampleTarget::MaxSamples));
     samples.setMin(1);
+    roundInput(samples);
     QtNumericEdit &outputClock = m_ui->page_output->clockRate();
     outputClock.setName("ARB Clockrate");
     outputClock.setReadOnly(true);
@@ -63,6 +65,10 @@ void DlgResample::readFields(const QSettings &settings)
 
 void DlgResample::sourceChanged()
 {
+    // Nothing changes until the user says what is to.
+    if (m_ui->rb_samples->isChecked() && hasSource()) {
+        m_ui->le_target_samples->setVal(static_cast<qlonglong>(sourceSamples()));
+    }
     slot_updatesettings();
 }
 

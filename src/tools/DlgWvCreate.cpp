@@ -12,6 +12,7 @@
 #include <QSettings>
 
 #include <cmath>
+#include <random>
 
 namespace {
 
@@ -165,6 +166,7 @@ CreateRequest DlgWvCreate::options() const
     request.maxClockHz = m_ui->le_maxclock->getVal();
     request.clockHz = m_ui->le_clockrate->getVal();
     request.autoScaling = m_ui->rb_sc_auto->isChecked();
+    request.seed = m_seed;
     request.zeroCrest = m_ui->cb_zerocrf->isChecked();
     return request;
 }
@@ -196,6 +198,8 @@ bool DlgWvCreate::preview()
     m_ui->w_iq->clear();
     m_ui->w_spectrum->clear();
     m_ui->w_constellation->clear();
+    // The file is to hold the very noise that was shown.
+    m_seed = std::random_device()();
     SignalPreviewJob job(options());
     if (runInPlace(job) != JobOutcome::Finished) {
         return false;

@@ -51,4 +51,5 @@ private:
 
     std::unique_ptr<Ui::DlgWvCreate> m_ui;
     std::unique_ptr<CreateTypePages> m_pages;
+    unsigned m_seed = 0; ///< of the random values that the preview shows
 };

@@ -28,6 +28,7 @@ bool openForReading(QFile &file)
 void clearOutputs(WvFileInfo &info)
 {
     WvFileInfo cleared;
+    cleared.reading = info.reading;
     cleared.gainDb = info.gainDb;
     cleared.fileName = info.fileName;
     cleared.dataStream = info.dataStream;
@@ -61,7 +62,8 @@ bool HvFileIO::readWaveform(WvFileInfo *info)
     if (info == nullptr) {
         return Tracer::fail("Invalid input parameter.");
     }
-    if (info->dataStream == nullptr || info->markerStream == nullptr) {
+    const bool unpacks = info->reading == SampleReading::Unpacked;
+    if ((unpacks && info->dataStream == nullptr) || info->markerStream == nullptr) {
         return Tracer::fail("No temporary data storage available.");
     }
     if (!info->markerStream->restartAtBegining()) {
@@ -79,7 +81,8 @@ bool HvFileIO::readWaveform(WvFileInfo *info)
     }
     emit ProgressUpdate(100);
     ProgressClock::runEvents();
-    if (!info->dataStream->restartAtBegining() || !info->markerStream->restartAtBegining()) {
+    if ((unpacks && !info->dataStream->restartAtBegining()) ||
+        !info->markerStream->restartAtBegining()) {
         return Tracer::fail("Writing to temporary data storage failed.");
     }
     return true;
@@ -120,12 +123,19 @@ bool HvFileIO::writeWaveform(WvWriteJob &job, const QString &fileName, BufferedI
     WvWriter writer(job, {.data = dataStream, .markers = markerStream, .tags = tagsStream},
                     progress, report);
     writer.prepareLevels();
-    OutputFile file(fileName);
+    OutputFile file(fileName,
+                    job.overwrite ? OutputFile::Existing::Replaced : OutputFile::Existing::Kept);
     if (!file.open()) {
-        return Tracer::fail("Error opening output file.");
+        return Tracer::fail(
+            QString("Error opening output file '%1': %2").arg(fileName, file.errorString()));
     }
     if (!writer.write(file)) {
         return false;
+    }
+    // A cancel that came with the last samples counts, too: nothing has been replaced yet.
+    ProgressClock::runEvents();
+    if (m_abort) {
+        return Tracer::fail("Action aborted by user.");
     }
     if (!file.commit()) {
         return Tracer::fail("Error writing output file: " + file.errorString());

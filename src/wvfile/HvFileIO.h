@@ -33,8 +33,7 @@ public:
     /// Writes a file from lists in memory or from a data stream, with markers from a list or from a
     /// marker stream, and the text of a tags stream. Each stream may be null. Samples beyond full
     /// scale are clipped and counted in the record. A file that stands is replaced
-    /// once the new one is complete; a failure or a cancel leaves it as it was. Of a new file the
-    /// part that was written then stays on the disk.
+    /// once the new one is complete; after a failure or a cancel everything is as it was.
     [[nodiscard]] bool writeWaveform(WvWriteJob &job, const QString &fileName,
                                      BufferedIO *dataStream, BufferedIO *markerStream,
                                      BufferedIO *tagsStream);

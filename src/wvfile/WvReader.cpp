@@ -40,6 +40,10 @@ bool WvReader::read()
     if (round == Round::Failed || !openSampleBlock(name) || !readSamples()) {
         return false;
     }
+    if (m_info.reading == SampleReading::Located) {
+        return true;
+    }
+    m_info.levels = m_levels;
     m_info.rmsOffset = measuredOffset(m_levels.rmsLevel(m_info.samples));
     m_info.peakOffset = measuredOffset(m_levels.peakLevel());
     return true;
@@ -296,7 +300,8 @@ bool WvReader::openSampleBlock(const QString &name)
     if (!finalizeMarkers()) {
         return false;
     }
-    if (!m_info.dataStream->writeHeader(BufferedIO::DataHeader)) {
+    if (m_info.reading == SampleReading::Unpacked &&
+        !m_info.dataStream->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Writing to temporary waveform storage failed.");
     }
     Tracer::Trace(Tracer::Information, QString("Reading %1 samples @ %2 bit from waveform...")
@@ -314,7 +319,9 @@ bool WvReader::finalizeMarkers()
                           .arg(m_markers.lastByte(), 0, 16));
         // A count that the file can't hold fails below, at the samples; the stream needn't grow to
         // it.
-        if (!m_markers.extendTo(std::min<qint64>(m_info.controlLength, m_fileLimit))) {
+        // Markers that aren't unpacked go on with their last byte by themselves.
+        if (m_info.reading == SampleReading::Unpacked &&
+            !m_markers.extendTo(std::min<qint64>(m_info.controlLength, m_fileLimit))) {
             return false;
         }
     }
@@ -336,6 +343,15 @@ SampleCoding WvReader::coding() const
 
 bool WvReader::readSamples()
 {
+    m_info.coding = coding();
+    m_info.blockStart = m_source.position();
+    if (m_info.reading != SampleReading::Unpacked &&
+        m_source.size() - m_info.blockStart < 4 * static_cast<qint64>(m_info.samples)) {
+        return Tracer::fail("Cannot read enough data from xWAVEFORM tag!");
+    }
+    if (m_info.reading == SampleReading::Located) {
+        return true;
+    }
     const bool complete = readBlocks();
     m_measuring.wait();
     return complete;
@@ -379,6 +395,9 @@ bool WvReader::storeBlock(qint64 begin, std::span<const float> values)
         m_measuring.start(measure);
     } else {
         measure();
+    }
+    if (m_info.reading == SampleReading::Measured) {
+        return true;
     }
     if (!m_info.dataStream->writeBlock(static_cast<int>(values.size_bytes()), values.data())) {
         return Tracer::fail("Cannot write to temporary file!");

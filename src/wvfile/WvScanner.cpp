@@ -292,6 +292,12 @@ bool WvScanner::processSampleBlock(ByteSource &source, const QString &name)
     }
     // Held within the file by the source, however far the stated length leads.
     const qint64 rest = source.size() - source.position();
+    if (rest < dataBytes) {
+        m_summary.missingSamples = count - rest / 4;
+        warn(QString("The file is cut off: %1 of %2 samples are missing.")
+                 .arg(m_summary.missingSamples)
+                 .arg(count));
+    }
     return source.seek(source.position() + std::min(dataBytes, rest)) ||
            Tracer::fail("Invalid WAVEFORM tag.");
 }

@@ -1,7 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "SampleCoding.h"
+
 #include "base/limits.h"
+#include "streams/levels.h"
 
 #include <QList>
 #include <QString>
@@ -34,6 +37,13 @@ enum WvType {
     return format == WvFormatTvx ? WvTypeTvx : WvTypeTgx;
 }
 
+/// How far the reader goes with the samples of a file.
+enum class SampleReading {
+    Unpacked, ///< into the data stream, measured on the way
+    Measured, ///< the levels alone
+    Located,  ///< not read; the measured levels stay those of the tags
+};
+
 /// Job record of HvFileIO::readWaveform. The caller fills the input fields; all others are cleared
 /// and filled by the reader.
 struct WvFileInfo
@@ -46,6 +56,7 @@ struct WvFileInfo
     int prefixNumber = 0;     ///< number before a comma in the sample block's prefix, else 0
     double rmsOffset = 0;     ///< measured, dB below full scale
     double peakOffset = 0;    ///< measured, dB below full scale
+    LevelSums levels;         ///< measured
     double rmsOffsetTag = 0;  ///< first value of LEVEL OFFS, dB
     double peakOffsetTag = 0; ///< second value of LEVEL OFFS, dB
     int format = WvFormatUnknown;
@@ -54,9 +65,13 @@ struct WvFileInfo
     QString system;
     QString date;
 
+    SampleCoding coding = SampleCoding::A;
+    qint64 blockStart = 0; ///< byte of the file where the samples begin
+
+    SampleReading reading = SampleReading::Unpacked; ///< in
     double gainDb = 0;                  ///< in: gain applied to all samples while reading, dB
     QString fileName;                   ///< in: path of the file
-    BufferedIO *dataStream = nullptr;   ///< in: initialised stream, required
+    BufferedIO *dataStream = nullptr;   ///< in: initialised stream, required to unpack
     BufferedIO *markerStream = nullptr; ///< in: initialised stream, required
     BufferedIO *tagsStream = nullptr; ///< in: initialised stream; null if unknown tags don't matter
 };
@@ -78,6 +93,7 @@ struct WvWriteJob
     int samples = 0;          ///< must be above 0
     double rmsOffset = 0;     ///< dB; in, and out when computed by the writer
     double peakOffset = 0;    ///< dB; in, and out when computed by the writer
+    bool overwrite = true;    ///< a file that stands under the name is replaced
     QString comment;          ///< empty: no tag
     QString copyright;        ///< empty: no tag
     bool markerLists = true;  ///< what the marker stream holds is written, too
@@ -111,12 +127,13 @@ struct WvFileSummary
     QString comment;
     QString copyright;
     QString date;
-    qint64 samples = -1;      ///< -1 if unknown
-    double clock = -1;        ///< Hz, -1 if unknown
-    double playTime = -1;     ///< s, -1 if unknown
-    bool levelsValid = false; ///< a readable LEVEL OFFS was found
-    double peakOffset = 0;    ///< dB, from the tag
-    double rmsOffset = 0;     ///< dB, from the tag
+    qint64 samples = -1;       ///< -1 if unknown
+    qint64 missingSamples = 0; ///< that the file was cut off before
+    double clock = -1;         ///< Hz, -1 if unknown
+    double playTime = -1;      ///< s, -1 if unknown
+    bool levelsValid = false;  ///< a readable LEVEL OFFS was found
+    double peakOffset = 0;     ///< dB, from the tag
+    double rmsOffset = 0;      ///< dB, from the tag
     bool hasChecksum = false;
     bool hasMarkers = false;
     QString settingsFile;

@@ -19,6 +19,7 @@ private slots:
 
     void keepsWhatStoodThere();
     void keepsPermissionsAndLinks();
+    void keepsWhatAppearsMeanwhile();
     void writesToDevices();
     void tellsWhy();
 
@@ -64,6 +65,23 @@ void TestOutputFile::keepsPermissionsAndLinks()
             QFileInfo(m_folder->path("near")).isSymLink());
     const auto user = QFile::ReadUser | QFile::WriteUser;
     QCOMPARE(QFile::permissions(m_folder->path("sub/real")) & ~user, permissions);
+}
+
+void TestOutputFile::keepsWhatAppearsMeanwhile()
+{
+    const auto kept = OutputFile::Existing::Kept;
+    OutputFile file(m_folder->path("out"), kept);
+    QVERIFY(file.open() && file.write(QByteArrayView("new")));
+    QVERIFY(m_folder->store("out", "another's"));
+    QVERIFY(!file.commit() && file.errorString() == "A file of this name exists already");
+    QVERIFY(!OutputFile(m_folder->path("out"), kept).open());
+    QCOMPARE(m_folder->load("out"), QByteArray("another's"));
+    OutputFile other(m_folder->path("other"), kept);
+    QVERIFY(other.open() && other.write(QByteArrayView("new")) && other.commit());
+    QCOMPARE(m_folder->load("other"), QByteArray("new"));
+    QVERIFY(QFile::link("other", m_folder->path("link")));
+    QVERIFY(isSameFile(m_folder->path("link"), m_folder->path("other")));
+    QVERIFY(!isSameFile(m_folder->path("out"), m_folder->path("other")));
 }
 
 void TestOutputFile::writesToDevices()

@@ -153,7 +153,9 @@ void TestJobs::importFails()
     forRows({{"cut data", wavFile(formatChunk() + data).chopped(1), "out.wv",
               QStringList{"Cannot read data from .wav file."}},
              {"no folder", wavFile(formatChunk() + data), "missing/out.wv",
-              QStringList{"Error opening output file.", "Waveform generation failed."}}},
+              QStringList{QString("Error opening output file '%1': No such file or directory")
+                              .arg(path("missing/out.wv")),
+                          "Waveform generation failed."}}},
             [&](const QByteArray &bytes, const QString &output, const QStringList &errors) {
                 QVERIFY(m_folder.store("in.wav", bytes));
                 WavImportJob job({path("in.wav"), {.output = {path(output), {}, {}}}});

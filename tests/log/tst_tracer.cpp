@@ -135,7 +135,7 @@ void TestTracer::entriesComeInOrderUpToABound()
     Tracer::Trace(1, "a");
     QVERIFY(!Tracer::fail("b"));
     Tracer::Trace(2, "");
-    QCOMPARE(log.take(), QStringList({"1|a", "4|b", "2|"}));
+    QCOMPARE(log.take(), QStringList({"1|a", "4|b"}));
     constexpr int lines = 250'000;
     for (int i = 0; i < lines; ++i) {
         Tracer::Trace(1, QString::number(i));

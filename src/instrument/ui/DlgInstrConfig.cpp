@@ -161,7 +161,11 @@ void DlgInstrConfig::rebuildTree()
 
     tree->clear();
     const QList<InstrConfigEntry> entries = m_list.entries();
-    if (!entries.isEmpty()) {
+    if (m_noVisa) {
+        for (const InstrConfigEntry &entry : entries) {
+            showOffline(entry, false);
+        }
+    } else if (!entries.isEmpty()) {
         LookJob job(entries, m_noVisa);
         (void)runJob(job, this, nullptr);
         for (qsizetype i = 0; i < entries.size(); ++i) {
