@@ -170,7 +170,8 @@ void MainWindow::TraceDataAvailable()
             delete m_ui->lw_log->takeItem(0);
         }
         // All rows have the height of one line.
-        auto *row = new QListWidgetItem(levelIcon(level), text.simplified(), m_ui->lw_log);
+        auto *row =
+            new QListWidgetItem(levelIcon(level), QString(text).replace('\n', ' '), m_ui->lw_log);
         row->setToolTip(text);
     }
     m_ui->lw_log->scrollToBottom();
