@@ -129,20 +129,28 @@ void timeJob(benchmark::State &state, MakeJob makeJob)
     state.SetItemsProcessed(state.iterations() * FileSamples);
 }
 
-/// The peer: the same file read and written as it is.
+/// The peer: the same file read, and written as it is, as often as a tool writes.
 class CopyOnly : public EditJob
 {
 public:
-    explicit CopyOnly(const Files &files)
+    explicit CopyOnly(const Files &files, int copies = 1)
         : EditJob(files.source(), files.out(), Reading::Quiet)
+        , m_copies(copies)
     {
     }
 
 private:
     bool edit() override
     {
-        return output().save({source().data(), source().markers(), source().tags()}, "Saving...");
+        bool saved = true;
+        for (int i = 0; i < m_copies && saved; ++i) {
+            saved =
+                output().save({source().data(), source().markers(), source().tags()}, "Saving...");
+        }
+        return saved;
     }
+
+    int m_copies;
 };
 
 const auto *const registered = [] {
@@ -153,6 +161,7 @@ const auto *const registered = [] {
             ->UseRealTime();
     };
     add("readAndWrite", [](const Files &f) { return std::make_unique<CopyOnly>(f); });
+    add("readAndWriteTwice", [](const Files &f) { return std::make_unique<CopyOnly>(f, 2); });
     add("level", [](const Files &f) {
         return std::make_unique<LevelJob>(LevelRequest{f.source(), f.out(), {}, {}});
     });

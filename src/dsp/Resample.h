@@ -3,6 +3,8 @@
 
 #include "filtertable.h"
 
+#include "streams/levels.h"
+
 #include <QObject>
 #include <QString>
 
@@ -15,6 +17,13 @@
 class BufferedIO;
 class Interpolator;
 class TapGeometry;
+
+/// Levels of the two results of a polar split.
+struct PolarLevels
+{
+    LevelSums phase;
+    LevelSums amplitude;
+};
 
 /// The stream processor of the tools: passes over whole data streams ("IQF" and float I/Q records).
 ///
@@ -77,9 +86,11 @@ public:
                                       BufferedIO *stream);
 
     /// Splits the first `samples` samples into the conjugate of their unit vectors and their
-    /// magnitudes: I = (2 magnitude - 1) gain + offset, Q = 0.
+    /// magnitudes: I = (2 magnitude - 1) gain + offset, Q = 0. The levels of both results are added
+    /// to `levels`, if that isn't null.
     [[nodiscard]] bool polarSplit(int samples, BufferedIO *source, BufferedIO *phase,
-                                  BufferedIO *amplitude, double offset, double gain);
+                                  BufferedIO *amplitude, double offset, double gain,
+                                  PolarLevels *levels = nullptr);
 
     /// Measures the linear peak and RMS of the vectors of the first `samples` samples. Both
     /// outputs are set on success only.

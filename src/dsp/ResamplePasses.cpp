@@ -170,7 +170,7 @@ bool Resample::frequencyShift(int samples, double frequency, double clock, Buffe
 }
 
 bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, BufferedIO *amplitude,
-                          double offset, double gain)
+                          double offset, double gain, PolarLevels *levels)
 {
     m_cancelled = false;
     if (samples < 1) {
@@ -205,6 +205,10 @@ bool Resample::polarSplit(int samples, BufferedIO *source, BufferedIO *phase, Bu
         const std::span<float> phasePart = std::span(phaseBlock).first(iq.size());
         const std::span<float> amplitudePart = std::span(amplitudeBlock).first(iq.size());
         splitPolar(iq, phasePart, amplitudePart, offset, gain);
+        if (levels != nullptr) {
+            addLevels(phasePart, levels->phase);
+            addLevels(amplitudePart, levels->amplitude);
+        }
         if (!writeSamples(*phase, phasePart)) {
             return failAtSample("Writing phase data", failedWriteSample(*phase, first));
         }

@@ -1,9 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "PolarJob.h"
 
-#include "RangeMeter.h"
-
-#include "dsp/Resample.h"
 #include "log/Tracer.h"
 
 #include <QDir>
@@ -54,11 +51,12 @@ bool PolarJob::edit()
     reportSource();
     output().setLength(*clock, source().info().samples);
     m_amplitudeOutput.record() = output().record();
-    return split() && save(output(), *m_phase.stream(), "Phase") &&
-           save(m_amplitudeOutput, *m_amplitude.stream(), "Amplitude");
+    PolarLevels levels;
+    return split(levels) && save(output(), *m_phase.stream(), levels.phase, "Phase") &&
+           save(m_amplitudeOutput, *m_amplitude.stream(), levels.amplitude, "Amplitude");
 }
 
-bool PolarJob::split()
+bool PolarJob::split(PolarLevels &levels)
 {
     const int samples = source().info().samples;
     emit report(ReportLine::heading("Converting"));
@@ -73,23 +71,15 @@ bool PolarJob::split()
     Resample splitter;
     const JobStep step(*this, "Converting...", splitter);
     return (splitter.polarSplit(samples, source().data(), m_phase.stream(), m_amplitude.stream(),
-                                m_request.offset, m_request.gain) &&
+                                m_request.offset, m_request.gain, &levels) &&
             !isCancelled()) ||
            Tracer::fail("Polar conversion of the waveform failed.");
 }
 
-bool PolarJob::save(WaveformOutput &file, BufferedIO &data, const QString &part)
+bool PolarJob::save(WaveformOutput &file, BufferedIO &data, const LevelSums &levels,
+                    const QString &part)
 {
-    const int samples = source().info().samples;
-    {
-        RangeMeter meter;
-        const JobStep step(*this, "Calculating...", meter);
-        const std::optional<LevelSums> levels = meter.measure(data, 0, samples);
-        if (!levels) {
-            return false;
-        }
-        file.setLevels(levels->peakLevel(), levels->rmsLevel(samples));
-    }
+    file.setLevels(levels.peakLevel(), levels.rmsLevel(source().info().samples));
     emit report(ReportLine::heading("Saving " + part));
     file.reportWaveform();
     const WvStreams streams{&data, source().markers(), source().tags()};

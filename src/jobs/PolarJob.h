@@ -3,6 +3,8 @@
 
 #include "EditJob.h"
 
+#include "dsp/Resample.h"
+
 struct PolarRequest
 {
     QString inputFile;
@@ -29,8 +31,9 @@ public:
 private:
     [[nodiscard]] QString refusal() const override;
     [[nodiscard]] bool edit() override;
-    [[nodiscard]] bool split();
-    [[nodiscard]] bool save(WaveformOutput &file, BufferedIO &data, const QString &part);
+    [[nodiscard]] bool split(PolarLevels &levels);
+    [[nodiscard]] bool save(WaveformOutput &file, BufferedIO &data, const LevelSums &levels,
+                            const QString &part);
 
     PolarRequest m_request;
     WaveformOutput m_amplitudeOutput;
