@@ -319,9 +319,7 @@ bool WvReader::finalizeMarkers()
                           .arg(m_markers.lastByte(), 0, 16));
         // A count that the file can't hold fails below, at the samples; the stream needn't grow to
         // it.
-        // Markers that aren't unpacked go on with their last byte by themselves.
-        if (m_info.reading == SampleReading::Unpacked &&
-            !m_markers.extendTo(std::min<qint64>(m_info.controlLength, m_fileLimit))) {
+        if (!m_markers.extendTo(std::min<qint64>(m_info.controlLength, m_fileLimit))) {
             return false;
         }
     }

@@ -52,6 +52,7 @@ void TestEngineeringNumber::parse()
              {"blanks", "  -3   dB ", "dB", true, -3},
              {"groups", "1 000 000", "Hz", false, 1e6},
              {"exponent and prefix", "1.5E-3 k", "Hz", false, 1.5},
+             {"femto", "5 fHz", "Hz", true, 5e-15},
              {"tera", "1 T", "", false, 1e12},
              {"capital kilo", "5 K", "Hz", true, 5e3},
              {"any unit", "5 kg", "", false, 5e3},
@@ -63,7 +64,7 @@ void TestEngineeringNumber::parse()
                          qPrintable(QString::number(number->value, 'g', 17)));
             });
     for (const char *text :
-         {"", "   ", "kHz", "1.2.3", "--1", "1 x", "0x10", "inf", "nan", "1e999", "1;2", "5 fHz"}) {
+         {"", "   ", "kHz", "1.2.3", "--1", "1 x", "0x10", "inf", "nan", "1e999", "1;2"}) {
         QVERIFY2(!parseNumber(text, "Hz", true).has_value(), text);
         QVERIFY2(!parseNumber(text, "Hz", false).has_value(), text);
     }

@@ -360,7 +360,8 @@ void TestEditJobs::refusals()
     const QString in = m_folder.path("in.wv");
     const QString clockless = m_folder.path("clockless.wv");
     const QByteArray noClock = QString("4|The waveform \"%1\" states no clock rate. Give the clock "
-                                       "rate of the result.")
+                                       "rate of the result in the field ARB Clockrate, or by "
+                                       "--clock.")
                                    .arg(clockless)
                                    .toUtf8();
     const auto check = [this](const std::shared_ptr<ToolJob> &job, const QByteArray &reason) {

@@ -95,10 +95,10 @@ void TestLevelJob::keepsLongUnknownTags()
 void TestLevelJob::completesMarkers()
 {
     forRows({{"ends high", "{CONTROL LENGTH:4}{MARKER LIST 1: 0:0;2:1}", " 0:0;2:1", " 0:0"},
-             // The second list is shorter than the first, with whose last byte the trace goes on.
-             {"cut by another list",
+             // Each trace goes on as its own list ends.
+             {"shorter than another list",
               "{CONTROL LENGTH:4}{MARKER LIST 1: 0:1;3:0}{MARKER LIST 2: 0:0;1:1}", " 0:1;3:0",
-              " 0:0;1:1;4:0"},
+              " 0:0;1:1"},
              {"longer than the samples", "{CONTROL LENGTH:20}{MARKER LIST 1: 0:0;5:1;15:0}",
               " 0:0;5:1", " 0:0"}},
             [](const QByteArray &tags, const QByteArray &first, const QByteArray &second) {
