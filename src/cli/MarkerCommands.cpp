@@ -157,6 +157,8 @@ void addMarkers(CommandSet &commands)
             openGroup(groups).pattern = QByteArray::fromStdString(text);
         },
         "Sequence of 0 and 1, repeated over the range");
+    addNumber(command, "--clock", markers->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
+              "Clock written to the file (default: that of the source)");
     addOutputArguments(command, markers->output);
 }
 
