@@ -34,7 +34,12 @@ void ConstellationGrid::append(std::span<const IqSample> samples, double scaleI,
             m_counts[indexOf(cellOf(i), cellOf(q))] += 1;
         }
     }
-    m_greatest = *std::max_element(m_counts.begin(), m_counts.end());
+    m_greatest = 0;
+    for (int row = 0; row < Size; ++row) {
+        for (int column = 0; column < Size; ++column) {
+            m_greatest = std::max(m_greatest, density(row, column));
+        }
+    }
 }
 
 void ConstellationGrid::clear()
@@ -43,13 +48,20 @@ void ConstellationGrid::clear()
     m_greatest = 0;
 }
 
+double ConstellationGrid::density(int row, int column) const
+{
+    const double width = row == Middle ? 2 : 1;
+    const double height = column == Middle ? 2 : 1;
+    return count(row, column) / (width * height);
+}
+
 double ConstellationGrid::levelDb(int row, int column) const
 {
-    const double cell = count(row, column);
+    const double cell = density(row, column);
     if (cell <= 0) {
         return EmptyDb;
     }
-    // Half a sample would be as dark as none.
-    const double range = std::log(m_greatest * 2);
+    // Half of the least that a cell can hold would be as dark as none.
+    const double range = std::log(m_greatest * 8);
     return std::log(m_greatest / cell) / range * EmptyDb;
 }

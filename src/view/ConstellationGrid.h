@@ -26,7 +26,10 @@ public:
     /// Samples in a cell; the row grows with I, the column with Q.
     [[nodiscard]] double count(int row, int column) const { return m_counts[indexOf(row, column)]; }
 
-    /// The count relative to the greatest one, 0 dB for that. The colour range is used in full: a
+    /// Samples for the area of a plain cell: noise would show a cross through zero otherwise.
+    [[nodiscard]] double density(int row, int column) const;
+
+    /// The density relative to the greatest one, 0 dB for that. The colour range is used in full: a
     /// single sample among many lies a little above its bottom, where the empty cell is.
     [[nodiscard]] double levelDb(int row, int column) const;
 

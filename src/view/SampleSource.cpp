@@ -70,7 +70,7 @@ bool StreamSource::next(std::span<IqSample> samples, std::span<quint8> markers)
         samples[k] = {m_block[2 * k], m_block[2 * k + 1]};
     }
     const int markerCount = static_cast<int>(markers.size());
-    if (m_markers.readBlock(markerCount, markers.data()) != markerCount) {
+    if (markerCount > 0 && m_markers.readBlock(markerCount, markers.data()) != markerCount) {
         return Tracer::fail("Cannot read marker data from temporary file.");
     }
     m_done += static_cast<qint64>(samples.size());

@@ -23,7 +23,8 @@ public:
     [[nodiscard]] virtual qint64 first() const = 0;
     /// Goes to the first sample. False, and a line in the log, if that fails.
     [[nodiscard]] virtual bool restart() = 0;
-    /// Fills both spans, which have one length, with what comes next. Same failures.
+    /// Fills both spans with what comes next; they have one length, or that of the markers is 0,
+    /// for a caller that looks at no markers in this whole run. Same failures.
     [[nodiscard]] virtual bool next(std::span<IqSample> samples, std::span<quint8> markers) = 0;
 };
 

@@ -7,6 +7,7 @@
 #include "dsp/windows.h"
 #include "plotscale.h"
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <complex>
@@ -95,4 +96,18 @@ std::vector<double> SpectrumLines::mean() const
         }
     }
     return sum;
+}
+
+std::vector<double> SpectrumLines::maximum() const
+{
+    if (m_lines.empty()) {
+        return {};
+    }
+    std::vector<double> result = m_lines.front().level;
+    for (const Line &line : m_lines) {
+        for (std::size_t i = 0; i < result.size(); ++i) {
+            result[i] = std::max(result[i], line.level[i]);
+        }
+    }
+    return result;
 }

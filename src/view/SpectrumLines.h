@@ -36,6 +36,9 @@ public:
     /// The mean of all lines in dB, 512 values; empty without lines.
     [[nodiscard]] std::vector<double> mean() const;
 
+    /// The greatest level of all lines, 512 values; empty without lines.
+    [[nodiscard]] std::vector<double> maximum() const;
+
     /// Frames transformed since the object was made.
     [[nodiscard]] qint64 transformCount() const { return m_transformCount; }
 

@@ -210,6 +210,19 @@ CORVANE_INLINE void fold(TraceBin &bin, const Block &block, int count, double &s
     bin.magAvg = sum / bin.count;
 }
 
+/// Nothing lies before the very first sample, so that it takes the step to the next one: 0 would be
+/// seen as a stroke from the carrier at the edge of the picture.
+double firstStep(std::span<const IqSample> samples)
+{
+    if (samples.size() < 2) {
+        return 0;
+    }
+    Block block;
+    block.folded[0] = 0;
+    analyse(samples.data(), 2, block);
+    return block.step[1];
+}
+
 } // namespace
 
 void TraceBins::compute(std::span<const IqSample> samples, std::span<const quint8> markers)
@@ -252,8 +265,8 @@ CORVANE_CLONES void TraceBins::append(std::span<const IqSample> samples,
             std::min({inBin, samples.size() - taken, std::size_t{Block::Size}});
         const int blockCount = static_cast<int>(count);
         analyse(samples.data() + taken, blockCount, block);
-        if (m_done == 0) { // nothing lies before the very first sample
-            block.step[0] = 0;
+        if (m_done == 0) {
+            block.step[0] = firstStep(samples);
         }
         TraceBin &bin = m_bins[static_cast<std::size_t>(m_bin)];
         fold(bin, block, blockCount, m_sum);

@@ -152,23 +152,40 @@ bool ViewWindow::loadPage(const Range &range)
     return true;
 }
 
-bool ViewWindow::zoomIn()
+bool ViewWindow::zoomIn(qint64 kept)
 {
     const auto *next = std::lower_bound(ZoomLadder.begin(), ZoomLadder.end(), m_points);
-    return setPoints(next == ZoomLadder.begin() ? m_points : *(next - 1));
+    return setPoints(next == ZoomLadder.begin() ? m_points : *(next - 1), kept);
 }
 
-bool ViewWindow::zoomOut()
+bool ViewWindow::zoomOut(qint64 kept)
 {
     const auto *next = std::upper_bound(ZoomLadder.begin(), ZoomLadder.end(), m_points);
-    return setPoints(next == ZoomLadder.end() ? m_points : *next);
+    return setPoints(next == ZoomLadder.end() ? m_points : *next, kept);
 }
 
-bool ViewWindow::setPoints(int points)
+bool ViewWindow::setPoints(int points, qint64 kept)
 {
+    const int former = m_points;
     const qint64 center = m_first + m_points / 2;
     m_points = static_cast<int>(std::min<qint64>(points, m_sampleCount));
-    return show(centredOn(center));
+    if (kept < 0 || former < 1) {
+        return show(centredOn(center));
+    }
+    const qint64 before = (kept - m_first) * m_points / former;
+    return show(bounded(std::min(kept - before, m_sampleCount - m_points)));
+}
+
+IqList ViewWindow::around(qint64 count, qint64 &first)
+{
+    count = std::min(count, m_sampleCount);
+    first = bounded(std::min(m_first + m_points / 2 - count / 2, m_sampleCount - count));
+    IqList samples;
+    QList<quint8> markers;
+    if (count < 1 || !read({first, count}, samples, markers)) {
+        return {};
+    }
+    return samples;
 }
 
 qint64 ViewWindow::centredOn(qint64 sample) const

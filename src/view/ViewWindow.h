@@ -48,9 +48,14 @@ public:
     /// message if the window would reach beyond the end of the waveform: it then stays.
     [[nodiscard]] bool show(qint64 first);
 
-    /// The next step of the ladder below or above the present length, about the same middle.
-    [[nodiscard]] bool zoomIn();
-    [[nodiscard]] bool zoomOut();
+    /// The next step of the ladder below or above the present length, about the same middle or with
+    /// sample `kept` of the waveform at the same place of the view.
+    [[nodiscard]] bool zoomIn(qint64 kept = -1);
+    [[nodiscard]] bool zoomOut(qint64 kept = -1);
+
+    /// `count` samples about the middle of the view, or as many as the waveform has, with the
+    /// position of the first one; empty, with the reason logged, if they can't be read.
+    [[nodiscard]] IqList around(qint64 count, qint64 &first);
 
     /// Starts that the move commands lead to; `show` takes them. Below 0 becomes 0.
     [[nodiscard]] qint64 reverse() const { return bounded(m_first - m_points); }
@@ -86,7 +91,7 @@ private:
 
     [[nodiscard]] qint64 littleStep() const { return qMax<qint64>(m_points / 20, 1); }
     [[nodiscard]] static qint64 bounded(qint64 first) { return qMax<qint64>(first, 0); }
-    [[nodiscard]] bool setPoints(int points);
+    [[nodiscard]] bool setPoints(int points, qint64 kept);
     [[nodiscard]] bool isShowable(qint64 first) const;
     [[nodiscard]] bool slide(qint64 first);
     [[nodiscard]] bool loadPage(const Range &range);

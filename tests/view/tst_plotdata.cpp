@@ -62,7 +62,10 @@ Bins plainBins(const std::vector<IqSample> &samples, const std::vector<quint8> &
         const double m = std::sqrt(s.i * s.i + s.q * s.q);
         const double p = plainPhase(s, m);
         const double q = p < 0 ? p + 6.283 : p;
-        double d = i == 0 ? 0 : q - previous;
+        const IqSample &second = samples[1];
+        const double next = plainPhase(second, std::hypot(second.i, second.q));
+        // The first one, which has nothing before it, takes the step to the second.
+        double d = i == 0 ? (next < 0 ? next + 6.283 : next) - q : q - previous;
         previous = q;
         if (d > 3.1415) {
             d -= 6.283;
