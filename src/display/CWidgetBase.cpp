@@ -94,6 +94,7 @@ void CWidgetBase::setLinearPower(bool linear)
 
 QImage CWidgetBase::picture()
 {
+    dropHover();
     const double ratio = devicePixelRatioF();
     QImage image(QSizeF(QSizeF(size()) * ratio).toSize(), QImage::Format_RGB32);
     image.setDevicePixelRatio(ratio);
@@ -104,6 +105,7 @@ QImage CWidgetBase::picture()
 
 bool CWidgetBase::savePicture(const QString &fileName)
 {
+    dropHover();
     return savePlotPicture(fileName, size(), devicePixelRatioF(),
                            [this](QPainter &painter) { drawPlot(painter, QRectF(rect())); });
 }
@@ -122,9 +124,11 @@ void CWidgetBase::choosePictureFile()
 {
     QString filter;
     QString fileName = QFileDialog::getSaveFileName(
-        this, tr("Save Picture"), {}, tr("PNG picture (*.png);;SVG picture (*.svg)"), &filter);
+        this, tr("Save Picture"), m_exportName,
+        tr("PNG picture (*.png);;SVG picture (*.svg);;PDF picture (*.pdf)"), &filter);
     if (!fileName.isEmpty()) {
-        fileName = withSuffix(fileName, filter.contains("*.svg") ? "svg" : "png", {"png", "svg"});
+        const QString suffix = filter.section("*.", 1).section(')', 0, 0);
+        fileName = withSuffix(fileName, suffix, pictureSuffixes());
         (void)savePicture(fileName); // the log tells of a failure
     }
 }
@@ -132,7 +136,7 @@ void CWidgetBase::choosePictureFile()
 void CWidgetBase::chooseDataFile()
 {
     const QString fileName =
-        QFileDialog::getSaveFileName(this, tr("Save Data"), {}, tr("CSV table (*.csv)"));
+        QFileDialog::getSaveFileName(this, tr("Save Data"), m_exportName, tr("CSV table (*.csv)"));
     if (!fileName.isEmpty()) {
         (void)saveData(withSuffix(fileName, "csv", {}));
     }

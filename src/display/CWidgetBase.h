@@ -66,6 +66,13 @@ public:
     [[nodiscard]] QSize sizeHint() const override { return {400, 300}; }
     [[nodiscard]] QSize minimumSizeHint() const override { return {200, 120}; }
 
+    /// The name, without suffix, that the dialogs for saving propose.
+    void setExportName(const QString &name) { m_exportName = name; }
+
+signals:
+    /// A double click asks for the whole room, or for the place of before.
+    void enlargeRequested();
+
 public slots:
     void copyPicture();
     void choosePictureFile();
@@ -78,6 +85,9 @@ protected:
     /// Writes the shown data as CSV with a header line; nothing when there are none.
     virtual void writeData(QTextStream &stream);
     [[nodiscard]] virtual bool hasData() const { return false; }
+
+    /// Forgets the place of the mouse, which no saved picture shows.
+    virtual void dropHover() {}
 
     /// Adds the entries of the derived display above those of the base.
     virtual void extendContextMenu(QMenu &menu);
@@ -100,5 +110,6 @@ private:
     int m_right = 0;
     bool m_linearPower = false;
     int m_colorSet = 0;
+    QString m_exportName;
     PlotStyle m_style; ///< palette and font
 };

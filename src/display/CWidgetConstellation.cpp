@@ -72,6 +72,17 @@ void CWidgetConstellation::col_noise()
     setColorMode(static_cast<int>(ColorMode::NoiseBlue));
 }
 
+void CWidgetConstellation::col_viridis()
+{
+    setColorMode(static_cast<int>(ColorMode::Viridis));
+}
+
+void CWidgetConstellation::setCursorSample(const std::optional<IqSample> &sample)
+{
+    m_scene.cursor = sample;
+    update();
+}
+
 void CWidgetConstellation::drawPlot(QPainter &painter, const QRectF &area)
 {
     updateGrid();
@@ -88,7 +99,8 @@ void CWidgetConstellation::extendContextMenu(QMenu &menu)
     addColorModes<CWidgetConstellation>(
         menu, this, colorMode(),
         {&CWidgetConstellation::col_rainbow, &CWidgetConstellation::col_blackwhite,
-         &CWidgetConstellation::col_blue, &CWidgetConstellation::col_noise});
+         &CWidgetConstellation::col_blue, &CWidgetConstellation::col_noise,
+         &CWidgetConstellation::col_viridis});
 }
 
 void CWidgetConstellation::mouseMoveEvent(QMouseEvent *event)

@@ -19,6 +19,9 @@ public:
     void setColorMode(int mode);
     [[nodiscard]] int colorMode() const { return static_cast<int>(m_scene.colorMode); }
 
+    /// Marks the sample of the measuring cursor; nothing marks none.
+    void setCursorSample(const std::optional<IqSample> &sample);
+
     [[nodiscard]] const ConstellationScene &scene();
 
 public slots:
@@ -27,6 +30,7 @@ public slots:
     void col_blackwhite();
     void col_blue();
     void col_noise();
+    void col_viridis();
 
 protected:
     void drawPlot(QPainter &painter, const QRectF &area) override;
@@ -35,6 +39,7 @@ protected:
     void extendContextMenu(QMenu &menu) override;
     void mouseMoveEvent(QMouseEvent *event) override;
     void leaveEvent(QEvent *event) override;
+    void dropHover() override { m_scene.mouse.reset(); }
 
 private:
     void updateGrid();

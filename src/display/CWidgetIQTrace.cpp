@@ -36,6 +36,7 @@ void CWidgetIQTrace::setData(const QList<CWidgetBase::IQData> &samples,
     m_scene.sampleCount = samples.size();
     m_dirty = true;
     m_mouseReported = false;
+    m_scene.mouseBin = -1; // it stood at a sample of the former data
     update();
 }
 
@@ -106,13 +107,30 @@ void CWidgetIQTrace::clear()
 void CWidgetIQTrace::zoomInY()
 {
     m_scene.zoomY = std::min(niceStep(m_scene.zoomY * 1.5), LargestZoomY);
+    keepPeakOnView();
     update();
+}
+
+/// A magnified level scale that began at 0 dB would lose a weak signal.
+void CWidgetIQTrace::keepPeakOnView()
+{
+    updateBins();
+    double peak = 0;
+    for (const TraceBin &bin : m_scene.bins.bins()) {
+        peak = bin.count > 0 ? std::max(peak, bin.magMax) : peak;
+    }
+    constexpr double Range = 100; // dB on view without zoom
+    const double step = Range / 10 / m_scene.zoomY;
+    const double peakDb = magnitudeToDb(peak);
+    const bool isFar = peakDb > -Range && peakDb < -5 * step;
+    m_scene.topDb = isFar ? std::ceil(peakDb / step) * step : 0;
 }
 
 void CWidgetIQTrace::zoomOutY()
 {
     // 10 -> 5, 5 -> 2, 2 -> 1: the next step at or above 0.4 of the present one.
     m_scene.zoomY = std::max(niceStep(m_scene.zoomY * 0.4), 1.0);
+    keepPeakOnView();
     update();
 }
 
@@ -124,7 +142,7 @@ void CWidgetIQTrace::drawPlot(QPainter &painter, const QRectF &area)
 
 void CWidgetIQTrace::writeData(QTextStream &stream)
 {
-    writeSampleTable(stream, m_samples, m_markers, m_firstSample);
+    writeSampleTable(stream, m_samples, m_markers, m_scene.firstSample);
 }
 
 void CWidgetIQTrace::mousePressEvent(QMouseEvent *event)
@@ -162,9 +180,13 @@ void CWidgetIQTrace::mouseDoubleClickEvent(QMouseEvent *event)
 
 void CWidgetIQTrace::wheelEvent(QWheelEvent *event)
 {
-    if (event->angleDelta().y() > 0) {
+    constexpr int Step = 120; // of a plain wheel; others send parts of it
+    m_wheel += event->angleDelta().y();
+    m_wheelSample = sampleAt(event->position());
+    for (; m_wheel >= Step; m_wheel -= Step) {
         emit zoom_in();
-    } else {
+    }
+    for (; m_wheel <= -Step; m_wheel += Step) {
         emit zoom_out();
     }
     event->accept();

@@ -35,8 +35,11 @@ public:
     void setShowMarkers(bool show);
     /// Clock rate in Hz, so that the axis shows time; 0 shows samples.
     void setClock(double hz);
-    /// Position of the first sample in the waveform, for tables of the data.
-    void setFirstSample(qint64 first) { m_firstSample = first; }
+    /// Position of the first sample in the waveform, for the time axis and for tables.
+    void setFirstSample(qint64 first) { m_scene.firstSample = first; }
+
+    /// While zoom_in and zoom_out are sent: the sample under the mouse, -1 if there is none.
+    [[nodiscard]] int wheelSample() const { return m_wheelSample; }
 
     [[nodiscard]] const TraceScene &scene();
 
@@ -60,6 +63,7 @@ protected:
     void drawPlot(QPainter &painter, const QRectF &area) override;
     void writeData(QTextStream &stream) override;
     [[nodiscard]] bool hasData() const override { return !m_samples.isEmpty(); }
+    void dropHover() override { m_scene.mouseBin = -1; }
     void mousePressEvent(QMouseEvent *event) override;
     void mouseMoveEvent(QMouseEvent *event) override;
     void mouseDoubleClickEvent(QMouseEvent *event) override;
@@ -69,11 +73,13 @@ private:
     [[nodiscard]] int sampleAt(const QPointF &position) const;
     void moveMouseCursor(int sample);
     void updateBins();
+    void keepPeakOnView();
 
     QList<CWidgetBase::IQData> m_samples;
     QList<quint8> m_markers;
     TraceScene m_scene;
     bool m_dirty = false;
     bool m_mouseReported = false; ///< the shown data were reported at the mouse cursor
-    qint64 m_firstSample = 0;
+    int m_wheel = 0;              ///< of a step, in eighths of a degree
+    int m_wheelSample = -1;
 };

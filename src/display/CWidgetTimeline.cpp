@@ -1,12 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CWidgetTimeline.h"
 
-#include "base/EngineeringNumber.h"
+#include "OverviewPainter.h"
+#include "plotaxis.h"
 #include "plotdraw.h"
 
 #include <QFontMetrics>
 #include <QMouseEvent>
 #include <QPainter>
+#include <QWheelEvent>
 
 #include <algorithm>
 #include <cmath>
@@ -38,13 +40,6 @@ double TimelinePainter::xOf(const QRectF &bar, double sample) const
                : bar.left();
 }
 
-QString TimelinePainter::positionText(qint64 sample) const
-{
-    return m_scene.clockHz > 0 ? formatNumber(static_cast<double>(sample) / m_scene.clockHz,
-                                              NumberFormat{.unit = "s", .precision = 3})
-                               : QString::number(sample);
-}
-
 void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
 {
     painter.save();
@@ -56,6 +51,7 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
     }
     const PixelGrid pixels(painter);
     fillArea(painter, place, m_style.color(ColorSlot::MarkedBackground));
+    OverviewPainter(m_style, m_scene.overview).paintBare(painter, place.adjusted(0, 1, 0, -1));
     painter.setFont(m_style.font);
     painter.setPen(m_style.color(ColorSlot::Text));
     const QRectF texts(place.left(), place.bottom() + 1, place.width(),
@@ -68,11 +64,20 @@ void TimelinePainter::paint(QPainter &painter, const QRectF &area) const
         const QRectF range(pixels.snap(left), place.top(), pixels.snap(width), place.height());
         fillArea(painter, range, m_style.color(ColorSlot::PeakTrace, 110));
         pixels.frame(range, m_style.color(ColorSlot::PeakTrace));
-        painter.drawText(texts, Qt::AlignLeft | Qt::AlignVCenter, positionText(0));
-        painter.drawText(texts, Qt::AlignRight | Qt::AlignVCenter, positionText(m_scene.total));
+        const auto seconds = [this](qint64 sample) {
+            return static_cast<double>(sample) / (m_scene.clockHz > 0 ? m_scene.clockHz : 1);
+        };
+        const QString unit = m_scene.clockHz > 0 ? "s" : "";
+        const AxisTexts whole({0, seconds(m_scene.total), unit});
+        painter.drawText(texts, Qt::AlignLeft | Qt::AlignVCenter, whole.exact(0));
+        painter.drawText(texts, Qt::AlignRight | Qt::AlignVCenter,
+                         whole.exact(seconds(m_scene.total)));
         const QFontMetricsF metrics(m_style.font);
-        const QString rangeText =
-            positionText(m_scene.first) + " ... " + positionText(m_scene.first + m_scene.count);
+        // As exact as the view is short.
+        const double viewFrom = seconds(m_scene.first);
+        const double viewTo = seconds(m_scene.first + m_scene.count);
+        const AxisTexts view({viewFrom, viewTo, unit});
+        const QString rangeText = view.exact(viewFrom) + " ... " + view.exact(viewTo);
         if (metrics.horizontalAdvance(rangeText) <
             texts.width() - 2 * metrics.horizontalAdvance("888.888 ms ")) {
             painter.drawText(texts, Qt::AlignCenter, rangeText);
@@ -104,6 +109,13 @@ void CWidgetTimeline::setWaveform(qint64 total, double clockHz)
 {
     m_scene.total = std::max<qint64>(total, 0);
     m_scene.clockHz = clockHz;
+    m_scene.overview = Overview();
+    update();
+}
+
+void CWidgetTimeline::setOverview(const Overview &overview)
+{
+    m_scene.overview = overview;
     update();
 }
 
@@ -135,7 +147,7 @@ QSize CWidgetTimeline::sizeHint() const
 
 QSize CWidgetTimeline::minimumSizeHint() const
 {
-    return {200, static_cast<int>(FlagSize) + 18 + QFontMetrics(m_style.font).height()};
+    return {200, static_cast<int>(FlagSize) + 36 + QFontMetrics(m_style.font).height()};
 }
 
 void CWidgetTimeline::set_xpos(double firstSample)
@@ -195,4 +207,12 @@ void CWidgetTimeline::mouseReleaseEvent(QMouseEvent *event)
         m_dragging = false;
         emit state_xpos(false);
     }
+}
+
+void CWidgetTimeline::wheelEvent(QWheelEvent *event)
+{
+    if (event->angleDelta().y() != 0) {
+        emit zoomRequested(event->angleDelta().y() < 0);
+    }
+    event->accept();
 }

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "PlotStyle.h"
+#include "view/Overview.h"
 
 #include <QRectF>
 #include <QWidget>
@@ -18,6 +19,7 @@ struct TimelineScene
     qint64 count = 0;
     std::array<qint64, 2> cursors{-1, -1}; ///< measuring and reference cursor, -1 for none
     double clockHz = 0;                    ///< 0 labels the bar in samples
+    Overview overview;                     ///< its columns may still be missing at the end
 };
 
 /// Draws the overview bar into any painter.
@@ -32,8 +34,6 @@ public:
     [[nodiscard]] double xOf(const QRectF &bar, double sample) const;
 
 private:
-    [[nodiscard]] QString positionText(qint64 sample) const;
-
     const PlotStyle &m_style;
     const TimelineScene &m_scene;
 };
@@ -49,6 +49,8 @@ public:
 
     /// Length of the waveform in samples and its clock rate in Hz.
     void setWaveform(qint64 total, double clockHz);
+    /// The envelope behind the bar, as far as it is known.
+    void setOverview(const Overview &overview);
     /// The visible range.
     void setRange(qint64 first, qint64 count);
     /// Puts cursor 1 (measuring) or 2 (reference) on a sample; -1 hides it.
@@ -69,12 +71,15 @@ signals:
     void mouse_xpos(double firstSample);
     /// A drag begins (true) or has ended (false).
     void state_xpos(bool dragging);
+    /// The wheel asks for a longer (true) or shorter view.
+    void zoomRequested(bool outwards);
 
 protected:
     void paintEvent(QPaintEvent *event) override;
     void mousePressEvent(QMouseEvent *event) override;
     void mouseMoveEvent(QMouseEvent *event) override;
     void mouseReleaseEvent(QMouseEvent *event) override;
+    void wheelEvent(QWheelEvent *event) override;
 
 private:
     [[nodiscard]] double sampleAt(double x) const;

@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
+#include <span>
 
 namespace {
 
@@ -14,16 +15,32 @@ struct Rgb
     int blue;
 };
 
-constexpr int RowCount = 5;
-using Rows = std::array<Rgb, RowCount>;
-
 /// From -150 dB to 0 dB.
-constexpr std::array<Rows, ColorModeCount> Scales{{
+constexpr std::array<std::array<Rgb, 5>, 4> PlainScales{{
     {{{0, 0, 64}, {0, 0, 144}, {192, 0, 0}, {208, 80, 0}, {255, 255, 0}}},
     {{{240, 240, 240}, {160, 160, 160}, {96, 96, 96}, {32, 32, 32}, {16, 16, 16}}},
     {{{0, 0, 0}, {16, 16, 64}, {48, 48, 96}, {80, 80, 128}, {112, 112, 192}}},
     {{{0, 0, 0}, {160, 160, 240}, {112, 112, 192}, {48, 48, 96}, {16, 16, 64}}},
 }};
+
+/// Nine steps of the map of van der Walt and Smith, which is even to the eye.
+constexpr std::array<Rgb, 9> ViridisScale{{{68, 1, 84},
+                                           {71, 45, 123},
+                                           {59, 82, 139},
+                                           {44, 114, 142},
+                                           {33, 144, 140},
+                                           {39, 173, 129},
+                                           {93, 200, 99},
+                                           {170, 220, 50},
+                                           {253, 231, 37}}};
+
+std::span<const Rgb> rowsOf(ColorMode mode)
+{
+    if (mode == ColorMode::Viridis) {
+        return ViridisScale;
+    }
+    return PlainScales[static_cast<std::size_t>(mode)];
+}
 
 int mixed(int from, int to, double share)
 {
@@ -32,9 +49,19 @@ int mixed(int from, int to, double share)
 
 } // namespace
 
-QStringList colorModeNames()
+QString colorModeName(ColorMode mode)
 {
-    return {"Rainbow", "Black/White", "Blue", "Noise (Blue)"};
+    constexpr std::array<const char *, ColorModeCount> Names{"Rainbow", "Black/White", "Blue",
+                                                             "Noise (Blue)", "Viridis"};
+    return Names[static_cast<std::size_t>(mode)];
+}
+
+const std::array<ColorMode, ColorModeCount> &colorModeOrder()
+{
+    static constexpr std::array<ColorMode, ColorModeCount> Order{
+        ColorMode::Viridis, ColorMode::Rainbow, ColorMode::BlackWhite, ColorMode::Blue,
+        ColorMode::NoiseBlue};
+    return Order;
 }
 
 ColorTable::ColorTable(ColorMode mode)
@@ -47,13 +74,14 @@ ColorTable::ColorTable(ColorMode mode)
 
 QRgb ColorTable::colorOfLevel(ColorMode mode, double db)
 {
-    const Rows &rows = Scales[static_cast<std::size_t>(mode)];
+    const std::span<const Rgb> rows = rowsOf(mode);
+    const std::size_t last = rows.size() - 1;
     // Written so that a level that is no number counts as the lowest.
     const double depth = (db > LowestDb ? std::min(db, 0.0) : LowestDb) / LowestDb;
-    const double place = (1 - depth) * (RowCount - 1);
+    const double place = (1 - depth) * static_cast<double>(last);
     const auto row = static_cast<std::size_t>(place);
     const Rgb &from = rows[row];
-    const Rgb &to = rows[std::min<std::size_t>(row + 1, RowCount - 1)];
+    const Rgb &to = rows[std::min(row + 1, last)];
     const double share = place - std::floor(place);
     return qRgb(mixed(from.red, to.red, share), mixed(from.green, to.green, share),
                 mixed(from.blue, to.blue, share));

@@ -2,7 +2,7 @@
 #pragma once
 
 #include <QRgb>
-#include <QStringList>
+#include <QString>
 
 #include <array>
 
@@ -12,12 +12,31 @@ enum class ColorMode {
     BlackWhite = 1,
     Blue = 2,
     NoiseBlue = 3,
+    Viridis = 4,
 };
 
-constexpr int ColorModeCount = 4;
+constexpr int ColorModeCount = 5;
 
-/// The names of the scales as menus show them.
-[[nodiscard]] QStringList colorModeNames();
+/// The scale that displays start with: equal steps of level look equally large in it.
+constexpr ColorMode DefaultColorMode = ColorMode::Viridis;
+
+/// The name of a scale as menus show it.
+[[nodiscard]] QString colorModeName(ColorMode mode);
+
+/// The scales in the order of menus.
+[[nodiscard]] const std::array<ColorMode, ColorModeCount> &colorModeOrder();
+
+/// Levels between which a colour scale runs, in dB.
+struct LevelRange
+{
+    double low = -150;
+    double high = 0;
+
+    /// The level on the scale of a ColorTable, which runs from 0 to -150 dB.
+    [[nodiscard]] double scaled(double db) const { return (db - high) * 150 / (high - low); }
+
+    friend bool operator==(const LevelRange &, const LevelRange &) = default;
+};
 
 /// Colours for levels from 0 to -150 dB in steps of 1 dB.
 class ColorTable
@@ -26,7 +45,7 @@ public:
     static constexpr int EntryCount = 151;
     static constexpr double LowestDb = -150;
 
-    explicit ColorTable(ColorMode mode = ColorMode::Rainbow);
+    explicit ColorTable(ColorMode mode = DefaultColorMode);
 
     [[nodiscard]] ColorMode mode() const { return m_mode; }
     /// The colour of `-index` dB, for an index from 0 to 150.

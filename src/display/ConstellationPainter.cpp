@@ -92,6 +92,7 @@ void ConstellationPainter::paint(QPainter &painter, const QRectF &area) const
             paintDots(painter, pixels, plot);
         }
         paintFrame(painter, pixels, plot);
+        paintCursor(painter, plot);
         paintAxisTexts(painter, area, plot);
         paintValueBox(painter, area);
     }
@@ -104,6 +105,9 @@ void ConstellationPainter::paintCells(QPainter &painter, const PixelGrid &pixels
     constexpr int CellCount = ConstellationGrid::Size;
     const QPointF center = plot.center();
     const double half = plot.width() / 2;
+    // Where nothing is, the colours of the scale go on, or the densest cells would look as empty.
+    fillArea(painter, plot,
+             QColor(ColorTable::colorOfLevel(m_scene.colorMode, ColorTable::LowestDb)));
     for (int row = 0; row < CellCount; ++row) {
         const CellRange i = cellRange(row);
         const double left = pixels.snap(center.x() + i.low * half);
@@ -141,6 +145,23 @@ void ConstellationPainter::paintDots(QPainter &painter, const PixelGrid &pixels,
         }
     }
     painter.setClipping(false);
+}
+
+void ConstellationPainter::paintCursor(QPainter &painter, const QRectF &plot) const
+{
+    if (!m_scene.cursor) {
+        return;
+    }
+    constexpr double Radius = 4;
+    const QPointF place(plot.center().x() + m_scene.cursor->i / m_scene.scaleI * plot.width() / 2,
+                        plot.center().y() - m_scene.cursor->q / m_scene.scaleQ * plot.height() / 2);
+    painter.save();
+    painter.setClipRect(plot.adjusted(-Radius, -Radius, Radius, Radius));
+    painter.setRenderHint(QPainter::Antialiasing);
+    painter.setPen(QPen(m_style.color(ColorSlot::PrimaryMarker), 2));
+    painter.setBrush(m_style.color(ColorSlot::CursorLine));
+    painter.drawEllipse(place, Radius, Radius);
+    painter.restore();
 }
 
 void ConstellationPainter::paintFrame(QPainter &painter, const PixelGrid &pixels,
@@ -181,8 +202,13 @@ void ConstellationPainter::paintAxisTexts(QPainter &painter, const QRectF &area,
             QRectF(area.left(), std::max(y, area.top()), plot.left() - area.left() - 4, height),
             Qt::AlignRight | Qt::AlignVCenter, axisText(share * m_scene.scaleQ));
     }
-    drawCaption(painter, m_style, plot, Qt::AlignTop | Qt::AlignHCenter, "Q");
-    drawCaption(painter, m_style, plot, Qt::AlignVCenter | Qt::AlignRight, "I");
+    // Beside the plot, where no sample lies.
+    painter.drawText(QRectF(plot.right() + 3, plot.center().y() - height / 2,
+                            std::max(area.right() - plot.right() - 3, 1.0), height),
+                     int(Qt::AlignLeft | Qt::AlignVCenter) | Qt::TextDontClip, "I");
+    const double width = metrics.horizontalAdvance("Q") + 1;
+    painter.drawText(QRectF(plot.center().x() + 4, plot.top() + 2, width, height), Qt::AlignCenter,
+                     "Q");
 }
 
 void ConstellationPainter::paintValueBox(QPainter &painter, const QRectF &area) const
@@ -195,10 +221,13 @@ void ConstellationPainter::paintValueBox(QPainter &painter, const QRectF &area) 
         return;
     }
     constexpr double WidthToHeight = 3.5;
+    // As many digits as a pixel of the scale deserves.
+    const double scale = std::max(m_scene.scaleI, m_scene.scaleQ);
+    const int digits = std::clamp(3 - static_cast<int>(std::floor(std::log10(scale))), 3, 9);
     const double level = magnitudeToDb(std::sqrt(value->i * value->i + value->q * value->q));
     ValueBox box;
-    box.lines = {QString("I %1 V").arg(value->i, 0, 'f', 3),
-                 QString("Q %1 V").arg(value->q, 0, 'f', 3),
+    box.lines = {QString("I %1 V").arg(value->i, 0, 'f', digits),
+                 QString("Q %1 V").arg(value->q, 0, 'f', digits),
                  QString("P %1 dB").arg(level, 0, 'f', 2)};
     box.leastWidth =
         WidthToHeight * QFontMetricsF(m_style.font).boundingRect(" Q -Q.QQQ V").height();

@@ -24,8 +24,9 @@ struct ConstellationScene
     std::span<const IqSample> dots;
     double scaleI = 1; ///< the value at the right edge
     double scaleQ = 1; ///< the value at the top
-    ColorMode colorMode = ColorMode::Rainbow;
-    std::optional<QPointF> mouse; ///< place of the mouse within the painted area
+    ColorMode colorMode = DefaultColorMode;
+    std::optional<IqSample> cursor; ///< the sample of the measuring cursor
+    std::optional<QPointF> mouse;   ///< place of the mouse within the painted area
 };
 
 /// Draws a constellation into any painter: up to 500 samples as dots, more as a density of cells.
@@ -49,6 +50,7 @@ public:
 private:
     void paintCells(QPainter &painter, const PixelGrid &pixels, const QRectF &plot) const;
     void paintDots(QPainter &painter, const PixelGrid &pixels, const QRectF &plot) const;
+    void paintCursor(QPainter &painter, const QRectF &plot) const;
     void paintFrame(QPainter &painter, const PixelGrid &pixels, const QRectF &plot) const;
     void paintAxisTexts(QPainter &painter, const QRectF &area, const QRectF &plot) const;
     void paintValueBox(QPainter &painter, const QRectF &area) const;

@@ -8,6 +8,12 @@
 
 #include <array>
 
+/// The ground of pictures that are made for documents.
+enum class PlotTheme {
+    Dark = 0, ///< as on the screen
+    Light = 1,
+};
+
 /// Colours and font of a plot: all that painters need to know of the application's look.
 struct PlotStyle
 {
@@ -16,6 +22,9 @@ struct PlotStyle
 
     /// The current colours and the application's font, a little smaller. Needs a QGuiApplication.
     [[nodiscard]] static PlotStyle current();
+
+    /// The same on a light ground, if that is wanted.
+    [[nodiscard]] static PlotStyle themed(PlotTheme theme);
 
     [[nodiscard]] QColor color(ColorSlot slot) const
     {

@@ -11,11 +11,12 @@
 #include <QPainter>
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 namespace {
 
-constexpr int Divisions = 10;        ///< of the time axis
+constexpr int Divisions = 10;        ///< of the level axis
 constexpr double MarkerPitch = 0.25; ///< of the pane's height from row to row
 constexpr double MarkerHeight = 0.1; ///< of a high level over a low one
 constexpr double LogRange = 100.0;   ///< dB from bottom to top
@@ -30,11 +31,9 @@ double drawable(double fraction)
     return fraction > -FarOff ? std::min(fraction, FarOff + 1) : -FarOff;
 }
 
-double logFraction(double magnitude, double zoom)
+double logLevel(double magnitude)
 {
-    const double level =
-        magnitude > 0 ? std::clamp(20 * std::log10(magnitude), -LogRange, 0.0) : -LogRange;
-    return level * zoom / LogRange + 1;
+    return magnitude > 0 ? std::clamp(20 * std::log10(magnitude), -LogRange, 0.0) : -LogRange;
 }
 
 /// Fills between two edges with the same horizontal places, column by column: a fraction of the
@@ -78,7 +77,7 @@ TracePainter::TracePainter(const PlotStyle &style, const TraceScene &scene)
 QMargins TracePainter::margins(const QFont &font)
 {
     const QFontMetricsF metrics(font);
-    const int left = static_cast<int>(std::ceil(metrics.horizontalAdvance("-100 dB"))) + 8;
+    const int left = static_cast<int>(std::ceil(metrics.horizontalAdvance("-100 MHz"))) + 6;
     const int bottom = static_cast<int>(std::ceil(metrics.height())) + 6;
     return {left, 6, 8, bottom};
 }
@@ -115,7 +114,8 @@ QList<TracePainter::Label> TracePainter::labels() const
     QList<Label> result;
     switch (m_scene.mode) {
     case TraceMode::IqEnvelope:
-        for (const double value : {0.7, 0.0, -0.7}) {
+        // In the order of their weight, for panes that have no room for all: full scale is seen.
+        for (const double value : {0.0, 1.0, -1.0, 0.7, -0.7}) {
             result += {(value + 1) / 2, QString::number(value / zoom)};
         }
         break;
@@ -123,7 +123,8 @@ QList<TracePainter::Label> TracePainter::labels() const
     case TraceMode::LogMagAverage:
         for (int k = 0; k <= Divisions; ++k) {
             result += {1.0 - static_cast<double>(k) / Divisions,
-                       QString("%1 dB").arg(k == 0 ? 0.0 : -10 * k / zoom)};
+                       QString("%1 dB").arg(
+                           k == 0 && m_scene.topDb == 0 ? 0.0 : m_scene.topDb - 10 * k / zoom)};
         }
         break;
     case TraceMode::LinMagAverage: {
@@ -134,11 +135,22 @@ QList<TracePainter::Label> TracePainter::labels() const
         }
         break;
     }
-    case TraceMode::Phase:
     case TraceMode::Frequency:
-        result += {0.75, QString("Pi/%1").arg(2 * zoom)};
+        if (m_scene.clockHz > 0) {
+            const double range = m_scene.clockHz / 2 / zoom;
+            const PlotAxis axis{-range, range, "Hz"};
+            const AxisTexts texts(axis);
+            const double step = niceStep(range / 4);
+            for (const double value : axisTicks(axis, step)) {
+                result += {(value / range + 1) / 2, texts.tick(value, step)};
+            }
+            break;
+        }
+        [[fallthrough]];
+    case TraceMode::Phase:
+        result += {0.75, QString("\u03c0/%1").arg(2 * zoom)};
         result += {0.5, "0"};
-        result += {0.25, QString("-Pi/%1").arg(2 * zoom)};
+        result += {0.25, QString("-\u03c0/%1").arg(2 * zoom)};
         break;
     }
     return result;
@@ -152,7 +164,7 @@ double TracePainter::fractionOf(double value) const
         return (value * zoom + 1) * 0.5;
     case TraceMode::LogMagEnvelope:
     case TraceMode::LogMagAverage:
-        return logFraction(value, zoom);
+        return (logLevel(value) - m_scene.topDb) * zoom / LogRange + 1;
     case TraceMode::LinMagAverage:
         return value * zoom;
     case TraceMode::Phase:
@@ -171,6 +183,8 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
         const PixelGrid grid(painter);
         const QList<QRectF> rects = panes(plot);
         paintRange(painter, plot);
+        const double division =
+            paintHorizontalAxis(painter, grid, m_style, area, plot, timeAxis(), GridAlpha);
         const qsizetype valuePanes = rects.size() - (m_scene.showMarkers ? 1 : 0);
         for (qsizetype k = 0; k < rects.size(); ++k) {
             QList<Label> texts = labels();
@@ -191,10 +205,9 @@ void TracePainter::paint(QPainter &painter, const QRectF &area) const
                 paintMarkers(grid, plot, rects.last());
             }
         }
-        paintCaptions(painter, plot, rects);
+        paintCaptions(painter, rects);
+        paintQuantity(painter, rects.first(), division);
         paintCursors(painter, grid, plot, rects);
-        paintFootLine(painter, QRectF(plot.left(), plot.bottom(), plot.width(),
-                                      area.bottom() - plot.bottom()));
     }
     painter.restore();
 }
@@ -203,22 +216,22 @@ void TracePainter::paintAxis(QPainter &painter, const PixelGrid &grid, const QRe
                              const QRectF &pane, const QList<Label> &texts) const
 {
     const QColor gridColor = m_style.color(ColorSlot::GridLines, GridAlpha);
-    for (int k = 1; k < Divisions; ++k) {
-        grid.vertical(pane.left() + pane.width() * k / Divisions, pane.top(), pane.bottom(),
-                      gridColor);
-    }
     painter.setFont(m_style.font);
     painter.setPen(m_style.color(ColorSlot::Text));
     const double height = QFontMetricsF(m_style.font).height();
+    const bool inSteps = texts.size() > 5; // of one size, of which every n-th gets its text
     const double spacing =
-        texts.size() > 1
-            ? std::fabs(yOf(pane, texts.at(1).fraction) - yOf(pane, texts.at(0).fraction))
-            : pane.height();
-    const int stride = labelStride(spacing, height);
+        inSteps ? std::fabs(yOf(pane, texts.at(1).fraction) - yOf(pane, texts.at(0).fraction)) : 0;
+    const int stride = inSteps ? labelStride(spacing, height) : 1;
+    QList<double> placed;
     for (qsizetype k = 0; k < texts.size(); ++k) {
         const double y = yOf(pane, texts.at(k).fraction);
         grid.horizontal(y, pane.left(), pane.right(), gridColor);
-        if (k % stride == 0) {
+        const bool hasRoom = std::none_of(placed.begin(), placed.end(), [&](double other) {
+            return std::fabs(other - y) < height;
+        });
+        if (k % stride == 0 && hasRoom) {
+            placed += y;
             painter.drawText(
                 QRectF(area.left(), y - height / 2, pane.left() - area.left() - 4, height),
                 Qt::AlignRight | Qt::AlignVCenter, texts.at(k).text);
@@ -268,8 +281,10 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
     upperEdge.reserve(qsizetype{2} * TraceBins::BinCount);
     lowerEdge.reserve(TraceBins::BinCount);
     const auto &bins = m_scene.bins.bins();
-    for (int k = 0; k < TraceBins::BinCount; ++k) {
-        const TraceBin &bin = bins[static_cast<std::size_t>(k)];
+    // The last column is as wide as the others; of single samples there is nothing behind the last.
+    const int columns = TraceBins::BinCount + (m_scene.sampleCount >= TraceBins::BinCount ? 1 : 0);
+    for (int k = 0; k < columns; ++k) {
+        const TraceBin &bin = bins[static_cast<std::size_t>(std::min(k, TraceBins::BinCount - 1))];
         if (bin.count > 0) {
             const double x = xOf(plot, k);
             upperEdge += QPointF(x, yOf(pane, drawable(fractionOf(bin.*upper))));
@@ -300,12 +315,20 @@ void TracePainter::paintValues(QPainter &painter, const QRectF &plot, const QRec
     if (m_scene.bins.isSparse()) {
         constexpr double Radius = 1.75;
         painter.setPen(Qt::NoPen);
-        painter.setBrush(m_style.color(ColorSlot::CursorLine));
+        painter.setBrush(color);
         for (const QPointF &dot : dots) {
             painter.drawEllipse(dot, Radius, Radius);
         }
     }
     painter.restore();
+}
+
+bool TracePainter::isLowBehind(int bin, quint8 bit) const
+{
+    const auto &bins = m_scene.bins.bins();
+    const auto next = std::find_if(bins.begin() + bin + 1, bins.end(),
+                                   [](const TraceBin &behind) { return behind.count > 0; });
+    return next != bins.end() && (next->mkrHigh & bit) == 0;
 }
 
 void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const QRectF &pane) const
@@ -316,8 +339,9 @@ void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const
         const double base = (MarkerCount - 1 - row) * MarkerPitch;
         const double lowY = grid.snap(yOf(pane, base));
         const double highY = grid.snap(yOf(pane, base + MarkerHeight));
-        const QColor color =
-            m_style.color(row % 2 == 0 ? ColorSlot::PrimaryMarker : ColorSlot::SecondaryMarker);
+        constexpr std::array RowColors{ColorSlot::PrimaryMarker, ColorSlot::SecondaryMarker,
+                                       ColorSlot::AverageTrace, ColorSlot::PeakTrace};
+        const QColor color = m_style.color(RowColors[static_cast<std::size_t>(row)]);
         const auto edge = [&](double x) {
             grid.vertical(x, highY, lowY + grid.lineWidth(), color);
         };
@@ -338,7 +362,8 @@ void TracePainter::paintMarkers(const PixelGrid &grid, const QRectF &plot, const
                 level = binLevel;
                 lineStart = x;
             }
-            if (changes || (bin.mkrHigh & bin.mkrLow & bit) != 0) {
+            // A marker that falls within a bin has its edge where the next one is low.
+            if (changes || ((bin.mkrHigh & bin.mkrLow & bit) != 0 && !isLowBehind(k, bit))) {
                 edge(x);
             }
         }
@@ -384,7 +409,9 @@ void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const 
             }
         }
     }
-    if (m_scene.mouseBin >= 0 && m_scene.mouseBin < TraceBins::BinCount) {
+    // Where a measuring cursor is set it stands at the very place of the mouse cursor.
+    if (m_scene.cursorBins[0] < 0 && m_scene.mouseBin >= 0 &&
+        m_scene.mouseBin < TraceBins::BinCount) {
         const double x = xOf(plot, m_scene.mouseBin);
         grid.dashedVertical(x, plot.top(), plot.bottom(), m_style.color(ColorSlot::CursorLine));
         drawFlag(painter, x + grid.lineWidth() / 2, plot.bottom() - FlagSize, FlagShape::Bottom,
@@ -392,57 +419,77 @@ void TracePainter::paintCursors(QPainter &painter, const PixelGrid &grid, const 
     }
 }
 
-void TracePainter::paintCaptions(QPainter &painter, const QRectF &plot,
-                                 const QList<QRectF> &panes) const
+void TracePainter::paintCaptions(QPainter &painter, const QList<QRectF> &panes) const
 {
     if (m_scene.mode == TraceMode::IqEnvelope) {
         drawCaption(painter, m_style, panes.at(0), Qt::AlignLeft | Qt::AlignTop, "I");
         drawCaption(painter, m_style, panes.at(1), Qt::AlignLeft | Qt::AlignTop, "Q");
     }
     if (m_scene.sampleCount > 0 && m_scene.sampleCount < TraceBins::MinSamples) {
-        drawCaption(painter, m_style, plot, Qt::AlignCenter,
-                    translated("A trace needs %1 samples, here are %2.")
+        drawCaption(painter, m_style, panes.first(), Qt::AlignCenter,
+                    translated("A trace needs %1 samples; there are only %2 here.")
                         .arg(TraceBins::MinSamples)
                         .arg(m_scene.sampleCount));
+    } else if (const QString hint = scaleHint(); !hint.isEmpty()) {
+        drawCaption(painter, m_style, panes.first(), Qt::AlignCenter, hint);
     }
 }
 
-void TracePainter::paintFootLine(QPainter &painter, const QRectF &line) const
+PlotAxis TracePainter::timeAxis() const
 {
-    QString quantity;
+    const auto first = static_cast<double>(m_scene.firstSample);
+    const double end = first + static_cast<double>(m_scene.sampleCount);
+    return m_scene.clockHz > 0 ? PlotAxis{first / m_scene.clockHz, end / m_scene.clockHz, "s"}
+                               : PlotAxis{first, end, {}};
+}
+
+void TracePainter::paintQuantity(QPainter &painter, const QRectF &pane, double division) const
+{
+    QString caption = quantity();
+    if (division > 0) {
+        const QString text = m_scene.clockHz > 0 ? AxisTexts({0, division, "s"}).exact(division)
+                                                 : translated("%1 samples").arg(division);
+        caption += ", " + translated("%1/div").arg(text);
+    }
+    const QFontMetricsF metrics(m_style.font);
+    if (metrics.horizontalAdvance(caption) < pane.width() - 2 * metrics.height()) {
+        drawCaption(painter, m_style, pane, Qt::AlignRight | Qt::AlignTop, caption);
+    }
+}
+
+QString TracePainter::quantity() const
+{
     switch (m_scene.mode) {
     case TraceMode::IqEnvelope:
-        quantity = translated("I and Q, full scale 1");
-        break;
+        return translated("Full scale 1");
     case TraceMode::LogMagEnvelope:
     case TraceMode::LogMagAverage:
-        quantity = translated("Magnitude in dB");
-        break;
+        return translated("Magnitude in dBFS");
     case TraceMode::LinMagAverage:
-        quantity = translated("Magnitude, full scale 1");
-        break;
+        return translated("Magnitude, full scale 1");
     case TraceMode::Phase:
-        quantity = translated("Phase in rad");
-        break;
+        return translated("Phase in rad");
     case TraceMode::Frequency:
-        quantity = translated("Frequency in rad per sample");
         break;
     }
-    painter.setFont(m_style.font);
-    painter.setPen(m_style.color(ColorSlot::Text));
-    painter.drawText(line, Qt::AlignLeft | Qt::AlignVCenter, quantity);
-    painter.drawText(line, Qt::AlignRight | Qt::AlignVCenter, divisionText());
+    return m_scene.clockHz > 0 ? translated("Frequency")
+                               : translated("Frequency in rad per sample");
 }
 
-QString TracePainter::divisionText() const
+QString TracePainter::scaleHint() const
 {
-    if (m_scene.sampleCount < 1) {
+    const bool isLog =
+        m_scene.mode == TraceMode::LogMagEnvelope || m_scene.mode == TraceMode::LogMagAverage;
+    if (!isLog || m_scene.sampleCount < TraceBins::MinSamples) {
         return {};
     }
-    const double samples = static_cast<double>(m_scene.sampleCount) / Divisions;
-    const QString division =
-        m_scene.clockHz > 0
-            ? formatNumber(samples / m_scene.clockHz, NumberFormat{.unit = "s", .precision = 3})
-            : translated("%1 samples").arg(samples);
-    return translated("%1/div").arg(division);
+    double highest = -1;
+    for (const TraceBin &bin : m_scene.bins.bins()) {
+        if (bin.count > 0) {
+            highest = std::max(
+                highest,
+                fractionOf(m_scene.mode == TraceMode::LogMagAverage ? bin.magAvg : bin.magMax));
+        }
+    }
+    return highest < 0 ? translated("The signal lies below the scale.") : QString();
 }

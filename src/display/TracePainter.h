@@ -2,6 +2,7 @@
 #pragma once
 
 #include "PlotStyle.h"
+#include "plotaxis.h"
 #include "view/TraceBins.h"
 
 #include <QList>
@@ -32,9 +33,11 @@ struct TraceScene
     qint64 sampleCount = 0;
     TraceMode mode = TraceMode::IqEnvelope;
     bool showMarkers = false;
-    double clockHz = 0; ///< 0 labels the time axis in samples
-    double zoomY = 1;   ///< magnifies the value axis: about zero, for the log modes about 0 dB
-    int mouseBin = -1;  ///< bin numbers of the cursors, -1 for none
+    double clockHz = 0;     ///< 0 labels the time axis in samples
+    qint64 firstSample = 0; ///< position of the first one in the waveform
+    double zoomY = 1;       ///< magnifies the value axis: about zero, for the log modes at its top
+    double topDb = 0;       ///< the level at the top of the log modes
+    int mouseBin = -1;      ///< bin numbers of the cursors, -1 for none
     std::array<int, 2> cursorBins{-1, -1}; ///< the measuring and the reference cursor
     std::array<int, 2> rangeBins{-1, -1};  ///< first and last of a range to be marked
 };
@@ -80,9 +83,14 @@ private:
     void paintRange(QPainter &painter, const QRectF &plot) const;
     void paintCursors(QPainter &painter, const PixelGrid &grid, const QRectF &plot,
                       const QList<QRectF> &panes) const;
-    void paintCaptions(QPainter &painter, const QRectF &plot, const QList<QRectF> &panes) const;
-    void paintFootLine(QPainter &painter, const QRectF &line) const;
-    [[nodiscard]] QString divisionText() const;
+    void paintCaptions(QPainter &painter, const QList<QRectF> &panes) const;
+    /// Whether the next bin that holds samples has the marker low throughout.
+    [[nodiscard]] bool isLowBehind(int bin, quint8 bit) const;
+    /// What is shown, and how much of the time axis a division is.
+    void paintQuantity(QPainter &painter, const QRectF &pane, double division) const;
+    [[nodiscard]] PlotAxis timeAxis() const;
+    [[nodiscard]] QString quantity() const;
+    [[nodiscard]] QString scaleHint() const;
 
     const PlotStyle &m_style;
     const TraceScene &m_scene;

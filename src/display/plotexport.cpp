@@ -8,7 +8,9 @@
 #include <QBuffer>
 #include <QFileInfo>
 #include <QImage>
+#include <QPageSize>
 #include <QPainter>
+#include <QPdfWriter>
 #include <QSvgGenerator>
 #include <QTextStream>
 
@@ -27,12 +29,15 @@ bool writeFile(const QString &fileName, const QByteArray &bytes)
     return false;
 }
 
-QByteArray svgOf(const QSize &size, const std::function<void(QPainter &)> &paint)
+constexpr int ScreenDpi = 96; ///< of the texts' measures
+
+QByteArray svgOf(const QSize &size, double ratio, const std::function<void(QPainter &)> &paint)
 {
     QBuffer buffer;
     QSvgGenerator generator;
     generator.setOutputDevice(&buffer);
-    generator.setSize(size);
+    generator.setResolution(ScreenDpi);
+    generator.setSize(QSizeF(QSizeF(size) * ratio).toSize());
     generator.setViewBox(QRect(QPoint(), size));
     generator.setTitle("Corvane");
     QPainter painter(&generator);
@@ -41,9 +46,30 @@ QByteArray svgOf(const QSize &size, const std::function<void(QPainter &)> &paint
     return buffer.data();
 }
 
+QByteArray pdfOf(const QSize &size, double ratio, const std::function<void(QPainter &)> &paint)
+{
+    QBuffer buffer;
+    buffer.open(QIODevice::WriteOnly);
+    QPdfWriter writer(&buffer);
+    writer.setResolution(ScreenDpi);
+    writer.setTitle("Corvane");
+    constexpr double PointsPerPixel = 72.0 / ScreenDpi;
+    writer.setPageSize(QPageSize(QSizeF(size) * ratio * PointsPerPixel, QPageSize::Point, {},
+                                 QPageSize::ExactMatch));
+    writer.setPageMargins({});
+    QPainter painter(&writer);
+    painter.scale(ratio, ratio);
+    paint(painter);
+    painter.end();
+    return buffer.data();
+}
+
 QByteArray pngOf(const QSize &size, double ratio, const std::function<void(QPainter &)> &paint)
 {
     QImage image(QSizeF(QSizeF(size) * ratio).toSize(), QImage::Format_RGB32);
+    if (image.isNull()) {
+        return {};
+    }
     image.setDevicePixelRatio(ratio);
     QPainter painter(&image);
     paint(painter);
@@ -54,20 +80,33 @@ QByteArray pngOf(const QSize &size, double ratio, const std::function<void(QPain
 
 } // namespace
 
+QStringList pictureSuffixes()
+{
+    return {"png", "svg", "pdf"};
+}
+
+QByteArray plotPicture(const QString &suffix, const QSize &size, double ratio,
+                       const std::function<void(QPainter &)> &paint)
+{
+    if (suffix == "svg") {
+        return svgOf(size, ratio, paint);
+    }
+    return suffix == "pdf" ? pdfOf(size, ratio, paint) : pngOf(size, ratio, paint);
+}
+
 bool savePlotPicture(const QString &fileName, const QSize &size, double ratio,
                      const std::function<void(QPainter &)> &paint)
 {
     const QString suffix = QFileInfo(fileName).suffix().toLower();
-    if (suffix != "png" && suffix != "svg") {
-        Tracer::Trace(
-            Tracer::Error,
-            QString("Cannot write '%1': a picture's name ends in .png or .svg.").arg(fileName));
-        return false;
+    if (!pictureSuffixes().contains(suffix)) {
+        return Tracer::fail(
+            QString("Cannot write '%1': a picture's name ends in .png, .svg or .pdf.")
+                .arg(fileName));
     }
-    const QByteArray bytes = suffix == "svg" ? svgOf(size, paint) : pngOf(size, ratio, paint);
+    // Lines and texts of drawings have no pixels of a screen.
+    const QByteArray bytes = plotPicture(suffix, size, suffix == "png" ? ratio : 1, paint);
     if (bytes.isEmpty()) {
-        Tracer::Trace(Tracer::Error, QString("Cannot make the picture for '%1'.").arg(fileName));
-        return false;
+        return Tracer::fail(QString("Cannot make the picture for '%1'.").arg(fileName));
     }
     return writeFile(fileName, bytes);
 }
@@ -95,25 +134,38 @@ void writeSampleTable(QTextStream &stream, std::span<const IqSample> samples,
 
 void writeSpectrumTable(QTextStream &stream, const SpectrumScene &scene)
 {
-    constexpr int Bins = SpectrumLines::FrameSize;
-    constexpr int Digits = 6;
     const bool hasClock = scene.clockHz > 0;
-    const auto frequency = [&](int bin) {
-        const double share = static_cast<double>(bin) / Bins - 0.5;
+    const auto frequency = [&](std::size_t point, std::size_t points) {
+        const double share = static_cast<double>(point) / static_cast<double>(points) - 0.5;
         return QString::number(hasClock ? share * scene.clockHz : share, 'g', SampleDigits);
     };
-    if (scene.mode == SpectrumMode::Spectrum) {
-        stream << (hasClock ? "frequency_hz" : "frequency") << ",level_db\n";
-        for (int bin = 0; bin < Bins && !scene.mean.empty(); ++bin) {
-            stream << frequency(bin) << ','
-                   << QString::number(scene.mean[static_cast<std::size_t>(bin)], 'g', Digits)
-                   << '\n';
+    constexpr int Digits = 6;
+    if (scene.mode == SpectrumMode::Ccdf) {
+        stream << "over_mean_db,probability\n";
+        for (const CcdfPoint &point : scene.figures.ccdf) {
+            stream << point.overMeanDb << ','
+                   << QString::number(point.probability, 'g', SampleDigits) << '\n';
         }
         return;
     }
+    if (scene.mode == SpectrumMode::Spectrum) {
+        const SpectrumTrace &trace = scene.trace;
+        stream << (hasClock ? "frequency_hz" : "frequency") << ",level_db"
+               << (trace.maximum.empty() ? "" : ",max_db") << '\n';
+        for (std::size_t point = 0; point < trace.level.size(); ++point) {
+            stream << frequency(point, trace.level.size()) << ','
+                   << QString::number(trace.level[point], 'g', Digits);
+            if (!trace.maximum.empty()) {
+                stream << ',' << QString::number(trace.maximum[point], 'g', Digits);
+            }
+            stream << '\n';
+        }
+        return;
+    }
+    constexpr std::size_t Bins = SpectrumLines::FrameSize;
     stream << "sample";
-    for (int bin = 0; bin < Bins; ++bin) {
-        stream << ',' << frequency(bin);
+    for (std::size_t bin = 0; bin < Bins; ++bin) {
+        stream << ',' << frequency(bin, Bins);
     }
     stream << '\n';
     for (const SpectrumLines::Line &line : scene.lines.lines()) {

@@ -2,6 +2,7 @@
 #include "renderplot.h"
 
 #include "ConstellationPainter.h"
+#include "OverviewPainter.h"
 #include "SpectrumPainter.h"
 #include "TracePainter.h"
 #include "base/parallel.h"
@@ -9,6 +10,7 @@
 #include "plotdraw.h"
 #include "waterfall.h"
 
+#include <QFontMetricsF>
 #include <QPainter>
 
 #include <algorithm>
@@ -42,8 +44,8 @@ bool forEachBlock(SampleSource &source, const Take &take)
     return true;
 }
 
-bool paintTrace(QPainter &painter, const QRectF &area, const PlotRequest &request,
-                SampleSource &source)
+bool paintTrace(QPainter &painter, const PlotStyle &style, const QRectF &area,
+                const PlotRequest &request, SampleSource &source)
 {
     TraceScene scene;
     scene.bins.begin(source.count());
@@ -53,7 +55,13 @@ bool paintTrace(QPainter &painter, const QRectF &area, const PlotRequest &reques
     scene.mode = static_cast<TraceMode>(request.view);
     scene.showMarkers = request.showMarkers;
     scene.clockHz = request.clockHz;
-    TracePainter(PlotStyle::current(), scene).paint(painter, area);
+    scene.firstSample = source.first();
+    if (request.range) {
+        constexpr double WholeRange = 100; // dB without zoom
+        scene.topDb = request.range->high;
+        scene.zoomY = WholeRange / (request.range->high - request.range->low);
+    }
+    TracePainter(style, scene).paint(painter, area);
     return read;
 }
 
@@ -73,8 +81,13 @@ bool readLines(SampleSource &source, int rows, SpectrumScene &scene)
         looked[line] = true;
         looked[std::min(line + 1, lines.size() - 1)] = true;
     }
+    std::vector<double> &mean = scene.trace.level;
+    std::vector<double> &maximum = scene.trace.maximum;
+    scene.trace.frames = lineCount;
     if (!lines.empty()) {
-        scene.mean.assign(SpectrumLines::FrameSize, 0.0);
+        constexpr double Lowest = -1e9;
+        mean.assign(SpectrumLines::FrameSize, 0.0);
+        maximum.assign(SpectrumLines::FrameSize, Lowest);
     }
     std::vector<IqSample> pending;
     std::size_t made = 0;
@@ -93,8 +106,9 @@ bool readLines(SampleSource &source, int rows, SpectrumScene &scene)
                 std::span(pending).subspan(k * SpectrumLines::FrameStep, SpectrumLines::FrameSize));
         });
         for (std::size_t k = from; k < made; ++k) {
-            for (std::size_t bin = 0; bin < scene.mean.size(); ++bin) {
-                scene.mean[bin] += lines[k].level[bin] / static_cast<double>(lineCount);
+            for (std::size_t bin = 0; bin < mean.size(); ++bin) {
+                mean[bin] += lines[k].level[bin] / static_cast<double>(lineCount);
+                maximum[bin] = std::max(maximum[bin], lines[k].level[bin]);
             }
             if (!looked[k]) {
                 lines[k].level = std::vector<double>(); // gives the memory back, as {} doesn't
@@ -107,25 +121,63 @@ bool readLines(SampleSource &source, int rows, SpectrumScene &scene)
     });
 }
 
-bool paintSpectrum(QPainter &painter, const QRectF &area, const PlotRequest &request,
-                   SampleSource &source)
+bool paintSpectrum(QPainter &painter, const PlotStyle &style, const QRectF &area,
+                   const PlotRequest &request, SampleSource &source)
 {
     SpectrumScene scene;
     scene.mode =
         request.view == PlotView::Spectrum ? SpectrumMode::Spectrum : SpectrumMode::Waterfall;
     scene.sampleCount = source.count();
     scene.clockHz = request.clockHz;
-    const PlotStyle style = PlotStyle::current();
+    scene.colors = ColorTable(request.palette);
     const QRectF plot = area.marginsRemoved(SpectrumPainter::margins(style.font, scene.mode));
     const int rows = scene.mode == SpectrumMode::Waterfall
                          ? SpectrumPainter::waterfallSize(plot, PixelGrid(painter).ratio()).height()
                          : 0;
     const bool read = readLines(source, rows, scene);
+    scene.levels = request.range.value_or(fittedRange(scene.lines.lines()));
+    if (request.range) {
+        scene.referenceDb = request.range->high;
+        scene.dbPerDivision =
+            (request.range->high - request.range->low) / SpectrumPainter::Divisions;
+    }
     SpectrumPainter(style, scene).paint(painter, area);
     return read;
 }
 
-bool paintConstellation(QPainter &painter, const QRectF &area, SampleSource &source)
+bool paintCcdf(QPainter &painter, const PlotStyle &style, const QRectF &area,
+               const PlotRequest &request, SampleSource &source)
+{
+    const auto figures = measureFigures(source, request.clockHz);
+    if (!figures) {
+        return false;
+    }
+    SpectrumScene scene;
+    scene.mode = SpectrumMode::Ccdf;
+    scene.figures = *figures;
+    SpectrumPainter(style, scene).paint(painter, area);
+    return true;
+}
+
+bool paintOverview(QPainter &painter, const PlotStyle &style, const QRectF &area,
+                   const PlotRequest &request, SampleSource &source)
+{
+    Overview overview(source.count());
+    std::vector<float> iq;
+    const bool read = forEachBlock(source, [&](std::span<const IqSample> samples, auto markers) {
+        iq.clear();
+        for (const IqSample &sample : samples) {
+            iq.push_back(static_cast<float>(sample.i));
+            iq.push_back(static_cast<float>(sample.q));
+        }
+        overview.append(iq, markers);
+    });
+    OverviewPainter(style, overview).paint(painter, area, request.clockHz);
+    return read;
+}
+
+bool paintConstellation(QPainter &painter, const PlotStyle &style, const QRectF &area,
+                        const PlotRequest &request, SampleSource &source)
 {
     double peak = 0;
     if (!forEachBlock(source, [&peak](auto samples, auto) {
@@ -144,7 +196,8 @@ bool paintConstellation(QPainter &painter, const QRectF &area, SampleSource &sou
     });
     scene.sampleCount = source.count();
     scene.dots = dots;
-    ConstellationPainter(PlotStyle::current(), scene).paint(painter, area);
+    scene.colorMode = request.palette;
+    ConstellationPainter(style, scene).paint(painter, area);
     return read;
 }
 
@@ -152,8 +205,8 @@ bool paintConstellation(QPainter &painter, const QRectF &area, SampleSource &sou
 
 QStringList plotViewNames()
 {
-    return {"iq",        "logmag",   "logavg",    "linavg",       "phase",
-            "frequency", "spectrum", "waterfall", "constellation"};
+    return {"iq",       "logmag",    "logavg",        "linavg", "phase",   "frequency",
+            "spectrum", "waterfall", "constellation", "ccdf",   "overview"};
 }
 
 std::optional<PlotView> plotViewOf(const QString &name)
@@ -162,10 +215,29 @@ std::optional<PlotView> plotViewOf(const QString &name)
     return index < 0 ? std::nullopt : std::optional(static_cast<PlotView>(index));
 }
 
+bool takesRange(PlotView view)
+{
+    return view == PlotView::LogMag || view == PlotView::LogAvg || view == PlotView::Spectrum ||
+           view == PlotView::Waterfall;
+}
+
 bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request,
                SampleSource &source)
 {
     clearVectorState();
+    const PlotStyle style = PlotStyle::themed(request.theme);
+    QRectF plot = area;
+    if (!request.title.isEmpty()) {
+        const QRectF strip(area.left(), area.top(), area.width(),
+                           QFontMetricsF(style.font).height() + 8);
+        fillArea(painter, strip, style.color(ColorSlot::PanelBackground));
+        painter.setFont(style.font);
+        painter.setPen(style.color(ColorSlot::Text));
+        painter.drawText(strip, Qt::AlignCenter,
+                         QFontMetricsF(style.font)
+                             .elidedText(request.title, Qt::ElideMiddle, strip.width() - 8));
+        plot.setTop(strip.bottom());
+    }
     switch (request.view) {
     case PlotView::Iq:
     case PlotView::LogMag:
@@ -173,14 +245,18 @@ bool paintPlot(QPainter &painter, const QRectF &area, const PlotRequest &request
     case PlotView::LinAvg:
     case PlotView::Phase:
     case PlotView::Frequency:
-        return paintTrace(painter, area, request, source);
+        return paintTrace(painter, style, plot, request, source);
     case PlotView::Spectrum:
     case PlotView::Waterfall:
-        return paintSpectrum(painter, area, request, source);
+        return paintSpectrum(painter, style, plot, request, source);
+    case PlotView::Ccdf:
+        return paintCcdf(painter, style, plot, request, source);
+    case PlotView::Overview:
+        return paintOverview(painter, style, plot, request, source);
     case PlotView::Constellation:
         break;
     }
-    return paintConstellation(painter, area, source);
+    return paintConstellation(painter, style, plot, request, source);
 }
 
 QImage renderPlot(const PlotRequest &request, SampleSource &source)
@@ -210,8 +286,10 @@ double constellationScale(double peak)
     if (!(peak > 0) || !std::isfinite(peak)) {
         return 1;
     }
-    const double power = std::pow(10.0, std::trunc(std::log10(peak * 0.5)));
-    return std::ceil(peak / power) * power;
+    // A peak that is round but for the last digits isn't given twice the room.
+    constexpr double Tolerance = 1e-4;
+    const double power = std::pow(10.0, std::floor(std::log10(peak * 0.5)));
+    return std::max(std::ceil(peak / power - Tolerance) * power, peak);
 }
 
 double peakMagnitude(std::span<const IqSample> samples)

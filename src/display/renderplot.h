@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "ColorTable.h"
+#include "PlotStyle.h"
 #include "view/SampleSource.h"
 
 #include <QImage>
@@ -25,10 +27,12 @@ enum class PlotView {
     Spectrum,
     Waterfall,
     Constellation,
+    Ccdf,
+    Overview, ///< of all samples, as one envelope
 };
 
 /// The names of the views on a command line, in the order of PlotView: "iq", "logmag", "logavg",
-/// "linavg", "phase", "frequency", "spectrum", "waterfall", "constellation".
+/// "linavg", "phase", "frequency", "spectrum", "waterfall", "constellation", "ccdf", "overview".
 [[nodiscard]] QStringList plotViewNames();
 
 /// Nothing for a name that is none of them.
@@ -40,12 +44,19 @@ struct PlotRequest
     // The samples, for the form of renderPlot that takes them from here.
     std::span<const IqSample> samples;
     std::span<const quint8> markers; ///< may be shorter than the samples
-    qint64 firstSample = 0;          ///< position of the first one in the waveform
-    double clockHz = 0;              ///< 0 labels the axes in samples
-    QSize size{800, 600};            ///< logical pixels
-    double pixelRatio = 1;           ///< device pixels to a logical one
-    bool showMarkers = false;        ///< the marker rows, in the views over time
+    qint64 firstSample = 0;   ///< position of the first one in the waveform, of the same form
+    double clockHz = 0;       ///< 0 labels the axes in samples
+    QSize size{800, 600};     ///< logical pixels
+    double pixelRatio = 1;    ///< device pixels to a logical one
+    bool showMarkers = false; ///< the marker rows, in the views over time
+    ColorMode palette = DefaultColorMode;
+    std::optional<LevelRange> range; ///< dB; nothing: what the view chooses; see takesRange
+    PlotTheme theme = PlotTheme::Dark;
+    QString title; ///< over the plot; empty for none
 };
+
+/// Whether a view has a scale in dB that a range can set.
+[[nodiscard]] bool takesRange(PlotView view);
 
 /// The picture that the display of this view would show of the samples. Reads them block by block,
 /// so that the memory needed doesn't grow with their number. Needs a QGuiApplication for its fonts

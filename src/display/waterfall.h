@@ -11,7 +11,12 @@
 [[nodiscard]] std::size_t waterfallLine(int row, int rows, std::size_t lineCount);
 
 /// Paints spectrum lines as a picture of a size in device pixels, time downwards, frequency to the
-/// right. Rows between two lines are mixed of both. Levels below -149 dB and above 0 dB keep the
-/// background colour.
+/// right. Rows between two lines are mixed of both. The range takes the whole scale of colours;
+/// levels beyond it have the colour of its nearer end.
 [[nodiscard]] QImage waterfallImage(const std::vector<SpectrumLines::Line> &lines,
-                                    const ColorTable &colors, const QSize &size);
+                                    const ColorTable &colors, const QSize &size,
+                                    const LevelRange &range = {});
+
+/// The range in which the levels of the lines lie, in steps of 10 dB: up to the highest one, down
+/// to what only a twentieth of them falls below. Lines without levels don't count.
+[[nodiscard]] LevelRange fittedRange(const std::vector<SpectrumLines::Line> &lines);

@@ -220,17 +220,20 @@ void TestDisplayWidgets::spectrumReadOut()
         const QStringList lines = painter.readOut(place, plot);
         QCOMPARE(lines.first(), "F 100 kHz");
         QCOMPARE(lines.last(), "L -20.00 dB");
-        if (mode == 1) { // line 4 of 9, at sample 1000 + 4 * 256
-            QCOMPARE(lines.at(1), "T 3.953 ms");
+        if (mode == 1) { // line 4 of 9, the middle of its frame at 1000 + 5 * 256
+            QCOMPARE(lines.at(1), "T 4.453 ms");
         }
         QVERIFY(painter.readOut(QPointF(2, 2), plot).isEmpty());
 
-        const QImage before = spectrum.picture();
+        const QImage before = spectrum.grab().toImage();
         moveTo(spectrum, place);
-        QVERIFY(spectrum.picture() != before);
+        QVERIFY(spectrum.grab().toImage() != before);
+        QCOMPARE(spectrum.picture(),
+                 before.convertToFormat(QImage::Format_RGB32)); // no read-out in it
+        moveTo(spectrum, place);
         QEvent leave(QEvent::Leave);
         QApplication::sendEvent(&spectrum, &leave);
-        QCOMPARE(spectrum.picture(), before);
+        QCOMPARE(spectrum.grab().toImage(), before);
     }
 }
 
@@ -291,7 +294,7 @@ void TestDisplayWidgets::savedPicturesAndData()
     const QString svg = folder.path("plot.svg");
     QVERIFY(trace.savePicture(svg));
     QVERIFY(load(svg).contains("<svg"));
-    QVERIFY(load(svg).contains("full scale 1")); // texts stay texts
+    QVERIFY(load(svg).contains("Full scale 1")); // texts stay texts
     const QString csv = folder.path("plot.csv");
     QVERIFY(trace.saveData(csv));
     QCOMPARE(load(csv), "sample,i,q,markers\n40,0.5,-0.25,1\n41,0.333333333,0,0\n42,0,0,15\n"
@@ -304,7 +307,7 @@ void TestDisplayWidgets::savedPicturesAndData()
     QVERIFY(spectrum.saveData(csv));
     const QList<QByteArray> lines = load(csv).split('\n');
     QCOMPARE(lines.size(), 514);
-    QCOMPARE(lines.first(), "frequency_hz,level_db");
+    QCOMPARE(lines.first(), "frequency_hz,level_db,max_db");
     QVERIFY(lines.at(1).startsWith("-256,"));
     QCOMPARE(lines.at(1 + 384).split(',').first(), "128");
     QVERIFY(std::fabs(lines.at(1 + 384).split(',').last().toDouble()) < 1e-6);
@@ -314,7 +317,7 @@ void TestDisplayWidgets::savedPicturesAndData()
     const QStringList errors = takeMessages();
     QCOMPARE(errors.size(), 2);
     QVERIFY(errors.at(0).contains("Cannot write '" + nowhere + "': "));
-    QVERIFY(errors.at(1).contains(".png or .svg"));
+    QVERIFY(errors.at(1).contains(".png, .svg or .pdf"));
 }
 
 void TestDisplayWidgets::timelineDrag()
