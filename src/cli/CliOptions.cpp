@@ -24,22 +24,6 @@ QString rangeText(const NumberRange &range, bool whole)
     return text(range.min) + " to " + text(range.max);
 }
 
-/// The number in the text; nothing if it isn't one. Fields overlook what stands behind the prefix
-/// letter, and letters that are none in this case; a script is told of both.
-std::optional<double> numberIn(const QString &text, const QString &unit)
-{
-    const auto number = parseNumber(text, unit, true);
-    if (!number || !number->trailing.isEmpty()) {
-        return std::nullopt;
-    }
-    QString prefix = text.simplified();
-    if (!unit.isEmpty() && prefix.endsWith(unit, Qt::CaseInsensitive)) {
-        prefix.chop(unit.size());
-    }
-    static const QRegularExpression unknownPrefix("[UNPF] *$");
-    return prefix.contains(unknownPrefix) ? std::nullopt : std::optional(number->value);
-}
-
 double parse(const std::string &name, const std::string &text, const NumberRange &range, bool whole)
 {
     const std::optional<double> number = numberIn(QString::fromLocal8Bit(text), range.unit);
@@ -75,6 +59,20 @@ CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberR
 }
 
 } // namespace
+
+std::optional<double> numberIn(const QString &text, const QString &unit)
+{
+    const auto number = parseNumber(text, unit, true);
+    if (!number || !number->trailing.isEmpty()) {
+        return std::nullopt;
+    }
+    QString prefix = text.simplified();
+    if (!unit.isEmpty() && prefix.endsWith(unit, Qt::CaseInsensitive)) {
+        prefix.chop(unit.size());
+    }
+    static const QRegularExpression unknownPrefix("[UNPF] *$");
+    return prefix.contains(unknownPrefix) ? std::nullopt : std::optional(number->value);
+}
 
 CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional<double> &value,
                        const NumberRange &range, const std::string &help)

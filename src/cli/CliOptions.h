@@ -24,6 +24,11 @@ struct NumberRange
     double max = std::numeric_limits<double>::max();
 };
 
+/// The number in an engineering form, its unit behind it or not; nothing if it isn't one. Fields
+/// overlook what stands behind the prefix letter, and letters that are none in this case; a script
+/// is told of both.
+[[nodiscard]] std::optional<double> numberIn(const QString &text, const QString &unit);
+
 /// Adds an option that takes a number in an engineering form: 10k, 1.5M, 1,5M, 10us, -3.
 CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional<double> &value,
                        const NumberRange &range, const std::string &help);

@@ -15,6 +15,7 @@ enum ExitCode {
     ExitDone = 0,
     ExitFailed = 1,
     ExitUsage = 2,
+    ExitLimit = 3, ///< all done, but a limit isn't met
     ExitCancelled = 130,
 };
 

@@ -7,8 +7,6 @@
 #include "base/OutputFile.h"
 #include "jobs/DumpJob.h"
 #include "jobs/InfoReport.h"
-#include "jobs/MeasureJob.h"
-#include "jobs/ReportText.h"
 #include "wvfile/HvFileIO.h"
 
 #include <QJsonArray>
@@ -86,43 +84,6 @@ int runDump(DumpArguments &arguments)
     return console.run(job);
 }
 
-struct MeasureArguments
-{
-    Console &console;
-    SampleRange range;
-    bool json = false;
-};
-
-int runMeasure(MeasureArguments &arguments)
-{
-    Console &console = arguments.console;
-    int exitCode = ExitDone;
-    if (!rangeFits(console, arguments.range, exitCode)) {
-        return exitCode;
-    }
-    MeasureJob job(arguments.range);
-    exitCode = console.run(job);
-    if (exitCode != ExitDone) {
-        return exitCode;
-    }
-    const LevelMeasurement &levels = job.result();
-    QByteArray text;
-    if (arguments.json) {
-        text = QJsonDocument(QJsonObject{{"samples", levels.samples},
-                                         {"peakOffset", levels.peakOffset},
-                                         {"rmsOffset", levels.rmsOffset},
-                                         {"crest", levels.crest()}})
-                   .toJson();
-    } else {
-        text = QString::asprintf("Samples:     %lld\nPeak Offset: %.6f dB\nRMS Offset:  %.6f dB\n"
-                                 "Peak / RMS:  %.6f dB\n",
-                                 levels.samples, writtenDb(levels.peakOffset),
-                                 writtenDb(levels.rmsOffset), writtenDb(levels.crest()))
-                   .toLatin1();
-    }
-    return console.print(text) ? ExitDone : console.failed();
-}
-
 } // namespace
 
 void addFileCommands(CommandSet &commands)
@@ -141,11 +102,4 @@ void addFileCommands(CommandSet &commands)
               "Form of the samples (default: csv)");
     addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)");
     dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
-
-    auto measure = std::make_shared<MeasureArguments>(MeasureArguments{commands.console, {}});
-    CLI::App &measureCommand =
-        addCommand<MeasureArguments>(commands.app, "measure", "Measure peak and RMS of the samples",
-                                     commands.action, measure, runMeasure);
-    addRange(measureCommand, measure->range);
-    measureCommand.add_flag("--json", measure->json, "Print JSON");
 }

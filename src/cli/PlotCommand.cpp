@@ -6,14 +6,14 @@
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
+#include "display/plotexport.h"
 #include "display/renderplot.h"
+#include "jobs/JobSource.h"
 #include "jobs/SampleReadJob.h"
 
-#include <QBuffer>
+#include <QFileInfo>
+#include <QPainter>
 #include <QRegularExpression>
-
-#include <atomic>
-#include <span>
 
 namespace {
 
@@ -23,44 +23,26 @@ struct PlotArguments
     SampleRange range;
     int view = 0;
     QSize size{800, 600};
+    double scale = 1;
     bool markers = false;
+    int palette = 0;
+    int theme = 0;
+    std::optional<LevelRange> levels;
+    QString title;
     QString output;
     bool force = false;
 };
 
-/// The samples of a file, with the progress and the cancel of a job.
-class PlotSource : public StreamSource
+QString suffixOf(const QString &fileName)
 {
-public:
-    PlotSource(ToolJob &job, SourceWaveform &source, qint64 first, qint64 count)
-        : StreamSource(*source.data(), *source.markers(), first, count)
-        , m_job(job)
-        , m_progress([&job](int percent) { emit job.ProgressUpdate(percent); }, m_never)
-    {
-    }
+    return QFileInfo(fileName).suffix().toLower();
+}
 
-    [[nodiscard]] bool restart() override
-    {
-        m_done = 0;
-        return StreamSource::restart();
-    }
-
-    [[nodiscard]] bool next(std::span<IqSample> samples, std::span<quint8> markers) override
-    {
-        // The tick lets the interrupt through, which the job then knows of.
-        if (m_progress.shouldStop(m_done, count()) || m_job.isCancelled()) {
-            return Tracer::fail("Action aborted by user.");
-        }
-        m_done += static_cast<qint64>(samples.size());
-        return StreamSource::next(samples, markers);
-    }
-
-private:
-    ToolJob &m_job;
-    const std::atomic<bool> m_never{false};
-    ProgressClock m_progress;
-    qint64 m_done = 0;
-};
+/// How often a view reads the samples.
+int passesOf(PlotView view)
+{
+    return view == PlotView::Constellation || view == PlotView::Ccdf ? 2 : 1;
+}
 
 /// Paints a range of a file as the viewer's display would.
 class PlotJob : public SampleReadJob
@@ -78,17 +60,25 @@ protected:
         PlotRequest request;
         request.view = static_cast<PlotView>(m_arguments.view);
         request.clockHz = source.info().clock;
-        request.size = m_arguments.size;
         request.showMarkers = m_arguments.markers;
-        PlotSource samples(*this, source, begin, count);
+        request.palette = colorModeOrder()[static_cast<std::size_t>(m_arguments.palette)];
+        request.theme = static_cast<PlotTheme>(m_arguments.theme);
+        request.range = m_arguments.levels;
+        request.title = m_arguments.title;
+        JobSource samples(*this, source, begin, count, passesOf(request.view));
         emit stepStarted("Painting...");
-        const QImage picture = renderPlot(request, samples);
-        if (picture.isNull()) {
-            return false;
+        bool painted = false;
+        const QByteArray picture = plotPicture(
+            suffixOf(m_arguments.output), m_arguments.size, m_arguments.scale,
+            [&](QPainter &painter) {
+                painted = paintPlot(painter, QRectF(QPointF(), m_arguments.size), request, samples);
+            });
+        if (picture.isEmpty()) {
+            return Tracer::fail("Cannot make the picture for '" + m_arguments.output +
+                                "': there is no memory for its pixels.");
         }
-        QBuffer png;
-        if (!picture.save(&png, "PNG")) {
-            return Tracer::fail("Cannot make the picture for '" + m_arguments.output + "'.");
+        if (!painted) {
+            return false;
         }
         // A cancel that came with the painting counts, too.
         ProgressClock::runEvents();
@@ -96,7 +86,7 @@ protected:
             return false;
         }
         OutputFile file(m_arguments.output, existingFile(m_arguments.force));
-        return (file.open() && file.write(png.data()) && file.commit()) ||
+        return (file.open() && file.write(picture) && file.commit()) ||
                Tracer::fail("Cannot write '" + m_arguments.output + "': " + file.errorString());
     }
 
@@ -107,6 +97,21 @@ private:
 int runPlot(PlotArguments &arguments)
 {
     Console &console = arguments.console;
+    if (!pictureSuffixes().contains(suffixOf(arguments.output))) {
+        return console.wrongUsage(
+            QString("--output: '%1' has no suffix of a picture; permitted: .png, .svg, .pdf")
+                .arg(arguments.output));
+    }
+    const auto view = static_cast<PlotView>(arguments.view);
+    if (arguments.levels && !takesRange(view)) {
+        return console.wrongUsage("--range: the view '" + plotViewNames().at(arguments.view) +
+                                  "' has no scale in dB; permitted with logmag, logavg, spectrum, "
+                                  "waterfall");
+    }
+    if (view == PlotView::Overview && (arguments.range.from || arguments.range.count)) {
+        return console.wrongUsage("--view: the overview is of the whole file; permitted without "
+                                  "--from and --count");
+    }
     if (!mayWrite(console, arguments.output, arguments.force) ||
         !isNoSource(console, arguments.output, arguments.range.fileName)) {
         return console.failed();
@@ -138,12 +143,53 @@ void addSize(CLI::App &command, QSize &size)
         ->type_name("WxH");
 }
 
+void addScale(CLI::App &command, double &scale)
+{
+    const auto take = [&scale](const std::string &text) {
+        constexpr double Least = 0.25;
+        constexpr double Most = 16;
+        const auto number = numberIn(QString::fromStdString(text), {});
+        if (!number || !(*number >= Least) || !(*number <= Most)) {
+            throw CLI::ValidationError("--scale: '" + text +
+                                       "' is out of range; permitted: 0.25 to 16");
+        }
+        scale = *number;
+    };
+    command
+        .add_option_function<std::string>(
+            "--scale", take, "Enlarge the picture with its lines and texts (default: 1)")
+        ->type_name("NUMBER");
+}
+
+void addLevels(CLI::App &command, std::optional<LevelRange> &levels)
+{
+    const auto take = [&levels](const std::string &text) {
+        const QStringList parts = QString::fromStdString(text).split(',');
+        const auto low = parts.size() == 2 ? numberIn(parts[0], "dB") : std::nullopt;
+        const auto high = parts.size() == 2 ? numberIn(parts[1], "dB") : std::nullopt;
+        constexpr double Least = -400;
+        constexpr double Most = 200;
+        if (!low || !high || !(*low < *high) || *low < Least || *high > Most) {
+            throw CLI::ValidationError("--range: '" + text +
+                                       "' is no range; permitted: two levels from -400 to 200 dB, "
+                                       "the lower one first, such as -80,0");
+        }
+        levels = LevelRange{*low, *high};
+    };
+    command
+        .add_option_function<std::string>(
+            "--range", take,
+            "Levels in dB at the ends of the scale, in the log views, the spectrum and the "
+            "waterfall (default: 0 dB downwards, the waterfall as its data lie)")
+        ->type_name("LO,HI");
+}
+
 } // namespace
 
 void addPlotCommand(CommandSet &commands)
 {
-    auto plot = std::make_shared<PlotArguments>(
-        PlotArguments{.console = commands.console, .range = {}, .output = {}});
+    auto plot = std::make_shared<PlotArguments>(PlotArguments{
+        .console = commands.console, .range = {}, .levels = {}, .title = {}, .output = {}});
     CLI::App &command =
         addCommand<PlotArguments>(commands.app, "plot", "Paint samples as the viewer shows them",
                                   commands.action, plot, runPlot);
@@ -151,6 +197,14 @@ void addPlotCommand(CommandSet &commands)
     addChoice(command, "--view", plot->view, plotViewNames(), "What to show (default: iq)");
     addSize(command, plot->size);
     command.add_flag("--markers", plot->markers, "Show the marker rows, in the views over time");
-    addOutputFile(command, plot->output, "Picture to write, PNG")->required();
+    addScale(command, plot->scale);
+    addChoice(command, "--palette", plot->palette,
+              {"viridis", "rainbow", "blackwhite", "blue", "noise"},
+              "Colours of waterfall and constellation (default: viridis)");
+    addLevels(command, plot->levels);
+    addChoice(command, "--theme", plot->theme, {"dark", "light"},
+              "Ground of the picture (default: dark)");
+    addText(command, "--title", plot->title, "Text over the plot");
+    addOutputFile(command, plot->output, "Picture to write: .png, .svg or .pdf")->required();
     command.add_flag("--force", plot->force, "Overwrite an existing file");
 }

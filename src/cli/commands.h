@@ -17,6 +17,7 @@ struct CommandSet
 };
 
 void addFileCommands(CommandSet &commands);
+void addMeasureCommand(CommandSet &commands);
 void addPlotCommand(CommandSet &commands);
 void addCreateCommands(CommandSet &commands);
 void addEditCommands(CommandSet &commands);

@@ -96,6 +96,7 @@ int run(int argc, char **argv)
 
     CommandSet commands{app, console, action};
     addFileCommands(commands);
+    addMeasureCommand(commands);
     addPlotCommand(commands);
     addCreateCommands(commands);
     addEditCommands(commands);

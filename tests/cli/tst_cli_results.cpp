@@ -193,7 +193,8 @@ void TestCliResults::measuresSamples()
     const CliRun answer = run("measure in.wv --json");
     QCOMPARE(answer.exitCode, 0);
     const QJsonObject levels = json(answer).object();
-    QCOMPARE(levels.keys(), (QStringList{"crest", "peakOffset", "rmsOffset", "samples"}));
+    QCOMPARE(levels.keys(), (QStringList{"ccdf", "crest", "dcI", "dcQ", "obw99", "obwCentre",
+                                         "peakOffset", "rmsOffset", "samples"}));
     const double half = 0.5 / 32767;
     const double high = 16383.5 / 32767;
     const double low = 100.5 / 32767;

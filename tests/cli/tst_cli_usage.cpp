@@ -99,7 +99,11 @@ void TestCliUsage::refusesWrongUsage()
         {"dump in.wv -o out --from 1.5", "--from: '1.5' is not a whole number; .*"},
         {"dump in.wv -o out --from 99999999999", "--from: '99999999999' is out of range; .*"},
         {"dump in.wv -o out --count 5", "--count: 5 leads outside the file; permitted: 1 to 4"},
-        {"plot in.wv -o out --view x", "--view: 'x' is unknown; permitted: iq, .*, constellation"},
+        {"plot in.wv -o out.bmp", "--output: 'out.bmp' has no suffix of a picture; .*"},
+        {"plot in.wv -o out.png --view iq --range -80,0", "--range: the view 'iq' has no scale.*"},
+        {"measure in.wv --limit foo<3", "--limit: 'foo<3' is no limit; permitted: .*"},
+        {"measure in.wv --band 3,2", "--band: '3,2' is no band; permitted: .*"},
+        {"plot in.wv -o out --view x", "--view: 'x' is unknown; permitted: iq, .*, overview"},
         {"plot in.wv -o out --size 63x64", "--size: 63x64 is not permitted; permitted: 64x64 .*"},
         {"create function", ".*--output.*"},
         {"create function -o out --freq 99",
@@ -193,11 +197,13 @@ void TestCliUsage::keepsExistingFiles()
 {
     for (const char *arguments :
          {"level in.wv -o out.wv", "import wav in.wav -o out.wv", "dump in.wv -o out.wv",
-          "plot in.wv -o out.wv", "create pm -o out.wv", "resample in.wv --samples 8 -o in.wv"}) {
-        QVERIFY(m_folder.store("out.wv", "mine"));
+          "plot in.wv -o out.png", "create pm -o out.wv", "resample in.wv --samples 8 -o in.wv"}) {
+        for (const char *name : {"out.wv", "out.png"}) {
+            QVERIFY(m_folder.store(name, "mine"));
+        }
         const CliRun answer = run(QString(arguments));
         QVERIFY2(answer.exitCode == 1 && answer.lastLine().contains("--force"), arguments);
-        QCOMPARE(m_folder.load("out.wv"), "mine");
+        QCOMPARE(m_folder.load("out.wv") + m_folder.load("out.png"), "minemine");
         QVERIFY2(m_folder.load("in.wv") == wvBytes, arguments);
     }
 }
