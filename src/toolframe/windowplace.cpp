@@ -29,6 +29,17 @@ void readWindowPlace(const QSettings &settings, QWidget &window, QPoint position
         screen = QGuiApplication::primaryScreen();
         position = screen->availableGeometry().topLeft();
     }
-    window.resize(size.boundedTo(screen->availableGeometry().size()));
+    const QRect room = screen->availableGeometry();
+    size = size.boundedTo(room.size());
+    if (!room.contains(QRect(position, size))) {
+        // The buttons are at its lower edge. What is moved has room for its frame, too.
+        constexpr QSize Frame(8, 36);
+        size = size.boundedTo(room.size() - Frame);
+        const QPoint last = room.bottomRight() - QPoint(size.width(), size.height()) -
+                            QPoint(Frame.width(), Frame.height());
+        position = {qMax(room.left(), qMin(position.x(), last.x())),
+                    qMax(room.top(), qMin(position.y(), last.y()))};
+    }
+    window.resize(size);
     window.move(position);
 }

@@ -7,6 +7,9 @@
 
 class CWidgetConstellation;
 class CWidgetSpectrum;
+class FiguresBox;
+class QComboBox;
+class QSplitter;
 class SourceWaveform;
 class ViewWindow;
 
@@ -43,7 +46,14 @@ protected:
 
 private:
     void addPlots();
+    void addSideColumn();
+    void addSpectrumChoices();
+    void applySpectrumChoices();
+    void showFrequencyLimits();
+    void enlarge(QWidget *plot);
     void showWindow();
+    void showSpectrum();
+    void showCursorSample();
     void clearCursorValues();
     void showDelta();
     void showFile();
@@ -54,4 +64,9 @@ private:
     std::unique_ptr<SourceWaveform> m_source;
     CWidgetSpectrum *m_spectrum = nullptr;
     CWidgetConstellation *m_constellation = nullptr;
+    QSplitter *m_plots = nullptr;
+    FiguresBox *m_figures = nullptr;
+    QComboBox *m_average = nullptr;
+    QComboBox *m_length = nullptr;
+    QComboBox *m_window = nullptr;
 };

@@ -4,14 +4,20 @@
 #include "display/CWidgetIQTrace.h"
 #include "display/CWidgetTimeline.h"
 #include "log/Tracer.h"
+#include "streams/samplestream.h"
+#include "view/TraceBins.h"
 
 #include <QElapsedTimer>
 #include <QHBoxLayout>
+#include <QShortcut>
+#include <QSplitter>
 #include <QToolButton>
 #include <QVBoxLayout>
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
+#include <vector>
 
 ViewFrame::ViewFrame(QWidget *parent)
     : QWidget(parent)
@@ -19,6 +25,7 @@ ViewFrame::ViewFrame(QWidget *parent)
     , m_timeline(new CWidgetTimeline)
     , m_column(new QVBoxLayout(this))
     , m_buttons(new QHBoxLayout)
+    , m_splitter(new QSplitter(Qt::Vertical))
 {
     m_trace->setObjectName("w_iqtrace");
     m_trace->setMinimumSize(200, 160);
@@ -26,7 +33,9 @@ ViewFrame::ViewFrame(QWidget *parent)
     m_timeline->setObjectName("w_timeline");
     m_timeline->setToolTip("The whole waveform; drag the visible range");
     m_column->setContentsMargins(0, 0, 0, 0);
-    m_column->addWidget(m_trace, 3);
+    m_splitter->addWidget(m_trace);
+    m_splitter->setChildrenCollapsible(false);
+    m_column->addWidget(m_splitter, 1);
     m_column->addWidget(m_timeline);
     m_column->addLayout(m_buttons);
     addNavigation();
@@ -35,8 +44,21 @@ ViewFrame::ViewFrame(QWidget *parent)
     connect(m_timeline, &CWidgetTimeline::state_xpos, this, &ViewFrame::state_position);
     connect(m_trace, &CWidgetIQTrace::mouseCsrData, this, &ViewFrame::set_csr_data);
     connect(m_trace, &CWidgetIQTrace::mouseZoomSet, this, &ViewFrame::set_zoom_position);
-    connect(m_trace, &CWidgetIQTrace::zoom_in, this, &ViewFrame::slot_zoomin);
-    connect(m_trace, &CWidgetIQTrace::zoom_out, this, &ViewFrame::slot_zoomout);
+    // What lies under the mouse stays there.
+    const auto underMouse = [this] {
+        const int sample = m_trace->wheelSample();
+        return sample < 0 ? NoSample : m_window.first() + sample;
+    };
+    connect(m_trace, &CWidgetIQTrace::zoom_in, this, [=, this] { zoom(false, underMouse()); });
+    connect(m_trace, &CWidgetIQTrace::zoom_out, this, [=, this] { zoom(true, underMouse()); });
+    connect(m_timeline, &CWidgetTimeline::zoomRequested, this,
+            [this](bool outwards) { zoom(outwards, NoSample); });
+    connect(&m_overviewTimer, &QTimer::timeout, this, &ViewFrame::readOverview);
+    const std::pair<const char *, qint64> steps[] = {{"Alt+Left", -1}, {"Alt+Right", 1}};
+    for (const auto &[key, step] : steps) {
+        auto *shortcut = new QShortcut(QKeySequence(key), this);
+        connect(shortcut, &QShortcut::activated, this, [this, step = step] { moveCursor(step); });
+    }
 }
 
 void ViewFrame::addNavigation()
@@ -84,7 +106,9 @@ void ViewFrame::addNavigation()
 
 void ViewFrame::addPlots(QWidget *plots)
 {
-    m_column->insertWidget(1, plots, 2);
+    m_splitter->addWidget(plots);
+    m_splitter->setStretchFactor(0, 3);
+    m_splitter->setStretchFactor(m_splitter->count() - 1, 2);
 }
 
 void ViewFrame::addButton(QWidget *button)
@@ -105,12 +129,73 @@ bool ViewFrame::setWaveform(BufferedIO *iqStream, BufferedIO *markerStream, qint
         return false;
     }
     refresh();
+    m_data = iqStream;
+    m_markerBytes = markerStream;
+    m_overview = m_fileName.isEmpty() ? Overview(samples) : Overview::kept(m_fileName, samples);
+    m_timeline->setOverview(m_overview);
+    if (!m_overview.isComplete()) {
+        m_overviewTimer.start(0);
+    }
     return true;
+}
+
+/// A piece at a time, between the events of the window: the streams are those of the view, too.
+void ViewFrame::readOverview()
+{
+    constexpr qint64 PieceSamples = 1 << 19;
+    constexpr qint64 PicturePieces = 16; // after how many the bar is painted again
+    const qint64 taken = m_overview.taken();
+    const auto count =
+        static_cast<std::size_t>(std::min(PieceSamples, m_overview.samples() - taken));
+    std::vector<float> iq(2 * count);
+    std::vector<quint8> markers(count);
+    const qint64 start = BufferedIO::HeaderSize + BufferedIO::RecordSize * taken;
+    const bool read = m_data->restartAtPosition(start) &&
+                      readSamples(*m_data, iq) == static_cast<int>(count) &&
+                      m_markerBytes->restartAtPosition(taken) &&
+                      m_markerBytes->readBlock(static_cast<int>(count), markers.data()) ==
+                          static_cast<int>(count);
+    if (!read) {
+        m_overviewTimer.stop(); // the view itself tells of a file that can't be read
+        return;
+    }
+    m_overview.append(iq, markers);
+    if (m_overview.isComplete()) {
+        m_overviewTimer.stop();
+        if (!m_fileName.isEmpty()) {
+            m_overview.save(m_fileName);
+        }
+    }
+    if (m_overview.isComplete() || taken / PieceSamples % PicturePieces == 0) {
+        m_timeline->setOverview(m_overview);
+    }
+}
+
+void ViewFrame::zoom(bool outwards, qint64 kept)
+{
+    if (!isEmpty() && (outwards ? m_window.zoomOut(kept) : m_window.zoomIn(kept))) {
+        refresh();
+    }
+}
+
+void ViewFrame::moveCursor(qint64 step)
+{
+    if (isEmpty()) {
+        return;
+    }
+    // A key press is a column where a column is more than a sample.
+    const qint64 width = std::max<qint64>(m_window.points() / TraceBins::BinCount, 1);
+    const qint64 first = m_window.first();
+    const qint64 here = cursor(Measuring) == NoSample ? first : cursor(Measuring) + step * width;
+    const qint64 sample = std::clamp<qint64>(here, first, first + m_window.points() - 1);
+    const IqSample &value = m_window.samples().at(sample - first);
+    set_csr_data(sample - first, value.i, value.q);
 }
 
 void ViewFrame::clear()
 {
     slot_stop();
+    m_overviewTimer.stop();
     m_window.release();
     m_clockHz = 0;
     m_cursors.fill(NoSample);
@@ -165,6 +250,9 @@ void ViewFrame::hideEvent(QHideEvent *event)
 
 void ViewFrame::moveTo(qint64 first)
 {
+    if (!isEmpty() && first == m_window.first() && !m_window.samples().isEmpty()) {
+        return; // at the end already
+    }
     Tracer::Trace(Tracer::Information, QString("New start sample: %1").arg(first));
     if (m_window.show(first)) {
         refresh();
@@ -187,7 +275,7 @@ void ViewFrame::slot_reverse()
 
 void ViewFrame::slot_forward()
 {
-    moveTo(m_window.forward());
+    moveTo(std::min(m_window.forward(), m_window.end()));
 }
 
 void ViewFrame::slot_reverse_little()
@@ -197,7 +285,7 @@ void ViewFrame::slot_reverse_little()
 
 void ViewFrame::slot_forward_little()
 {
-    moveTo(m_window.forwardLittle());
+    moveTo(std::min(m_window.forwardLittle(), m_window.end()));
 }
 
 void ViewFrame::slot_move_start()
@@ -240,16 +328,12 @@ void ViewFrame::slot_playstep()
 
 void ViewFrame::slot_zoomin()
 {
-    if (!isEmpty() && m_window.zoomIn()) {
-        refresh();
-    }
+    zoom(false, NoSample);
 }
 
 void ViewFrame::slot_zoomout()
 {
-    if (!isEmpty() && m_window.zoomOut()) {
-        refresh();
-    }
+    zoom(true, NoSample);
 }
 
 void ViewFrame::slot_zoomin_y()

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "view/Overview.h"
 #include "view/PlayInterval.h"
 #include "view/ViewWindow.h"
 
@@ -13,6 +14,7 @@ class BufferedIO;
 class CWidgetIQTrace;
 class CWidgetTimeline;
 class QHBoxLayout;
+class QSplitter;
 class QVBoxLayout;
 
 /// The frame in which tools look at a whole waveform: a trace "w_iqtrace" of the window's samples,
@@ -42,13 +44,24 @@ public:
     /// Marks the samples from `first` to `last`, both included.
     void setRange(qint64 first, qint64 last);
 
-    /// Places a widget between trace and overview bar, for displays that follow the window.
+    /// Adds a display that follows the window below the trace, with a grip between them.
     void addPlots(QWidget *plots);
+
+    /// The trace and what was added, for whoever keeps their sizes.
+    [[nodiscard]] QSplitter &splitter() { return *m_splitter; }
+
+    /// The name of the shown file, for the overview that is kept of it; before setWaveform.
+    void setFileName(const QString &fileName) { m_fileName = fileName; }
 
     /// Appends a widget to the row of buttons.
     void addButton(QWidget *button);
 
     [[nodiscard]] const ViewWindow &window() const { return m_window; }
+    /// Samples about the middle of the view, see ViewWindow::around.
+    [[nodiscard]] IqList around(qint64 count, qint64 &first)
+    {
+        return m_window.around(count, first);
+    }
     [[nodiscard]] double clockHz() const { return m_clockHz; }
     [[nodiscard]] CWidgetIQTrace &trace() { return *m_trace; }
 
@@ -100,12 +113,21 @@ private:
     void moveTo(qint64 first);
     void refresh();
     void placeCursors();
+    void readOverview();
+    void zoom(bool outwards, qint64 kept);
+    void moveCursor(qint64 step);
     [[nodiscard]] bool isEmpty() const { return m_window.sampleCount() == 0; }
 
     CWidgetIQTrace *m_trace = nullptr;
     CWidgetTimeline *m_timeline = nullptr;
     QVBoxLayout *m_column = nullptr;
     QHBoxLayout *m_buttons = nullptr;
+    QSplitter *m_splitter = nullptr;
+    BufferedIO *m_data = nullptr;
+    BufferedIO *m_markerBytes = nullptr;
+    QString m_fileName;
+    Overview m_overview;
+    QTimer m_overviewTimer; ///< each turn reads a piece of the file
     ViewWindow m_window;
     QTimer m_playTimer;
     PlayInterval m_playInterval;
