@@ -97,6 +97,11 @@ bool saveWidgets(const QDir &folder)
     const auto save = [&](CWidgetBase &widget, const char *name) {
         good = widget.savePicture(folder.filePath(QString("display-%1.png").arg(name))) && good;
     };
+    // With what the mouse points at, which no saved picture shows.
+    const auto saveAsSeen = [&](CWidgetBase &widget, const char *name) {
+        const QString file = folder.filePath(QString("display-%1.png").arg(name));
+        good = widget.grab().save(file) && good;
+    };
     CWidgetIQTrace trace;
     trace.resize(800, 500);
     trace.setClock(Clock);
@@ -117,15 +122,13 @@ bool saveWidgets(const QDir &folder)
     spectrum.resize(800, 500);
     spectrum.setClock(Clock);
     spectrum.setData(chirp.samples);
-    const char *names[] = {"rainbow", "blackwhite", "blue", "noise"};
-    for (int mode = 0; mode < ColorModeCount; ++mode) {
-        spectrum.setColorMode(mode);
-        moveMouse(spectrum, {480, 250});
-        save(spectrum, qPrintable(QString("waterfall-%1").arg(names[mode])));
+    for (int index = 0; index < ColorModeCount; ++index) {
+        spectrum.setColorMode(static_cast<int>(colorModeOrder().at(static_cast<size_t>(index))));
+        save(spectrum, qPrintable("waterfall-" + colorModeKeys().at(index)));
     }
     spectrum.setView(0);
     moveMouse(spectrum, {480, 200});
-    save(spectrum, "spectrum-readout");
+    saveAsSeen(spectrum, "spectrum-readout");
     spectrum.setData(toneSamples(400, 0.1));
     save(spectrum, "spectrum-short");
 
@@ -133,7 +136,7 @@ bool saveWidgets(const QDir &folder)
     constellation.resize(500, 400);
     constellation.setData(symbols(20000));
     moveMouse(constellation, {330, 130});
-    save(constellation, "constellation-readout");
+    saveAsSeen(constellation, "constellation-readout");
     constellation.setData(toneSamples(300, 0.05));
     save(constellation, "constellation-dots");
 

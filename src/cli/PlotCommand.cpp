@@ -198,8 +198,7 @@ void addPlotCommand(CommandSet &commands)
     addSize(command, plot->size);
     command.add_flag("--markers", plot->markers, "Show the marker rows, in the views over time");
     addScale(command, plot->scale);
-    addChoice(command, "--palette", plot->palette,
-              {"viridis", "rainbow", "blackwhite", "blue", "noise"},
+    addChoice(command, "--palette", plot->palette, colorModeKeys(),
               "Colours of waterfall and constellation (default: viridis)");
     addLevels(command, plot->levels);
     addChoice(command, "--theme", plot->theme, {"dark", "light"},

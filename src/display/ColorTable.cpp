@@ -56,6 +56,11 @@ QString colorModeName(ColorMode mode)
     return Names[static_cast<std::size_t>(mode)];
 }
 
+QStringList colorModeKeys()
+{
+    return {"viridis", "rainbow", "blackwhite", "blue", "noise"};
+}
+
 const std::array<ColorMode, ColorModeCount> &colorModeOrder()
 {
     static constexpr std::array<ColorMode, ColorModeCount> Order{

@@ -2,7 +2,7 @@
 #pragma once
 
 #include <QRgb>
-#include <QString>
+#include <QStringList>
 
 #include <array>
 
@@ -22,6 +22,9 @@ constexpr ColorMode DefaultColorMode = ColorMode::Viridis;
 
 /// The name of a scale as menus show it.
 [[nodiscard]] QString colorModeName(ColorMode mode);
+
+/// The names of the scales on a command line, in the order of menus.
+[[nodiscard]] QStringList colorModeKeys();
 
 /// The scales in the order of menus.
 [[nodiscard]] const std::array<ColorMode, ColorModeCount> &colorModeOrder();

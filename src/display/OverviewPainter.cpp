@@ -30,11 +30,16 @@ OverviewPainter::OverviewPainter(const PlotStyle &style, const Overview &overvie
     }
 }
 
+QRectF OverviewPainter::plotOf(const PlotStyle &style, const QRectF &area)
+{
+    const QFontMetricsF metrics(style.font);
+    const double left = std::ceil(metrics.horizontalAdvance("1.234")) + 10;
+    return area.adjusted(left, 8, -10, -metrics.height() - 7);
+}
+
 void OverviewPainter::paint(QPainter &painter, const QRectF &area, double clockHz) const
 {
-    const QFontMetricsF metrics(m_style.font);
-    const double left = std::ceil(metrics.horizontalAdvance("1.234")) + 10;
-    const QRectF plot = area.adjusted(left, 8, -10, -metrics.height() - 7);
+    const QRectF plot = plotOf(m_style, area);
     fillArea(painter, area, m_style.color(ColorSlot::PanelBackground));
     if (plot.width() <= 0 || plot.height() <= 0) {
         return;

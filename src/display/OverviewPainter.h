@@ -18,6 +18,9 @@ public:
     /// As a picture with axes.
     void paint(QPainter &painter, const QRectF &area, double clockHz) const;
 
+    /// Where a picture with axes has its values.
+    [[nodiscard]] static QRectF plotOf(const PlotStyle &style, const QRectF &area);
+
     /// The envelope and the markers alone, in a place of any size.
     void paintBare(QPainter &painter, const QRectF &place) const;
 

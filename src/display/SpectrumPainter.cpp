@@ -69,14 +69,16 @@ double SpectrumPainter::yOf(const QRectF &plot, double db) const
 double SpectrumPainter::xOfShare(const QRectF &plot, double share) const
 {
     // A point stands for the stretch about its frequency; the first one begins at the left edge.
-    const auto points = static_cast<double>(std::max<std::size_t>(m_scene.trace.level.size(), 1));
+    const auto points =
+        static_cast<double>(m_scene.trace.level.empty() ? Bins : m_scene.trace.level.size());
     const double span = m_scene.highShare - m_scene.lowShare;
     return plot.left() + (share + 0.5 / points - m_scene.lowShare) / span * plot.width();
 }
 
 double SpectrumPainter::shareAt(const QRectF &plot, double x) const
 {
-    const auto points = static_cast<double>(std::max<std::size_t>(m_scene.trace.level.size(), 1));
+    const auto points =
+        static_cast<double>(m_scene.trace.level.empty() ? Bins : m_scene.trace.level.size());
     const double span = m_scene.highShare - m_scene.lowShare;
     return m_scene.lowShare + (x - plot.left()) / plot.width() * span - 0.5 / points;
 }

@@ -165,8 +165,8 @@ void DlgView::applySpectrumChoices()
 /// One plot alone, or all of them again.
 void DlgView::enlarge(QWidget *plot)
 {
-    const bool isAlone = m_ui->w_view->trace().isHidden();
-    m_ui->w_view->trace().setVisible(isAlone);
+    const bool isAlone = !m_ui->w_view->isUpperPlotVisible();
+    m_ui->w_view->setUpperPlotVisible(isAlone);
     for (QWidget *other :
          {static_cast<QWidget *>(m_spectrum), static_cast<QWidget *>(m_constellation)}) {
         other->setVisible(isAlone || other == plot);

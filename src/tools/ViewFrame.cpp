@@ -2,6 +2,7 @@
 #include "ViewFrame.h"
 
 #include "display/CWidgetIQTrace.h"
+#include "display/CWidgetOverview.h"
 #include "display/CWidgetTimeline.h"
 #include "log/Tracer.h"
 #include "streams/samplestream.h"
@@ -9,6 +10,7 @@
 
 #include <QElapsedTimer>
 #include <QHBoxLayout>
+#include <QKeyEvent>
 #include <QShortcut>
 #include <QSplitter>
 #include <QToolButton>
@@ -19,10 +21,35 @@
 #include <utility>
 #include <vector>
 
+namespace {
+
+/// A button whose key acts at once: the toolkit's own way waits for the picture of a pressed
+/// button, and for ever while the key is held.
+class KeyButton : public QToolButton
+{
+public:
+    using QToolButton::QToolButton;
+
+protected:
+    bool event(QEvent *event) override
+    {
+        if (event->type() != QEvent::Shortcut ||
+            static_cast<QShortcutEvent *>(event)->isAmbiguous()) {
+            return QToolButton::event(event);
+        }
+        click();
+        return true;
+    }
+};
+
+} // namespace
+
 ViewFrame::ViewFrame(QWidget *parent)
     : QWidget(parent)
     , m_trace(new CWidgetIQTrace)
+    , m_whole(new CWidgetOverview)
     , m_timeline(new CWidgetTimeline)
+    , m_wholeButton(new KeyButton)
     , m_column(new QVBoxLayout(this))
     , m_buttons(new QHBoxLayout)
     , m_splitter(new QSplitter(Qt::Vertical))
@@ -34,11 +61,13 @@ ViewFrame::ViewFrame(QWidget *parent)
     m_timeline->setToolTip("The whole waveform; drag the visible range");
     m_column->setContentsMargins(0, 0, 0, 0);
     m_splitter->addWidget(m_trace);
+    m_splitter->addWidget(m_whole);
     m_splitter->setChildrenCollapsible(false);
     m_column->addWidget(m_splitter, 1);
     m_column->addWidget(m_timeline);
     m_column->addLayout(m_buttons);
     addNavigation();
+    addWholeView();
     connect(&m_playTimer, &QTimer::timeout, this, &ViewFrame::slot_playstep);
     connect(m_timeline, &CWidgetTimeline::mouse_xpos, this, &ViewFrame::update_position);
     connect(m_timeline, &CWidgetTimeline::state_xpos, this, &ViewFrame::state_position);
@@ -92,7 +121,7 @@ void ViewFrame::addNavigation()
         if (button.slot == &ViewFrame::slot_zoomin) {
             m_buttons->addSpacing(Gap);
         }
-        auto *made = new QToolButton;
+        auto *made = new KeyButton;
         made->setObjectName(button.name);
         made->setText(button.text);
         made->setToolTip(button.toolTip);
@@ -101,13 +130,52 @@ void ViewFrame::addNavigation()
         connect(made, &QToolButton::clicked, this, button.slot);
         m_buttons->addWidget(made);
     }
+    m_wholeButton->setObjectName("pb_whole");
+    m_wholeButton->setText("All");
+    m_wholeButton->setToolTip("Show the Whole Waveform");
+    m_wholeButton->setShortcut(QKeySequence("A"));
+    m_wholeButton->setCheckable(true);
+    m_wholeButton->setMinimumSize(Side, Side);
+    m_buttons->addWidget(m_wholeButton);
     m_buttons->addStretch();
+}
+
+void ViewFrame::addWholeView()
+{
+    m_whole->setObjectName("w_whole");
+    m_whole->setMinimumSize(m_trace->minimumSize());
+    m_whole->setToolTip("Click to view a part");
+    m_whole->hide();
+    connect(m_wholeButton, &QToolButton::toggled, this, &ViewFrame::showWhole);
+    connect(m_whole, &CWidgetOverview::sampleChosen, this, [this](qlonglong sample) {
+        m_wholeButton->setChecked(false);
+        moveTo(m_window.centredOn(sample));
+    });
+}
+
+void ViewFrame::showWhole(bool whole)
+{
+    const bool visible = isUpperPlotVisible();
+    m_wholeButton->setChecked(whole);
+    setUpperPlotVisible(visible);
+}
+
+void ViewFrame::setUpperPlotVisible(bool visible)
+{
+    m_trace->setVisible(visible && !m_wholeButton->isChecked());
+    m_whole->setVisible(visible && m_wholeButton->isChecked());
+}
+
+bool ViewFrame::isUpperPlotVisible() const
+{
+    return !m_trace->isHidden() || !m_whole->isHidden();
 }
 
 void ViewFrame::addPlots(QWidget *plots)
 {
     m_splitter->addWidget(plots);
     m_splitter->setStretchFactor(0, 3);
+    m_splitter->setStretchFactor(1, 3);
     m_splitter->setStretchFactor(m_splitter->count() - 1, 2);
 }
 
@@ -132,11 +200,17 @@ bool ViewFrame::setWaveform(BufferedIO *iqStream, BufferedIO *markerStream, qint
     m_data = iqStream;
     m_markerBytes = markerStream;
     m_overview = m_fileName.isEmpty() ? Overview(samples) : Overview::kept(m_fileName, samples);
-    m_timeline->setOverview(m_overview);
+    showOverview();
     if (!m_overview.isComplete()) {
         m_overviewTimer.start(0);
     }
     return true;
+}
+
+void ViewFrame::showOverview()
+{
+    m_timeline->setOverview(m_overview);
+    m_whole->setOverview(m_overview, m_clockHz);
 }
 
 /// A piece at a time, between the events of the window: the streams are those of the view, too.
@@ -167,7 +241,7 @@ void ViewFrame::readOverview()
         }
     }
     if (m_overview.isComplete() || taken / PieceSamples % PicturePieces == 0) {
-        m_timeline->setOverview(m_overview);
+        showOverview();
     }
 }
 
@@ -202,6 +276,7 @@ void ViewFrame::clear()
     m_range.fill(NoSample);
     m_trace->clear();
     m_timeline->setWaveform(0, 0);
+    m_whole->setOverview({}, 0);
     placeCursors();
 }
 
@@ -264,6 +339,7 @@ void ViewFrame::refresh()
     m_trace->setFirstSample(m_window.first());
     m_trace->setData(m_window.samples(), m_window.markers());
     m_timeline->setRange(m_window.first(), m_window.points());
+    m_whole->setRange(m_window.first(), m_window.points());
     placeCursors();
     emit windowChanged();
 }

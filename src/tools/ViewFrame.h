@@ -12,9 +12,11 @@
 
 class BufferedIO;
 class CWidgetIQTrace;
+class CWidgetOverview;
 class CWidgetTimeline;
 class QHBoxLayout;
 class QSplitter;
+class QToolButton;
 class QVBoxLayout;
 
 /// The frame in which tools look at a whole waveform: a trace "w_iqtrace" of the window's samples,
@@ -46,6 +48,10 @@ public:
 
     /// Adds a display that follows the window below the trace, with a grip between them.
     void addPlots(QWidget *plots);
+
+    /// Shows or hides the upper plot: the trace, or the whole waveform in its place.
+    void setUpperPlotVisible(bool visible);
+    [[nodiscard]] bool isUpperPlotVisible() const;
 
     /// The trace and what was added, for whoever keeps their sizes.
     [[nodiscard]] QSplitter &splitter() { return *m_splitter; }
@@ -86,6 +92,9 @@ public slots:
     void slot_zoomout_y();
     void slot_move_start();
     void slot_move_end();
+    /// Shows the whole waveform's envelope instead of the trace, until a click in it chooses where
+    /// the view goes.
+    void showWhole(bool whole);
     /// Moves the view to a first sample, as the overview bar asks.
     void update_position(double firstSample);
     /// The same from elsewhere; the bar follows.
@@ -114,12 +123,16 @@ private:
     void refresh();
     void placeCursors();
     void readOverview();
+    void showOverview();
+    void addWholeView();
     void zoom(bool outwards, qint64 kept);
     void moveCursor(qint64 step);
     [[nodiscard]] bool isEmpty() const { return m_window.sampleCount() == 0; }
 
     CWidgetIQTrace *m_trace = nullptr;
+    CWidgetOverview *m_whole = nullptr;
     CWidgetTimeline *m_timeline = nullptr;
+    QToolButton *m_wholeButton = nullptr;
     QVBoxLayout *m_column = nullptr;
     QHBoxLayout *m_buttons = nullptr;
     QSplitter *m_splitter = nullptr;

@@ -13,6 +13,7 @@
 #include "tools/ViewFrame.h"
 
 #include "display/CWidgetIQTrace.h"
+#include "display/CWidgetOverview.h"
 #include "display/CWidgetTimeline.h"
 #include "display/QtNumericEdit.h"
 #include "wvfile/HvFileIO.h"
@@ -328,23 +329,42 @@ void TestTools::viewMovesZoomsAndPlays()
     QVERIFY(view.startModule(path("long.wv")));
     view.show();
     QCOMPARE(view.window().points(), 5000);
-    // A twentieth of the view is a small step; a move beyond the file leaves the view in place.
-    forRows({{"forward", "pb_forward", 5000},
-             {"a little", "pb_forward_little", 5250},
-             {"back a little", "pb_reverse_little", 5000},
-             {"back", "pb_reverse", 0},
-             {"before the start", "pb_reverse", 0},
-             {"end", "pb_end", 15000},
-             {"beyond the end", "pb_forward", 15000}},
-            [&](const char *button, int first) {
-                click(view, button);
+    QVERIFY(QTest::qWaitForWindowActive(&view));
+    const auto press = [&view](Qt::Key key, Qt::KeyboardModifiers with = {}) {
+        QTest::keyClick(view.focusWidget() != nullptr ? view.focusWidget() : &view, key, with);
+    };
+    // A twentieth of the view is a small step; a move beyond the file goes to its end.
+    forRows({{"forward", Qt::Key_PageDown, 5000},
+             {"a little", Qt::Key_Right, 5250},
+             {"back a little", Qt::Key_Left, 5000},
+             {"back", Qt::Key_PageUp, 0},
+             {"before the start", Qt::Key_PageUp, 0},
+             {"end", Qt::Key_End, 15000},
+             {"beyond the end", Qt::Key_PageDown, 15000},
+             {"start", Qt::Key_Home, 0}},
+            [&](Qt::Key key, int first) {
+                press(key);
                 QCOMPARE(view.window().first(), first);
             });
-    click(view, "pb_zoomin");
+    press(Qt::Key_Right, Qt::AltModifier);
+    press(Qt::Key_Right, Qt::AltModifier);
+    QCOMPARE(textOf(view, "l_csr_sample"), QString("9")); // a column of the trace further
+    press(Qt::Key_A);
+    auto *whole = child<CWidgetOverview>(view, "w_whole");
+    QVERIFY(whole->isVisible() && child<CWidgetIQTrace>(view, "w_iqtrace")->isHidden());
+    QTest::mouseClick(whole, Qt::LeftButton, {}, {whole->width() - 12, whole->height() / 2});
+    QVERIFY(whole->isHidden());
+    QCOMPARE(view.window().first(), 15000);
+    const double zoomY = frameOf(view).trace().scene().zoomY;
+    press(Qt::Key_Plus, Qt::ControlModifier);
+    QVERIFY(frameOf(view).trace().scene().zoomY > zoomY);
+    press(Qt::Key_Minus, Qt::ControlModifier);
+    QCOMPARE(frameOf(view).trace().scene().zoomY, zoomY);
+    press(Qt::Key_Plus);
     QCOMPARE(view.window().points(), 2000);
     QCOMPARE(view.window().first(), 16500); // the middle, 17500, stays
     frameOf(view).set_position(17700);
-    click(view, "pb_play");
+    press(Qt::Key_Space);
     QTRY_COMPARE(view.window().first(), 18000);
     frameOf(view).slot_playstep();
     QCOMPARE(view.window().first(), 18000);
