@@ -11,8 +11,10 @@
 #include <QStandardPaths>
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstring>
+#include <utility>
 
 namespace {
 
@@ -45,6 +47,33 @@ void dropOldest()
     }
 }
 
+/// The least and the greatest square of a magnitude, of at least one sample.
+std::pair<float, float> squareRange(std::span<const float> iq)
+{
+    constexpr std::size_t Lanes = 8; // independent of each other, so that the loop is vectorised
+    const auto square = [iq](std::size_t k) {
+        return iq[2 * k] * iq[2 * k] + iq[2 * k + 1] * iq[2 * k + 1];
+    };
+    std::array<float, Lanes> low{};
+    std::array<float, Lanes> high{};
+    low.fill(square(0));
+    high.fill(square(0));
+    const std::size_t count = iq.size() / 2;
+    std::size_t k = 0;
+    for (; k + Lanes <= count; k += Lanes) {
+        for (std::size_t lane = 0; lane < Lanes; ++lane) {
+            const float value = square(k + lane);
+            low[lane] = value < low[lane] ? value : low[lane];
+            high[lane] = value > high[lane] ? value : high[lane];
+        }
+    }
+    for (; k < count; ++k) {
+        low[0] = std::min(low[0], square(k));
+        high[0] = std::max(high[0], square(k));
+    }
+    return {*std::ranges::min_element(low), *std::ranges::max_element(high)};
+}
+
 } // namespace
 
 Overview::Overview(qint64 samples)
@@ -70,13 +99,7 @@ void Overview::append(std::span<const float> iq, std::span<const quint8> markers
         }
         const auto from = static_cast<std::size_t>(done);
         const auto count = static_cast<std::size_t>(std::min(given - done, endOf(m_bin) - m_taken));
-        float low = iq[2 * from] * iq[2 * from] + iq[2 * from + 1] * iq[2 * from + 1];
-        float high = low;
-        for (std::size_t k = from; k < from + count; ++k) {
-            const float square = iq[2 * k] * iq[2 * k] + iq[2 * k + 1] * iq[2 * k + 1];
-            low = square < low ? square : low;
-            high = square > high ? square : high;
-        }
+        const auto [lowest, highest] = squareRange(iq.subspan(2 * from, 2 * count));
         quint8 marksHigh = 0;
         quint8 marksLow = 0;
         for (std::size_t k = from; k < std::min(from + count, markers.size()); ++k) {
@@ -85,8 +108,8 @@ void Overview::append(std::span<const float> iq, std::span<const quint8> markers
         }
         OverviewBin &bin = m_bins[static_cast<std::size_t>(m_bin)];
         const qint64 start = m_bin == 0 ? 0 : endOf(m_bin - 1);
-        low = std::sqrt(low);
-        high = std::sqrt(high);
+        const float low = std::sqrt(lowest);
+        const float high = std::sqrt(highest);
         bin.low = m_taken == start ? low : std::min(bin.low, low);
         bin.high = m_taken == start ? high : std::max(bin.high, high);
         constexpr quint8 Bits = 15;
