@@ -5,9 +5,9 @@
 #include "datavalues.h"
 
 #include "base/EngineeringNumber.h"
+#include "base/SideWorker.h"
 #include "base/limits.h"
 #include "log/Tracer.h"
-#include "streams/levels.h"
 #include "streams/samplestream.h"
 
 #include <QFile>
@@ -125,6 +125,7 @@ bool DataFileAccess::importDevices(const WvImportJob &job, QIODevice &first, QIO
     m_copyright.clear();
     m_clockHz.reset();
     m_clipped = ClipCount();
+    m_sums = LevelSums();
     if (!data->restartAtBegining()) {
         return Tracer::fail("Temporary file for wave data cannot be opened.");
     }
@@ -148,6 +149,7 @@ bool DataFileAccess::readText(const WvImportJob &job, QIODevice &first, QIODevic
     std::vector<float> iq(floatsOf(StreamBlockSamples));
     const auto take = [&](std::span<float> values) {
         if (!second) {
+            addLevels(values, m_sums);
             return writeSamples(data, values);
         }
         for (size_t i = 0; i < values.size(); ++i) {
@@ -185,6 +187,7 @@ bool DataFileAccess::addSecondText(const ValueFormat &format, QIODevice &second,
             block[2 * i + 1] = values[i];
         }
         merged += count;
+        addLevels(block, m_sums);
         return writeSamples(data, block);
     };
     qint64 count = 0;
@@ -311,8 +314,11 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
     const size_t valuesOfFirst = floatsOf(StreamBlockSamples) / (second ? 2 : 1);
     const auto valueBytes = static_cast<size_t>(size);
     std::vector<std::byte> bytes(valuesOfFirst * valueBytes);
-    std::vector<float> iq(floatsOf(StreamBlockSamples));
+    // While the levels of one block are summed, the next one is fetched.
+    std::array<std::vector<float>, 2> blocks;
+    blocks.fill(std::vector<float>(floatsOf(StreamBlockSamples)));
     std::vector<float> part(valuesOfFirst);
+    SideWorker sums;
     /// Fetches up to `count` values; how many came.
     const auto fetch = [&](QIODevice &device, size_t count, float *target) {
         const qint64 got = device.read(reinterpret_cast<char *>(bytes.data()),
@@ -328,6 +334,7 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
         }
         const auto wanted =
             static_cast<size_t>(std::min<qint64>(most - m_samples, StreamBlockSamples));
+        std::vector<float> &iq = blocks.front();
         size_t samples = 0;
         if (!second) {
             samples = fetch(first, 2 * wanted, iq.data()) / 2;
@@ -344,10 +351,13 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
             }
         }
         const auto block = std::span(iq).first(2 * samples);
-        if (!checkMagnitudes(block, m_samples)) {
+        // Integers can't leave the range by more than a step.
+        if (job.format.dataFormat == DataFormat::Rational && !checkMagnitudes(block, m_samples)) {
             return false;
         }
-        if (samples > 0 && !writeSamples(data, block)) {
+        sums.start([this, block] { addLevels(block, m_sums); });
+        blocks.front().swap(blocks.back());
+        if (samples > 0 && !data.writeBlock(static_cast<int>(block.size_bytes()), block.data())) {
             return Tracer::fail("Cannot write to temporary waveform storage.");
         }
         m_samples += static_cast<qint64>(samples);
@@ -355,6 +365,7 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
             break;
         }
     }
+    sums.wait();
     if (limit <= 0 && m_samples == MaxSamples && !first.atEnd()) {
         return tooManySamples();
     }
@@ -362,37 +373,15 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
     return true;
 }
 
-bool DataFileAccess::measure(BufferedIO &data, LevelSums &sums)
-{
-    if (!data.checkHeader(BufferedIO::DataHeader)) {
-        return Tracer::fail("Resetting the temporary waveform storage failed.");
-    }
-    ProgressClock progress = startProgress();
-    const BlockLoop loop = forEachBlock(
-        data, m_samples, [&](qint64 done) { return progress.shouldStop(done, m_samples); },
-        [&sums](std::span<const float> iq, qint64) {
-            addLevels(iq, sums);
-            return true;
-        });
-    if (loop.end == BlockLoop::Stopped) {
-        return Tracer::fail("Action aborted by user.");
-    }
-    return loop.end == BlockLoop::Done || Tracer::fail("Error reading samples from temporary file");
-}
-
 bool DataFileAccess::finish(const WvImportJob &job, WvWriteJob &result, BufferedIO &data)
 {
-    LevelSums sums;
-    if (!measure(data, sums)) {
-        return false;
-    }
-    const double peak = sums.peakLevel();
-    if (!std::isfinite(peak) || !std::isfinite(sums.sum)) {
+    const double peak = m_sums.peakLevel();
+    if (!std::isfinite(peak) || !std::isfinite(m_sums.sum)) {
         return Tracer::fail("Numbers appear to be too large. Check conversion settings!");
     }
     const bool full = job.scaling == ImportScaling::Auto;
     // Silence stays silence.
-    if (peak > 0 && (full ? peak != 1 : peak > 1) && !scale(job.scaling, peak, data, sums)) {
+    if (peak > 0 && (full ? peak != 1 : peak > 1) && !scale(job.scaling, peak, data)) {
         return false;
     }
     if (!data.restartAtBegining()) {
@@ -401,13 +390,13 @@ bool DataFileAccess::finish(const WvImportJob &job, WvWriteJob &result, Buffered
     result.samples = static_cast<int>(m_samples);
     result.comment = m_comment;
     result.copyright = m_copyright;
-    result.rmsOffset = offsetOf(sums.rmsLevel(m_samples));
-    result.peakOffset = offsetOf(sums.peakLevel());
+    result.rmsOffset = offsetOf(m_sums.rmsLevel(m_samples));
+    result.peakOffset = offsetOf(m_sums.peakLevel());
     result.levelsValid = true;
     return true;
 }
 
-bool DataFileAccess::scale(ImportScaling scaling, double peak, BufferedIO &data, LevelSums &sums)
+bool DataFileAccess::scale(ImportScaling scaling, double peak, BufferedIO &data)
 {
     say("Peak vector is " + QString::number(peak, 'g') + " Scaling to 1.0...");
     if (!data.checkHeader(BufferedIO::DataHeader)) {
@@ -416,7 +405,7 @@ bool DataFileAccess::scale(ImportScaling scaling, double peak, BufferedIO &data,
     if (!data.writeBytes(BufferedIO::HeaderSize, BufferedIO::DataHeader)) {
         return Tracer::fail("Error writing header to temporary waveform storage.");
     }
-    sums = LevelSums();
+    m_sums = LevelSums();
     qint64 clippedSamples = 0;
     qint64 tooLong = 0;
     const auto clip = [&](std::span<float> iq) {
@@ -442,7 +431,7 @@ bool DataFileAccess::scale(ImportScaling scaling, double peak, BufferedIO &data,
                     value = static_cast<float>(value / peak);
                 }
             }
-            addLevels(iq, sums);
+            addLevels(iq, m_sums);
             return writeSamples(data, iq);
         });
     switch (loop.end) {
@@ -463,9 +452,9 @@ bool DataFileAccess::scale(ImportScaling scaling, double peak, BufferedIO &data,
     }
     if (scaling != ImportScaling::None) {
         // Rounding may leave the largest vector a little beside full scale.
-        sums.peak = 1;
+        m_sums.peak = 1;
     }
-    say("New Peak value is " + QString::number(sums.peakLevel(), 'g'));
-    say("New RMS value is " + QString::number(sums.rmsLevel(m_samples), 'g'));
+    say("New Peak value is " + QString::number(m_sums.peakLevel(), 'g'));
+    say("New RMS value is " + QString::number(m_sums.rmsLevel(m_samples), 'g'));
     return true;
 }

@@ -4,6 +4,7 @@
 #include "ReadControl.h"
 #include "importdata.h"
 
+#include "streams/levels.h"
 #include "wvfile/SampleCoding.h"
 #include "wvfile/WvTypes.h"
 
@@ -14,7 +15,6 @@
 
 class BufferedIO;
 class QIODevice;
-struct LevelSums;
 
 /// Reads samples that stand as text or as raw numbers in one or two files, into a sample stream.
 class DataFileAccess : public ReadControl
@@ -52,12 +52,12 @@ private:
     [[nodiscard]] bool readBinary(const WvImportJob &job, QIODevice &first, QIODevice *second,
                                   BufferedIO &data, qint64 limit);
     [[nodiscard]] bool finish(const WvImportJob &job, WvWriteJob &result, BufferedIO &data);
-    [[nodiscard]] bool measure(BufferedIO &data, LevelSums &sums);
-    [[nodiscard]] bool scale(ImportScaling scaling, double peak, BufferedIO &data, LevelSums &sums);
+    [[nodiscard]] bool scale(ImportScaling scaling, double peak, BufferedIO &data);
 
     qint64 m_samples = 0;
     QString m_comment;
     QString m_copyright;
     std::optional<double> m_clockHz;
     ClipCount m_clipped;
+    LevelSums m_sums; ///< of what was written
 };

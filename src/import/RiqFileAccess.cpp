@@ -5,6 +5,7 @@
 
 #include "log/Tracer.h"
 #include "streams/BufferedIO.h"
+#include "streams/samplestream.h"
 
 #include <QtEndian>
 
@@ -247,7 +248,15 @@ bool RiqFileAccess::readSamples(qsizetype index, BufferedIO *stream, qint64 limi
     constexpr size_t MaxSamples = 32767;
     std::vector<char> head(static_cast<size_t>(headSize));
     std::vector<qint16> words(2 * MaxSamples);
-    std::vector<float> values(2 * MaxSamples);
+    // Several UDP blocks make one transfer to the stream.
+    std::vector<float> values(2 * MaxSamples + floatsOf(StreamBlockSamples));
+    size_t held = 0;
+    const auto store = [&] {
+        const auto bytes = static_cast<int>(held * sizeof(float));
+        held = 0;
+        return stream->writeBlock(bytes, values.data()) ||
+               Tracer::fail("Cannot write to temporary file.");
+    };
     qint64 position = entry.position;
     qint64 samples = 0;
     quint32 block = 0;
@@ -280,11 +289,15 @@ bool RiqFileAccess::readSamples(qsizetype index, BufferedIO *stream, qint64 limi
             return Tracer::fail("Cannot read data from .riq file.");
         }
         convertWords(std::span(words).first(2 * static_cast<size_t>(wanted)), entry.littleEndian,
-                     values.data());
-        if (!stream->writeBytes(static_cast<int>(wanted) * BufferedIO::RecordSize, values.data())) {
-            return Tracer::fail("Cannot write to temporary file.");
+                     values.data() + held);
+        held += floatsOf(static_cast<int>(wanted));
+        if (held >= floatsOf(StreamBlockSamples) && !store()) {
+            return false;
         }
         samples += wanted;
+    }
+    if (held > 0 && !store()) {
+        return false;
     }
     Tracer::Trace(Tracer::Information,
                   QString("%1 UDP blocks (%2 samples) processed.").arg(block).arg(samples));
