@@ -3,6 +3,7 @@
 
 #include "InstrumentIdentity.h"
 #include "VisaSession.h"
+#include "remotepaths.h"
 
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
@@ -34,9 +35,9 @@ bool ArbControl::start(const QString &path, int seconds)
     // Old errors would be taken for errors of this start.
     (void)m_session.checkErrorQueue();
     const bool hasCoder = m_identity.hasBasebandCoder();
-    const QString select = hasCoder ? "SOUR:BB:ARB:WAV:SEL '" : "SOUR:WAV:SEL '";
+    const QString select = hasCoder ? "SOUR:BB:ARB:WAV:SEL " : "SOUR:WAV:SEL ";
     const QString switchOn = hasCoder ? "SOUR:BB:ARB:STAT ON; *OPC?" : "SOUR:STAT ON; *OPC?";
-    if (!m_session.send(select + path + "'")) {
+    if (!m_session.send(select + commandString(path))) {
         (void)m_session.checkErrorQueue();
         return false;
     }

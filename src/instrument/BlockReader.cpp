@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "BlockReader.h"
 
+#include "Transcript.h"
+#include "remotepaths.h"
+
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
 #include "log/Tracer.h"
@@ -79,7 +82,7 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
         return Tracer::fail("Cannot open local file for writing.");
     }
     m_control.report(0);
-    if (!m_session.send(":MMEM:DATA? '" + remotePath + "'")) {
+    if (!m_session.send(":MMEM:DATA? " + commandString(remotePath))) {
         return fail(queryFailed);
     }
     // The data may hold any byte.
@@ -89,6 +92,7 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
         return false;
     }
     note(QString("Reading %1 bytes.").arg(*length));
+    Transcript::received(Transcript::blockText(*length));
     QElapsedTimer rateTimer;
     rateTimer.start();
     const bool received = receiveFile(file, *length);
@@ -100,12 +104,8 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
     if (!written) {
         return fail(localWriteFailed);
     }
-    char terminator = 0;
-    quint32 count = 0;
-    const ViStatus status = m_session.read(&terminator, 1, count);
-    if (!VisaSession::isGoodRead(status)) {
-        // All data are there, so this is worth no more than a message.
-        (void)fail("No terminating character received.", status);
+    if (!readTerminator(*length)) {
+        return false;
     }
     const qint64 elapsedMs = rateTimer.elapsed();
     m_control.report(100);
@@ -124,6 +124,39 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
     return true;
 }
 
+bool BlockReader::readHead(const QString &remotePath, qint64 maximum, QByteArray &head)
+{
+    head.clear();
+    if (!m_session.send(":MMEM:DATA? " + commandString(remotePath))) {
+        return fail(queryFailed);
+    }
+    m_session.setAttribute(VI_ATTR_TERMCHAR_EN, VI_FALSE);
+    const std::optional<qint64> length = readFileLength();
+    if (!length) {
+        return false;
+    }
+    const qint64 wanted = std::min(*length, maximum);
+    head.resize(wanted);
+    qint64 received = 0;
+    while (received < wanted) {
+        quint32 count = 0;
+        const auto room = static_cast<quint32>(std::min(wanted - received, FileBlockBytes));
+        const ViStatus status = m_session.read(head.data() + received, room, count);
+        if (!VisaSession::isGoodRead(status) || count == 0) {
+            return fail("Reading binary data block failed.", status);
+        }
+        received += count;
+    }
+    Transcript::received(Transcript::blockText(received));
+    if (*length <= maximum) {
+        return readTerminator(*length);
+    }
+    // The rest stays where it is.
+    const ViStatus status = m_session.clear();
+    (void)m_session.checkErrorQueue();
+    return status == VI_SUCCESS;
+}
+
 std::optional<qint64> BlockReader::readFileLength() const
 {
     std::array<char, MaxDigits> text{};
@@ -131,7 +164,14 @@ std::optional<qint64> BlockReader::readFileLength() const
     ViStatus status = m_session.read(text.data(), 2, count);
     if (!VisaSession::isGoodRead(status)) {
         (void)fail("Reading start character failed.", status);
+        if (!m_session.isSilent()) {
+            // A file that isn't there is told of in the queue alone.
+            (void)m_session.checkErrorQueue();
+        }
         return std::nullopt;
+    }
+    if (count == 2 && text[0] == '#' && text[1] == '(') {
+        return readBracketLength();
     }
     if (count != 2 || text[0] != '#' || !isDigit(text[1])) {
         (void)fail("Invalid or no character received from instrument. Expected character was '#'.",
@@ -148,13 +188,60 @@ std::optional<qint64> BlockReader::readFileLength() const
         (void)fail("Invalid length data received from instrument.");
         return std::nullopt;
     }
-    const bool allDigits = std::all_of(text.begin(), text.begin() + digits, isDigit);
-    const qint64 length = QByteArray(text.data(), digits).toLongLong();
-    if (!allDigits || length == 0) {
+    return lengthIn(QByteArray(text.data(), digits));
+}
+
+std::optional<qint64> BlockReader::lengthIn(const QByteArray &digits) const
+{
+    // Without digits the block would end where the message does, wherever that is.
+    if (digits.isEmpty() || !std::all_of(digits.begin(), digits.end(), isDigit)) {
         (void)fail("Invalid length information received from instrument.");
         return std::nullopt;
     }
-    return length;
+    return digits.toLongLong();
+}
+
+/// The form for what nine digits can't tell, as it is written: "#(1000000000)".
+std::optional<qint64> BlockReader::readBracketLength() const
+{
+    constexpr qsizetype MaxBracketDigits = 12;
+    QByteArray digits;
+    while (digits.size() <= MaxBracketDigits) {
+        char character = 0;
+        quint32 count = 0;
+        const ViStatus status = m_session.read(&character, 1, count);
+        if (!VisaSession::isGoodRead(status) || count != 1) {
+            (void)fail("Reading length information failed.", status);
+            return std::nullopt;
+        }
+        if (character == ')') {
+            return lengthIn(digits);
+        }
+        digits.append(character);
+    }
+    (void)fail(qPrintable(QString("The instrument announces a block of '%1...' bytes, which has "
+                                  "more than %2 digits.")
+                              .arg(QString::fromLatin1(digits))
+                              .arg(MaxBracketDigits)));
+    return std::nullopt;
+}
+
+/// The byte behind the data. False if the block goes on there.
+bool BlockReader::readTerminator(qint64 length) const
+{
+    char terminator = 0;
+    quint32 count = 0;
+    const ViStatus status = m_session.read(&terminator, 1, count);
+    if (!VisaSession::isGoodRead(status)) {
+        // All data are there, so this is worth no more than a message.
+        (void)fail("No terminating character received.", status);
+        return true;
+    }
+    // A stream has no marks between messages, so that there the byte itself must tell.
+    const bool goesOn = m_session.isStream() ? terminator != '\n' : status == VI_SUCCESS_MAX_CNT;
+    return !goesOn || fail(qPrintable(QString("The instrument sends more than the %1 bytes that it "
+                                              "announced.")
+                                          .arg(length)));
 }
 
 bool BlockReader::receiveFile(OutputFile &file, qint64 length)
@@ -315,6 +402,7 @@ std::optional<qint64> BlockReader::readStreamLength() const
         length = 10 * length + digitValue(text[i]);
     }
     note(QString("Instrument sends %1 bytes.").arg(length));
+    Transcript::received(Transcript::blockText(length));
     return length;
 }
 

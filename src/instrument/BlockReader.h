@@ -13,7 +13,8 @@ class BufferedIO;
 class OutputFile;
 
 /// Reads one definite-length block of IEEE 488.2: "#", one digit n, n digits with the byte count,
-/// the data, and one terminating byte. Lives for one transfer of a session.
+/// the data, and one terminating byte; of a file also "#(", the byte count and ")". Lives for one
+/// transfer of a session.
 class BlockReader
 {
 public:
@@ -24,6 +25,9 @@ public:
     [[nodiscard]] bool readFile(const QString &remotePath, const QString &localPath,
                                 OutputFile &file);
 
+    /// Asks for a remote file and reads at most the first `maximum` bytes of it.
+    [[nodiscard]] bool readHead(const QString &remotePath, qint64 maximum, QByteArray &head);
+
     /// Reads a block that was asked for. See VisaDevice::readBinaryBlock.
     [[nodiscard]] bool readStream(BufferedIO &stream, qint64 maximum);
 
@@ -31,6 +35,9 @@ private:
     [[nodiscard]] bool fail(const char *text) const;
     [[nodiscard]] bool fail(const char *text, ViStatus status) const;
     [[nodiscard]] std::optional<qint64> readFileLength() const;
+    [[nodiscard]] std::optional<qint64> readBracketLength() const;
+    [[nodiscard]] std::optional<qint64> lengthIn(const QByteArray &digits) const;
+    [[nodiscard]] bool readTerminator(qint64 length) const;
     [[nodiscard]] bool receiveFile(OutputFile &file, qint64 length);
     [[nodiscard]] bool failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
                                       ViStatus status) const;

@@ -2,6 +2,7 @@
 #include "BlockWriter.h"
 
 #include "InstrumentFiles.h"
+#include "Transcript.h"
 #include "instrumenttext.h"
 #include "remotepaths.h"
 
@@ -18,7 +19,16 @@
 
 namespace {
 
-constexpr qint64 BlockBytes = 1024;
+/// For each block a network asks for a round trip, so the fewer the better; the VISA layer cuts
+/// them to what the other end takes.
+qint64 blockBytesOf(quint16 interfaceKind)
+{
+    constexpr qint64 Network = 64 * 1024;
+    constexpr qint64 Usb = 16 * 1024;
+    constexpr qint64 Other = 1024;
+    return interfaceKind == VI_INTF_TCPIP ? Network : interfaceKind == VI_INTF_USB ? Usb : Other;
+}
+
 /// Largest byte count that fits in the nine digits of the definite form.
 constexpr qint64 MaxDefiniteBytes = 999'999'999;
 /// The instrument's byte count is a signed 32-bit number.
@@ -35,7 +45,6 @@ BlockWriter::BlockWriter(VisaSession &session, InstrumentFiles &files, Operation
     : m_session(session)
     , m_files(files)
     , m_control(control)
-    , m_buffer(BlockBytes, '\0')
 {
 }
 
@@ -44,7 +53,7 @@ QString BlockWriter::header(const QString &remotePath, qint64 size)
     const QString count = QString::number(size);
     const QString head = size <= MaxDefiniteBytes ? QString("#%1%2").arg(count.size()).arg(count)
                                                   : "#(" + count + ')';
-    return ":MMEM:DATA '" + remotePath + "'," + head;
+    return ":MMEM:DATA " + commandString(remotePath) + ',' + head;
 }
 
 bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
@@ -62,19 +71,21 @@ bool BlockWriter::writeFile(const QString &localPath, const QString &remotePath)
     }
     const QString head = header(remotePath, size);
     const std::optional<QByteArray> headBytes = toInstrument(head);
+    // A file that can't be read must not cost the one that it was to replace.
+    QFile file(localPath);
+    if (headBytes && !file.open(QIODevice::ReadOnly)) {
+        return Tracer::fail("Error opening local input file.");
+    }
     if (!headBytes || !removeOldFile(remotePath)) {
         return false;
     }
     m_control.report(0);
-    QFile file(localPath);
-    if (!file.open(QIODevice::ReadOnly)) {
-        return Tracer::fail("Error opening local input file.");
-    }
     if (!prepareSession()) {
         return false;
     }
     note(QString("Sending %1 bytes of binary data...").arg(size));
     note("VISA >> '" + head + "...'");
+    Transcript::sent(":MMEM:DATA " + commandString(remotePath) + ',' + Transcript::blockText(size));
     quint32 count = 0;
     if (const ViStatus status = m_session.write(*headBytes, count); status != VI_SUCCESS) {
         m_session.reportStatus(status);
@@ -113,7 +124,7 @@ bool BlockWriter::removeOldFile(const QString &remotePath)
     }
     return std::all_of(entries.cbegin(), entries.cend(), [&](const RemoteFileEntry &entry) {
         return entry.isDirectory() || entry.name != parts.fileName ||
-               m_session.send(":MMEM:DEL '" + remotePath + "'; *OPC?");
+               m_session.send(":MMEM:DEL " + commandString(remotePath) + "; *OPC?");
     });
 }
 
@@ -124,6 +135,7 @@ bool BlockWriter::prepareSession()
         return false;
     }
     m_interface = *interfaceKind;
+    m_buffer.resize(blockBytesOf(m_interface));
     // The instrument then takes only EOI for the end of a message, so that a line feed among the
     // data can't end it.
     if (m_interface == VI_INTF_GPIB && !m_session.send(":SYST:COMM:GPIB:LTER EOI; *OPC?")) {
@@ -150,8 +162,8 @@ bool BlockWriter::sendFile(QFile &file, qint64 size)
 {
     ProgressClock progress(m_control.report, m_control.cancelled);
     for (qint64 remaining = size; remaining > 0;) {
-        const qint64 wanted = std::min(remaining, BlockBytes);
-        if (remaining <= BlockBytes) {
+        const qint64 wanted = std::min<qint64>(remaining, m_buffer.size());
+        if (remaining <= m_buffer.size()) {
             Tracer::Trace(Tracer::Debug, "VISA >> Sending last data block.");
             if (!setSendEnd(VI_TRUE)) {
                 return false;
@@ -194,7 +206,9 @@ void BlockWriter::recover(VisaSession &session, ViBoolean previousEnd, quint16 i
     session.setAttribute(VI_ATTR_SEND_END_EN, VI_TRUE);
     quint32 count = 0;
     (void)session.write(" ", 1, count);
-    session.clear();
+    if (session.clear() == VI_ERROR_CONN_LOST && !session.isSilent() && !session.reopen()) {
+        return;
+    }
     (void)session.checkErrorQueue();
     (void)session.send("*CLS");
     session.setAttribute(VI_ATTR_SEND_END_EN, previousEnd);

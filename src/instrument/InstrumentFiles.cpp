@@ -5,6 +5,7 @@
 #include "VisaSession.h"
 #include "remotepaths.h"
 
+#include "base/ProgressClock.h"
 #include "log/Tracer.h"
 
 #include <QCoreApplication>
@@ -15,6 +16,8 @@ namespace {
 
 /// No real folder lies deeper; an instrument that lists a folder in itself ends here.
 constexpr int MaxDepth = 64;
+/// One that lists two folders in themselves would have folders without end above that depth.
+constexpr qsizetype MaxEntries = 1'000'000;
 
 bool tooDeep(const QString &directory)
 {
@@ -24,6 +27,11 @@ bool tooDeep(const QString &directory)
                             .arg(MaxDepth));
 }
 
+QString removal(const QString &path)
+{
+    return ":MMEM:RDIR " + commandString(path) + "; *OPC?";
+}
+
 /// A path must name more than a root, and with an empty name a folder would turn into its parent.
 bool isUsable(const QString &path, const QString &name, const char *reason)
 {
@@ -31,6 +39,11 @@ bool isUsable(const QString &path, const QString &name, const char *reason)
         return character != '/' && character != '\\' && character != '\'';
     });
     return (isNamed && path.size() >= 2) || Tracer::fail(reason);
+}
+
+bool broken()
+{
+    return Tracer::fail("*** User break.");
 }
 
 const char *const EmptyDirectory = "Directory path cannot be empty.";
@@ -56,7 +69,8 @@ bool InstrumentFiles::listDirectory(QList<RemoteFileEntry> &entries, const QStri
     // Only what this query is answered counts below.
     const QString earlierErrors = m_session.takeErrors();
     QString answer;
-    const bool answered(m_session.query(":MMEM:CAT? '" + path + "'", answer));
+    const bool answered(
+        m_session.query(":MMEM:CAT? " + commandString(path), answer, VisaSession::Blanks::Kept));
     const QString errors = m_session.takeErrors();
     // An error number that ends so tells of an empty or missing directory.
     const bool isEmpty = !answered && errors.contains("469");
@@ -88,15 +102,24 @@ bool InstrumentFiles::listTree(QStringList &files, qint64 &totalSize, const QStr
 bool InstrumentFiles::listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory)
 {
     entries.clear();
-    return collectTree(entries, directory, QString(), 0);
+    ProgressClock clock(m_control.report, m_control.cancelled);
+    return collectTree(entries, directory, QString(), 0, clock);
 }
 
 bool InstrumentFiles::collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
-                                  const QString &prefix, int depth)
+                                  const QString &prefix, int depth, ProgressClock &clock)
 {
     const QString path = prefix.isEmpty() ? directory : directory + '/' + prefix;
     if (depth > MaxDepth) {
         return tooDeep(path);
+    }
+    if (entries.size() > MaxEntries) {
+        return Tracer::fail(
+            QString("The instrument lists more than %1 files and folders.").arg(MaxEntries));
+    }
+    // How many folders there are shows only at the end.
+    if (clock.shouldStop(-1) || m_control.cancelled) {
+        return broken();
     }
     QList<RemoteFileEntry> level;
     if (!listDirectory(level, path)) {
@@ -107,11 +130,19 @@ bool InstrumentFiles::collectTree(QList<RemoteFileEntry> &entries, const QString
             entry.name.prepend(prefix + '/');
         }
         entries.append(entry);
-        if (entry.isDirectory() && !collectTree(entries, directory, entry.name, depth + 1)) {
+        if (entry.isDirectory() && !collectTree(entries, directory, entry.name, depth + 1, clock)) {
             return false;
         }
     }
     return true;
+}
+
+bool InstrumentFiles::holds(const QList<RemoteFileEntry> &entries, const QString &fileName) const
+{
+    return std::any_of(entries.cbegin(), entries.cend(), [&](const RemoteFileEntry &entry) {
+        return !entry.isDirectory() &&
+               isSameName(entry.name, fileName, m_identity.isUnixFileSystem());
+    });
 }
 
 bool InstrumentFiles::deleteRemoteFile(const QString &path, const std::function<bool()> &agreed)
@@ -124,10 +155,12 @@ bool InstrumentFiles::deleteRemoteFile(const QString &path, const std::function<
     if (!listDirectory(entries, parts.directory + pattern)) {
         return false;
     }
-    const bool exists =
-        std::any_of(entries.cbegin(), entries.cend(),
-                    [&](const RemoteFileEntry &entry) { return entry.name == parts.fileName; });
-    if (!exists) {
+    if (parts.suffix.isEmpty() && !holds(entries, parts.fileName) &&
+        !listDirectory(entries, parts.directory)) {
+        // To some, "*.*" is only what has a point in its name.
+        return false;
+    }
+    if (!holds(entries, parts.fileName)) {
         // What is gone need not be deleted.
         Tracer::Trace(Tracer::Warning, "*** File does not exist on instrument.");
         return true;
@@ -135,7 +168,7 @@ bool InstrumentFiles::deleteRemoteFile(const QString &path, const std::function<
     if (agreed && !agreed()) {
         return true;
     }
-    if (!m_session.send("MMEM:DEL '" + path + "'; *OPC?")) {
+    if (!m_session.send("MMEM:DEL " + commandString(path) + "; *OPC?")) {
         return Tracer::fail("*** Error deleting file on instrument.");
     }
     return bool(m_session.checkErrorQueue());
@@ -148,7 +181,7 @@ bool InstrumentFiles::makeDirectory(const QString &parent, const QString &name)
         return false;
     }
     Tracer::Trace(Tracer::Information, "Creating directory '" + path + "'");
-    return bool(m_session.send(":MMEM:MDIR '" + path + "'; *OPC?"));
+    return bool(m_session.send(":MMEM:MDIR " + commandString(path) + "; *OPC?"));
 }
 
 bool InstrumentFiles::renameEntry(const QString &directory, const QString &oldName,
@@ -161,7 +194,8 @@ bool InstrumentFiles::renameEntry(const QString &directory, const QString &oldNa
         return false;
     }
     Tracer::Trace(Tracer::Information, "Renaming '" + oldPath + "'");
-    return bool(m_session.send(":MMEM:MOVE '" + oldPath + "','" + newPath + "'; *OPC?"));
+    return bool(m_session.send(":MMEM:MOVE " + commandString(oldPath) + ',' +
+                               commandString(newPath) + "; *OPC?"));
 }
 
 bool InstrumentFiles::removeDirectory(const QString &parent, const QString &name)
@@ -171,15 +205,17 @@ bool InstrumentFiles::removeDirectory(const QString &parent, const QString &name
         return false;
     }
     Tracer::Trace(Tracer::Information, "Removing directory '" + path + "'");
-    return bool(m_session.send(":MMEM:RDIR '" + path + "'; *OPC?"));
+    return bool(m_session.send(removal(path)));
 }
 
 bool InstrumentFiles::removeEmptyTree(const QString &parent, const QString &name)
 {
-    return removeFolders(parent, name, 0);
+    ProgressClock clock(m_control.report, m_control.cancelled);
+    return removeFolders(parent, name, 0, clock);
 }
 
-bool InstrumentFiles::removeFolders(const QString &parent, const QString &name, int depth)
+bool InstrumentFiles::removeFolders(const QString &parent, const QString &name, int depth,
+                                    ProgressClock &clock)
 {
     const QString path = joined(parent, name);
     if (!isUsable(path, name, EmptyDirectory)) {
@@ -187,6 +223,9 @@ bool InstrumentFiles::removeFolders(const QString &parent, const QString &name, 
     }
     if (depth > MaxDepth) {
         return tooDeep(path);
+    }
+    if (clock.shouldStop(-1) || m_control.cancelled) {
+        return broken();
     }
     QList<RemoteFileEntry> entries;
     if (!listDirectory(entries, path)) {
@@ -197,16 +236,16 @@ bool InstrumentFiles::removeFolders(const QString &parent, const QString &name, 
             continue;
         }
         Tracer::Trace(Tracer::Information, "Descending into '" + joined(path, entry.name) + "'");
-        if (!removeFolders(path, entry.name, depth + 1)) {
+        if (!removeFolders(path, entry.name, depth + 1, clock)) {
             return false;
         }
     }
-    return bool(m_session.send(":MMEM:RDIR '" + path + "'; *OPC?"));
+    // What is refused here, such as a folder with a hidden file, is told by the queue alone.
+    return m_session.send(removal(path)) && m_session.checkErrorQueue();
 }
 
 bool InstrumentFiles::removeTree(const QString &parent, const QString &name)
 {
-    const CancelScope cancelScope(m_control.cancelled);
     const QString path = joined(parent, name);
     Tracer::Trace(Tracer::Information, "Removing tree '" + path + "'");
     QCoreApplication::processEvents();
@@ -222,14 +261,14 @@ bool InstrumentFiles::removeTree(const QString &parent, const QString &name)
         return false;
     }
     for (qsizetype i = 0; i < files.size(); ++i) {
-        if (!m_session.send(":MMEM:DEL '" + files.at(i) + "'; *OPC?") ||
+        if (!m_session.send(":MMEM:DEL " + commandString(files.at(i)) + "; *OPC?") ||
             !m_session.checkErrorQueue()) {
             return false;
         }
         m_control.report(static_cast<int>(100 * (i + 1) / files.size()));
         QCoreApplication::processEvents();
         if (m_control.cancelled) {
-            return Tracer::fail("*** User break.");
+            return broken();
         }
     }
     return removeEmptyTree(parent, name);

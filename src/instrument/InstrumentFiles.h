@@ -10,6 +10,7 @@
 
 #include <functional>
 
+class ProgressClock;
 struct InstrumentIdentity;
 class VisaSession;
 
@@ -22,6 +23,8 @@ public:
                     OperationControl &control);
 
     [[nodiscard]] bool listDirectory(QList<RemoteFileEntry> &entries, const QString &path);
+    /// Whether a list has a file of that name, as the instrument compares names.
+    [[nodiscard]] bool holds(const QList<RemoteFileEntry> &entries, const QString &fileName) const;
     [[nodiscard]] bool listTree(QStringList &files, qint64 &totalSize, const QString &directory);
     [[nodiscard]] bool listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory);
 
@@ -37,8 +40,9 @@ public:
 
 private:
     [[nodiscard]] bool collectTree(QList<RemoteFileEntry> &entries, const QString &directory,
-                                   const QString &prefix, int depth);
-    [[nodiscard]] bool removeFolders(const QString &parent, const QString &name, int depth);
+                                   const QString &prefix, int depth, ProgressClock &clock);
+    [[nodiscard]] bool removeFolders(const QString &parent, const QString &name, int depth,
+                                     ProgressClock &clock);
     [[nodiscard]] QString joined(const QString &parent, const QString &name) const;
 
     VisaSession &m_session;

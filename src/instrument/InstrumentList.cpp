@@ -3,6 +3,8 @@
 
 #include "InstrumentSummary.h"
 
+#include "remotepaths.h"
+
 #include "log/Tracer.h"
 
 #include <QSettings>
@@ -27,7 +29,7 @@ QString text(const QSettings &settings, const char *name, qsizetype index)
 bool isSameInstrument(const InstrConfigEntry &one, const InstrConfigEntry &other)
 {
     return one.model == other.model && one.serial == other.serial &&
-           one.interface == other.interface;
+           plainResource(one.interface) == plainResource(other.interface);
 }
 
 } // namespace
@@ -36,7 +38,7 @@ qsizetype InstrumentList::indexOf(const QString &resource) const
 {
     const auto found =
         std::find_if(m_entries.begin(), m_entries.end(), [&](const InstrConfigEntry &entry) {
-            return entry.resource.compare(resource, Qt::CaseInsensitive) == 0;
+            return plainResource(entry.resource) == plainResource(resource);
         });
     return found == m_entries.end() ? -1 : found - m_entries.begin();
 }

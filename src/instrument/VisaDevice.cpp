@@ -4,11 +4,13 @@
 #include "ArbControl.h"
 #include "BlockReader.h"
 #include "BlockWriter.h"
+#include "GeneratorControl.h"
 #include "InstrumentFiles.h"
 #include "InstrumentIdentity.h"
 #include "OperationControl.h"
 #include "VisaSession.h"
 #include "instrumentscan.h"
+#include "remotepaths.h"
 
 #include "log/Tracer.h"
 
@@ -82,7 +84,8 @@ bool VisaDevice::openResource(const QString &resource)
     if (!session.isOpen()) {
         identity = {};
     }
-    const Exchange opened = session.open(resource);
+    m_parts->control.cancelled = false;
+    const Exchange opened = session.open(resource, m_parts->control);
     if (!opened) {
         // What is open from before stays; what could not be configured does not.
         if (opened.outcome == Exchange::Outcome::Failed) {
@@ -156,6 +159,21 @@ bool VisaDevice::interfaceType(quint16 &type) const
 void VisaDevice::reportStatus(qint32 status) const
 {
     m_parts->session.reportStatus(status);
+}
+
+void VisaDevice::setTakesInput(bool takesInput)
+{
+    m_parts->control.takesInput = takesInput;
+}
+
+bool VisaDevice::isResourceOpenElsewhere(const QString &resource) const
+{
+    const QString wanted = plainResource(resource);
+    const QMutexLocker locker(&library().mutex);
+    return std::any_of(
+        library().devices.cbegin(), library().devices.cend(), [&](const VisaDevice *other) {
+            return other != this && other->isOpen() && plainResource(other->resource()) == wanted;
+        });
 }
 
 bool VisaDevice::isOpenElsewhere(const QString &model, const QString &serial) const
@@ -261,12 +279,14 @@ bool VisaDevice::basebandCapabilities(int index, int &size, int &clock, int &ban
 
 bool VisaDevice::scanResources(QList<VisaDevice *> &found, int kind)
 {
+    m_parts->control.cancelled = false;
     return scanInstruments(found, kind, m_parts->session, m_parts->control);
 }
 
 // Transfers
 
-bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localPath)
+bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localPath,
+                                OutputFile::Existing existing)
 {
     m_parts->control.cancelled = false;
     if (!areNamed(localPath, remotePath) ||
@@ -274,8 +294,15 @@ bool VisaDevice::readRemoteFile(const QString &remotePath, const QString &localP
                             &VisaFunctions::viRead) == nullptr) {
         return false;
     }
-    OutputFile file(localPath);
+    OutputFile file(localPath, existing);
     return BlockReader(m_parts->session, m_parts->control).readFile(remotePath, localPath, file);
+}
+
+bool VisaDevice::readRemoteHead(const QString &remotePath, qint64 maximum, QByteArray &head)
+{
+    return library().functions(&VisaFunctions::viClear, &VisaFunctions::viSetAttribute,
+                               &VisaFunctions::viRead) != nullptr &&
+           BlockReader(m_parts->session, m_parts->control).readHead(remotePath, maximum, head);
 }
 
 bool VisaDevice::writeRemoteFile(const QString &localPath, const QString &remotePath)
@@ -321,11 +348,13 @@ bool VisaDevice::listDirectory(QList<RemoteFileEntry> &entries, const QString &p
 
 bool VisaDevice::listTree(QStringList &files, qint64 &totalSize, const QString &directory)
 {
+    m_parts->control.cancelled = false;
     return m_parts->files.listTree(files, totalSize, directory);
 }
 
 bool VisaDevice::listTreeEntries(QList<RemoteFileEntry> &entries, const QString &directory)
 {
+    m_parts->control.cancelled = false;
     return m_parts->files.listTreeEntries(entries, directory);
 }
 
@@ -362,11 +391,13 @@ bool VisaDevice::removeDirectory(const QString &parent, const QString &name)
 
 bool VisaDevice::removeEmptyTree(const QString &parent, const QString &name)
 {
+    m_parts->control.cancelled = false;
     return m_parts->files.removeEmptyTree(parent, name);
 }
 
 bool VisaDevice::removeTree(const QString &parent, const QString &name)
 {
+    m_parts->control.cancelled = false;
     return m_parts->files.removeTree(parent, name);
 }
 
@@ -374,14 +405,31 @@ bool VisaDevice::removeTree(const QString &parent, const QString &name)
 
 bool VisaDevice::startArb(const QString &path, int seconds)
 {
+    m_parts->control.cancelled = false;
     return ArbControl(m_parts->session, m_parts->identity, m_parts->control, m_parts->arbIntervals)
         .start(path, seconds);
 }
 
 bool VisaDevice::waitForArbReady(int seconds)
 {
+    m_parts->control.cancelled = false;
     return ArbControl(m_parts->session, m_parts->identity, m_parts->control, m_parts->arbIntervals)
         .waitUntilReady(seconds);
+}
+
+bool VisaDevice::stopArb()
+{
+    return GeneratorControl(m_parts->session, m_parts->identity).stop();
+}
+
+bool VisaDevice::readState(GeneratorState &state)
+{
+    return GeneratorControl(m_parts->session, m_parts->identity).read(state);
+}
+
+bool VisaDevice::changeState(const GeneratorChange &change)
+{
+    return GeneratorControl(m_parts->session, m_parts->identity).change(change);
 }
 
 void VisaDevice::setArbIntervals(const ArbIntervals &intervals)

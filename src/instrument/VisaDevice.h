@@ -15,6 +15,8 @@
 
 class BufferedIO;
 struct ArbIntervals;
+struct GeneratorChange;
+struct GeneratorState;
 struct InstrumentIdentity;
 
 /// One instrument: the one face of its VISA session, its identity, its files, the block transfers
@@ -48,8 +50,8 @@ public:
 
     // Session
 
-    /// Opens, configures and identifies. On failure nothing stays open; an open device is left
-    /// alone.
+    /// Opens, configures and identifies. cancel() ends the wait for a host. On failure nothing
+    /// stays open; an open device is left alone.
     [[nodiscard]] bool openResource(const QString &resource);
     /// Also true when nothing is open. The identity stays.
     bool closeResource();
@@ -70,8 +72,14 @@ public:
     [[nodiscard]] bool interfaceType(quint16 &type) const;
     /// Logs the library's words for a status.
     void reportStatus(qint32 status) const;
+    /// Whether the user's input is let through while an instrument is being opened. For a caller
+    /// that has made sure that nothing but a cancel can come of it, as by a modal dialog.
+    void setTakesInput(bool takesInput);
     /// Whether another device has a session with this instrument.
     [[nodiscard]] bool isOpenElsewhere(const QString &model, const QString &serial) const;
+
+    /// The same by the resource, before the instrument has told who it is.
+    [[nodiscard]] bool isResourceOpenElsewhere(const QString &resource) const;
 
     // Identity and capabilities; they stay after closing
 
@@ -103,7 +111,12 @@ public:
 
     /// Instrument to local file. After a failure a file that was there is as it was before, and
     /// none is new.
-    [[nodiscard]] bool readRemoteFile(const QString &remotePath, const QString &localPath);
+    /// A file that stands under the local name may also be one that is to be kept.
+    [[nodiscard]] bool
+    readRemoteFile(const QString &remotePath, const QString &localPath,
+                   OutputFile::Existing existing = OutputFile::Existing::Replaced);
+    /// The first bytes of a remote file, at most `maximum`.
+    [[nodiscard]] bool readRemoteHead(const QString &remotePath, qint64 maximum, QByteArray &head);
     /// Local file to instrument; replaces a file there. After a failure there is none.
     [[nodiscard]] bool writeRemoteFile(const QString &localPath, const QString &remotePath);
     /// Reads the block that a command sent before has asked for, of at most `maximum` bytes; the
@@ -140,14 +153,20 @@ public:
 
     /// Selects a waveform file, waits until it is loaded, and switches the ARB on.
     [[nodiscard]] bool startArb(const QString &path, int seconds = DefaultArbSeconds);
-    /// Polls the instrument once a second. A cancel() from before the call ends it at once.
+    /// Polls the instrument once a second.
     [[nodiscard]] bool waitForArbReady(int seconds);
     static constexpr int DefaultArbSeconds = 100;
+    /// Switches the ARB off. The RF output stays as it is.
+    [[nodiscard]] bool stopArb();
+    /// What the generator plays and how its RF side is set. False if it can't be asked.
+    [[nodiscard]] bool readState(GeneratorState &state);
+    /// Sets what the change names, the output last.
+    [[nodiscard]] bool changeState(const GeneratorChange &change);
     /// Other times than those of real instruments.
     void setArbIntervals(const ArbIntervals &intervals);
 
 public slots:
-    /// Ends the running operation at its next tick.
+    /// Ends the running operation at its next tick; one that starts later knows nothing of it.
     void cancel();
 
 signals:

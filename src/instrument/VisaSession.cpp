@@ -1,11 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "VisaSession.h"
 
+#include "OperationControl.h"
+#include "Transcript.h"
 #include "instrumenttext.h"
 #include "reachability.h"
 
 #include "log/Tracer.h"
 
+#include <QElapsedTimer>
 #include <QMutexLocker>
 
 #include <array>
@@ -19,7 +22,12 @@ constexpr quint32 WriteBufferBytes = 2048;
 constexpr quint32 ReadBufferBytes = 4096;
 constexpr quint32 ShortAnswerBytes = 1023;
 constexpr quint32 LongAnswerBytes = 32767;
+constexpr qsizetype MaxAnswerBytes = 64 * 1024 * 1024;
 constexpr int MaxErrorsPerCheck = 20;
+constexpr qint64 MaxErrorsMs = 10'000;
+/// What an instrument that has just let time run out gets to show that it is still there.
+constexpr quint32 ClearMs = 400;
+constexpr quint32 QueueMs = 500;
 constexpr int MaxLoggedAnswer = 200;
 
 VisaLibrary &library()
@@ -40,6 +48,33 @@ void note(const QString &text)
 
 } // namespace
 
+/// While it lives, an instrument that is late gets no more than a short time, so that one that has
+/// gone silent costs one time-out and not one for each step of the clean-up.
+class VisaSession::Patience
+{
+public:
+    Patience(const VisaSession &session, quint32 milliseconds, bool isShort)
+        : m_session(session)
+        , m_isShort(isShort && milliseconds < session.m_timeoutMs)
+    {
+        if (m_isShort) {
+            m_session.setAttribute(VI_ATTR_TMO_VALUE, milliseconds);
+        }
+    }
+    ~Patience()
+    {
+        if (m_isShort) {
+            m_session.setAttribute(VI_ATTR_TMO_VALUE, m_session.m_timeoutMs);
+        }
+    }
+    Patience(const Patience &) = delete;
+    Patience &operator=(const Patience &) = delete;
+
+private:
+    const VisaSession &m_session;
+    bool m_isShort;
+};
+
 bool VisaSession::failNotOpen()
 {
     return Tracer::fail("Device is not open.");
@@ -51,7 +86,64 @@ Exchange VisaSession::failWith(ViStatus status) const
     return {Outcome::Failed, status};
 }
 
-Exchange VisaSession::open(const QString &resource)
+Exchange VisaSession::failRead(ViStatus status)
+{
+    const Exchange result = failWith(status);
+    clear();
+    return result;
+}
+
+ViStatus VisaSession::noted(ViStatus status)
+{
+    m_isLate = m_isLate || status == VI_ERROR_TMO;
+    return status;
+}
+
+void VisaSession::fallSilent()
+{
+    m_isSilent = true;
+    Tracer::Trace(Tracer::Error,
+                  "The instrument has fallen silent. Open it again once it answers.");
+}
+
+ViStatus VisaSession::read(char *buffer, quint32 size, quint32 &count)
+{
+    count = 0;
+    if (m_isSilent) {
+        return VI_ERROR_CONN_LOST;
+    }
+    ViUInt32 received = 0;
+    const ViStatus status =
+        visa().viRead(m_handle, reinterpret_cast<ViByte *>(buffer), size, &received);
+    count = std::min<quint32>(received, size);
+    m_isLate = m_isLate && status < VI_SUCCESS;
+    return noted(status);
+}
+
+ViStatus VisaSession::write(const char *bytes, quint32 size, quint32 &count)
+{
+    count = 0;
+    if (m_isSilent) {
+        return VI_ERROR_CONN_LOST;
+    }
+    const Patience patience(*this, ClearMs, m_isLate);
+    return noted(visa().viWrite(m_handle, reinterpret_cast<const ViByte *>(bytes), size, &count));
+}
+
+ViStatus VisaSession::clear()
+{
+    if (m_isSilent) {
+        return VI_ERROR_CONN_LOST;
+    }
+    const Patience patience(*this, ClearMs, m_isLate);
+    const ViStatus status = visa().viClear(m_handle);
+    if (m_isLate && status < VI_SUCCESS) {
+        fallSilent();
+    }
+    return status;
+}
+
+Exchange VisaSession::open(const QString &resource, const OperationControl &control)
 {
     if (m_isOpen) {
         (void)Tracer::fail("Device is already open.");
@@ -64,16 +156,13 @@ Exchange VisaSession::open(const QString &resource)
     }
     m_errors.clear();
     const std::optional<QByteArray> name = toInstrument(resource);
-    if (!name || (resource.contains("TCPIP", Qt::CaseInsensitive) && !isHostReachable(resource))) {
+    if (!name ||
+        (resource.contains("TCPIP", Qt::CaseInsensitive) && !isHostReachable(resource, control))) {
         return {Outcome::Unsendable};
     }
-    ViStatus status = VI_ERROR_INV_OBJECT;
-    {
-        const QMutexLocker locker(&library().mutex);
-        if (library().manager != VI_NULL) {
-            status = visa().viOpen(library().manager, name->constData(), VI_NO_LOCK, 0, &m_handle);
-        }
-    }
+    m_name = *name;
+    m_isStream = resource.endsWith("::SOCKET", Qt::CaseInsensitive);
+    ViStatus status = openHandle();
     if (status != VI_SUCCESS) {
         Tracer::Trace(Tracer::Error, "viOpen(): Cannot open instrument connection.");
         reportStatus(status);
@@ -81,14 +170,44 @@ Exchange VisaSession::open(const QString &resource)
         m_handle = VI_NULL;
         return {Outcome::Failed, status};
     }
-    m_isOpen = true;
     note("Device opened. Configuring interface...");
     status = configure();
     return status == VI_SUCCESS ? Exchange{} : failWith(status);
 }
 
-ViStatus VisaSession::configure() const
+ViStatus VisaSession::openHandle()
 {
+    ViStatus status = VI_ERROR_INV_OBJECT;
+    const QMutexLocker locker(&library().mutex);
+    if (library().manager != VI_NULL) {
+        status = visa().viOpen(library().manager, m_name.constData(), VI_NO_LOCK, 0, &m_handle);
+    }
+    m_isOpen = status == VI_SUCCESS;
+    m_isLate = false;
+    m_isSilent = false;
+    return status;
+}
+
+Exchange VisaSession::reopen()
+{
+    visa().viClose(m_handle);
+    ViStatus status = openHandle();
+    if (!m_isOpen) {
+        m_handle = VI_NULL;
+        return failWith(status);
+    }
+    const quint32 timeoutMs = m_timeoutMs;
+    status = configure();
+    if (status != VI_SUCCESS) {
+        return failWith(status);
+    }
+    note("The connection to the instrument was lost and has been made anew.");
+    return setTimeoutMs(timeoutMs);
+}
+
+ViStatus VisaSession::configure()
+{
+    m_timeoutMs = InitialTimeoutMs;
     ViStatus status = clear();
     if (status == VI_SUCCESS) {
         status = setAttribute(VI_ATTR_TMO_VALUE, InitialTimeoutMs);
@@ -117,8 +236,14 @@ Exchange VisaSession::close()
                             &VisaFunctions::viClose) == nullptr) {
         return {Outcome::NoLibrary};
     }
-    visa().viGpibControlREN(m_handle, VI_GPIB_REN_DEASSERT_GTL);
-    clear();
+    if (!m_isSilent) {
+        const Patience patience(*this, ClearMs, true);
+        const ViStatus status = visa().viGpibControlREN(m_handle, VI_GPIB_REN_DEASSERT_GTL);
+        // Of a stream a clear makes a new connection, which would only be closed.
+        if (status != VI_ERROR_TMO && !m_isStream) {
+            visa().viClear(m_handle);
+        }
+    }
     visa().viClose(m_handle);
     m_handle = VI_NULL;
     m_isOpen = false;
@@ -138,6 +263,7 @@ Exchange VisaSession::send(const QString &command)
     if (!bytes) {
         return {Outcome::Unsendable};
     }
+    Transcript::sent(command);
     quint32 count = 0;
     if (!bytes->isEmpty()) {
         const ViStatus status = write(*bytes, count);
@@ -151,10 +277,14 @@ Exchange VisaSession::send(const QString &command)
     std::array<char, ShortAnswerBytes> buffer{};
     const ViStatus status = read(buffer.data(), ShortAnswerBytes, count);
     if (status < VI_SUCCESS) {
-        return failWith(status);
+        return failRead(status);
     }
     const QString answer = fromInstrument(buffer.data(), count);
+    Transcript::received(answer);
     const bool isDone = answer.toInt() == 1;
+    if (!isDone && status == VI_SUCCESS_MAX_CNT) {
+        clear();
+    }
     if (!isDone) {
         Tracer::Trace(Tracer::Error, "ERROR : R Unexpected Result from *OPC?");
     }
@@ -162,7 +292,28 @@ Exchange VisaSession::send(const QString &command)
     return {isDone ? Outcome::Done : Outcome::Refused};
 }
 
-Exchange VisaSession::query(const QString &command, QString &answer)
+ViStatus VisaSession::readAll(QByteArray &bytes)
+{
+    // An instrument answers a list of its files as one message, however long.
+    for (quint32 room = LongAnswerBytes;; room = 2 * LongAnswerBytes) {
+        const qsizetype size = bytes.size();
+        bytes.resize(size + room);
+        quint32 count = 0;
+        const ViStatus status = read(bytes.data() + size, room, count);
+        bytes.truncate(size + count);
+        if (status != VI_SUCCESS_MAX_CNT) {
+            return status;
+        }
+        if (bytes.size() > MaxAnswerBytes) {
+            Tracer::Trace(Tracer::Error,
+                          QString("The answer of the instrument is longer than %1 bytes.")
+                              .arg(MaxAnswerBytes));
+            return VI_ERROR_ALLOC;
+        }
+    }
+}
+
+Exchange VisaSession::query(const QString &command, QString &answer, Blanks blanks)
 {
     answer.clear();
     if (!m_isOpen) {
@@ -178,21 +329,79 @@ Exchange VisaSession::query(const QString &command, QString &answer)
     quint32 count = 0;
     if (!bytes->isEmpty()) {
         note("VISA >> '" + command + "'");
+        Transcript::sent(command);
         // Not by viPrintf, which would take a "%" or a backslash in a path for its own.
         const ViStatus status = write(*bytes, count);
         if (status < VI_SUCCESS) {
             return failWith(status);
         }
     }
-    QByteArray buffer(LongAnswerBytes, '\0');
-    const ViStatus status = read(buffer.data(), LongAnswerBytes, count);
+    QByteArray buffer;
+    const ViStatus status = readAll(buffer);
     if (status < VI_SUCCESS) {
-        return failWith(status);
+        return failRead(status);
     }
-    answer = fromInstrument(buffer.constData(), count);
+    answer = blanks == Blanks::Kept ? wholeTextOf(buffer) : fromInstrument(buffer);
+    Transcript::received(answer);
     note("VISA << '" +
          (answer.size() <= MaxLoggedAnswer ? answer : answer.left(MaxLoggedAnswer) + "..."));
     return checkErrorQueue();
+}
+
+std::optional<QString> VisaSession::ask(const QString &query, quint32 milliseconds)
+{
+    const std::optional<QByteArray> bytes = toInstrument(query);
+    if (!m_isOpen || !bytes) {
+        return std::nullopt;
+    }
+    const Patience patience(*this, milliseconds, true);
+    Transcript::sent(query);
+    quint32 count = 0;
+    std::array<char, ShortAnswerBytes> buffer{};
+    ViStatus status = write(*bytes, count);
+    if (status == VI_SUCCESS) {
+        status = read(buffer.data(), ShortAnswerBytes, count);
+    }
+    if (status >= VI_SUCCESS && status != VI_SUCCESS_MAX_CNT) {
+        const QString answer = fromInstrument(buffer.data(), count);
+        Transcript::received(answer);
+        return answer;
+    }
+    clear();
+    // What it said about a query that it doesn't know is no error of anybody's.
+    const QString errors = m_errors;
+    (void)checkErrorQueue();
+    m_errors = errors;
+    return std::nullopt;
+}
+
+ViStatus VisaSession::readError(QString &answer)
+{
+    const Patience patience(*this, QueueMs, m_isLate && !m_isSilent);
+    ViStatus status =
+        m_isSilent ? VI_ERROR_CONN_LOST : noted(visa().viPrintf(m_handle, ":SYST:ERR?"));
+    if (status != VI_SUCCESS) {
+        Tracer::Trace(Tracer::Error, ":SYST:ERR? Command failed.");
+        return status;
+    }
+    const bool wasLate = m_isLate;
+    std::array<char, ShortAnswerBytes + 1> buffer{};
+    quint32 count = 0;
+    status = read(buffer.data(), ShortAnswerBytes, count);
+    // A remark such as "buffer full" counts as well: it would leave the rest of this answer to the
+    // next query.
+    if (status != VI_SUCCESS) {
+        Tracer::Trace(Tracer::Error, "No response from :SYST:ERR?");
+        if (wasLate && status == VI_ERROR_TMO) {
+            fallSilent();
+        }
+        clear();
+    }
+    answer = fromInstrument(buffer.data(), count);
+    if (status == VI_SUCCESS) {
+        Transcript::received(answer);
+    }
+    return status;
 }
 
 Exchange VisaSession::checkErrorQueue()
@@ -204,22 +413,14 @@ Exchange VisaSession::checkErrorQueue()
         return {Outcome::NoLibrary};
     }
     Exchange result;
-    for (int i = 0; i < MaxErrorsPerCheck; ++i) {
-        ViStatus status = visa().viPrintf(m_handle, ":SYST:ERR?");
+    QElapsedTimer time;
+    time.start();
+    for (int i = 0; i < MaxErrorsPerCheck && !time.hasExpired(MaxErrorsMs); ++i) {
+        QString answer;
+        const ViStatus status = readError(answer);
         if (status != VI_SUCCESS) {
-            Tracer::Trace(Tracer::Error, ":SYST:ERR? Command failed.");
             return failWith(status);
         }
-        std::array<char, ShortAnswerBytes + 1> buffer{};
-        quint32 count = 0;
-        status = read(buffer.data(), ShortAnswerBytes, count);
-        // A remark such as "buffer full" counts as well: it would leave the rest of this answer to
-        // the next query.
-        if (status != VI_SUCCESS) {
-            Tracer::Trace(Tracer::Error, "No response from :SYST:ERR?");
-            return failWith(status);
-        }
-        const QString answer = fromInstrument(buffer.data(), count);
         bool isNumber = false;
         const int number = answer.section(',', 0, 0).toInt(&isNumber);
         if (!isNumber || number == 0) {
@@ -241,6 +442,9 @@ Exchange VisaSession::setTimeoutMs(quint32 milliseconds)
         return notOpen();
     }
     const ViStatus status = setAttribute(VI_ATTR_TMO_VALUE, milliseconds);
+    if (status == VI_SUCCESS) {
+        m_timeoutMs = milliseconds;
+    }
     return {status == VI_SUCCESS ? Outcome::Done : Outcome::Failed, status};
 }
 

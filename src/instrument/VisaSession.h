@@ -10,6 +10,8 @@
 #include <optional>
 #include <utility>
 
+struct OperationControl;
+
 /// How an exchange with an instrument ended. The reason of a failure is in the log as well.
 struct [[nodiscard]] Exchange
 {
@@ -34,16 +36,30 @@ struct [[nodiscard]] Exchange
 class VisaSession
 {
 public:
-    /// Opens and configures; a session that is open is left alone.
-    Exchange open(const QString &resource);
-    /// Also done when nothing is open.
+    /// Opens and configures; a session that is open is left alone. A cancel by `control` ends the
+    /// wait for a host.
+    Exchange open(const QString &resource, const OperationControl &control);
+    /// Also done when nothing is open. A silent instrument holds it up for less than a second.
     Exchange close();
     [[nodiscard]] bool isOpen() const { return m_isOpen; }
 
+    /// Makes a lost connection anew, with nothing said to the instrument. On a failure the session
+    /// is closed.
+    Exchange reopen();
+
+    /// Whether the instrument let time run out and took no notice of being cleared either. Every
+    /// call fails at once then, until the session is opened anew.
+    [[nodiscard]] bool isSilent() const { return m_isSilent; }
+
     /// See VisaDevice::sendCommand.
     Exchange send(const QString &command);
-    /// See VisaDevice::queryText.
-    Exchange query(const QString &command, QString &answer);
+    /// What becomes of the white space in an answer.
+    enum class Blanks { Collapsed, Kept };
+
+    /// See VisaDevice::queryText. Of an answer above 64 MiB nothing is delivered.
+    Exchange query(const QString &command, QString &answer, Blanks blanks = Blanks::Collapsed);
+    /// The answer to a query that the instrument may not know; nothing if none comes in time.
+    [[nodiscard]] std::optional<QString> ask(const QString &query, quint32 milliseconds);
     /// See VisaDevice::checkErrorQueue.
     Exchange checkErrorQueue();
     [[nodiscard]] QString takeErrors() { return std::exchange(m_errors, {}); }
@@ -65,27 +81,22 @@ public:
     // The calls of the library. The caller has made sure that it has the functions for them.
 
     /// Reads up to `size` bytes; never believes in more than that.
-    [[nodiscard]] ViStatus read(char *buffer, quint32 size, quint32 &count) const
-    {
-        ViUInt32 received = 0;
-        const ViStatus status =
-            visa().viRead(m_handle, reinterpret_cast<ViByte *>(buffer), size, &received);
-        count = std::min<quint32>(received, size);
-        return status;
-    }
+    [[nodiscard]] ViStatus read(char *buffer, quint32 size, quint32 &count);
 
-    [[nodiscard]] ViStatus write(const QByteArray &bytes, quint32 &count) const
+    [[nodiscard]] ViStatus write(const QByteArray &bytes, quint32 &count)
     {
         return write(bytes.constData(), static_cast<quint32>(bytes.size()), count);
     }
 
-    [[nodiscard]] ViStatus write(const char *bytes, quint32 size, quint32 &count) const
-    {
-        count = 0;
-        return visa().viWrite(m_handle, reinterpret_cast<const ViByte *>(bytes), size, &count);
-    }
+    [[nodiscard]] ViStatus write(const char *bytes, quint32 size, quint32 &count);
 
-    ViStatus clear() const { return visa().viClear(m_handle); }
+    /// Drops what is on its way in both directions, so that no late answer is taken for that of
+    /// another command.
+    ViStatus clear();
+
+    /// Whether a byte stream without marks of its own carries the session, so that only the bytes
+    /// tell where an answer ends.
+    [[nodiscard]] bool isStream() const { return m_isStream; }
 
     ViStatus setAttribute(ViAttr attribute, ViAttrState value) const
     {
@@ -108,11 +119,25 @@ public:
     }
 
 private:
+    class Patience;
+
     [[nodiscard]] static const VisaFunctions &visa() { return VisaLibrary::instance().all(); }
-    [[nodiscard]] ViStatus configure() const;
+    [[nodiscard]] ViStatus openHandle();
+    [[nodiscard]] ViStatus configure();
+    [[nodiscard]] ViStatus readAll(QByteArray &bytes);
+    [[nodiscard]] ViStatus readError(QString &answer);
+    [[nodiscard]] ViStatus noted(ViStatus status);
+    void fallSilent();
     Exchange failWith(ViStatus status) const;
+    /// For a read that left the session between two messages.
+    Exchange failRead(ViStatus status);
 
     ViSession m_handle = VI_NULL; ///< 0 when closed
+    QByteArray m_name;            ///< of the resource
+    quint32 m_timeoutMs = 0;
     bool m_isOpen = false;
+    bool m_isStream = false;
+    bool m_isLate = false; ///< the last call ran out of time and nothing was answered since
+    bool m_isSilent = false;
     QString m_errors; ///< of the instrument, one a line
 };

@@ -233,6 +233,23 @@ std::optional<BasebandLimits> basebandOf(int modelIndex, const QString &options,
     }
 }
 
+std::optional<BasebandLimits> largestBasebandOf(int modelIndex)
+{
+    std::optional<BasebandLimits> largest;
+    for (const BasebandOption &first : BasebandOptions) {
+        for (const BasebandOption &second : BasebandOptions) {
+            const QString options = QString("%1,%2,").arg(first.text, second.text);
+            if (const auto limits = basebandOf(modelIndex, options, 1)) {
+                BasebandLimits &widest = largest ? *largest : largest.emplace();
+                widest.size = std::max(widest.size, limits->size);
+                widest.clock = std::max(widest.clock, limits->clock);
+                widest.bandwidth = std::max(widest.bandwidth, limits->bandwidth);
+            }
+        }
+    }
+    return largest;
+}
+
 QString serialOf(int modelIndex, const QString &field)
 {
     const InstrumentModel *model = modelRow(modelIndex);

@@ -55,6 +55,9 @@ inline constexpr int NoModel = 99;
 [[nodiscard]] std::optional<BasebandLimits> basebandOf(int modelIndex, const QString &options,
                                                        int baseband);
 
+/// The largest limits that any options give the first baseband of a model. Nothing if it has none.
+[[nodiscard]] std::optional<BasebandLimits> largestBasebandOf(int modelIndex);
+
 /// The serial number in field 2 of the "*IDN?" answer, whose two halves generators and analyzers
 /// send in opposite order.
 [[nodiscard]] QString serialOf(int modelIndex, const QString &field);

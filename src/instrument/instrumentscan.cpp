@@ -25,7 +25,6 @@ bool scanInstruments(QList<VisaDevice *> &found, int kind, const VisaSession &se
     if (visa == nullptr) {
         return false;
     }
-    const CancelScope cancelScope(control.cancelled);
     Tracer::Trace(Tracer::Information, kind == VisaDevice::ScanGpib
                                            ? "Scanning for local GPIB devices..."
                                            : "Scanning for local USB devices...");
@@ -42,6 +41,11 @@ bool scanInstruments(QList<VisaDevice *> &found, int kind, const VisaSession &se
         const QMutexLocker locker(&library.mutex);
         status = visa->viFindRsrc(library.manager, expression, &list, &count, text.data());
     }
+    if (status == VI_ERROR_RSRC_NFOUND) {
+        Tracer::Trace(Tracer::Information, "No devices found.");
+        control.report(100);
+        return true;
+    }
     if (status != VI_SUCCESS) {
         Tracer::Trace(Tracer::Error, "No devices found. viFindRsrc() returned an error.");
         session.reportStatus(status);
@@ -53,8 +57,13 @@ bool scanInstruments(QList<VisaDevice *> &found, int kind, const VisaSession &se
         control.report(static_cast<int>(
             std::min<quint64>(100, 100 * number / std::max<ViUInt32>(count, 1) + 10)));
         text.back() = '\0';
+        const QString resource = QString::fromLatin1(text.data());
         auto device = std::make_unique<VisaDevice>();
-        if (device->openResource(QString::fromLatin1(text.data()))) {
+        if (device->isResourceOpenElsewhere(resource)) {
+            // A second session might disturb the pane that works with it.
+            Tracer::Trace(Tracer::Information,
+                          QString("The device '%1' is in use and was not asked.").arg(resource));
+        } else if (device->openResource(resource)) {
             device->closeResource();
             found.append(device.release());
         }

@@ -21,7 +21,21 @@ std::optional<QByteArray> toInstrument(const QString &command)
     return command.toLatin1();
 }
 
-QString fromInstrument(const char *bytes, quint32 count)
+namespace {
+
+QString textOf(const char *bytes, qsizetype count)
 {
-    return QString::fromLatin1(bytes, static_cast<qsizetype>(qstrnlen(bytes, count))).simplified();
+    return QString::fromLatin1(bytes, std::find(bytes, bytes + count, '\0') - bytes);
+}
+
+} // namespace
+
+QString fromInstrument(const char *bytes, qsizetype count)
+{
+    return textOf(bytes, count).simplified();
+}
+
+QString wholeTextOf(const QByteArray &bytes)
+{
+    return textOf(bytes.constData(), bytes.size()).trimmed();
 }

@@ -11,4 +11,11 @@
 [[nodiscard]] std::optional<QByteArray> toInstrument(const QString &command);
 
 /// The text of an answer up to its first zero byte, each run of white space made one blank.
-[[nodiscard]] QString fromInstrument(const char *bytes, quint32 count);
+[[nodiscard]] QString fromInstrument(const char *bytes, qsizetype count);
+[[nodiscard]] inline QString fromInstrument(const QByteArray &bytes)
+{
+    return fromInstrument(bytes.constData(), bytes.size());
+}
+
+/// The same with the white space that stands within the answer, for texts that hold names.
+[[nodiscard]] QString wholeTextOf(const QByteArray &bytes);

@@ -75,10 +75,6 @@ QString pathProblem(const QString &path)
     if (path.isEmpty()) {
         return "the path on the instrument is empty";
     }
-    if (path.contains('\'')) {
-        return "'" + path +
-               "' holds an apostrophe, which ends the path in the instrument's command";
-    }
     return {};
 }
 
@@ -135,7 +131,33 @@ QString joinRemotePath(const QString &parent, const QString &name, QChar separat
     while (tail.startsWith(separator)) {
         tail.remove(0, 1);
     }
-    return QString(head + separator + tail).remove('\'');
+    return head + separator + tail;
+}
+
+QString commandString(QString text)
+{
+    return '\'' + text.replace('\'', "''") + '\'';
+}
+
+bool isSameName(const QString &one, const QString &other, bool unixFileSystem)
+{
+    return one.compare(other, unixFileSystem ? Qt::CaseSensitive : Qt::CaseInsensitive) == 0;
+}
+
+QString plainResource(const QString &resource)
+{
+    QStringList parts = resource.trimmed().toUpper().split("::");
+    // A number that is left out is 0, a kind that is left out INSTR.
+    if (!parts.first().isEmpty() && !parts.first().back().isDigit()) {
+        parts.first() += '0';
+    }
+    if (parts.last() != "INSTR" && parts.last() != "SOCKET") {
+        parts.append("INSTR");
+    }
+    if (parts.first().startsWith("TCPIP") && parts.size() == 3 && parts.last() == "INSTR") {
+        parts.insert(2, "INST0");
+    }
+    return parts.join("::");
 }
 
 QList<RemoteFileEntry> parseCatalogue(const QString &answer)

@@ -42,8 +42,7 @@
 /// command, joins two, or stands for others. Empty if it can.
 [[nodiscard]] QString sendingProblem(const QString &name);
 
-/// Why a path can't stand in a command: it is empty, or an apostrophe would end it there. Empty if
-/// it can.
+/// Why a path can't stand in a command: it is empty. Empty if it can.
 [[nodiscard]] QString pathProblem(const QString &path);
 
 /// As above, for a path that is taken apart into a folder and a name in it.
@@ -72,14 +71,24 @@ struct RemotePath
 /// The reverse: what a user or an instrument with this separator has written, with "/".
 [[nodiscard]] QString slashPath(const QString &path, QChar separator);
 
+/// A text as a string of a command: between apostrophes, with those in it doubled, so that no name
+/// can end it (IEEE 488.2, 7.7.5).
+[[nodiscard]] QString commandString(QString text);
+
 /// Joins a folder and a name below it with the instrument's separator, which replaces both kinds in
-/// the two. Apostrophes go, as they would end the string of the command.
+/// the two.
 [[nodiscard]] QString joinRemotePath(const QString &parent, const QString &name, QChar separator);
 
 /// Reads the answer to ":MMEM:CAT?": used and free bytes, then one quoted text for each entry with
 /// name, type and size between commas. Names that begin with a point are left out, as is what
 /// can't be read.
 [[nodiscard]] QList<RemoteFileEntry> parseCatalogue(const QString &answer);
+
+/// Whether an instrument that takes no notice of the case of names has the one for the other.
+[[nodiscard]] bool isSameName(const QString &one, const QString &other, bool unixFileSystem);
+
+/// A resource string by which two can be compared: the same for all spellings of one resource.
+[[nodiscard]] QString plainResource(const QString &resource);
 
 /// The VISA resource of what a user typed: a resource string stays as it is, a host name or address
 /// becomes "TCPIP::host::INSTR". Empty for a blank text.

@@ -96,6 +96,7 @@ ViStatus viOpen(ViSession, const ViChar *name, ViAccessMode mode, ViUInt32 timeo
     *session = Instrument;
     if (status == VI_SUCCESS) {
         ++fake().openSessions;
+        fake().sendsEnd = true;
     }
     return status;
 }

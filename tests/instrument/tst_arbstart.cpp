@@ -120,11 +120,16 @@ void TestArbStart::arbCancel()
     (void)takeLog();
     QElapsedTimer timer;
     timer.start();
-    // One left over from before ends the wait as well.
-    device.cancel();
+    connect(&device, &VisaDevice::ProgressUpdate, &device, &VisaDevice::cancel);
     QVERIFY(!device.waitForArbReady(100));
     QVERIFY(timer.elapsed() < 5000);
     QCOMPARE(takeLog(), QStringList{"4 *** User break."});
+    // One left over from before is none of the next wait.
+    device.disconnect();
+    fake->answer = [](const std::string &message) {
+        return message == "STAT:OPER:COND?" || message == "SOUR:BB:PROG:MCOD?" ? "0\n" : "";
+    };
+    QVERIFY(device.waitForArbReady(100));
 }
 
 QTEST_GUILESS_MAIN(TestArbStart)

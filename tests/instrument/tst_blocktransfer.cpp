@@ -91,6 +91,21 @@ void TestBlockTransfer::readFile()
           "hello",
           {"4 No terminating character received.", timeoutReport}},
          {"no answer", "", {}, false, "", {"4 Reading start character failed.", timeoutReport}},
+         {"empty file", "#10\n", {}, true, "", {}},
+         {"size in brackets", "#(5)he\nlo\n", {}, true, "he\nlo", {}},
+         {"no end of brackets",
+          "#(1234567890123",
+          {},
+          false,
+          "",
+          {"4 The instrument announces a block of '1234567890123...' bytes, which has more than 12 "
+           "digits."}},
+         {"longer than announced",
+          "#13hello\n",
+          {},
+          false,
+          "",
+          {"4 The instrument sends more than the 3 bytes that it announced."}},
          {"text", "hello\n", {}, false, "", {noBlock, "4 ERROR: status 3FFF0006"}},
          {"length cut", "#512", {}, false, "", {"4 Invalid length data received from instrument."}},
          {"#0", "#0\n", {}, false, "", {badLength}},
@@ -271,8 +286,8 @@ void TestBlockTransfer::writeFile()
     const QString endOn = "viSetAttribute 3FFF0016 1";
     FakeInstrument &fake = *m_fake;
     forRows<Row>({{"1", 1, {endOn, "viWrite 1 END"}},
-                  {"1024", 1024, {endOn, "viWrite 1024 END"}},
-                  {"1025", 1025, {"viWrite 1024", endOn, "viWrite 1 END"}}},
+                  {"a block", 65536, {endOn, "viWrite 65536 END"}},
+                  {"more", 65537, {"viWrite 65536", endOn, "viWrite 1 END"}}},
                  [&](const Row &row) {
                      // Line feeds are data like any other.
                      const QByteArray data =
@@ -310,10 +325,10 @@ void TestBlockTransfer::writeFileFails()
     const qint32 gone = VI_ERROR_CONN_LOST;
     // In each the instrument sits in the middle of a block.
     forRows<Row>(
-        {{"header", "viWrite 34", gone, 0, false, {lost}},
-         {"first block", "viWrite 1024", gone, 0, true, {lost}},
+        {{"header", "viWrite 36", gone, 0, false, {lost}},
+         {"first block", "viWrite 65536", gone, 0, true, {lost}},
          {"second block with a remark",
-          "viWrite 1024",
+          "viWrite 65536",
           VI_SUCCESS_MAX_CNT,
           1,
           true,
@@ -322,7 +337,7 @@ void TestBlockTransfer::writeFileFails()
         [this](const Row &row) {
             init();
             FakeInstrument &fake = *m_fake;
-            QVERIFY(store(local(), QByteArray(3000, 'x')));
+            QVERIFY(store(local(), QByteArray(200'000, 'x')));
             // The half-written file shows only in the list that is asked for to delete it.
             fake->answer = [](const std::string &message) {
                 return message == ":MMEM:CAT? '/var/user/*.wv'" ? "1,2,\"a.wv,BIN,1024\"\n" : "";
@@ -343,11 +358,27 @@ void TestBlockTransfer::writeFileFails()
             QCOMPARE(messages.contains("MMEM:DEL '/var/user/a.wv'; *OPC?"), row.deletes);
             QCOMPARE(calls.value(blank - 1), "viSetAttribute 3FFF0016 1");
             QCOMPARE(calls.value(blank + 1), "viClear");
+            QVERIFY(calls.filter("viOpen").isEmpty());
             QVERIFY(calls.lastIndexOf("viSetAttribute 3FFF0016 1") > blank);
             // The session is of use again.
             fake->status = nullptr;
             QVERIFY(m_device->writeRemoteFile(local(), remoteName));
         });
+    // Where the connection is gone, a new one lets the half-written file be removed.
+    init();
+    FakeInstrument &fake = *m_fake;
+    bool isLost = false;
+    QVERIFY(store(local(), QByteArray(100'000, 'x')));
+    fake->status = [&](const std::string &call) {
+        isLost = (isLost || call == "viWrite 65536") && call.rfind("viOpen", 0) != 0;
+        return isLost && call.rfind("viClose", 0) != 0 ? gone : 0;
+    };
+    fake->answer = [](const std::string &message) {
+        return message == ":MMEM:CAT? '/var/user/*.wv'" ? "1,2,\"a.wv,BIN,1024\"\n" : "";
+    };
+    QVERIFY(!m_device->writeRemoteFile(local(), remoteName));
+    QVERIFY(fake.takeMessages().contains("MMEM:DEL '/var/user/a.wv'; *OPC?"));
+    QVERIFY(m_device->isOpen());
 }
 
 void TestBlockTransfer::writeFileReplaces()
@@ -384,6 +415,10 @@ void TestBlockTransfer::writeFileOverGpib()
 {
     FakeInstrument &fake = *m_fake;
     fake->interfaceType = VI_INTF_GPIB;
+    QVERIFY(store(local(), QByteArray(1025, 'x')));
+    QVERIFY(m_device->writeRemoteFile(local(), remoteName));
+    QVERIFY(fake.takeCalls().contains("viWrite 1024"));
+    (void)fake.takeMessages();
     QVERIFY(store(local(), "x"));
     QVERIFY(m_device->writeRemoteFile(local(), remoteName));
     const QString eoi = ":SYST:COMM:GPIB:LTER EOI; *OPC?";
@@ -433,7 +468,7 @@ void TestBlockTransfer::cancel()
         QElapsedTimer timer;
         bool isSlow = true;
         fake->status = [&](const std::string &call) {
-            const bool isData = call == "viWrite 1024" || call == "viRead 32768";
+            const bool isData = call == "viWrite 65536" || call == "viRead 32768";
             timer.start();
             while (isData && isSlow && !timer.hasExpired(110)) {
             }

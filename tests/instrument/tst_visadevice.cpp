@@ -35,6 +35,7 @@ private slots:
     void hostIsUnreachable();
     void sendCommand();
     void queryText();
+    void lateAnswers();
     void errorQueue();
     void errorQueueFails();
     void charactersOutsideLatin1();
@@ -132,7 +133,10 @@ void TestVisaDevice::opens()
         (void)takeLog();
         (void)fake.takeCalls();
         QVERIFY(device.closeResource());
-        QCOMPARE(fake.takeCalls(), (QStringList{"viGpibControlREN 2", "viClear", "viClose"}));
+        // One that has gone silent meanwhile holds it up for a moment alone.
+        QCOMPARE(fake.takeCalls(),
+                 (QStringList{"viSetAttribute 3FFF001A 400", "viGpibControlREN 2", "viClear",
+                              "viSetAttribute 3FFF001A 5000", "viClose"}));
         QCOMPARE(takeLog(information), QStringList{"1 Device TGX-870, 100001 closed."});
         // Closed already: nothing happens, the identity stays.
         QVERIFY(device.closeResource());
@@ -294,6 +298,40 @@ void TestVisaDevice::queryText()
     QCOMPARE(takeLog(), QStringList{"4 ERROR: status BFFF0015"});
 }
 
+/// After an answer that came too late, or only in part, the next query gets its own.
+void TestVisaDevice::lateAnswers()
+{
+    FakeInstrument fake;
+    VisaDevice device;
+    QVERIFY(device.openResource(resource));
+    const std::string longText = " first,\"two  blanks\" " + std::string(100'000, 'x') + "\n";
+    fake->answer = [&](const std::string &message) {
+        return message == "LONG?" ? longText : std::string();
+    };
+    QString answer;
+    QVERIFY(device.queryText("LONG?", answer));
+    QCOMPARE(answer.size(), static_cast<qsizetype>(longText.size()) - 3);
+    fake.failCall("viRead 65534", VI_ERROR_TMO);
+    QVERIFY(!device.queryText("LONG?", answer));
+    QVERIFY(answer.isEmpty());
+    fake->status = nullptr;
+    QVERIFY(device.queryText("*IDN?", answer));
+    QVERIFY2(answer.startsWith("Halvorn"), qPrintable(answer));
+    // One that takes no notice of being cleared has gone, and nothing waits for it again.
+    fake->status = [](const std::string &call) {
+        const bool isOut = call.rfind("viRead", 0) == 0 || call == "viClear";
+        return isOut ? VI_ERROR_TMO : VI_SUCCESS;
+    };
+    QVERIFY(!device.sendCommand("DO; *OPC?"));
+    (void)fake.takeCalls();
+    QVERIFY(!device.queryText("*IDN?", answer));
+    QVERIFY(!device.checkErrorQueue());
+    QVERIFY(device.closeResource());
+    QCOMPARE(fake.takeCalls(), QStringList{"viClose"});
+    fake->status = nullptr;
+    QVERIFY(device.openResource(resource));
+}
+
 void TestVisaDevice::errorQueue()
 {
     FakeInstrument fake;
@@ -395,10 +433,14 @@ void TestVisaDevice::scanFails()
     VisaDevice device;
     QList<VisaDevice *> found;
     QVERIFY(!device.scanResources(found, 2));
+    // None is an answer, too.
+    QVERIFY(device.scanResources(found, VisaDevice::ScanUsb));
+    fake.failCall("viFindRsrc", VI_ERROR_SYSTEM_ERROR);
     QVERIFY(!device.scanResources(found, VisaDevice::ScanUsb));
+    fake->status = nullptr;
     QCOMPARE(takeLog(), (QStringList{"4 Invalid remte control interface type.",
                                      "4 No devices found. viFindRsrc() returned an error.",
-                                     "4 ERROR: status BFFF0011"}));
+                                     "4 ERROR: status BFFF0000"}));
     QVERIFY(fake.takeCalls().contains("viFindRsrc USB[0-9]::0x7FE3::?*INSTR"));
     fake->resources = {"USB0::0x7FE3::1::2::INSTR", "USB0::0x7FE3::1::3::INSTR"};
     connect(&device, &VisaDevice::ProgressUpdate, &device, [&device](int percent) {
@@ -409,6 +451,15 @@ void TestVisaDevice::scanFails()
     QVERIFY(!device.scanResources(found, VisaDevice::ScanUsb));
     QCOMPARE(found.size(), 1);
     qDeleteAll(found);
+    // An instrument that a pane works with is left alone, however its resource is written.
+    device.disconnect();
+    found.clear();
+    VisaDevice pane;
+    QVERIFY(pane.openResource("gpib::28"));
+    fake->resources = {"GPIB0::28::INSTR"};
+    (void)fake.takeCalls();
+    QVERIFY(device.scanResources(found, VisaDevice::ScanGpib));
+    QVERIFY(fake.takeCalls().filter("viOpen").isEmpty());
 }
 
 QTEST_GUILESS_MAIN(TestVisaDevice)

@@ -6,7 +6,6 @@
 #include "instrument/remotepaths.h"
 #include "jobs/instrument/ScanJob.h"
 #include "log/Tracer.h"
-#include "toolframe/WaitCursor.h"
 #include "toolframe/pictures.h"
 #include "toolframe/runjob.h"
 #include "toolframe/windowplace.h"
@@ -208,8 +207,7 @@ void DlgInstrConfig::instr_add_manual()
     bool isKnown = false;
     {
         const QScopedValueRollback<bool> busy(m_busy, true);
-        const WaitCursor cursor;
-        isKnown = job.run() == JobOutcome::Finished;
+        isKnown = runJob(job, this, nullptr) == JobOutcome::Finished;
     }
     if (!isKnown) {
         const QString reason = QString("The device '%1' was not added.").arg(resource);
@@ -249,8 +247,9 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
     const auto added =
         std::count_if(found.cbegin(), found.cend(),
                       [&](const InstrumentSummary &summary) { return addOnline(summary, origin); });
-    if (outcome != JobOutcome::Finished && found.isEmpty()) {
-        say("The scan found nothing. See the log.");
+    if (found.isEmpty()) {
+        say(outcome == JobOutcome::Failed ? "The scan could not be made. See the log."
+                                          : "The scan found no instrument.");
         return;
     }
     say(added == 0   ? QString("The scan found no new instrument.")
