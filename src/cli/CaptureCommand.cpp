@@ -1,9 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CliOptions.h"
-#include "Console.h"
-#include "commands.h"
+#include "InstrumentArguments.h"
 
-#include "instrument/remotepaths.h"
 #include "jobs/instrument/CaptureJob.h"
 #include "jobs/instrument/CaptureSaveJob.h"
 
@@ -15,6 +12,7 @@ struct CaptureArguments
 {
     Console &console;
     QString resource{};
+    QString transcript{};
     int input = 0;
     int trigger = 0;
     int slope = 0;
@@ -46,6 +44,9 @@ int runCapture(CaptureArguments &arguments)
     request.pretriggerSamples =
         static_cast<int>(arguments.pretrigger.value_or(request.pretriggerSamples));
     request.triggerLevelDbm = arguments.levelDbm.value_or(request.triggerLevelDbm);
+    if (!startTranscript(arguments.transcript)) {
+        return arguments.console.failed();
+    }
     CaptureJob job(request);
     const int exitCode = arguments.console.run(job);
     if (exitCode != ExitDone) {
@@ -69,6 +70,7 @@ void addCaptureCommand(CLI::App &instr, CommandSet &commands)
     addText(command, "resource", state->resource, "VISA resource string, host name or address")
         ->type_name("RES")
         ->required();
+    addTranscript(command, state->transcript);
     addChoice(command, "--input", state->input, {"rf", "aiq", "diq"}, "Input (default: rf)");
     addNumber(command, "--rate", state->rateHz, {"Hz", R::MinRateHz, R::MaxRateHz},
               "Sample rate; the analyzer takes the nearest that it has (default: 1 MHz)");

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Console.h"
 
+#include "base/visibletext.h"
 #include "jobs/ReportText.h"
 #include "jobs/ToolJob.h"
 
@@ -108,7 +109,8 @@ void Console::printLine(const QString &line)
 {
     clearProgress();
     m_lastLine = line;
-    std::fprintf(stderr, "%s\n", line.toLocal8Bit().constData());
+    std::fprintf(stderr, "%s\n",
+                 visibleText(QString(line).replace('\t', ' ')).toLocal8Bit().constData());
 }
 
 void Console::printReport(const ReportLine &line)

@@ -1,11 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CliOptions.h"
-#include "Console.h"
-#include "commands.h"
+#include "InstrumentArguments.h"
 
+#include "base/visibletext.h"
 #include "instrument/InstrumentSummary.h"
-#include "instrument/VisaDevice.h"
-#include "instrument/remotepaths.h"
 #include "jobs/instrument/EntryJob.h"
 #include "jobs/instrument/ListJob.h"
 #include "jobs/instrument/QueryJob.h"
@@ -20,56 +17,6 @@
 #include <QJsonObject>
 
 namespace {
-
-/// The arguments of all commands; each uses some of them.
-struct InstrumentArguments
-{
-    Console &console;
-    QString resource{};
-    QString first{};  ///< path, or command for the instrument
-    QString second{}; ///< the other path
-    int scanKind = VisaDevice::ScanGpib;
-    std::optional<qint64> seconds{};
-    bool json = false;
-    bool recursive = false;
-    bool force = false;
-    bool needsInstrument = false;
-    int (*run)(InstrumentArguments &) = nullptr;
-};
-
-int runNamed(InstrumentArguments &arguments)
-{
-    if (arguments.needsInstrument && resourceOf(arguments.resource).isEmpty()) {
-        return arguments.console.wrongUsage("RES: the name of the instrument is empty");
-    }
-    return arguments.run(arguments);
-}
-
-/// Runs a job; behind the reason that the program saw goes what the instrument reported, as that
-/// tells more.
-int runJob(Console &console, InstrumentJob &job)
-{
-    const int exitCode = console.run(job);
-    const QString words = "The instrument reports: " + job.reported();
-    if (exitCode == ExitFailed && !job.reported().isEmpty() && console.lastReason() != words) {
-        console.error(words);
-    }
-    return exitCode;
-}
-
-/// Makes a job for the instrument of the arguments and runs it.
-template <typename Job, typename... Request>
-int runOn(const InstrumentArguments &arguments, const Request &...request)
-{
-    Job job({.resource = resourceOf(arguments.resource)}, request...);
-    return runJob(arguments.console, job);
-}
-
-/// Ends a command with its result on standard output.
-int printed(Console &console, int exitCode, const QByteArray &text)
-{
-    return exitCode != ExitDone || console.print(text) ? exitCode : console.failed();
-}
 
 QJsonObject infoObject(const InstrumentSummary &summary)
 {
@@ -109,7 +56,7 @@ QByteArray infoLines(const InstrumentSummary &summary)
     rows += summaryRows(summary);
     QString text;
     for (const auto &[label, value] : std::as_const(rows)) {
-        text += (label + ':').leftJustified(16) + value + '\n';
+        text += (label + ':').leftJustified(16) + visibleText(value) + '\n';
     }
     return text.toLocal8Bit();
 }
@@ -117,29 +64,10 @@ QByteArray infoLines(const InstrumentSummary &summary)
 int runInfo(InstrumentArguments &arguments)
 {
     IdentifyJob job({.resource = resourceOf(arguments.resource)});
-    const int exitCode = runJob(arguments.console, job);
+    const int exitCode = runInstrumentJob(arguments.console, job);
     return printed(arguments.console, exitCode,
                    arguments.json ? QJsonDocument(infoObject(job.summary())).toJson()
                                   : infoLines(job.summary()));
-}
-
-int runScan(InstrumentArguments &arguments)
-{
-    ScanJob job(arguments.scanKind);
-    const int exitCode = arguments.console.run(job);
-    QJsonArray objects;
-    QString text;
-    for (const InstrumentSummary &found : job.found()) {
-        objects.append(QJsonObject{{"resource", found.resource},
-                                   {"model", found.model},
-                                   {"serial", found.serial},
-                                   {"interface", found.interfaceName}});
-        text +=
-            QStringList{found.resource, found.model, found.serial, found.interfaceName}.join('\t') +
-            '\n';
-    }
-    return printed(arguments.console, exitCode,
-                   arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
 }
 
 int runQuery(InstrumentArguments &arguments)
@@ -149,10 +77,10 @@ int runQuery(InstrumentArguments &arguments)
     }
     QueryJob job({.resource = resourceOf(arguments.resource)}, QueryJob::Kind::Query,
                  arguments.first);
-    const int exitCode = runJob(arguments.console, job);
+    const int exitCode = runInstrumentJob(arguments.console, job);
     // An answer counts even where the instrument also complained.
     if ((exitCode == ExitDone || !job.answer().isEmpty()) &&
-        !arguments.console.print(job.answer().toLocal8Bit() + '\n')) {
+        !arguments.console.print(visibleText(job.answer()).toLocal8Bit() + '\n')) {
         return arguments.console.failed();
     }
     return exitCode;
@@ -172,14 +100,14 @@ int runList(InstrumentArguments &arguments)
         return arguments.console.wrongUsage("PATH: " + problem);
     }
     ListJob job({.resource = resourceOf(arguments.resource)}, arguments.first, arguments.recursive);
-    const int exitCode = runJob(arguments.console, job);
+    const int exitCode = runInstrumentJob(arguments.console, job);
     QJsonArray objects;
     QString text;
     for (const RemoteFileEntry &entry : job.entries()) {
         objects.append(
             QJsonObject{{"name", entry.name}, {"type", entry.type}, {"size", entry.size}});
         text += entry.type.leftJustified(4) + QString::number(entry.size).rightJustified(12) +
-                "  " + entry.name + '\n';
+                "  " + visibleText(entry.name) + '\n';
     }
     return printed(arguments.console, exitCode,
                    arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
@@ -259,24 +187,40 @@ int runGet(InstrumentArguments &arguments)
     if (!mayWrite(arguments.console, local, arguments.force)) {
         return arguments.console.failed();
     }
-    return runOn<TransferJob>(arguments, TransferJob::Direction::Get, local, remote);
+    return runOn<TransferJob>(arguments,
+                              TransferJob::Request{.direction = TransferJob::Direction::Get,
+                                                   .locals = {local},
+                                                   .remote = remote,
+                                                   .existing = existingFile(arguments.force)});
 }
 
 int runPut(InstrumentArguments &arguments)
 {
-    const QString local = arguments.first;
-    QString remote = arguments.second;
+    Console &console = arguments.console;
+    QStringList locals;
+    for (const std::string &path : arguments.paths) {
+        locals.append(QString::fromLocal8Bit(path));
+    }
+    const QString remote = locals.takeLast();
     if (const QString problem = pathProblem(remote); !problem.isEmpty()) {
-        return arguments.console.wrongUsage("REMOTE: " + problem);
+        return console.wrongUsage("REMOTE: " + problem);
     }
-    if (!QFileInfo(local).isFile()) {
-        arguments.console.error("The local file '" + local + "' does not exist.");
-        return arguments.console.failed();
+    const bool isFolder = remote.endsWith('/') || remote.endsWith('\\');
+    if (locals.size() > 1 && !isFolder) {
+        return console.wrongUsage("REMOTE: '" + remote +
+                                  "' is no folder for several files; a folder ends in /");
     }
-    if (remote.endsWith('/') || remote.endsWith('\\')) {
-        remote += QFileInfo(local).fileName();
+    for (const QString &local : std::as_const(locals)) {
+        if (!QFileInfo(local).isFile()) {
+            console.error("The local file '" + local + "' does not exist.");
+            return console.failed();
+        }
     }
-    return runOn<TransferJob>(arguments, TransferJob::Direction::Put, local, remote);
+    return runOn<TransferJob>(arguments,
+                              TransferJob::Request{.direction = TransferJob::Direction::Put,
+                                                   .locals = locals,
+                                                   .remote = remote,
+                                                   .check = arguments.check()});
 }
 
 int runStart(InstrumentArguments &arguments)
@@ -288,8 +232,10 @@ int runStart(InstrumentArguments &arguments)
     if (!path.endsWith(".wv", Qt::CaseInsensitive)) {
         return arguments.console.wrongUsage("REMOTE: '" + path + "' is no waveform file (*.wv)");
     }
-    return runOn<StartJob>(arguments, path,
-                           static_cast<int>(arguments.seconds.value_or(StartJob::DefaultSeconds)));
+    StartJob job({.resource = resourceOf(arguments.resource)}, path,
+                 static_cast<int>(arguments.seconds.value_or(StartJob::DefaultSeconds)));
+    job.setCheck(arguments.check());
+    return runInstrumentJob(arguments.console, job);
 }
 
 } // namespace
@@ -300,67 +246,68 @@ void addInstrumentCommands(CommandSet &commands)
     instr->require_subcommand(1);
     const auto add = [&](const std::string &name, const std::string &help,
                          int (*run)(InstrumentArguments &)) {
-        auto arguments = std::make_shared<InstrumentArguments>(
-            InstrumentArguments{.console = commands.console, .run = run});
-        CLI::App &command = addCommand(*instr, name, help, commands.action, arguments, runNamed);
-        return std::pair<CLI::App &, InstrumentArguments &>(command, *arguments);
-    };
-    const auto addOnDevice = [&](const std::string &name, const std::string &help,
-                                 int (*run)(InstrumentArguments &)) {
-        auto result = add(name, help, run);
-        result.second.needsInstrument = true;
-        addText(result.first, "resource", result.second.resource,
-                "VISA resource string, host name or address")
-            ->type_name("RES")
-            ->required();
-        return result;
+        return addInstrumentCommand(*instr, commands, name, help, run);
     };
     const auto addArgument = [](CLI::App &command, const std::string &name, QString &value,
                                 const std::string &type, const std::string &help) {
         addText(command, name, value, help)->type_name(type)->required();
     };
+    const auto addStrict = [](InstrumentCommand &command) {
+        command.app.add_flag("--strict", command.arguments.strict,
+                             "Refuse a waveform that the instrument can't play");
+    };
 
-    auto [scan, scanned] = add("scan", "Find the instruments of an interface", runScan);
-    addChoice(scan, "interface", scanned.scanKind, {"gpib", "usb"}, "Interface to look at")
-        ->required();
-    scan.add_flag("--json", scanned.json, "Print one JSON array");
-
-    auto [info, shown] = addOnDevice("info", "Show what an instrument is and can", runInfo);
+    addDiscoveryCommands(*instr, commands);
+    auto [info, shown] = add("info", "Show what an instrument is and can", runInfo);
     info.add_flag("--json", shown.json, "Print JSON");
 
-    auto [query, asked] = addOnDevice("query", "Send a query and print the answer", runQuery);
+    auto [query, asked] = add("query", "Send a query and print the answer", runQuery);
     addArgument(query, "command", asked.first, "COMMAND", "Query, such as *IDN?");
-    auto [send, sent] = addOnDevice("send", "Send a command", runSend);
+    query.footer("Example: corvane-cli instr query 192.168.1.20 '*IDN?'");
+    auto [send, sent] = add("send", "Send a command", runSend);
     addArgument(send, "command", sent.first, "COMMAND", "Command, such as *RST");
 
-    auto [list, listed] = addOnDevice("ls", "List a folder", runList);
+    auto [list, listed] = add("ls", "List a folder", runList);
     addArgument(list, "path", listed.first, "PATH", "Folder on the instrument");
     list.add_flag("--json", listed.json, "Print one JSON array");
     list.add_flag("--recursive", listed.recursive, "With all folders below it");
-    auto [makeFolder, made] = addOnDevice("mkdir", "Make a folder", runMakeFolder);
+    auto [makeFolder, made] = add("mkdir", "Make a folder", runMakeFolder);
     addArgument(makeFolder, "path", made.first, "PATH", "Folder on the instrument");
-    auto [removeFolder, removed] = addOnDevice("rmdir", "Remove a folder", runRemoveFolder);
+    auto [removeFolder, removed] = add("rmdir", "Remove a folder", runRemoveFolder);
     addArgument(removeFolder, "path", removed.first, "PATH", "Folder on the instrument");
     removeFolder.add_flag("--recursive", removed.recursive, "With all it holds");
-    auto [move, moved] = addOnDevice("mv", "Rename a file or folder", runMove);
+    auto [move, moved] = add("mv", "Rename a file or folder", runMove);
     addArgument(move, "old", moved.first, "OLD", "Full path on the instrument");
     addArgument(move, "new", moved.second, "NEW", "Name in the same folder, or its full path");
-    auto [removeFile, deleted] = addOnDevice("rm", "Delete a file", runRemoveFile);
+    auto [removeFile, deleted] = add("rm", "Delete a file", runRemoveFile);
     addArgument(removeFile, "path", deleted.first, "PATH", "File on the instrument");
 
-    auto [get, fetched] = addOnDevice("get", "Copy a file from the instrument", runGet);
+    auto [get, fetched] = add("get", "Copy a file from the instrument", runGet);
     addArgument(get, "remote", fetched.first, "REMOTE", "File on the instrument");
     addArgument(get, "local", fetched.second, "LOCAL", "Local file, or folder for it");
     get.add_flag("--force", fetched.force, "Overwrite an existing file");
-    auto [put, stored] = addOnDevice("put", "Copy a file to the instrument", runPut);
-    addArgument(put, "local", stored.first, "LOCAL", "Local file");
-    addArgument(put, "remote", stored.second, "REMOTE",
-                "File on the instrument, which is replaced if it is there; a folder ends in /");
-    auto [start, started] = addOnDevice("run", "Play a waveform file of the instrument", runStart);
-    addArgument(start, "remote", started.first, "REMOTE", "Waveform file on the instrument");
+    get.footer("Example: corvane-cli instr get 192.168.1.20 /var/user/a.wv a.wv");
+    InstrumentCommand put = add("put", "Copy files to the instrument", runPut);
+    constexpr int MinPaths = 2;
+    put.app
+        .add_option("paths", put.arguments.paths,
+                    "Local files, and the file on the instrument, which is replaced if it is "
+                    "there; a folder ends in /")
+        ->type_name("LOCAL... REMOTE")
+        ->expected(MinPaths, CLI::detail::expected_max_vector_size)
+        ->required();
+    addStrict(put);
+    put.app.footer("Example: corvane-cli instr put 192.168.1.20 a.wv b.wv /var/user/");
+    InstrumentCommand start = add("run", "Play a waveform file of the instrument", runStart);
+    addArgument(start.app, "remote", start.arguments.first, "REMOTE",
+                "Waveform file (*.wv) on the instrument");
     constexpr double MaxSeconds = 86400;
-    addInteger(start, "--timeout", started.seconds, {"s", 1, MaxSeconds},
-               "Longest wait for the instrument to load it (default: 100 s)");
+    addInteger(start.app, "--timeout", start.arguments.seconds, {"s", 1, MaxSeconds},
+               "Longest wait for the instrument to load it, 1 s to 86400 s (default: 100 s)");
+    addStrict(start);
+    start.app.footer("The RF output stays as it is.\n"
+                     "Example: corvane-cli instr run 192.168.1.20 /var/user/a.wv");
 
+    addGeneratorCommands(*instr, commands);
     addCaptureCommand(*instr, commands);
 }

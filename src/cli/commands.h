@@ -25,5 +25,6 @@ void addFilterCommands(CommandSet &commands);
 void addMarkerCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addComposeCommand(CommandSet &commands);
+void addCheckCommand(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);
 void addCaptureCommand(CLI::App &instr, CommandSet &commands);

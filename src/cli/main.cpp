@@ -61,7 +61,11 @@ std::vector<std::string> argumentsOf(int argc, char **argv)
 {
     std::vector<std::string> arguments(argv + std::min(argc, 1), argv + argc);
     const auto command = findCommand(arguments.begin(), arguments.end());
-    if (command != arguments.end() && *command == "info") {
+    const auto takesFiles = [&] {
+        return *command == "info" || (*command == "instr" && std::find(command, arguments.end(),
+                                                                       "put") != arguments.end());
+    };
+    if (command != arguments.end() && takesFiles()) {
         std::for_each(command, arguments.end(), [](std::string &argument) {
             if (argument.starts_with('[')) {
                 argument.insert(0, "./");
@@ -104,6 +108,7 @@ int run(int argc, char **argv)
     addMarkerCommands(commands);
     addImportCommands(commands);
     addComposeCommand(commands);
+    addCheckCommand(commands);
     addInstrumentCommands(commands);
     try {
         app.parse(argumentsOf(argc, argv));

@@ -11,6 +11,7 @@
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QProcess>
+#include <QRegularExpression>
 #include <QTemporaryDir>
 #include <QTest>
 
@@ -72,6 +73,8 @@ private slots:
     void getKeepsFiles();
     void failures();
     void play();
+    void rfSide();
+    void limitsOfTheInstrument();
     void capturedSignalPlaysBack();
     void interrupted();
     void withoutLibrary();
@@ -118,7 +121,9 @@ void TestInstrCommands::wrongUsage()
                   {"drive alone", {"rmdir", "x", "D:", "--recursive"}, "'D:'"},
                   {"folder above", {"rmdir", "x", "/a/b/..", "--recursive"}, ".."},
                   {"other folder", {"mv", "x", "/d/a.wv", "/e/a.wv"}, "NEW"},
-                  {"apostrophe", {"rm", "x", "/it's.wv"}, "apostrophe"},
+                  {"nothing to set", {"rf", "x"}, "--freq"},
+                  {"on and off", {"rf", "x", "--on", "--off"}, "--o"},
+                  {"several to a file", {"put", "x", "a.wv", "b.wv", "/c.wv"}, "'/c.wv'"},
                   {"few samples", {"capture", "x", "-o", "a.wv", "--samples", "99"}, "--samples"}},
                  [](const Row &row) {
                      const Outcome outcome = run(row.arguments);
@@ -162,6 +167,7 @@ void TestInstrCommands::scan()
                                                   {"model", "TGX-870"},
                                                   {"serial", "100001"},
                                                   {"interface", "GPIB0"}}));
+    QCOMPARE(run({"scan", "usb", "--json"}).output, "[\n]\n");
     QVERIFY(run({"scan", "gpib"}).output.contains("GPIB0::5::INSTR\tPAX-690\t200002\tGPIB0\n"));
 }
 
@@ -181,6 +187,10 @@ void TestInstrCommands::queryAndSend()
     QCOMPARE(outcome.exitCode, 1);
     QCOMPARE(outcome.lastLine(), "error: The instrument reports: -113,\"Undefined header\"");
     QCOMPARE(run({"send", device, "*IDN?"}).exitCode, 0);
+    // Nothing that could move the cursor reaches a terminal.
+    const QString log =
+        runProgram({"--verbose", "instr", "send", device, "\033[2J"}).log.join('\n');
+    QVERIFY2(log.contains("'\\x1B[2J'") && !log.contains('\033'), qPrintable(log));
 }
 
 void TestInstrCommands::foldersAndFiles()
@@ -221,6 +231,9 @@ void TestInstrCommands::transfers()
     QVERIFY(load(remote("x.wv")) == data);
     QCOMPARE(run({"get", device, "/var/user/x.wv", local("back.wv")}).exitCode, 0);
     QVERIFY(load(local("back.wv")) == data);
+    QVERIFY(store(remote("it's empty"), ""));
+    QCOMPARE(run({"get", device, "/var/user/it's empty", local("empty")}).exitCode, 0);
+    QVERIFY(QFile::exists(local("empty")) && load(local("empty")).isEmpty());
     // On an instrument with drives, whose paths may be written either way.
     QCOMPARE(run({"mkdir", "GPIB0::5", "D:\\w"}).exitCode, 0);
     QCOMPARE(run({"put", "GPIB0::5", local("x.wv"), "D:\\w\\"}).exitCode, 0);
@@ -269,7 +282,6 @@ void TestInstrCommands::failures()
                   {"no local file",
                    {"put", device, "/nonexistent.wv", "/var/user/"},
                    "'/nonexistent.wv' does not exist"},
-                  {"nothing on USB", {"scan", "usb"}, "No devices found."},
                   {"no analyzer",
                    {"capture", device, "-o", local("c.wv")},
                    "The Selected Device is not a Spectrum Analyzer."}},
@@ -293,6 +305,67 @@ void TestInstrCommands::play()
     Outcome outcome = run({"run", device, "/var/user/x.WV", "--timeout", "2"});
     QCOMPARE(outcome.exitCode, 1);
     QCOMPARE(outcome.lastLine(), "error: ARB did not get ready in time.");
+}
+
+void TestInstrCommands::rfSide()
+{
+    QVERIFY(store(remote("x.wv"), "12345"));
+    QJsonObject state = run({"state", device, "--json"}).json().object();
+    QVERIFY(state.contains("waveform") && state["waveform"].isNull());
+    QCOMPARE(state["arb"], QJsonValue(false));
+    const QString transcript = local("talk.txt");
+    const Outcome outcome = run({"run", device, "/var/user/x.wv", "--transcript", transcript});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log, QStringList{"warning: The RF output is off."});
+    const QStringList lines = QString::fromUtf8(load(transcript)).split('\n');
+    const QRegularExpression form(R"(^ *\d+ (>>|<<) .)");
+    QCOMPARE(lines.filter(form).size(), lines.size() - 1);
+    QCOMPARE(lines.filter(">> SOUR:BB:ARB:WAV:SEL '/var/user/x.wv'").size(), 1);
+    QCOMPARE(lines.filter("<< <5 bytes>").size(), 1);
+    QCOMPARE(run({"rf", device, "--freq", "1.5G", "--level", "-12.5", "--on"}).exitCode, 0);
+    state = run({"state", device, "--json"}).json().object();
+    QCOMPARE(state["waveform"].toString(), "/var/user/x.wv");
+    QCOMPARE(state["arb"], QJsonValue(true));
+    QCOMPARE(state["frequency"].toDouble(), 1.5e9);
+    QCOMPARE(state["level"].toDouble(), -12.5);
+    QCOMPARE(state["output"], QJsonValue(true));
+    QCOMPARE(run({"stop", device}).exitCode, 0);
+    const QString text = run({"state", device}).output;
+    QVERIFY2(text.contains("ARB:            off\n") && text.contains("RF output:      on\n"),
+             qPrintable(text));
+    QCOMPARE(run({"rf", device, "--level", "99"}).exitCode, 1);
+    QCOMPARE(run({"state", "GPIB0::5"}).lastLine(),
+             "error: The device 'PAX-690, 200002' is no generator.");
+}
+
+void TestInstrCommands::limitsOfTheInstrument()
+{
+    const QString fast = local("fast.wv");
+    const QStringList create{"create", "pm", "--freq", "1M", "--clock", "200M", "-o", fast};
+    QCOMPARE(runProgram(create).exitCode, 0);
+    Outcome outcome = runProgram({"check", fast, "--for", device, "--json"});
+    QCOMPARE(outcome.exitCode, 3);
+    QCOMPARE(outcome.json()["ok"], QJsonValue(false));
+    const QString clock = outcome.json()["problems"].toArray().first().toString();
+    QVERIFY2(clock.contains("200 MHz") && clock.contains("60 MHz"), qPrintable(clock));
+    // The fastest options of the model play at 120 MHz, another model at 264 MHz.
+    QCOMPARE(runProgram({"check", fast, "--model", "TGX-870"}).exitCode, 3);
+    QCOMPARE(runProgram({"check", fast, "--model", "tbx-320"}).output, "ok\n");
+    QCOMPARE(runProgram({"check", fast}).exitCode, 2);
+    QCOMPARE(runProgram({"check", local("visa.ini"), "--model", "TGX-870"}).exitCode, 1);
+    QVERIFY(store(local("n.txt"), "1"));
+    outcome = run({"put", device, local("n.txt"), fast, "/var/user/", "--strict"});
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY(!QFile::exists(remote("n.txt")));
+    outcome = run({"put", device, local("n.txt"), fast, "/var/user/"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log.size(), 2);
+    QVERIFY(outcome.log.first().startsWith("warning: " + fast));
+    QVERIFY(load(remote("fast.wv")) == load(fast) && load(remote("n.txt")) == "1");
+    outcome = run({"run", device, "/var/user/fast.wv", "--strict"});
+    QCOMPARE(outcome.exitCode, 1);
+    QVERIFY2(outcome.lastLine().contains("200 MHz"), qPrintable(outcome.lastLine()));
+    QCOMPARE(run({"query", device, "SOUR:BB:ARB:STAT?"}).output, "0\n");
 }
 
 /// From the analyzer by way of the disk to the generator.

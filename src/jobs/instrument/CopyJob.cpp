@@ -9,6 +9,7 @@
 #include <QDir>
 #include <QFile>
 #include <QFileInfo>
+#include <QTemporaryDir>
 
 #include <algorithm>
 #include <utility>
@@ -99,10 +100,11 @@ bool CopyJob::collect()
     const char *label = m_request.sourceDevice ? "Building remote source files list..."
                                                : "Building local source files list...";
     Tracer::Trace(Tracer::Information, label);
-    emit stepStarted(label);
     if (m_request.sourceDevice) {
+        const JobStep step(*this, label, *m_request.sourceDevice);
         return collectRemote();
     }
+    emit stepStarted(label);
     ProgressClock clock([this](int percent) { emit ProgressUpdate(percent); }, cancelFlag());
     return collectLocal({}, clock);
 }
@@ -184,15 +186,17 @@ bool CopyJob::copy(const File &file)
 bool CopyJob::relay(const File &file)
 {
     // There is no way from one instrument to the other but by way of the disk.
-    const QString passed = QDir(QDir::tempPath()).filePath("HvCorvane.tmp");
-    QFile::remove(passed);
-    bool done = fetch(file.source, passed);
-    if (done) {
-        m_leg = 1;
-        done = !isCancelled() && send(passed, file.target);
+    // A folder of its own keeps two running programs, and other users, apart.
+    const QTemporaryDir folder;
+    if (!folder.isValid()) {
+        return Tracer::fail("Cannot create a temporary folder: " + folder.errorString());
     }
-    QFile::remove(passed);
-    return done;
+    const QString passed = folder.filePath("HvCorvane.tmp");
+    if (!fetch(file.source, passed)) {
+        return false;
+    }
+    m_leg = 1;
+    return !isCancelled() && send(passed, file.target);
 }
 
 template <typename Transfer>
@@ -252,7 +256,7 @@ bool CopyJob::fetch(const QString &remote, const QString &local)
         QString("Reading file %1\nfrom instrument %2").arg(entryName(remote), deviceName(*device));
     return transfer(device, label, "Reading file from instrument failed.", [&] {
         const QString source = nativePathOn(*device, remote);
-        return device->readRemoteFile(source, local);
+        return device->readRemoteFile(source, local, m_request.existing);
     });
 }
 

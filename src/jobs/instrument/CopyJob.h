@@ -3,6 +3,8 @@
 
 #include "jobs/ToolJob.h"
 
+#include "base/OutputFile.h"
+
 #include <QList>
 #include <QStringList>
 
@@ -21,6 +23,9 @@ struct CopyRequest
     VisaDevice *targetDevice = nullptr;
     QString targetFolder; ///< ends in "/"; empty for the present one, with a name
     QString targetName{}; ///< of a file at the target; empty for that of the source
+
+    /// What becomes of a local file that appears under the name of the target meanwhile.
+    OutputFile::Existing existing = OutputFile::Existing::Replaced;
 };
 
 /// What a copy asks its user in the middle of the run; an empty function stands for yes.

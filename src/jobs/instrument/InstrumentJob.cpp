@@ -27,6 +27,7 @@ bool InstrumentJob::work()
     if (const QString problem = device.takeLastError(); !problem.isEmpty()) {
         Tracer::Trace(Tracer::Error, problem);
     }
+    device.setTakesInput(true);
     const bool isReady = device.openResource(m_instrument.resource);
     // A cancel from while the instrument was being opened.
     QCoreApplication::processEvents();
@@ -60,6 +61,20 @@ bool InstrumentJob::checked(VisaDevice &device, bool done)
     noteReported(device.takeLastError());
     return Tracer::fail(m_reported.isEmpty() ? QString("The instrument did not do as it was told.")
                                              : "The instrument reports: " + m_reported);
+}
+
+bool InstrumentJob::mayPlay(const QStringList &problems, WaveformCheck check)
+{
+    if (problems.isEmpty()) {
+        return true;
+    }
+    if (check == WaveformCheck::Strict) {
+        return Tracer::fail(problems.join(' '));
+    }
+    for (const QString &problem : problems) {
+        emit report(ReportLine::warning(problem));
+    }
+    return true;
 }
 
 void InstrumentJob::noteReported(const QString &errors)

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "waveformcheck.h"
+
 #include "jobs/ToolJob.h"
 
 #include <QString>
@@ -37,6 +39,10 @@ protected:
     /// True if a command was done and left no error in the instrument's queue, which tells of what
     /// an instrument has refused without an answer; otherwise the reason is logged.
     [[nodiscard]] bool checked(VisaDevice &device, bool done);
+
+    /// Reports why the instrument can't play a waveform. False, with the reason logged, if that is
+    /// a reason to go no further.
+    [[nodiscard]] bool mayPlay(const QStringList &problems, WaveformCheck check);
 
     /// Adds to what the instrument has reported.
     void noteReported(const QString &errors);

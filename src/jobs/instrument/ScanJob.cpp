@@ -59,6 +59,8 @@ LookJob::LookJob(QList<InstrConfigEntry> entries, bool noVisa, QObject *parent)
 bool LookJob::work()
 {
     VisaDevice device(m_noVisa);
+    device.setTakesInput(true);
+    connect(this, &ToolJob::cancelRequested, &device, &VisaDevice::cancel);
     for (qsizetype i = 0; i < m_entries.size() && !isCancelled(); ++i) {
         const InstrConfigEntry &entry = m_entries.at(i);
         emit stepStarted(QString("Looking for the instrument '%1'...")

@@ -1,9 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "StartJob.h"
 
+#include "instrument/GeneratorControl.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
 #include "log/Tracer.h"
+
+#include <QTemporaryFile>
 
 #include <utility>
 
@@ -16,6 +19,9 @@ StartJob::StartJob(InstrumentRef instrument, QString path, int seconds, QObject 
 
 bool StartJob::talk(VisaDevice &device)
 {
+    if (!isFit(device)) {
+        return false;
+    }
     constexpr quint32 AnswerTimeoutMs = 5000;
     const quint32 savedTimeoutMs = device.timeoutMs();
     (void)device.setTimeoutMs(AnswerTimeoutMs);
@@ -24,5 +30,36 @@ bool StartJob::talk(VisaDevice &device)
         Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
     }
     (void)device.setTimeoutMs(savedTimeoutMs);
+    GeneratorState state;
+    if (started && device.readState(state)) {
+        m_isOutputOff = state.output == false;
+    }
+    if (m_isOutputOff) {
+        emit report(ReportLine::warning("The RF output is off."));
+    }
     return started;
+}
+
+/// By the tags, which stand at the beginning of the file.
+bool StartJob::isFit(VisaDevice &device)
+{
+    if (m_check == WaveformCheck::None) {
+        return true;
+    }
+    constexpr qint64 HeadBytes = 64 * 1024;
+    QByteArray head;
+    QTemporaryFile file;
+    if (!device.readRemoteHead(nativePath(m_path, device.pathSeparator()), HeadBytes, head) ||
+        !file.open() || file.write(head) != head.size() || !file.flush()) {
+        return Tracer::fail("The waveform cannot be checked.");
+    }
+    const bool isStrict = m_check == WaveformCheck::Strict;
+    if (!isWaveformHead(head)) {
+        return !isStrict || Tracer::fail(QString("The file '%1' is no waveform.").arg(m_path));
+    }
+    const std::optional<WaveformNeeds> needs = needsOf(file.fileName());
+    if (!needs) {
+        return !isStrict;
+    }
+    return mayPlay(waveformProblems(*needs, summaryOf(device)), m_check);
 }

@@ -15,10 +15,21 @@ public:
     StartJob(InstrumentRef instrument, QString path, int seconds = DefaultSeconds,
              QObject *parent = nullptr);
 
+    /// Looks before the start whether the instrument can play the waveform; by default nobody does.
+    void setCheck(WaveformCheck check) { m_check = check; }
+
+    /// Whether the RF output was off when the waveform was started, so that nothing leaves it. It
+    /// stays as it is.
+    [[nodiscard]] bool isOutputOff() const { return m_isOutputOff; }
+
 protected:
     [[nodiscard]] bool talk(VisaDevice &device) override;
 
 private:
+    [[nodiscard]] bool isFit(VisaDevice &device);
+
     QString m_path;
     int m_seconds;
+    WaveformCheck m_check = WaveformCheck::None;
+    bool m_isOutputOff = false;
 };

@@ -10,37 +10,75 @@
 #include <QDir>
 #include <QFileInfo>
 
+#include <algorithm>
 #include <utility>
 
-TransferJob::TransferJob(InstrumentRef instrument, Direction direction, QString local,
-                         QString remote, QObject *parent)
+TransferJob::TransferJob(InstrumentRef instrument, Request request, QObject *parent)
     : InstrumentJob(std::move(instrument),
-                    direction == Direction::Get ? "Reading file..." : "Sending file...", parent)
-    , m_direction(direction)
-    , m_local(std::move(local))
-    , m_remote(std::move(remote))
+                    request.direction == Direction::Get ? "Reading file..." : "Sending file...",
+                    parent)
+    , m_request(std::move(request))
 {
 }
 
 bool TransferJob::talk(VisaDevice &device)
 {
-    const QFileInfo local(m_local);
+    if (m_request.direction == Direction::Put && !areFit(device)) {
+        return false;
+    }
+    return std::all_of(m_request.locals.cbegin(), m_request.locals.cend(),
+                       [&](const QString &local) { return !isCancelled() && copy(device, local); });
+}
+
+/// Before anything is sent, so that a script knows where it stands after a refusal.
+bool TransferJob::areFit(const VisaDevice &device)
+{
+    if (m_request.check == WaveformCheck::None) {
+        return true;
+    }
+    const InstrumentSummary instrument = summaryOf(device);
+    return std::all_of(
+        m_request.locals.cbegin(), m_request.locals.cend(), [&](const QString &local) {
+            const bool isStrict = m_request.check == WaveformCheck::Strict;
+            if (!isWaveformFile(local)) {
+                return !isStrict || !local.endsWith(".wv", Qt::CaseInsensitive) ||
+                       Tracer::fail(QString("The file '%1' is no waveform.").arg(local));
+            }
+            const std::optional<WaveformNeeds> needs = needsOf(local);
+            if (!needs) {
+                return !isStrict;
+            }
+            QStringList problems = waveformProblems(*needs, instrument);
+            if (m_request.locals.size() > 1) {
+                for (QString &problem : problems) {
+                    problem.prepend(local + ": ");
+                }
+            }
+            return mayPlay(problems, m_request.check);
+        });
+}
+
+bool TransferJob::copy(VisaDevice &device, const QString &localName)
+{
+    const QFileInfo local(localName);
     const QString localFolder = local.absolutePath() + (local.dir().isRoot() ? "" : "/");
-    const QString remote = slashPath(m_remote, device.pathSeparator());
+    const QString remote = slashPath(m_request.remote, device.pathSeparator());
     CopyRequest request;
-    if (m_direction == Direction::Get) {
+    if (m_request.direction == Direction::Get) {
         if (!QFileInfo(localFolder).isDir()) {
             return Tracer::fail(QString("The folder '%1' does not exist.").arg(localFolder));
         }
         request = {.sourceDevice = &device,
                    .source = remote,
                    .targetFolder = localFolder,
-                   .targetName = local.fileName()};
+                   .targetName = local.fileName(),
+                   .existing = m_request.existing};
     } else {
+        const QString name = remote.mid(folderOf(remote).size());
         request = {.source = localFolder + local.fileName(),
                    .targetDevice = &device,
                    .targetFolder = folderOf(remote),
-                   .targetName = remote.mid(folderOf(remote).size())};
+                   .targetName = name.isEmpty() ? local.fileName() : name};
     }
     CopyJob copy(request);
     connect(&copy, &ToolJob::stepStarted, this, &ToolJob::stepStarted);

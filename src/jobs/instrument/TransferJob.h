@@ -3,8 +3,12 @@
 
 #include "InstrumentJob.h"
 
-/// Copies one file between the disk and an instrument by a CopyJob, under a name of its own at the
-/// target.
+#include "base/OutputFile.h"
+
+#include <QStringList>
+
+/// Copies files between the disk and an instrument by a CopyJob for each, under a name of its own
+/// at the target.
 class TransferJob final : public InstrumentJob
 {
     Q_OBJECT
@@ -12,16 +16,26 @@ class TransferJob final : public InstrumentJob
 public:
     enum class Direction { Get, Put };
 
-    /// `remote` with "/" or as the instrument writes it. An existing file is replaced on either
-    /// side; a local one stays as it was after a failure.
-    TransferJob(InstrumentRef instrument, Direction direction, QString local, QString remote,
-                QObject *parent = nullptr);
+    struct Request
+    {
+        Direction direction = Direction::Get;
+        QStringList locals; ///< one to be written, or those to be sent
+        QString remote; ///< with "/" or as the instrument writes it; a folder ends in a separator
+        /// Of a local file. A remote one is replaced.
+        OutputFile::Existing existing = OutputFile::Existing::Replaced;
+        /// Of the waveforms to be sent.
+        WaveformCheck check = WaveformCheck::None;
+    };
+
+    /// A local file stays as it was after a failure.
+    TransferJob(InstrumentRef instrument, Request request, QObject *parent = nullptr);
 
 protected:
     [[nodiscard]] bool talk(VisaDevice &device) override;
 
 private:
-    Direction m_direction;
-    QString m_local;
-    QString m_remote;
+    [[nodiscard]] bool areFit(const VisaDevice &device);
+    [[nodiscard]] bool copy(VisaDevice &device, const QString &localName);
+
+    Request m_request;
 };

@@ -1,0 +1,99 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "waveformcheck.h"
+
+#include "base/EngineeringNumber.h"
+#include "instrument/instrumentmodels.h"
+#include "log/Tracer.h"
+#include "wvfile/HvFileIO.h"
+
+#include <QFile>
+
+#include <algorithm>
+
+namespace {
+
+QStringList problemsOn(const WaveformNeeds &needs, const BasebandLimits &limits,
+                       const QString &owner)
+{
+    QStringList problems;
+    if (limits.size > 0 && needs.samples > limits.size) {
+        problems.append(QString("The waveform has %1 samples; the memory of %2 takes %3.")
+                            .arg(needs.samples)
+                            .arg(owner)
+                            .arg(limits.size));
+    }
+    if (needs.clockHz > limits.clock) {
+        problems.append(QString("The clock of the waveform is %1; %2 plays at most %3.")
+                            .arg(engineeringText(needs.clockHz, "Hz"), owner,
+                                 engineeringText(limits.clock, "Hz")));
+    }
+    if (needs.clockHz > limits.bandwidth) {
+        problems.append(QString("At its clock of %1 the waveform may reach beyond the bandwidth of "
+                                "%2, which is %3.")
+                            .arg(engineeringText(needs.clockHz, "Hz"), owner,
+                                 engineeringText(limits.bandwidth, "Hz")));
+    }
+    return problems;
+}
+
+} // namespace
+
+bool isWaveformHead(const QByteArray &head)
+{
+    return head.trimmed().toUpper().startsWith("{TYPE");
+}
+
+bool isWaveformFile(const QString &fileName)
+{
+    constexpr qint64 HeadBytes = 64;
+    QFile file(fileName);
+    return file.open(QIODevice::ReadOnly) && isWaveformHead(file.read(HeadBytes));
+}
+
+std::optional<WaveformNeeds> needsOf(const QString &fileName)
+{
+    if (!isWaveformFile(fileName)) {
+        Tracer::Trace(Tracer::Error, QString("The file '%1' is no waveform.").arg(fileName));
+        return std::nullopt;
+    }
+    WvFileSummary summary;
+    if (!HvFileIO().readWaveformInfo(fileName, &summary)) {
+        return std::nullopt;
+    }
+    return WaveformNeeds{.samples = std::max<qint64>(summary.samples, 0),
+                         .clockHz = std::max(summary.clock, 0.0)};
+}
+
+QStringList waveformProblems(const WaveformNeeds &needs, const InstrumentSummary &instrument)
+{
+    if (instrument.analyzer) {
+        return {QString("The %1 is an analyzer, which plays no waveforms.").arg(instrument.model)};
+    }
+    if (needs.samples <= 0) {
+        return {"The waveform has no samples."};
+    }
+    std::optional<QStringList> fewest;
+    for (size_t i = 0; i < instrument.baseband.size(); ++i) {
+        if (const auto &limits = instrument.baseband[i]) {
+            const QString owner = QString("baseband %1 of the %2").arg(i + 1).arg(instrument.model);
+            const QStringList problems = problemsOn(needs, *limits, owner);
+            if (!fewest || problems.size() < fewest->size()) {
+                fewest = problems;
+            }
+        }
+    }
+    return fewest.value_or(QStringList());
+}
+
+std::optional<InstrumentSummary> summaryOfModel(const QString &model)
+{
+    const int index = findModel(model.toUpper());
+    if (index == NoModel) {
+        return std::nullopt;
+    }
+    InstrumentSummary summary;
+    summary.model = modelRow(index)->name;
+    summary.analyzer = modelRow(index)->analyzer;
+    summary.baseband[0] = largestBasebandOf(index);
+    return summary;
+}

@@ -1,0 +1,42 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "instrument/InstrumentSummary.h"
+
+#include <QByteArray>
+#include <QString>
+#include <QStringList>
+
+#include <optional>
+
+/// What is done about a waveform that an instrument can't play.
+enum class WaveformCheck {
+    None,   ///< nobody looks
+    Warned, ///< told, and no obstacle
+    Strict, ///< told, and nothing is sent or started
+};
+
+/// What counts of a waveform for an instrument that is to play it.
+struct WaveformNeeds
+{
+    qint64 samples = 0;
+    double clockHz = 0; ///< 0: not known
+};
+
+/// Whether the first bytes of a file are those of a waveform.
+[[nodiscard]] bool isWaveformHead(const QByteArray &head);
+
+/// The same for a file, without a word on one that is none or can't be read.
+[[nodiscard]] bool isWaveformFile(const QString &fileName);
+
+/// Of a waveform file; nothing, with the reason logged, if it is none.
+[[nodiscard]] std::optional<WaveformNeeds> needsOf(const QString &fileName);
+
+/// Why the instrument can't play a waveform: one text for each limit of its basebands that is
+/// broken, of the baseband that comes nearest where there are two. Empty where it can, or where
+/// nobody knows its limits.
+[[nodiscard]] QStringList waveformProblems(const WaveformNeeds &needs,
+                                           const InstrumentSummary &instrument);
+
+/// A model with the largest basebands that it is sold with. Nothing if there is no such model.
+[[nodiscard]] std::optional<InstrumentSummary> summaryOfModel(const QString &model);
