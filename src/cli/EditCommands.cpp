@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "RangeArguments.h"
 #include "commands.h"
 
+#include "jobs/CropJob.h"
 #include "jobs/LevelJob.h"
 #include "jobs/ResampleJob.h"
 
@@ -69,11 +71,43 @@ void addResample(CommandSet &commands)
     addOutputArguments(command, resample->output);
 }
 
+struct CropArguments
+{
+    Console &console;
+    CropRequest request;
+    OutputArguments output;
+};
+
+int runCrop(CropArguments &arguments)
+{
+    int exitCode = ExitDone;
+    if (!rangeFits(arguments.console, arguments.request.range, exitCode)) {
+        return exitCode;
+    }
+    if (!mayWrite(arguments.console, arguments.output.options.fileName, arguments.output.force)) {
+        return arguments.console.failed();
+    }
+    arguments.request.output = arguments.output.options;
+    CropJob job(arguments.request);
+    return arguments.console.run(job);
+}
+
+void addCrop(CommandSet &commands)
+{
+    auto crop = std::make_shared<CropArguments>(CropArguments{commands.console, {}, {}});
+    CLI::App &command = addCommand<CropArguments>(commands.app, "crop",
+                                                  "Cut a piece out of a waveform as it stands",
+                                                  commands.action, crop, runCrop);
+    addRange(command, crop->request.range);
+    addOutputArguments(command, crop->output);
+}
+
 } // namespace
 
 void addEditCommands(CommandSet &commands)
 {
     addResample(commands);
+    addCrop(commands);
     auto level = std::make_shared<LevelArguments>(LevelArguments{commands.console, {}, {}});
     CLI::App &command = addCommand<LevelArguments>(
         commands.app, "level", "Copy a waveform with new level tags, its samples untouched",

@@ -5,9 +5,10 @@
 #include "commands.h"
 
 #include "base/OutputFile.h"
+#include "jobs/CheckJob.h"
 #include "jobs/DumpJob.h"
+#include "jobs/ExportJob.h"
 #include "jobs/InfoReport.h"
-#include "wvfile/HvFileIO.h"
 
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -19,7 +20,32 @@ struct InfoArguments
     Console &console;
     std::vector<std::string> files;
     bool json = false;
+    bool check = false;
 };
+
+/// Scans, and checks if wanted, one file into the two forms of the listing.
+int listFile(InfoArguments &arguments, const QString &fileName, QJsonArray &objects,
+             QByteArray &text)
+{
+    WvFileSummary summary;
+    if (!scanWaveform(fileName, summary)) {
+        return ExitFailed;
+    }
+    QJsonObject object = infoJson(summary);
+    std::optional<WaveformCheck> check;
+    if (arguments.check) {
+        CheckJob job(fileName);
+        if (const int code = arguments.console.run(job); code != ExitDone) {
+            return code;
+        }
+        check = job.result();
+        object["check"] = checkJson(*check);
+    }
+    objects.append(object);
+    text +=
+        (text.isEmpty() ? "" : "\n") + infoText(summary, check ? &*check : nullptr).toLocal8Bit();
+    return ExitDone;
+}
 
 int runInfo(InfoArguments &arguments)
 {
@@ -27,16 +53,16 @@ int runInfo(InfoArguments &arguments)
     QJsonArray objects;
     QByteArray text;
     for (const std::string &name : arguments.files) {
-        WvFileSummary summary;
         const QString fileName = QString::fromLocal8Bit(name);
-        if (!HvFileIO().readWaveformInfo(fileName, &summary)) {
-            // The scan's own words don't name the file, of which there may be many.
+        const int code = listFile(arguments, fileName, objects, text);
+        if (code == ExitCancelled) {
+            return code;
+        }
+        if (code != ExitDone) {
+            // The reason in the log doesn't name the file, of which there may be many.
             arguments.console.error(fileName + ": " + arguments.console.lastReason());
             allScanned = false;
-            continue;
         }
-        objects.append(infoJson(summary));
-        text += (text.isEmpty() ? "" : "\n") + infoText(summary).toLocal8Bit();
     }
     const bool printed =
         arguments.console.print(arguments.json ? QJsonDocument(objects).toJson() : text);
@@ -84,6 +110,59 @@ int runDump(DumpArguments &arguments)
     return console.run(job);
 }
 
+struct ExportArguments
+{
+    Console &console;
+    ExportRequest request;
+    int type = 0;
+    CLI::Option *typeOption = nullptr;
+    bool force = false;
+};
+
+int runExport(ExportArguments &arguments)
+{
+    Console &console = arguments.console;
+    ExportRequest &request = arguments.request;
+    if (*arguments.typeOption) {
+        request.type = static_cast<ExportType>(arguments.type);
+    }
+    request.overwrite = arguments.force;
+    if (const QString problem = exportProblem(request); !problem.isEmpty()) {
+        return console.wrongUsage(problem);
+    }
+    int exitCode = ExitDone;
+    if (!rangeFits(console, request.range, exitCode)) {
+        return exitCode;
+    }
+    for (const QString &file : exportedFiles(request.outputFile)) {
+        if (!mayWrite(console, file, arguments.force) ||
+            !isNoSource(console, file, request.range.fileName)) {
+            return console.failed();
+        }
+    }
+    ExportJob job(request);
+    return console.run(job);
+}
+
+void addExport(CommandSet &commands)
+{
+    auto exported =
+        std::make_shared<ExportArguments>(ExportArguments{commands.console, {}, 0, nullptr, false});
+    CLI::App &command =
+        addCommand<ExportArguments>(commands.app, "export", "Write a waveform for other programs",
+                                    commands.action, exported, runExport);
+    addRange(command, exported->request.range);
+    addOutputFile(command, exported->request.outputFile,
+                  "File to write; its suffix tells the format: .wav, .cf32, .cs16, .csv, .mat, or "
+                  ".sigmf-meta with .sigmf-data beside it")
+        ->required();
+    exported->typeOption = addChoice(
+        command, "--type", exported->type, exportTypeNames(),
+        "Form of a value: 32-bit float, 16 or 24 bits, for .wav and .sigmf-meta (default: "
+        "s16)");
+    command.add_flag("--force", exported->force, "Overwrite existing files");
+}
+
 } // namespace
 
 void addFileCommands(CommandSet &commands)
@@ -93,6 +172,8 @@ void addFileCommands(CommandSet &commands)
         commands.app, "info", "Show the tags of waveform files", commands.action, info, runInfo);
     infoCommand.add_option("files", info->files, "Waveform files")->required()->type_name("FILE");
     infoCommand.add_flag("--json", info->json, "Print one JSON array");
+    infoCommand.add_flag("--check", info->check,
+                         "Read the samples, too: complete, levels as measured, loop point");
 
     auto dump = std::make_shared<DumpArguments>(DumpArguments{commands.console, {}, 0, {}});
     CLI::App &dumpCommand = addCommand<DumpArguments>(commands.app, "dump", "Write out samples",
@@ -102,4 +183,5 @@ void addFileCommands(CommandSet &commands)
               "Form of the samples (default: csv)");
     addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)");
     dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
+    addExport(commands);
 }

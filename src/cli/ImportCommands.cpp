@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "CliOptions.h"
 #include "Console.h"
+#include "ImportArguments.h"
 #include "commands.h"
 
 #include "base/EngineeringNumber.h"
@@ -21,76 +21,6 @@
 
 namespace {
 
-/// What all imports take.
-struct ImportArguments
-{
-    explicit ImportArguments(Console &theConsole)
-        : console(theConsole)
-    {
-    }
-
-    Console &console;
-    QString inputFile;
-    std::optional<double> clockHz;
-    int scaling = static_cast<int>(ImportScaling::Down);
-    CLI::Option *scalingOption = nullptr;
-    bool list = false;
-    bool json = false;
-    OutputArguments output;
-
-    [[nodiscard]] ImportTarget target() const
-    {
-        ImportTarget target;
-        target.output = output.options;
-        target.scaling = static_cast<ImportScaling>(scaling);
-        target.clockHz = clockHz.value_or(target.clockHz);
-        return target;
-    }
-};
-
-/// Adds the options of all imports; `clockHelp` tells the default of the clock.
-void addImportOptions(CLI::App &command, ImportArguments &arguments, const std::string &fileHelp,
-                      const std::string &clockHelp)
-{
-    addText(command, "file", arguments.inputFile, fileHelp)->required();
-    addNumber(command, "--clock", arguments.clockHz,
-              {"Hz", ImportTarget::MinClockHz, ImportTarget::MaxClockHz},
-              "Clock of the waveform" + clockHelp);
-    arguments.scalingOption = addChoice(command, "--scaling", arguments.scaling,
-                                        {"none", "down", "auto"}, "Level scaling (default: down)");
-    addOutputArguments(command, arguments.output);
-}
-
-void addListOptions(CLI::App &command, ImportArguments &arguments)
-{
-    command.add_flag("--list", arguments.list, "Show what the file holds instead of importing it");
-    command.add_flag("--json", arguments.json, "With --list: print JSON");
-    // A listing writes nothing.
-    command.get_option("--output")->required(false);
-}
-
-/// Whether the output may be written; if not, `exitCode` tells how to end.
-bool outputStands(ImportArguments &arguments, int &exitCode)
-{
-    if (arguments.output.options.fileName.isEmpty()) {
-        exitCode = arguments.console.wrongUsage("--output is required");
-        return false;
-    }
-    if (!mayWrite(arguments.console, arguments.output.options.fileName, arguments.output.force)) {
-        exitCode = arguments.console.failed();
-        return false;
-    }
-    return true;
-}
-
-/// Prints a listing in the form that was asked for.
-int printList(ImportArguments &arguments, const QJsonDocument &json, const QString &text)
-{
-    return arguments.console.print(arguments.json ? json.toJson() : text.toLocal8Bit())
-               ? ExitDone
-               : arguments.console.failed();
-}
-
 int listWav(ImportArguments &arguments)
 {
     WavFileAccess file;
@@ -104,11 +34,15 @@ int listWav(ImportArguments &arguments)
                                                {"playTime", header->playTime()},
                                                {"channels", header->channels},
                                                {"bits", header->bitsPerSample},
-                                               {"float", false}}),
-                     QString("Sample Rate: %1\nSamples:     %2\nPlay Time:   %3\n")
+                                               {"float", header->isFloat}}),
+                     QString("Sample Rate: %1\nSamples:     %2\nPlay Time:   %3\n"
+                             "Channels:    %4\nBits:        %5%6\n")
                          .arg(engineeringText(header->sampleRate, "Hz"))
                          .arg(header->samples())
-                         .arg(engineeringText(header->playTime(), "s")));
+                         .arg(engineeringText(header->playTime(), "s"))
+                         .arg(header->channels)
+                         .arg(header->bitsPerSample)
+                         .arg(header->isFloat ? ", float" : ""));
 }
 
 int runWav(ImportArguments &arguments)
@@ -479,7 +413,7 @@ void addWavCommand(CLI::App &import, CommandSet &commands)
 {
     auto wav = std::make_shared<ImportArguments>(commands.console);
     CLI::App &command = addCommand<ImportArguments>(
-        import, "wav", "Import a stereo WAVE file, I on the left and Q on the right channel",
+        import, "wav", "Import a WAVE file: I is the left or only channel, Q the right one",
         commands.action, wav, runWav);
     addImportOptions(command, *wav, "WAVE file to read", " (default: the file's sample rate)");
     addListOptions(command, *wav);
@@ -495,4 +429,5 @@ void addImportCommands(CommandSet &commands)
     addMatCommand(*import, commands);
     addRiqCommand(*import, commands);
     addWavCommand(*import, commands);
+    addSigmfCommand(*import, commands);
 }

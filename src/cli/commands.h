@@ -27,4 +27,5 @@ void addImportCommands(CommandSet &commands);
 void addComposeCommand(CommandSet &commands);
 void addCheckCommand(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);
+void addSigmfCommand(CLI::App &import, CommandSet &commands);
 void addCaptureCommand(CLI::App &instr, CommandSet &commands);

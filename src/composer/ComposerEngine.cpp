@@ -371,5 +371,9 @@ bool ComposerEngine::scaleAndSave(BufferedIO &data, BufferedIO &markers, const L
         emit errorMessage(QStringLiteral("Waveform generation failed"));
         return Tracer::fail("Waveform generation failed.");
     }
+    emit message(QStringLiteral("Loop point: ") + loopText(job.loop));
+    if (!job.loop.isContinuous) {
+        emit warningMessage(loopWarning(job.loop));
+    }
     return true;
 }

@@ -4,12 +4,10 @@
 #include "MatSource.h"
 #include "matelements.h"
 
+#include "base/freespace.h"
 #include "log/Tracer.h"
 #include "streams/TempStream.h"
 #include "streams/samplestream.h"
-
-#include <QDir>
-#include <QStorageInfo>
 
 #include <algorithm>
 #include <array>
@@ -64,19 +62,6 @@ QString refusal(const MatEntry &entry)
         return "Length of real and imaginary data do not match.";
     }
     return {};
-}
-
-/// Whether the temporary folder has room for the samples and, on their way, the real parts.
-bool hasRoomFor(qint64 samples)
-{
-    const qint64 needed = samples * (BufferedIO::RecordSize + qint64(sizeof(float)));
-    const QStorageInfo storage(QDir::tempPath());
-    return !storage.isValid() || storage.bytesAvailable() >= needed ||
-           Tracer::fail(QString("Not enough space in the temporary folder '%1': %2 bytes are "
-                                "needed, %3 are free.")
-                            .arg(QDir::tempPath())
-                            .arg(needed)
-                            .arg(storage.bytesAvailable()));
 }
 
 } // namespace
@@ -380,7 +365,8 @@ bool MatFileAccess::readVariable(const QString &name, BufferedIO *stream, qint64
     if (!entry->compressed) {
         return Tracer::fail("TO DO: !!! Evaluate data of uncompressed elements !!!");
     }
-    if (!hasRoomFor(samples)) {
+    // The samples and, on their way, the real parts.
+    if (!hasTemporaryRoomFor(samples * (BufferedIO::RecordSize + qint64(sizeof(float))))) {
         return false;
     }
     if (!stream->writeHeader(BufferedIO::DataHeader)) {

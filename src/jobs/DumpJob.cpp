@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DumpJob.h"
 
-#include "base/ProgressClock.h"
+#include "samplepass.h"
+
 #include "base/parallel.h"
-#include "log/Tracer.h"
 #include "wvfile/SampleCoding.h"
 
 #include <QtEndian>
@@ -15,8 +15,6 @@
 #include <vector>
 
 namespace {
-
-constexpr qint64 BlockSamples = 16 * 1024;
 
 /// The shortest form of up to nine significant digits: enough to tell any two floats apart.
 void appendNumber(QByteArray &line, float value)
@@ -71,11 +69,11 @@ DumpJob::DumpJob(SampleRange range, DumpFormat format, Sink sink, QObject *paren
 {
 }
 
-QByteArray DumpJob::encode(qint64 begin, std::span<const float> values,
-                           std::span<const char> markers) const
+QByteArray encodeSamples(DumpFormat format, qint64 begin, std::span<const float> values,
+                         std::span<const char> markers)
 {
     QByteArray bytes;
-    switch (m_format) {
+    switch (format) {
     case DumpFormat::Csv:
         return toCsv(begin, values, markers);
     case DumpFormat::Cf32:
@@ -92,36 +90,14 @@ QByteArray DumpJob::encode(qint64 begin, std::span<const float> values,
 
 bool DumpJob::process(SourceWaveform &source, qint64 begin, qint64 count)
 {
-    if (!source.data()->restartAtPosition(BufferedIO::HeaderSize +
-                                          begin * BufferedIO::RecordSize) ||
-        !source.markers()->restartAtPosition(begin)) {
-        return Tracer::fail("Cannot set I/Q data stream start position.");
-    }
-    if (m_format == DumpFormat::Csv && !m_sink("sample,i,q,markers\n")) {
+    if (m_format == DumpFormat::Csv && !m_sink(CsvHeading)) {
         return false;
     }
     emit stepStarted("Writing Samples...");
-    ProgressClock progress([this](int percent) { emit ProgressUpdate(percent); }, cancelFlag());
-    std::vector<float> values(2 * static_cast<size_t>(std::min(count, BlockSamples)));
-    std::vector<char> markers(values.size() / 2);
-    for (qint64 done = 0; done < count;) {
-        if (progress.shouldStop(done, count)) {
-            return Tracer::fail("Action aborted by user.");
-        }
-        const auto wanted = static_cast<int>(std::min(count - done, BlockSamples));
-        const int bytes = wanted * BufferedIO::RecordSize;
-        if (source.data()->readBlock(bytes, values.data()) != bytes ||
-            source.markers()->readBlock(wanted, markers.data()) != wanted) {
-            return Tracer::fail("Cannot read I/Q data.");
-        }
-        const auto samples = static_cast<size_t>(wanted);
-        if (!m_sink(encode(begin + done, std::span(values).first(2 * samples),
-                           std::span(markers).first(samples)))) {
-            return false;
-        }
-        done += wanted;
-    }
-    // A cancel that came with the last samples counts, too.
-    ProgressClock::runEvents();
-    return mayProceed() && (!m_finish || m_finish());
+    return passSamples(
+               *this, source, begin, count,
+               [this](std::span<const float> values, std::span<const char> markers, qint64 first) {
+                   return m_sink(encodeSamples(m_format, first, values, markers));
+               }) &&
+           (!m_finish || m_finish());
 }

@@ -12,6 +12,14 @@ enum class DumpFormat {
     Ci16, ///< interleaved 16-bit integers as the writer codes them, little-endian
 };
 
+/// The first line of the CSV form.
+inline constexpr char CsvHeading[] = "sample,i,q,markers\n";
+
+/// Samples in one of the forms; `begin` is the number of the first one.
+[[nodiscard]] QByteArray encodeSamples(DumpFormat format, qint64 begin,
+                                       std::span<const float> values,
+                                       std::span<const char> markers);
+
 /// Writes out a range of samples.
 class DumpJob : public SampleReadJob
 {
@@ -31,9 +39,6 @@ protected:
     [[nodiscard]] bool process(SourceWaveform &source, qint64 begin, qint64 count) override;
 
 private:
-    [[nodiscard]] QByteArray encode(qint64 begin, std::span<const float> values,
-                                    std::span<const char> markers) const;
-
     DumpFormat m_format;
     Sink m_sink;
     std::function<bool()> m_finish;

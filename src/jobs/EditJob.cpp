@@ -55,7 +55,7 @@ SampleReading EditJob::sampleReading() const
     const bool overwritten =
         isSameFile(m_inputFile, m_output.fileName()) &&
         !QFileInfo(QFileInfo(m_output.fileName()).canonicalPath()).isWritable();
-    return overwritten ? SampleReading::Unpacked : SampleReading::Measured;
+    return overwritten ? SampleReading::Unpacked : wantedReading();
 }
 
 QString EditJob::refusal() const

@@ -34,6 +34,10 @@ protected:
     /// levels, comment, copyright.
     [[nodiscard]] virtual bool edit() = 0;
 
+    /// How far the source is to be read; without its levels the record of the output has none
+    /// either.
+    [[nodiscard]] virtual SampleReading wantedReading() const { return SampleReading::Measured; }
+
     [[nodiscard]] SourceWaveform &source() { return m_loaded ? *m_loaded : m_source; }
     [[nodiscard]] WaveformOutput &output() { return m_output; }
     [[nodiscard]] const QString &inputFile() const { return m_inputFile; }

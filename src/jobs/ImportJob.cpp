@@ -79,13 +79,21 @@ bool ImportJob::work()
     m_output.setLength(m_clockHz, *samples);
     m_output.reportLevels();
     reportSaving();
-    return m_output.save({.data = data.stream()}, "Creating Waveform File...");
+    return m_output.save({.data = data.stream(), .markers = foundMarkers(), .tags = unknownTags()},
+                         "Creating Waveform File...");
 }
 
 void ImportJob::reportSaving()
 {
     emit report(ReportLine::heading("Saving"));
     m_output.reportFile();
+}
+
+void ImportJob::keepLevelUnlessAuto()
+{
+    if (m_target.scaling == ImportScaling::Down) {
+        m_target.scaling = ImportScaling::None;
+    }
 }
 
 bool ImportJob::scale(TempStream &data, qint64 samples)

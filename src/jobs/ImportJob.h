@@ -54,6 +54,13 @@ protected:
     /// Brings the samples to their final level, sets the levels of the output and reports them.
     [[nodiscard]] virtual bool scale(TempStream &data, qint64 samples);
 
+    /// Markers and unknown tags that readInput() has found beside the samples; null without any.
+    [[nodiscard]] virtual BufferedIO *foundMarkers() { return nullptr; }
+    [[nodiscard]] virtual BufferedIO *unknownTags() { return nullptr; }
+
+    /// The samples fit as they stand: only a scaling to full scale that was asked for is done.
+    void keepLevelUnlessAuto();
+
     /// Reports what comes before the file is written.
     virtual void reportSaving();
 

@@ -1,8 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "InfoReport.h"
 
-#include "base/EngineeringNumber.h"
+#include "CheckJob.h"
+#include "ReportText.h"
 
+#include "base/EngineeringNumber.h"
+#include "log/Tracer.h"
+#include "wvfile/HvFileIO.h"
+#include "wvfile/foreignfile.h"
+
+#include <QFile>
 #include <QJsonArray>
 
 #include <algorithm>
@@ -39,10 +46,14 @@ QJsonValue knownOrNull(double value)
 QString samplesText(const WvFileSummary &summary)
 {
     const QString count = known(static_cast<double>(summary.samples));
-    return summary.missingSamples == 0
-               ? count
-               : QString("%1, the file is cut off: %2 are missing")
-                     .arg(count, engineeringText(static_cast<double>(summary.missingSamples)));
+    if (!summary.isCutOff) {
+        return count;
+    }
+    return QString("%1the file is cut off: %2 missing")
+        .arg(count.isEmpty() ? count : count + ", ",
+             summary.missingSamples > 0
+                 ? engineeringText(static_cast<double>(summary.missingSamples)) + " are"
+                 : QString("all are"));
 }
 
 InfoRow detail(const QString &label, const QString &value)
@@ -96,10 +107,28 @@ QList<InfoRow> segmentRows(const WvFileSummary &summary)
     return rows;
 }
 
-QString infoText(const WvFileSummary &summary)
+QList<InfoRow> checkRows(const WaveformCheck &check)
+{
+    QList<InfoRow> rows{{"Complete", yesNo(check.isComplete)}};
+    if (check.samples > 0) {
+        const auto measured = [](double value) {
+            return QString::asprintf("%.2f dB", writtenDb(value));
+        };
+        rows << InfoRow{"Peak Offset (Measured)", measured(check.peakOffset)}
+             << InfoRow{"Peak / RMS (Measured)", measured(check.rmsOffset - check.peakOffset)}
+             << InfoRow{"Values At Full Scale", QString::number(check.clipped)}
+             << InfoRow{"Loop Point", loopText(check.loop)};
+    }
+    return rows;
+}
+
+QString infoText(const WvFileSummary &summary, const WaveformCheck *check)
 {
     QList<InfoRow> rows{{"File", summary.fileName}};
     rows += fileRows(summary);
+    if (check != nullptr) {
+        rows += checkRows(*check);
+    }
     rows += segmentRows(summary);
     qsizetype width = 0;
     for (InfoRow &row : rows) {
@@ -151,4 +180,41 @@ QJsonObject infoJson(const WvFileSummary &summary)
         {"segmentCount", summary.segmentCount},
         {"segments", segments},
     };
+}
+
+QJsonObject checkJson(const WaveformCheck &check)
+{
+    const auto figure = [&check](const QJsonValue &value) {
+        return check.samples > 0 ? value : QJsonValue(QJsonValue::Null);
+    };
+    return {
+        {"complete", check.isComplete},
+        {"peakOffset", figure(check.peakOffset)},
+        {"rmsOffset", figure(check.rmsOffset)},
+        {"crest", figure(check.rmsOffset - check.peakOffset)},
+        {"clipped", figure(check.clipped)},
+        {"loopMagnitudeStep", figure(check.loop.magnitudeStepDb)},
+        {"loopPhaseStep", figure(check.loop.phaseStepDegrees)},
+        {"loopContinuous", figure(check.loop.isContinuous)},
+    };
+}
+
+bool scanWaveform(const QString &fileName, WvFileSummary &summary)
+{
+    const bool scanned = HvFileIO().readWaveformInfo(fileName, &summary);
+    if (scanned && !summary.typeText.isEmpty()) {
+        return true;
+    }
+    if (const QString kind = foreignKind(fileName); !kind.isEmpty()) {
+        return Tracer::fail(QString("This is no waveform file: it is %1.").arg(kind));
+    }
+    if (scanned) {
+        return Tracer::fail("This is no waveform file: it has no TYPE tag.");
+    }
+    // A whole one ends with the brace of a tag.
+    QFile file(fileName);
+    if (file.open(QIODevice::ReadOnly) && file.seek(file.size() - 1) && file.read(1) != "}") {
+        return Tracer::fail("The file is cut off within its tags.");
+    }
+    return false;
 }

@@ -7,6 +7,8 @@
 #include <QList>
 #include <QString>
 
+struct WaveformCheck;
+
 /// One row of the information report.
 struct InfoRow
 {
@@ -27,8 +29,18 @@ struct InfoRow
 /// The rows on the segments of a multi-segment waveform; empty for a plain one.
 [[nodiscard]] QList<InfoRow> segmentRows(const WvFileSummary &summary);
 
-/// The report as plain text, one row a line.
-[[nodiscard]] QString infoText(const WvFileSummary &summary);
+/// The rows on what the samples were measured to be.
+[[nodiscard]] QList<InfoRow> checkRows(const WaveformCheck &check);
+
+/// The report as plain text, one row a line, with the rows of the check if there is one.
+[[nodiscard]] QString infoText(const WvFileSummary &summary, const WaveformCheck *check = nullptr);
 
 /// The summary under the names of its fields.
 [[nodiscard]] QJsonObject infoJson(const WvFileSummary &summary);
+
+/// The check under the names that scripts know; figures without samples are null.
+[[nodiscard]] QJsonObject checkJson(const WaveformCheck &check);
+
+/// Scans the tags of a file. False, with the reason logged, if they can't be read, or if the file
+/// is no waveform, of which the reason says what it is.
+[[nodiscard]] bool scanWaveform(const QString &fileName, WvFileSummary &summary);

@@ -42,6 +42,15 @@ ReportLines waveformRows(const QString &fileName, const WvWriteJob &waveform)
            levelRows(waveform);
 }
 
+QString clippingText(qint64 clipped, qint64 values, double largest)
+{
+    return QString("%1 of %2 values clipped, largest %3 dB above full scale. "
+                   "Lower the level to keep the signal undistorted.")
+        .arg(clipped)
+        .arg(values)
+        .arg(20 * std::log10(std::max(largest, 1.0)), 0, 'f', 2);
+}
+
 QString plainLine(const ReportLine &line)
 {
     QString text = line.kind == ReportLine::Kind::Row ? line.text + ' ' + line.value : line.text;

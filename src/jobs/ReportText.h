@@ -18,6 +18,10 @@ struct WvWriteJob;
 /// File, clock, and the rows of levelRows: what a tool says of a file that it reads or writes.
 [[nodiscard]] ReportLines waveformRows(const QString &fileName, const WvWriteJob &waveform);
 
+/// That so many of `values` values were clipped; `largest` is their largest magnitude, of full
+/// scale 1.
+[[nodiscard]] QString clippingText(qint64 clipped, qint64 values, double largest);
+
 /// A report line for a terminal.
 [[nodiscard]] QString plainLine(const ReportLine &line);
 

@@ -14,7 +14,7 @@ struct WavImportRequest
     bool clockFromFile = true; ///< the file's sample rate, held to the permitted clocks
 };
 
-/// Makes a waveform from a stereo WAVE file.
+/// Makes a waveform from a WAVE file.
 class WavImportJob : public ImportJob
 {
     Q_OBJECT

@@ -10,21 +10,7 @@
 #include "wvfile/HvFileIO.h"
 
 #include <algorithm>
-#include <cmath>
 #include <utility>
-
-namespace {
-
-QString clippingText(const WvWriteJob &record)
-{
-    return QString("%1 of %2 values clipped, largest %3 dB above full scale. "
-                   "Lower the level to keep the signal undistorted.")
-        .arg(record.clippedValues)
-        .arg(2 * static_cast<qint64>(record.samples))
-        .arg(20 * std::log10(std::max(record.largestValue, 1.0)), 0, 'f', 2);
-}
-
-} // namespace
 
 WaveformOutput::WaveformOutput(ToolJob &job, OutputOptions options)
     : m_job(job)
@@ -83,18 +69,28 @@ bool WaveformOutput::save(const WvStreams &streams, const QString &stepLabel)
     m_record.clippedValues += m_clipped.values;
     m_record.largestValue = std::max(m_record.largestValue, m_clipped.largest);
     if (m_record.clippedValues > 0) {
-        emit m_job.report(ReportLine::warning(clippingText(m_record)));
+        emit m_job.report(ReportLine::warning(
+            clippingText(m_record.clippedValues, 2 * static_cast<qint64>(m_record.samples),
+                         m_record.largestValue)));
     }
-    if (!writerClipped || m_levelsAsStated || streams.data == nullptr) {
-        return true;
+    if (writerClipped && !m_levelsAsStated && streams.data != nullptr) {
+        // The tags come before the samples in the file, so they are known too late only here.
+        if (!measureClipped(*streams.data) || !write(streams, stepLabel)) {
+            return false;
+        }
+        emit m_job.report(ReportLine::plain("Levels after clipping"));
+        reportLevels();
     }
-    // The tags come before the samples in the file, so they are known too late only here.
-    if (!measureClipped(*streams.data) || !write(streams, stepLabel)) {
-        return false;
-    }
-    emit m_job.report(ReportLine::plain("Levels after clipping"));
-    reportLevels();
+    reportLoop();
     return true;
+}
+
+void WaveformOutput::reportLoop()
+{
+    emit m_job.report(ReportLine::plain("Loop point: " + loopText(m_record.loop)));
+    if (!m_record.loop.isContinuous) {
+        emit m_job.report(ReportLine::warning(loopWarning(m_record.loop)));
+    }
 }
 
 bool WaveformOutput::write(const WvStreams &streams, const QString &stepLabel)

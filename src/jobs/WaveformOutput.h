@@ -47,7 +47,8 @@ public:
     void addClipped(const ClipCount &clipped) { m_clipped = clipped; }
 
     /// Writes the file as a step of this label. Tells in the report how many values lay beyond full
-    /// scale; the level tags are then those of the samples as they were written. False, with the
+    /// scale; the level tags are then those of the samples as they were written. Tells, too, what
+    /// happens at the loop point, with a warning of a step. False, with the
     /// reason logged, if it fails or the job is cancelled; a file that stood there is then left as
     /// it was.
     [[nodiscard]] bool save(const WvStreams &streams, const QString &stepLabel);
@@ -55,6 +56,7 @@ public:
 private:
     [[nodiscard]] bool write(const WvStreams &streams, const QString &stepLabel);
     [[nodiscard]] bool measureClipped(BufferedIO &data);
+    void reportLoop();
 
     ToolJob &m_job;
     bool m_levelsAsStated = false;

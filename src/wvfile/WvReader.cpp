@@ -40,7 +40,7 @@ bool WvReader::read()
     if (round == Round::Failed || !openSampleBlock(name) || !readSamples()) {
         return false;
     }
-    if (m_info.reading == SampleReading::Located) {
+    if (!measures()) {
         return true;
     }
     m_info.levels = m_levels;
@@ -66,6 +66,10 @@ WvReader::Round WvReader::readTag(QString &name)
         bytes.append(static_cast<char>(byte));
     }
     name = QString::fromLatin1(bytes);
+    if (byte == ByteSource::NoByte && m_source.position() >= m_source.size()) {
+        Tracer::fail("The file is cut off within its tags.");
+        return Round::Failed;
+    }
     if (byte != ':' || bytes.size() > MaxNameLength) {
         Tracer::fail("Tag name '" + name + "' is invalid.");
         return Round::Failed;
@@ -86,6 +90,9 @@ bool WvReader::processTag(const QString &name)
     }
     if (name.contains("MARKER LIST ")) {
         m_info.hasMarkers = true;
+        if (m_info.reading == SampleReading::Checked) {
+            return m_source.skipPast('}') || Tracer::fail("Invalid tag. '}' is missing.");
+        }
         return m_markers.mergeList(m_source, name);
     }
     for (const char *dropped : {"CRESTFACTOR", "SI COMPENSATED", "SYSTEM"}) {
@@ -182,6 +189,7 @@ bool WvReader::processSamples(const QString &text)
     if (!isNumber || count <= 0) {
         return Tracer::fail("Invalid number of samples! Use value > 0.");
     }
+    m_statedSamples = count;
     return takeSampleCount(count);
 }
 
@@ -215,6 +223,9 @@ bool WvReader::processControlLength(const QString &text)
 {
     bool isNumber = false;
     const qint64 length = text.simplified().toLongLong(&isNumber);
+    if (m_info.reading == SampleReading::Checked) {
+        return true;
+    }
     if (!isNumber || length < 0 || length > std::min(m_fileLimit, MaxSamples)) {
         return Tracer::fail("CONTROL LENGTH tag is invalid ('" + text + "').");
     }
@@ -343,11 +354,18 @@ bool WvReader::readSamples()
 {
     m_info.coding = coding();
     m_info.blockStart = m_source.position();
+    if (m_info.reading == SampleReading::Checked) {
+        const auto there = (m_source.size() - m_info.blockStart) / 4;
+        const auto stated = std::max<qint64>(m_info.samples, m_statedSamples);
+        m_info.samples = static_cast<int>(std::min<qint64>(m_info.samples, there));
+        m_info.missingSamples = stated - m_info.samples;
+        return true;
+    }
     if (m_info.reading != SampleReading::Unpacked &&
         m_source.size() - m_info.blockStart < 4 * static_cast<qint64>(m_info.samples)) {
         return Tracer::fail("Cannot read enough data from xWAVEFORM tag!");
     }
-    if (m_info.reading == SampleReading::Located) {
+    if (!measures()) {
         return true;
     }
     const bool complete = readBlocks();

@@ -48,6 +48,11 @@ private:
     [[nodiscard]] bool readBlocks();
     [[nodiscard]] bool storeBlock(qint64 begin, std::span<const float> values);
     [[nodiscard]] SampleCoding coding() const;
+    [[nodiscard]] bool measures() const
+    {
+        return m_info.reading == SampleReading::Unpacked ||
+               m_info.reading == SampleReading::Measured;
+    }
 
     WvFileInfo &m_info;
     ProgressClock &m_progress;
@@ -55,6 +60,7 @@ private:
     qint64 m_fileLimit = 0; ///< largest position that a marker list may name
     MarkerTrace m_markers;
     bool m_sixteenBit = true;
+    qint64 m_statedSamples = 0; ///< by the SAMPLES tag
     LevelSums m_levels;
     std::array<std::vector<float>, 2> m_values; ///< one is measured while the other is filled
     SideWorker m_measuring;                     // last: its work uses the others

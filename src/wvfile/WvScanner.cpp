@@ -60,6 +60,10 @@ bool WvScanner::scan(QIODevice &device)
             return false;
         }
     }
+    if (m_holdsSamples && !m_blockFound) {
+        m_summary.isCutOff = true;
+        m_summary.missingSamples = std::max<qint64>(m_summary.samples, 0);
+    }
     if (!m_summary.levelsValid) {
         Tracer::Trace(Tracer::Warning, "No LEVEL OFFS tag found in waveform file.");
     }
@@ -171,6 +175,7 @@ bool WvScanner::processType(const QString &text)
         return Tracer::fail("Invalid file format in TYPE tag.");
     }
     m_summary.typeText = kind->description;
+    m_holdsSamples = kind->logText != nullptr;
     Tracer::Trace(Tracer::Information, "Waveform TYPE-tag : " + m_summary.typeText);
     return true;
 }
@@ -265,6 +270,7 @@ bool WvScanner::processSegments(const QString &name, const QString &text)
 bool WvScanner::processSampleBlock(ByteSource &source, const QString &name)
 {
     Tracer::Trace(Tracer::Debug, "WAVEFORM-tag found.");
+    m_blockFound = true;
     TagText prefix;
     bool isNumber = false;
     const qint64 blockBytes = name.section('-', 1, 1).simplified().toLongLong(&isNumber);
@@ -293,6 +299,7 @@ bool WvScanner::processSampleBlock(ByteSource &source, const QString &name)
     // Held within the file by the source, however far the stated length leads.
     const qint64 rest = source.size() - source.position();
     if (rest < dataBytes) {
+        m_summary.isCutOff = true;
         m_summary.missingSamples = count - rest / 4;
         warn(QString("The file is cut off: %1 of %2 samples are missing.")
                  .arg(m_summary.missingSamples)

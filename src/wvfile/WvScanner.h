@@ -30,4 +30,6 @@ private:
 
     WvFileSummary &m_summary;
     bool m_clockFound = false;
+    bool m_holdsSamples = false; ///< by its TYPE tag
+    bool m_blockFound = false;
 };

@@ -5,6 +5,7 @@
 
 #include "base/limits.h"
 #include "streams/levels.h"
+#include "streams/looppoint.h"
 
 #include <QList>
 #include <QString>
@@ -42,6 +43,7 @@ enum class SampleReading {
     Unpacked, ///< into the data stream, measured on the way
     Measured, ///< the levels alone
     Located,  ///< not read; the measured levels stay those of the tags
+    Checked,  ///< as Located, of a file that may be cut off; marker lists are passed over
 };
 
 /// Job record of HvFileIO::readWaveform. The caller fills the input fields; all others are cleared
@@ -66,7 +68,8 @@ struct WvFileInfo
     QString date;
 
     SampleCoding coding = SampleCoding::A;
-    qint64 blockStart = 0; ///< byte of the file where the samples begin
+    qint64 blockStart = 0;     ///< byte of the file where the samples begin
+    qint64 missingSamples = 0; ///< of a file to be checked: stated by its tags, but not there
 
     SampleReading reading = SampleReading::Unpacked; ///< in
     double gainDb = 0;                  ///< in: gain applied to all samples while reading, dB
@@ -103,6 +106,7 @@ struct WvWriteJob
     QList<int> markers;       ///< bits 0 to 3 are markers 1 to 4; or empty
     qint64 clippedValues = 0; ///< out: values, I and Q each, that no word of the file can hold
     double largestValue = 0;  ///< out: largest magnitude among those, of full scale 1
+    LoopPoint loop;           ///< out: of the samples as they were written
 };
 
 /// One segment of a multi-segment waveform.
@@ -129,6 +133,7 @@ struct WvFileSummary
     QString date;
     qint64 samples = -1;       ///< -1 if unknown
     qint64 missingSamples = 0; ///< that the file was cut off before
+    bool isCutOff = false;     ///< the file ends before all that its tags lead one to expect
     double clock = -1;         ///< Hz, -1 if unknown
     double playTime = -1;      ///< s, -1 if unknown
     bool levelsValid = false;  ///< a readable LEVEL OFFS was found

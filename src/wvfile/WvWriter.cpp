@@ -260,6 +260,7 @@ bool WvWriter::writeSamples(OutputFile &file)
     std::vector<float> values(2 * static_cast<size_t>(std::min(m_job.samples, BlockSamples)));
     std::vector<std::byte> words(2 * values.size());
     ClipCount clipped;
+    LoopMeter loop;
     for (int done = 0; done < m_job.samples;) {
         if (m_progress.shouldStop(done, m_job.samples, 50, 100)) {
             return Tracer::fail("Action aborted by user.");
@@ -270,7 +271,13 @@ bool WvWriter::writeSamples(OutputFile &file)
         const auto bytes = std::span(words).first(4 * static_cast<size_t>(got));
         const auto samples = std::span(values).first(2 * static_cast<size_t>(got));
         encodeWords(samples, bytes);
+        const qint64 clippedBefore = clipped.values;
         countClipped(samples, clipped);
+        if (clipped.values != clippedBefore) {
+            std::transform(samples.begin(), samples.end(), samples.begin(),
+                           [](float value) { return std::clamp(value, -1.0F, 1.0F); });
+        }
+        loop.add(samples);
         if (!put(file, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
             return false;
         }
@@ -281,5 +288,6 @@ bool WvWriter::writeSamples(OutputFile &file)
     }
     m_job.clippedValues = clipped.values;
     m_job.largestValue = clipped.largest;
+    m_job.loop = loop.result();
     return true;
 }

@@ -27,7 +27,11 @@ private slots:
     void dumpsMarkers();
     void infoListsFiles();
     void infoShowsTheRest();
+    void infoChecksSamples();
     void measuresSamples();
+    void cropsPieces();
+    void exportsAndTakesBack();
+    void refusesBadSigmf();
     void listsWavFiles();
     void carriesSoundThrough();
 
@@ -167,14 +171,14 @@ void TestCliResults::infoShowsTheRest()
 {
     QVERIFY(m_folder.store("1.wv", wvFile(kindA + "{CLOCK:1}", QByteArray(4, '\0'))));
     QVERIFY(m_folder.store("2.wv", "{TYPE: NONE,0}"));
-    QVERIFY(m_folder.store("3.wv", {}));
+    QVERIFY(m_folder.store("3.wv", "{TYPE: TGX-WV,0}"));
     const CliRun listed = run("info 1.wv 2.wv missing.wv 3.wv --json");
     QCOMPARE(listed.exitCode, 1);
     const QJsonArray objects = json(listed).array();
     QCOMPARE(objects.size(), 2);
     QCOMPARE(objects.at(0).toObject().value("fileName"), "1.wv");
     QCOMPARE(objects.at(1).toObject().value("fileName"), "3.wv");
-    // A file without tags is no error, and its values are unknown.
+    // What no tag states is unknown.
     for (const char *unknown : {"samples", "clock", "playTime", "peakOffset", "rmsOffset"}) {
         QVERIFY(objects.at(1).toObject().value(QLatin1String(unknown)).isNull());
     }
@@ -184,7 +188,51 @@ void TestCliResults::infoShowsTheRest()
     const QByteArray text = run("info missing.wv 1.wv 3.wv").output;
     QCOMPARE(text.count("File: "), 2);
     QVERIFY(text.indexOf("1.wv") < text.indexOf("3.wv"));
+    QVERIFY(text.contains("the file is cut off: all are missing"));
     QCOMPARE(json(run("info missing.wv --json")).array().size(), 0);
+    QVERIFY(m_folder.store("wave", wavFile(formatChunk() + chunk("data", words({1, 2})))));
+    QVERIFY(m_folder.store("nothing", {}));
+    QVERIFY(m_folder.store("words", "Some text.\n"));
+    QVERIFY(m_folder.store("half", "{TYPE: TGX-WV,0}{MARKER LIST 1: 0:1;12"));
+    forRows({{"wave", "wave", "This is no waveform file: it is a WAV sound file."},
+             {"nothing", "nothing", "This is no waveform file: it is empty."},
+             {"words", "words", "This is no waveform file: it is text."},
+             {"half", "half", "The file is cut off within its tags."}},
+            [&](const QString &name, const QString &reason) {
+                const CliRun answer = run("info " + name);
+                QCOMPARE(answer.exitCode, 1);
+                QCOMPARE(answer.lastLine(), "error: " + name + ": " + reason);
+            });
+}
+
+void TestCliResults::infoChecksSamples()
+{
+    const auto check = [&](const QByteArray &file) {
+        [&] { QVERIFY(m_folder.store("in.wv", file)); }();
+        return json(run("info --check --json in.wv"))
+            .array()
+            .first()
+            .toObject()["check"]
+            .toObject();
+    };
+    // A turn has 1000 samples: the tone ends 3249 steps of 0.36 degrees after its start.
+    const QJsonObject open = check(toneFile(3250));
+    QCOMPARE(open.value("complete"), true);
+    QCOMPARE(open.value("loopContinuous"), false);
+    QVERIFY(std::fabs(open.value("loopPhaseStep").toDouble() - (3 * 360 - 3249 * 0.36)) < 0.01);
+    QVERIFY(std::fabs(open.value("loopMagnitudeStep").toDouble()) < 0.001);
+    QVERIFY(std::fabs(open.value("peakOffset").toDouble() - 6.02) < 0.01);
+    QVERIFY(std::fabs(open.value("crest").toDouble()) < 0.001);
+    QCOMPARE(open.value("clipped"), 0);
+    QCOMPARE(check(toneFile(3000)).value("loopContinuous"), true);
+
+    const QJsonObject cut =
+        check(wvFile(kindA, words({32767, -32767, 32766, -32766, 0, -32768})).chopped(1 + 4));
+    QCOMPARE(cut.value("complete"), false);
+    QCOMPARE(cut.value("clipped"), 2);
+    const QJsonObject none = check(wvFile(kindA, words({1, 2})).chopped(1 + 4));
+    QCOMPARE(none.value("complete"), false);
+    QVERIFY(none.value("crest").isNull());
 }
 
 void TestCliResults::measuresSamples()
@@ -211,6 +259,110 @@ void TestCliResults::measuresSamples()
              "Peak / RMS:  0.000000 dB");
 }
 
+void TestCliResults::cropsPieces()
+{
+    const QByteArray file = toneFile(3000).replace("{CLOCK:", "{MORE: kept}{CLOCK:");
+    QVERIFY(m_folder.store("in.wv", file));
+    const CliRun answer = run("crop in.wv -o out.wv --from 1400 --count 250 --force");
+    QCOMPARE(answer.exitCode, 0);
+    QCOMPARE(answer.lastLine(), "Piece saved");
+    const QByteArray piece = m_folder.load("out.wv");
+    QCOMPARE(sampleWords(piece), sampleWords(file).mid(4 * 1400, 4 * 250));
+    QCOMPARE(tag(piece, "MARKER LIST 1"), " 0:1;100:0"); // high in the first half of the source
+    QCOMPARE(tag(piece, "MORE"), " kept");
+    QCOMPARE(tag(piece, "CLOCK"), tag(file, "CLOCK"));
+    QVERIFY(answer.lines.join('\n').contains("warning: Loop point: step of "));
+    QCOMPARE(run("crop in.wv -o other.wv --from 3000").exitCode, 2);
+    QCOMPARE(run("crop in.wv -o out.wv").exitCode, 1);
+}
+
+void TestCliResults::exportsAndTakesBack()
+{
+    // All words that the writer makes come back, and so do markers and texts.
+    QList<int> sampleValues;
+    for (int word = -32767; word <= 32767; word += 7) {
+        sampleValues << word << -word;
+    }
+    const QByteArray tags = kindA +
+                            "{COMMENT:say \"hi\" \\}{COPYRIGHT:me}{CLOCK:1234567.25}{MORE: kept}"
+                            "{CONTROL LENGTH:9363}{MARKER LIST 1: 0:1;1:0;9362:1}"
+                            "{MARKER LIST 2: 0:0;7:1;5000:0}{MARKER LIST 3: 0:0}"
+                            "{MARKER LIST 4: 0:1}";
+    QVERIFY(m_folder.store("in.wv", wvFile(tags, words(sampleValues))));
+    const QByteArray samples = run("dump in.wv").output;
+    const QByteArray floats = run("dump in.wv --format cf32").output;
+    forRows({{"s16", "", ".sigmf-meta"}, {"f32", "--type f32", ".sigmf-data"}},
+            [&](const QString &type, const QString &suffix) {
+                QCOMPARE(run("export in.wv -o out.sigmf-meta --force " + type).exitCode, 0);
+                QCOMPARE(run("import sigmf out" + suffix + " -o back.wv --force").exitCode, 0);
+                QVERIFY(run("dump back.wv").output == samples);
+                const QByteArray back = m_folder.load("back.wv");
+                QCOMPARE(tag(back, "CLOCK"), "1234567.250000");
+                QCOMPARE(tag(back, "COMMENT"), "say \"hi\" \\");
+                QCOMPARE(tag(back, "COPYRIGHT"), "me");
+                QCOMPARE(tag(back, "MORE"), " kept");
+            });
+    const QJsonArray annotations =
+        QJsonDocument::fromJson(m_folder.load("out.sigmf-meta")).object()["annotations"].toArray();
+    QCOMPARE(annotations.size(), 4);
+    QCOMPARE(
+        annotations.at(1).toObject(),
+        (QJsonObject{{"core:sample_start", 0}, {"core:sample_count", 9363}, {"core:label", "M4"}}));
+    QVERIFY(m_folder.load("out.sigmf-data") == floats);
+
+    const CliRun wav = run("export in.wv -o out.wav --from 100 --count 50");
+    QCOMPARE(wav.exitCode, 0);
+    QVERIFY(wav.lines.contains("warning: The clock of 1234567.25 Hz was rounded to 1234567 Hz: a "
+                               "WAV file has whole sample rates."));
+    QCOMPARE(m_folder.load("out.wav"), wavFile(formatChunk(1, 2, 1234567) +
+                                               chunk("data", words(sampleValues).mid(400, 200))));
+    QCOMPARE(run("export in.wv -o out.mat").exitCode, 0);
+    QCOMPARE(run("import mat out.mat -o back.wv --clock 1M --scaling none --force").exitCode, 0);
+    QVERIFY(run("dump back.wv --format cf32").output == floats);
+    forRows({{"suffix", "out.txt", "'out.txt' doesn't tell the format"},
+             {"type", "out.csv --type f32", "The type f32 isn't one of .csv files"}},
+            [&](const QString &arguments, const QString &reason) {
+                const CliRun answer = run("export in.wv -o " + arguments);
+                QCOMPARE(answer.exitCode, 2);
+                QVERIFY2(answer.lastLine().contains(reason), qPrintable(answer.lastLine()));
+            });
+}
+
+void TestCliResults::refusesBadSigmf()
+{
+    const auto import = [&](const QByteArray &meta, const QByteArray &data) {
+        [&] {
+            QVERIFY(m_folder.store("bad.sigmf-meta", meta));
+            QVERIFY(m_folder.store("bad.sigmf-data", data));
+        }();
+        return run("import sigmf bad.sigmf-meta -o bad.wv --force");
+    };
+    const QByteArray global = "{\"global\": {\"core:sample_rate\": 1e6, \"core:datatype\": ";
+    forRows({{"no JSON", "{", "The SigMF metadata are no JSON"},
+             {"type", global + "\"cf16_le\"}}", "The SigMF datatype 'cf16_le' is unknown"},
+             {"header", global + "\"ci16_le\"}, \"captures\": [{\"core:header_bytes\": 9}]}",
+              "The SigMF data are shorter than the headers"},
+             {"start", global + "\"ci16_le\"}, \"captures\": [{\"core:sample_start\": -1}]}",
+              "no whole number from 0 in core:sample_start: -1"},
+             {"channels", global + "\"ci16_le\", \"core:num_channels\": 1e9}}",
+              "no whole number from 0 in core:num_channels"}},
+            [&](const QByteArray &meta, const QString &reason) {
+                const CliRun answer = import(meta, QByteArray(8, '\1'));
+                QCOMPARE(answer.exitCode, 1);
+                QVERIFY2(answer.lastLine().contains(reason), qPrintable(answer.lastLine()));
+            });
+    // Annotations may lie anywhere; they are held to the samples.
+    const QByteArray marks = ", \"annotations\": [{\"core:label\": \"M2\", "
+                             "\"core:sample_start\": 1, \"core:sample_count\": 9000000000000}, "
+                             "{\"core:label\": \"M1\", \"core:sample_start\": 4e15}]}";
+    QCOMPARE(import(global + "\"ri8\"}" + marks, QByteArray::fromHex("00408100")).exitCode, 0);
+    const QList<QByteArray> lines = run("dump bad.wv").output.split('\n');
+    QCOMPARE(lines.value(1), "0,-1.52592547e-05,-1.52592547e-05,0");
+    QCOMPARE(lines.value(2), "1,0.5,-1.52592547e-05,2");
+    QVERIFY(m_folder.store("bad.sigmf", QByteArray(700, 'x')));
+    QVERIFY(run("import sigmf bad.sigmf -o bad.wv --force").lastLine().contains("is damaged"));
+}
+
 void TestCliResults::listsWavFiles()
 {
     QVERIFY(m_folder.store(
@@ -223,7 +375,8 @@ void TestCliResults::listsWavFiles()
                           {"bits", 16},
                           {"float", false}}));
     const QByteArray text = run("import wav --list in.wav").output;
-    QCOMPARE(text.simplified(), "Sample Rate: 192 kHz Samples: 96000 Play Time: 500 ms");
+    QCOMPARE(text.simplified(),
+             "Sample Rate: 192 kHz Samples: 96000 Play Time: 500 ms Channels: 2 Bits: 16");
 }
 
 void TestCliResults::carriesSoundThrough()

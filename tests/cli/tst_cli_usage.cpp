@@ -169,7 +169,7 @@ void TestCliUsage::failsWithItsReason()
 {
     const QList<std::pair<const char *, const char *>> uses{
         {"info missing.wv", "error: missing.wv: File does not exist."},
-        {"info folder", "error: folder: Cannot open file."},
+        {"info folder", "error: folder: This is no waveform file: it is a folder."},
         {"dump /dev/zero", "error: Cannot open waveform input file."},
         {"dump cut.wv -o out", "error: Cannot read enough data from xWAVEFORM tag!"},
         {"level cut.wv -o out", "error: Cannot read enough data from xWAVEFORM tag!"},

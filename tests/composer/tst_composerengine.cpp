@@ -445,6 +445,7 @@ void tst_composerengine::reports()
         "  Will Create 1000 Output Samples",
         "Rescaling Waveform Data",
         "Saving Final Waveform to " + document.target.sName,
+        "Loop point: continuous",
         "Cleaning up 2 Temporary Files",
     };
     QCOMPARE(lines.join('\n'), expected.join('\n'));

@@ -20,6 +20,8 @@ private slots:
     void init();
     void checksHeader_data();
     void checksHeader();
+    void convertsEachForm_data();
+    void convertsEachForm();
     void tellsHeaderFields();
     void namesWhatACutHeaderLacks();
     void logsTheWalk();
@@ -107,16 +109,77 @@ void TestWavFileAccess::checksHeader_data()
         "No chunk length available in .wav file.");
     row("chunk of 0 bytes", wavFile(chunk("LIST", {}) + formatChunk() + data), false,
         "No chunk length available in .wav file.");
-    row("fmt of 18 bytes", wavFile(chunk("fmt ", formatChunk().mid(8) + words({0})) + data), false,
-        "Format chunk has invalid length.");
-    row("float samples", wavFile(formatChunk(3, 2, 48000, 8, 32) + data), false,
+    row("fmt of 18 bytes", wavFile(chunk("fmt ", formatChunk().mid(8) + words({0})) + data), true,
+        "");
+    row("fmt of 20 bytes", wavFile(chunk("fmt ", formatChunk().mid(8) + words({0, 0})) + data),
+        false, "Format chunk has invalid length.");
+    row("short fact", wavFile(formatChunk() + chunk("fact", littleEndian(4)) + data), true, "");
+    row("sound of telephones", wavFile(formatChunk(6, 2, 8000, 2, 8) + data), false,
         "Data Format must be PCM.");
-    row("mono", wavFile(formatChunk(1, 1, 48000, 2, 16) + data), false,
+    row("float of 64 bits", wavFile(formatChunk(3, 2, 48000, 16, 64) + data), false,
+        "Data must be 16 bits/sample.");
+    row("three channels", wavFile(formatChunk(1, 3, 48000, 6, 16) + data), false,
         "File must contain 2 channels.");
-    row("24 bit", wavFile(formatChunk(1, 2, 48000, 6, 24) + data), false,
+    row("24 bit, alignment 8", wavFile(formatChunk(1, 2, 48000, 8, 24) + data), false,
         "Block alignment must be 4 bytes.");
     row("24 bit, alignment 4", wavFile(formatChunk(1, 2, 48000, 4, 24) + data), false,
         "Data must be 16 bits/sample.");
+}
+
+void TestWavFileAccess::convertsEachForm_data()
+{
+    QTest::addColumn<QByteArray>("chunks");
+    QTest::addColumn<std::vector<float>>("values");
+    const auto row = [](const char *name, const QByteArray &format, const QByteArray &data,
+                        const std::vector<float> &values) {
+        QTest::newRow(name) << format + chunk("data", data) << values;
+    };
+    const auto extensible = [](int tag, int alignment, int bits) {
+        return chunk("fmt ", formatChunk(0xFFFE, 2, 48000, alignment, bits).mid(8) +
+                                 words({22, bits, 3, 0, tag, 0}) +
+                                 QByteArray::fromHex("00001000800000aa00389b71"));
+    };
+    const QByteArray bytes24 = QByteArray::fromHex("000080ffff7f000040010000");
+    const std::vector<float> values24{-1, 8388607.0F / 8388608, 0.5F, 1.0F / 8388608};
+    row("8 bit, mono", formatChunk(1, 1, 48000, 1, 8), QByteArray::fromHex("0080ff408080808080"),
+        {-1, 0, 0, 0, 127.0F / 128, 0, -0.5F, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0});
+    row("16 bit, mono", formatChunk(1, 1, 48000, 2, 16), words({-32768, 16384, 0, 0, 0}),
+        {-1, 0, 0.5F, 0, 0, 0, 0, 0, 0, 0});
+    row("24 bit", formatChunk(1, 2, 48000, 6, 24), bytes24, values24);
+    row("24 bit, extensible", extensible(1, 6, 24), bytes24, values24);
+    row("32 bit", formatChunk(1, 2, 48000, 8, 32),
+        littleEndian(qint32(-0x7FFFFFFF - 1)) + littleEndian(qint32(0x20000000)) +
+            littleEndian(qint32(0)) + littleEndian(qint32(-0x40000000)),
+        {-1, 0.25F, 0, -0.5F});
+    const QByteArray floats =
+        littleEndian(1.5F) + littleEndian(-0.1F) + littleEndian(0.0F) + littleEndian(-2.0F);
+    row("float", formatChunk(3, 2, 48000, 8, 32), floats, {1.5F, -0.1F, 0, -2});
+    row("float, extensible", extensible(3, 8, 32), floats, {1.5F, -0.1F, 0, -2});
+}
+
+void TestWavFileAccess::convertsEachForm()
+{
+    QFETCH(QByteArray, chunks);
+    QFETCH(std::vector<float>, values);
+    const auto convert = [&](const QByteArray &bytes) {
+        WavFileAccess file;
+        TempStream stream;
+        return file.open(stored(bytes)) && file.readHeader() && stream.open() &&
+                       file.readSamples(stream.stream(), 0)
+                   ? floatsOf(stream)
+                   : std::vector<float>();
+    };
+    QCOMPARE(convert(wavFile(chunks)), values);
+    // The same as RF64, whose lengths of 32 bits say nothing.
+    const auto data = chunks.indexOf("data");
+    const QByteArray lengths = littleEndian(qint64(1) << 40) +
+                               littleEndian(static_cast<qint64>(chunks.size() - data - 8)) +
+                               QByteArray(12, '\0');
+    QByteArray longForm = chunks;
+    longForm.replace(data + 4, 4, littleEndian(qint32(-1)));
+    QCOMPARE(
+        convert("RF64" + littleEndian(qint32(-1)) + "WAVE" + chunk("ds64", lengths) + longForm),
+        values);
 }
 
 void TestWavFileAccess::checksHeader()

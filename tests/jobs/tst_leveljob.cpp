@@ -139,8 +139,9 @@ void TestLevelJob::tellsItsSteps()
     LevelJob job({folder.path("in.wv"), {folder.path("out.wv"), "new <&>", QString()}, {}, 0.25});
     const JobRun run(job);
     QCOMPARE(run.steps, (QStringList{"Reading Waveform...", "Saving waveform..."}));
-    QCOMPARE(run.report, (QStringList{"File:        " + folder.path("out.wv"), "Samples:     1",
-                                      "Peak Offset: 0.00 dB", "Peak/RMS:    0.25 dB"}));
+    QCOMPARE(run.report,
+             (QStringList{"Loop point: continuous", "File:        " + folder.path("out.wv"),
+                          "Samples:     1", "Peak Offset: 0.00 dB", "Peak/RMS:    0.25 dB"}));
     QCOMPARE(tag(folder.load("out.wv"), "COMMENT"), "new <&>");
 }
 

@@ -117,11 +117,12 @@ void TestSignalJobs::reportsACreation()
     const JobRun run(job);
     const QByteArray file = m_folder.load("out.wv");
     const double crest = tag(file, "LEVEL OFFS").split(',').value(0).toDouble();
-    QCOMPARE(run.report, (QStringList{"Creating signal", "Level scaling", "Signal statistics",
-                                      "Samples:     " + tag(file, "SAMPLES"),
-                                      "Clock:       10.24 MHz", "Peak Offset: 0.00 dB",
-                                      QString("Peak/RMS:    %1 dB").arg(crest, 0, 'f', 2),
-                                      "Saving file", "Signal creation completed"}));
+    QCOMPARE(
+        run.report,
+        (QStringList{"Creating signal", "Level scaling", "Signal statistics",
+                     "Samples:     " + tag(file, "SAMPLES"), "Clock:       10.24 MHz",
+                     "Peak Offset: 0.00 dB", QString("Peak/RMS:    %1 dB").arg(crest, 0, 'f', 2),
+                     "Saving file", "Loop point: continuous", "Signal creation completed"}));
     QCOMPARE(run.steps, (QStringList{"Creating waveform data...", "Scaling...", "Saving file..."}));
 }
 
@@ -141,8 +142,8 @@ void TestSignalJobs::reportsAConversion()
     QCOMPARE(
         report.mid(9, 5),
         (QStringList{"Rescaling to same peak level", "File:        " + path("out.wv")} + result));
-    QCOMPARE(report.mid(15),
-             (QStringList{"Saving", "File:        " + path("out.wv"), "Resampling completed"}));
+    QCOMPARE(report.mid(15), (QStringList{"Saving", "File:        " + path("out.wv"),
+                                          "Loop point: continuous", "Resampling completed"}));
     QCOMPARE(tag(m_folder.load("out.wv"), "COMMENT"), QByteArray("ac"));
 
     // The tone has one length of vector, and so has what comes out of it; the markers follow.

@@ -75,8 +75,9 @@ void DlgWvFromWav::inputChanged()
     file.close();
     const std::optional<WavHeader> header = WavImportJob::readHeader(file, inputFile());
     if (!header) {
-        m_error->setText("Cannot evaluate .wav file header.\nOnly stereo files of 16-bit PCM are "
-                         "read: I on the left and Q on the right channel.");
+        m_error->setText("Cannot evaluate .wav file header.\nRead are files of one or two "
+                         "channels: PCM of 8, 16, 24 or 32 bits, or 32-bit float. I is the left "
+                         "or the only channel, Q the right one.");
         return;
     }
     m_headerValid = true;
