@@ -32,7 +32,7 @@ int listFile(InfoArguments &arguments, const QString &fileName, QJsonArray &obje
         return ExitFailed;
     }
     QJsonObject object = infoJson(summary);
-    std::optional<WaveformCheck> check;
+    std::optional<SampleCheck> check;
     if (arguments.check) {
         CheckJob job(fileName);
         if (const int code = arguments.console.run(job); code != ExitDone) {

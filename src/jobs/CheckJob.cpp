@@ -49,7 +49,7 @@ bool CheckJob::work()
             return false;
         }
     }
-    m_result = WaveformCheck();
+    m_result = SampleCheck();
     m_result.isComplete = info.missingSamples == 0;
     m_result.samples = info.samples;
     if (info.samples == 0) {

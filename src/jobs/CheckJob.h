@@ -6,7 +6,7 @@
 #include "streams/looppoint.h"
 
 /// What the samples of a waveform file say, beside its tags.
-struct WaveformCheck
+struct SampleCheck
 {
     bool isComplete = false; ///< as many samples as the tags say
     qint64 samples = 0;      ///< those that are there; without any there are no figures
@@ -25,11 +25,11 @@ public:
     explicit CheckJob(const QString &fileName, QObject *parent = nullptr);
 
     /// Valid after the job has finished.
-    [[nodiscard]] const WaveformCheck &result() const { return m_result; }
+    [[nodiscard]] const SampleCheck &result() const { return m_result; }
 
 private:
     [[nodiscard]] bool work() override;
 
     QString m_fileName;
-    WaveformCheck m_result;
+    SampleCheck m_result;
 };

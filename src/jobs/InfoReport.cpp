@@ -107,7 +107,7 @@ QList<InfoRow> segmentRows(const WvFileSummary &summary)
     return rows;
 }
 
-QList<InfoRow> checkRows(const WaveformCheck &check)
+QList<InfoRow> checkRows(const SampleCheck &check)
 {
     QList<InfoRow> rows{{"Complete", yesNo(check.isComplete)}};
     if (check.samples > 0) {
@@ -122,7 +122,7 @@ QList<InfoRow> checkRows(const WaveformCheck &check)
     return rows;
 }
 
-QString infoText(const WvFileSummary &summary, const WaveformCheck *check)
+QString infoText(const WvFileSummary &summary, const SampleCheck *check)
 {
     QList<InfoRow> rows{{"File", summary.fileName}};
     rows += fileRows(summary);
@@ -182,7 +182,7 @@ QJsonObject infoJson(const WvFileSummary &summary)
     };
 }
 
-QJsonObject checkJson(const WaveformCheck &check)
+QJsonObject checkJson(const SampleCheck &check)
 {
     const auto figure = [&check](const QJsonValue &value) {
         return check.samples > 0 ? value : QJsonValue(QJsonValue::Null);

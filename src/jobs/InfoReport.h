@@ -7,7 +7,7 @@
 #include <QList>
 #include <QString>
 
-struct WaveformCheck;
+struct SampleCheck;
 
 /// One row of the information report.
 struct InfoRow
@@ -30,16 +30,16 @@ struct InfoRow
 [[nodiscard]] QList<InfoRow> segmentRows(const WvFileSummary &summary);
 
 /// The rows on what the samples were measured to be.
-[[nodiscard]] QList<InfoRow> checkRows(const WaveformCheck &check);
+[[nodiscard]] QList<InfoRow> checkRows(const SampleCheck &check);
 
 /// The report as plain text, one row a line, with the rows of the check if there is one.
-[[nodiscard]] QString infoText(const WvFileSummary &summary, const WaveformCheck *check = nullptr);
+[[nodiscard]] QString infoText(const WvFileSummary &summary, const SampleCheck *check = nullptr);
 
 /// The summary under the names of its fields.
 [[nodiscard]] QJsonObject infoJson(const WvFileSummary &summary);
 
 /// The check under the names that scripts know; figures without samples are null.
-[[nodiscard]] QJsonObject checkJson(const WaveformCheck &check);
+[[nodiscard]] QJsonObject checkJson(const SampleCheck &check);
 
 /// Scans the tags of a file. False, with the reason logged, if they can't be read, or if the file
 /// is no waveform, of which the reason says what it is.
