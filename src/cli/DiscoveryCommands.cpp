@@ -3,6 +3,8 @@
 #include "InstrumentArguments.h"
 
 #include "base/visibletext.h"
+#include "jobs/instrument/DoctorJob.h"
+#include "jobs/instrument/LanScanJob.h"
 #include "jobs/instrument/ScanJob.h"
 
 #include <QJsonArray>
@@ -11,22 +13,90 @@
 
 namespace {
 
+constexpr int ScanLan = 2; ///< behind the kinds of VisaDevice
+
+QString row(const QStringList &texts)
+{
+    QStringList visible;
+    for (const QString &text : texts) {
+        visible.append(visibleText(text));
+    }
+    return visible.join('\t') + '\n';
+}
+
+QJsonObject objectOf(const InstrumentSummary &found)
+{
+    return {{"resource", found.resource},
+            {"model", found.model},
+            {"serial", found.serial},
+            {"interface", found.interfaceName}};
+}
+
+QStringList textsOf(const InstrumentSummary &found)
+{
+    return {found.resource, found.model, found.serial, found.interfaceName};
+}
+
+int runLanScan(InstrumentArguments &arguments)
+{
+    LanScanJob job(arguments.listenSeconds.value_or(LanScanJob::DefaultSeconds));
+    const int exitCode = arguments.console.run(job);
+    QJsonArray objects;
+    QString text;
+    for (const LanInstrument &found : job.found()) {
+        QJsonObject object = objectOf(found.summary);
+        object["found"] = QJsonArray::fromStringList(found.found);
+        object["resources"] = QJsonArray::fromStringList(found.resources);
+        objects.append(object);
+        text += row(textsOf(found.summary) + QStringList{found.found.join(',')});
+    }
+    return printed(arguments.console, exitCode,
+                   arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
+}
+
 int runScan(InstrumentArguments &arguments)
 {
+    if (arguments.scanKind == ScanLan) {
+        return runLanScan(arguments);
+    }
+    if (arguments.listenSeconds) {
+        return arguments.console.wrongUsage("--time: only of a scan of the network");
+    }
     ScanJob job(arguments.scanKind);
     const int exitCode = arguments.console.run(job);
     QJsonArray objects;
     QString text;
     for (const InstrumentSummary &found : job.found()) {
-        objects.append(QJsonObject{{"resource", found.resource},
-                                   {"model", found.model},
-                                   {"serial", found.serial},
-                                   {"interface", found.interfaceName}});
-        text += visibleText(found.resource) + '\t' + visibleText(found.model) + '\t' +
-                visibleText(found.serial) + '\t' + found.interfaceName + '\n';
+        objects.append(objectOf(found));
+        text += row(textsOf(found));
     }
     return printed(arguments.console, exitCode,
                    arguments.json ? QJsonDocument(objects).toJson() : text.toLocal8Bit());
+}
+
+int runDoctor(InstrumentArguments &arguments)
+{
+    const QString host = arguments.first.trimmed();
+    if (host.isEmpty() || host.contains("::")) {
+        return arguments.console.wrongUsage("HOST: '" + host + "' is no host name or address");
+    }
+    DoctorJob job(host);
+    const int exitCode = arguments.console.run(job);
+    QJsonArray objects;
+    QString text;
+    for (const DoctorStep &step : job.steps()) {
+        objects.append(QJsonObject{
+            {"step", step.step}, {"ok", step.ok}, {"text", step.text}, {"advice", step.advice}});
+        text += (step.ok ? "ok    " : "FAIL  ") + step.step.leftJustified(12) + ' ' +
+                visibleText(step.text) + (step.advice.isEmpty() ? QString() : ' ' + step.advice) +
+                '\n';
+    }
+    // What was found counts above all where there is no way.
+    if (!arguments.console.print(arguments.json ? QJsonDocument(objects).toJson()
+                                                : text.toLocal8Bit())) {
+        return arguments.console.failed();
+    }
+    return exitCode;
 }
 
 } // namespace
@@ -35,7 +105,18 @@ void addDiscoveryCommands(CLI::App &instr, CommandSet &commands)
 {
     auto [scan, scanned] = addInstrumentCommand(
         instr, commands, "scan", "Find the instruments of an interface", runScan, false);
-    addChoice(scan, "interface", scanned.scanKind, {"gpib", "usb"}, "Interface to look at")
+    addChoice(scan, "interface", scanned.scanKind, {"gpib", "usb", "lan"}, "Interface to look at")
         ->required();
     scan.add_flag("--json", scanned.json, "Print one JSON array");
+    addNumber(scan, "--time", scanned.listenSeconds,
+              {"s", LanScanJob::MinSeconds, LanScanJob::MaxSeconds},
+              "Time to listen on the network, 0.1 s to 60 s (default: 2 s)");
+    scan.footer("Example: corvane-cli instr scan lan --time 5");
+    auto [doctor, asked] = addInstrumentCommand(
+        instr, commands, "doctor", "Walk the way to an instrument and tell where it ends",
+        runDoctor, false);
+    addText(doctor, "host", asked.first, "Host name or address")->type_name("HOST")->required();
+    doctor.add_flag("--json", asked.json, "Print one JSON array");
+    doctor.footer("Exit status 1: there is no way to an instrument.\n"
+                  "Example: corvane-cli instr doctor 192.168.1.20");
 }

@@ -22,6 +22,7 @@ struct InstrumentArguments
     QString transcript{};
     int scanKind = 0;
     std::optional<qint64> seconds{};
+    std::optional<double> listenSeconds{};
     std::optional<double> frequencyHz{};
     std::optional<double> levelDbm{};
     bool on = false;

@@ -378,6 +378,7 @@ std::optional<QString> VisaSession::ask(const QString &query, quint32 millisecon
 ViStatus VisaSession::readError(QString &answer)
 {
     const Patience patience(*this, QueueMs, m_isLate && !m_isSilent);
+    Transcript::sent(":SYST:ERR?");
     ViStatus status =
         m_isSilent ? VI_ERROR_CONN_LOST : noted(visa().viPrintf(m_handle, ":SYST:ERR?"));
     if (status != VI_SUCCESS) {

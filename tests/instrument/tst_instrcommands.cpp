@@ -294,6 +294,19 @@ void TestInstrCommands::failures()
                      QVERIFY(outcome.lastLine().startsWith("error: "));
                  });
     QVERIFY(!QFile::exists(local("c.wv")));
+    // Nobody is there, and the examination says where the way ends.
+    const Outcome outcome = run({"doctor", "127.0.0.99", "--json"});
+    QCOMPARE(outcome.exitCode, 1);
+    QStringList failed;
+    const QJsonArray steps = outcome.json().array();
+    for (const QJsonValue &step : steps) {
+        if (!step["ok"].toBool()) {
+            failed.append(step["step"].toString());
+            QVERIFY(!step["text"].toString().isEmpty() && !step["advice"].toString().isEmpty());
+        }
+    }
+    failed.removeAll("usbtmc");
+    QCOMPARE(failed, (QStringList{"tcp 111", "tcp 4880", "tcp 5025", "link"}));
 }
 
 void TestInstrCommands::play()
