@@ -4,6 +4,7 @@
 
 #include "instrument/FakeInstrument.h"
 #include "instrument/VisaDevice.h"
+#include "support/modals.h"
 
 #include <QApplication>
 #include <QInputDialog>
@@ -132,7 +133,11 @@ void TestInstrListEditing::deletes()
     QCOMPARE(m_changes->size(), 2);
     QVERIFY(!m_dialog->findChild<QPushButton *>("pb_clear")->isEnabled());
     fill(all);
-    click("pb_clear");
+    Seen seen;
+    QVERIFY(withModal([this] { click("pb_clear"); }, answer("No", seen)));
+    QVERIFY2(seen.text.contains("all"), qPrintable(seen.text));
+    QVERIFY(!m_dialog->instruments().isEmpty());
+    QVERIFY(withModal([this] { click("pb_clear"); }, press("Yes")));
     QVERIFY(m_dialog->instruments().isEmpty());
     QCOMPARE(m_changes->size(), 1);
 }
@@ -212,8 +217,10 @@ void TestInstrListEditing::keys()
     QVERIFY(hasFocus(*m_dialog));
     QTest::keyClick(m_dialog.get(), Qt::Key_H, Qt::AltModifier);
     QTRY_COMPARE(QApplication::focusWidget(), line);
-    QTest::keyClick(line, Qt::Key_L, Qt::AltModifier);
+    QVERIFY(withModal([line] { QTest::keyClick(line, Qt::Key_L, Qt::AltModifier); }, press("Yes")));
     QTRY_VERIFY(m_dialog->instruments().isEmpty());
+    m_dialog->activateWindow();
+    QVERIFY(hasFocus(*m_dialog));
     QTest::keyClick(line, Qt::Key_A, Qt::AltModifier);
     QTRY_COMPARE(m_dialog->instruments().size(), 1);
     QTest::keyClick(line, Qt::Key_Escape);
@@ -247,7 +254,7 @@ void TestInstrListEditing::showsEverything()
         tree()->setCurrentItem(item(0));
         QCoreApplication::processEvents();
         QVERIFY(m_dialog->grab().save(folder + "/instrument-configuration.png"));
-        click("pb_clear");
+        QVERIFY(withModal([this] { click("pb_clear"); }, press("Yes")));
         type("127.0.0.99");
         QVERIFY(m_dialog->grab().save(folder + "/instrument-configuration-empty.png"));
     }

@@ -4,6 +4,7 @@
 #include "instrument/InstrumentSummary.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
+#include "jobs/instrument/LanScanJob.h"
 #include "jobs/instrument/ScanJob.h"
 #include "log/Tracer.h"
 #include "toolframe/pictures.h"
@@ -15,6 +16,7 @@
 #include <QHeaderView>
 #include <QInputDialog>
 #include <QLabel>
+#include <QMessageBox>
 #include <QScopedValueRollback>
 #include <QSet>
 #include <QSettings>
@@ -66,9 +68,10 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     connect(m_ui->pb_add, &QPushButton::clicked, this, &DlgInstrConfig::instr_add_manual);
     connect(m_ui->pb_scan_usb, &QPushButton::clicked, this, &DlgInstrConfig::instr_scan_usb);
     connect(m_ui->pb_scan_gpib, &QPushButton::clicked, this, &DlgInstrConfig::instr_scan_gpib);
+    connect(m_ui->pb_scan_lan, &QPushButton::clicked, this, &DlgInstrConfig::instr_scan_lan);
     connect(m_ui->pb_refresh, &QPushButton::clicked, this, &DlgInstrConfig::instr_refresh);
     connect(m_ui->pb_delete, &QPushButton::clicked, this, &DlgInstrConfig::instr_removedevice);
-    connect(m_ui->pb_clear, &QPushButton::clicked, this, &DlgInstrConfig::instr_clearlist);
+    connect(m_ui->pb_clear, &QPushButton::clicked, this, &DlgInstrConfig::askToClear);
     connect(m_ui->pb_close, &QPushButton::clicked, this, &DlgInstrConfig::reject);
     const QTreeWidget *tree = m_ui->tw_instruments;
     connect(tree, &QTreeWidget::itemChanged, this, &DlgInstrConfig::instr_itemChanged);
@@ -243,7 +246,30 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
         const QScopedValueRollback<bool> busy(m_busy, true);
         outcome = runJob(job, this, nullptr);
     }
-    const QList<InstrumentSummary> &found = job.found();
+    addFound(job.found(), outcome, origin);
+}
+
+void DlgInstrConfig::instr_scan_lan()
+{
+    if (m_busy) {
+        return;
+    }
+    LanScanJob job(LanScanJob::DefaultSeconds, m_noVisa);
+    JobOutcome outcome = JobOutcome::Failed;
+    {
+        const QScopedValueRollback<bool> busy(m_busy, true);
+        outcome = runJob(job, this, nullptr);
+    }
+    QList<InstrumentSummary> found;
+    for (const LanInstrument &instrument : job.found()) {
+        found.append(instrument.summary);
+    }
+    addFound(found, outcome, "LAN Scan");
+}
+
+void DlgInstrConfig::addFound(const QList<InstrumentSummary> &found, JobOutcome outcome,
+                              const QString &origin)
+{
     const auto added =
         std::count_if(found.cbegin(), found.cend(),
                       [&](const InstrumentSummary &summary) { return addOnline(summary, origin); });
@@ -256,6 +282,17 @@ void DlgInstrConfig::scan(int kind, const QString &origin)
         : added == 1 ? QString("The scan found 1 new instrument.")
                      : QString("The scan found %1 new instruments.").arg(added));
     emit updateInstruments();
+}
+
+void DlgInstrConfig::askToClear()
+{
+    // Comments and folders of the whole list go with it.
+    const auto answer = QMessageBox::question(
+        this, "Delete All",
+        QString("Delete all %1 instruments from the list?").arg(m_list.entries().size()));
+    if (answer == QMessageBox::Yes) {
+        instr_clearlist();
+    }
 }
 
 void DlgInstrConfig::instr_clearlist()

@@ -10,6 +10,7 @@
 class QLabel;
 class QSettings;
 class QTreeWidgetItem;
+enum class JobOutcome;
 struct InstrumentSummary;
 
 namespace Ui {
@@ -50,6 +51,9 @@ public slots:
     void instr_add_manual();
     void instr_scan_gpib();
     void instr_scan_usb();
+    /// Looks for instruments on all networks of this machine.
+    void instr_scan_lan();
+
     void instr_clearlist();
 
     /// Removes the instrument of the current row.
@@ -68,6 +72,8 @@ signals:
 private:
     void addActions();
     void scan(int kind, const QString &origin);
+    void addFound(const QList<InstrumentSummary> &found, JobOutcome outcome, const QString &origin);
+    void askToClear();
     void rebuildTree();
     /// True when the instrument is new.
     bool addOnline(const InstrumentSummary &summary, const QString &origin);
