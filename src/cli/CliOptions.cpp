@@ -43,6 +43,13 @@ double parse(const std::string &name, const std::string &text, const NumberRange
                                    .toStdString());
 }
 
+/// The range behind a help text; a range without an end says nothing.
+std::string withRange(const std::string &help, const NumberRange &range, bool whole)
+{
+    const bool isOpen = range.min == std::numeric_limits<double>::lowest();
+    return isOpen ? help : help + " [" + rangeText(range, whole).toStdString() + ']';
+}
+
 /// An option whose number goes to `take`.
 template <typename Take>
 CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberRange &range,
@@ -54,7 +61,7 @@ CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberR
             [name, range, whole, take](const std::string &text) {
                 take(parse(name, text, range, whole));
             },
-            help)
+            withRange(help, range, whole))
         ->type_name(whole ? "COUNT" : "NUMBER");
 }
 

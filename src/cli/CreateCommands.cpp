@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "Presets.h"
 #include "commands.h"
 
 #include "base/EngineeringNumber.h"
@@ -55,6 +56,31 @@ int runCreate(CreateArguments &arguments)
     return arguments.console.run(job);
 }
 
+/// The number of a kind in the dialog's list of waveforms, by which it keeps the choice.
+int mainChoice(CreateKind kind)
+{
+    switch (kind) {
+    case CreateKind::Function:
+        return 0;
+    case CreateKind::Am:
+        return 1;
+    case CreateKind::Pm:
+        return 2;
+    case CreateKind::Fm:
+        return 3;
+    case CreateKind::Sweep:
+        return 4;
+    case CreateKind::MultiCarrier:
+        return 5;
+    case CreateKind::Pulse:
+    case CreateKind::Chirp:
+        return 6;
+    case CreateKind::Noise:
+        break;
+    }
+    return 7;
+}
+
 /// One kind of signal as a command, with the options that all kinds share.
 class KindCommand
 {
@@ -73,7 +99,9 @@ public:
         number("--min-clock", signalfields::minClock);
         number("--max-clock", signalfields::maxClock);
         addNumber(m_command, "--clock", m_arguments->numbers[&signalfields::clockRate],
-                  rangeOf(signalfields::clockRate), "Clock written to the file (default: fitted)");
+                  rangeOf(signalfields::clockRate),
+                  std::string("Clock written to the file (default: fitted). ") +
+                      signalfields::clockRate.help);
         addChoice(m_command, "--scaling", m_arguments->scaling, {"auto", "none"},
                   "Level scaling (default: auto)");
         m_command.add_flag("--zero-crest", m_arguments->zeroCrest,
@@ -86,6 +114,7 @@ public:
 
     KindCommand &number(const std::string &name, const SignalField &field)
     {
+        keep(name, field);
         addNumber(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
         return *this;
     }
@@ -93,6 +122,7 @@ public:
     /// A number of which only whole values make sense.
     KindCommand &count(const std::string &name, const SignalField &field)
     {
+        keep(name, field);
         addInteger(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
         return *this;
     }
@@ -100,13 +130,21 @@ public:
     KindCommand &subKind(const std::string &name, const QStringList &names, const std::string &help)
     {
         addChoice(m_command, name, m_arguments->choices.subKind, names, help);
+        m_kept.append(PresetField{.option = name,
+                                  .key = "wv.sub",
+                                  .names = names,
+                                  .condition = {"wv.main", mainChoice(m_arguments->kind)}});
         return *this;
     }
 
     KindCommand &ramp()
     {
-        addChoice(m_command, "--ramp", m_arguments->ramp, {"linear", "rcos"},
+        const QStringList names{"linear", "rcos"};
+        addChoice(m_command, "--ramp", m_arguments->ramp, names,
                   "Shape of the edges (default: linear)");
+        const bool isChirp = m_arguments->kind == CreateKind::Chirp;
+        m_kept +=
+            {.option = "--ramp", .key = isChirp ? "chirp.ramp" : "pulse.ramp", .names = names};
         return *this;
     }
 
@@ -114,10 +152,34 @@ public:
     {
         m_command.add_flag("--random-phase,!--no-random-phase", m_arguments->choices.randomPhase,
                            "Give each carrier a random phase (default: yes)");
+        m_kept.append(PresetField{.option = "--random-phase", .key = "mc.rndp"});
         return *this;
     }
 
+    /// To be called behind all options: what is kept in presets.
+    void presets(Presets &presets)
+    {
+        constexpr double Version = 1.0; // of the settings that the dialog keeps
+        const bool isChirp = m_arguments->kind == CreateKind::Chirp;
+        presets.add(m_command, "WvCreate", m_kept + presetTexts(),
+                    {{"ver", Version},
+                     {"wv.main", mainChoice(m_arguments->kind)},
+                     {"wv.sub", isChirp ? 1 : 0}});
+    }
+
 private:
+    void keep(const std::string &name, const SignalField &field)
+    {
+        if (field.key == nullptr) {
+            return;
+        }
+        PresetField kept{.option = name, .key = field.key, .unit = field.unit};
+        if (&field == &signalfields::oversampling) {
+            kept.condition = {"fn.overen", true};
+        }
+        m_kept.append(kept);
+    }
+
     [[nodiscard]] static NumberRange rangeOf(const SignalField &field)
     {
         return {field.unit, field.min, field.max};
@@ -126,11 +188,13 @@ private:
     [[nodiscard]] static std::string helpOf(const SignalField &field)
     {
         const QString start = engineeringText(field.start, field.unit);
-        return std::string(field.text) + " (default: " + start.toStdString() + ")";
+        const std::string text = field.help == nullptr ? field.text : field.help;
+        return text + " (default: " + start.toStdString() + ")";
     }
 
     std::shared_ptr<CreateArguments> m_arguments;
     CLI::App &m_command;
+    QList<PresetField> m_kept;
 };
 
 void addPeriodicKinds(CommandSet &commands, CLI::App &create)
@@ -144,16 +208,19 @@ void addPeriodicKinds(CommandSet &commands, CLI::App &create)
         .number("--offset-i", offsetI)
         .number("--offset-q", offsetQ)
         .number("--phase-q", phaseQ)
-        .count("--oversampling", oversampling);
+        .count("--oversampling", oversampling)
+        .presets(commands.presets);
     KindCommand(commands, create, "multicarrier", CreateKind::MultiCarrier, "Many carriers")
         .number("--spacing", spacing)
         .count("--carriers", carriers)
         .number("--offset-i", carrierOffsetI)
-        .randomPhase();
+        .randomPhase()
+        .presets(commands.presets);
     KindCommand(commands, create, "noise", CreateKind::Noise, "Band-limited noise")
         .subKind("--color", {"white", "pink", "brown"}, "Colour (default: white)")
         .number("--bandwidth", noiseBandwidth)
-        .number("--duration", noiseDuration);
+        .number("--duration", noiseDuration)
+        .presets(commands.presets);
 }
 
 void addPulseKinds(CommandSet &commands, CLI::App &create)
@@ -165,7 +232,8 @@ void addPulseKinds(CommandSet &commands, CLI::App &create)
         .number("--fall", pulseFall)
         .number("--blank", pulseBlank)
         .ramp()
-        .number("--resolution", pulseResolution);
+        .number("--resolution", pulseResolution)
+        .presets(commands.presets);
     KindCommand(commands, create, "chirp", CreateKind::Chirp, "Pulse with a frequency ramp")
         .number("--rise", chirpRise)
         .number("--on", chirpOn)
@@ -173,7 +241,8 @@ void addPulseKinds(CommandSet &commands, CLI::App &create)
         .number("--blank", chirpBlank)
         .ramp()
         .number("--resolution", chirpResolution)
-        .number("--range", chirpRange);
+        .number("--range", chirpRange)
+        .presets(commands.presets);
 }
 
 void addModulatedKinds(CommandSet &commands, CLI::App &create)
@@ -184,13 +253,15 @@ void addModulatedKinds(CommandSet &commands, CLI::App &create)
         .number("--freq", fmFrequency)
         .number("--dev", fmDeviation)
         .number("--freq2", fmFrequency2)
-        .number("--dev2", fmDeviation2);
+        .number("--dev2", fmDeviation2)
+        .presets(commands.presets);
     KindCommand(commands, create, "sweep", CreateKind::Sweep, "Frequency sweep")
         .subKind("--shape", {"linear", "sine", "triangular"}, "Course (default: linear)")
         .number("--dev", sweepDeviation)
         .number("--time", sweepTime)
         .number("--start-phase", sweepStart)
-        .number("--stop-phase", sweepStop);
+        .number("--stop-phase", sweepStop)
+        .presets(commands.presets);
     KindCommand(commands, create, "am", CreateKind::Am, "Amplitude modulation")
         .subKind("--mode",
                  {"regular", "lsb", "usb", "lsb+c", "usb+c", "lsb+usb", "2-tone", "2-tone-nc"},
@@ -198,10 +269,12 @@ void addModulatedKinds(CommandSet &commands, CLI::App &create)
         .number("--freq", amFrequency)
         .number("--depth", amDepth)
         .number("--freq2", amFrequency2)
-        .number("--depth2", amDepth2);
+        .number("--depth2", amDepth2)
+        .presets(commands.presets);
     KindCommand(commands, create, "pm", CreateKind::Pm, "Phase modulation by a tone")
         .number("--freq", pmFrequency)
-        .number("--dev", pmDeviation);
+        .number("--dev", pmDeviation)
+        .presets(commands.presets);
 }
 
 } // namespace

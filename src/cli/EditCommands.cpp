@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "Presets.h"
 #include "RangeArguments.h"
 #include "commands.h"
 
@@ -69,6 +70,16 @@ void addResample(CommandSet &commands)
                {"", 1, static_cast<double>(ResampleTarget::MaxSamples)}, "Target sample count")
         ->excludes(clock);
     addOutputArguments(command, resample->output);
+    commands.presets.add(command, "Resample",
+                         {{.option = "--clock",
+                           .key = "clock",
+                           .unit = "Hz",
+                           .condition = {"clkmode", 1},
+                           .unless = "--samples"},
+                          {.option = "--samples",
+                           .key = "samples",
+                           .condition = {"clkmode", 0},
+                           .unless = "--clock"}});
 }
 
 struct CropArguments
@@ -121,4 +132,7 @@ void addEditCommands(CommandSet &commands)
     addNumber(command, "--clock", level->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
               "Clock of the result (default: that of the source)");
     addOutputArguments(command, level->output);
+    commands.presets.add(command, "Rescale",
+                         {{.option = "--peak", .key = "peak", .unit = "dB"},
+                          {.option = "--pkrms", .key = "pkrms", .unit = "dB"}});
 }

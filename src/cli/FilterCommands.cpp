@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "Presets.h"
 #include "RangeArguments.h"
 #include "commands.h"
 
@@ -16,6 +17,12 @@ namespace {
 /// In the order of their names in the option's help.
 constexpr std::array FilterKinds{FilterKind::Rectangular, FilterKind::Cosine,
                                  FilterKind::RootCosine, FilterKind::Gauss};
+
+/// In the order of their numbers.
+QStringList windowNames()
+{
+    return {"none", "rife-vincent", "hann", "hanning", "blackmann", "bl-harris", "flat-top"};
+}
 
 struct FilterArguments
 {
@@ -78,9 +85,7 @@ void addFilter(CommandSet &commands)
     addNumber(command, "--bandwidth", filter->request.bandwidthHz,
               {"Hz", FilterRequest::MinBandwidthHz, MaxClockHz / 2},
               "One-sided bandwidth (default: 0.4 of the clock)");
-    addChoice(command, "--window", filter->request.window,
-              {"none", "rife-vincent", "hann", "hanning", "blackmann", "bl-harris", "flat-top"},
-              "Window over the filter");
+    addChoice(command, "--window", filter->request.window, windowNames(), "Window over the filter");
     addInteger(command, "--length", filter->length,
                {"", FilterRequest::MinLength, FilterRequest::MaxLength},
                "Length in samples (default: 150)");
@@ -89,6 +94,14 @@ void addFilter(CommandSet &commands)
     addNumber(command, "--clock", filter->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
               "Clock written to the file (default: that of the source)");
     addOutputArguments(command, filter->output);
+    commands.presets.add(command, "Filter",
+                         {{.option = "--type",
+                           .key = "filtertype",
+                           .names = {"rectangular", "root-cosine", "cosine", "gauss"}},
+                          {.option = "--bandwidth", .key = "filterfreq", .unit = "Hz"},
+                          {.option = "--window", .key = "windowtype", .names = windowNames()},
+                          {.option = "--length", .key = "filterlength"},
+                          {.option = "--param", .key = "filterparam"}});
 }
 
 struct PolarArguments
@@ -139,6 +152,9 @@ void addPolar(CommandSet &commands)
     addNumber(command, "--clock", polar->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
               "Clock written to the files (default: that of the source)");
     addOutputTexts(command, polar->output);
+    commands.presets.add(
+        command, "Polar",
+        {{.option = "--offset", .key = "offset"}, {.option = "--gain", .key = "gain"}});
 }
 
 } // namespace

@@ -2,6 +2,7 @@
 #include "ImportArguments.h"
 
 #include "Console.h"
+#include "Presets.h"
 
 void addImportOptions(CLI::App &command, ImportArguments &arguments, const std::string &fileHelp,
                       const std::string &clockHelp)
@@ -21,6 +22,16 @@ void addListOptions(CLI::App &command, ImportArguments &arguments)
     command.add_flag("--json", arguments.json, "With --list: print JSON");
     // A listing writes nothing.
     command.get_option("--output")->required(false);
+}
+
+void addImportPresets(CLI::App &command, CommandSet &commands, const QString &group)
+{
+    commands.presets.add(
+        command, group,
+        QList<PresetField>{
+            {.option = "--scaling", .key = "scaling", .names = {"none", "down", "auto"}},
+            {.option = "--clock", .key = "clock", .unit = "Hz"}} +
+            presetTexts());
 }
 
 bool outputStands(ImportArguments &arguments, int &exitCode)

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "CliOptions.h"
+#include "commands.h"
 
 #include "jobs/ImportJob.h"
 
@@ -40,6 +41,9 @@ void addImportOptions(CLI::App &command, ImportArguments &arguments, const std::
 
 /// Adds --list and --json, with which no output is needed.
 void addListOptions(CLI::App &command, ImportArguments &arguments);
+
+/// Adds the presets of an import whose dialog keeps its fields in `group`.
+void addImportPresets(CLI::App &command, CommandSet &commands, const QString &group);
 
 /// Whether the output may be written; if not, `exitCode` tells how to end.
 [[nodiscard]] bool outputStands(ImportArguments &arguments, int &exitCode);

@@ -395,6 +395,7 @@ void addMatCommand(CLI::App &import, CommandSet &commands)
     addText(command, "--variable", mat->variable,
             "Name of the vector (default: the only one that can be imported)");
     addListOptions(command, *mat);
+    addImportPresets(command, commands, "Mat2Wv");
 }
 
 void addRiqCommand(CLI::App &import, CommandSet &commands)
@@ -407,6 +408,7 @@ void addRiqCommand(CLI::App &import, CommandSet &commands)
                {{}, 1, static_cast<double>(std::numeric_limits<int>::max())},
                "Number of the packet, from 1 (default: the only one)");
     addListOptions(command, *riq);
+    addImportPresets(command, commands, "Riq2Wv");
 }
 
 void addWavCommand(CLI::App &import, CommandSet &commands)
@@ -417,6 +419,7 @@ void addWavCommand(CLI::App &import, CommandSet &commands)
         commands.action, wav, runWav);
     addImportOptions(command, *wav, "WAVE file to read", " (default: the file's sample rate)");
     addListOptions(command, *wav);
+    addImportPresets(command, commands, "Wav2Wv");
 }
 
 } // namespace

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CliOptions.h"
 #include "Console.h"
+#include "Presets.h"
 #include "RangeArguments.h"
 #include "commands.h"
 
@@ -242,6 +243,11 @@ void addWrap(CommandSet &commands)
     addNumber(command, "--clock", wrap->request.clockHz, {"Hz", MinClockHz, MaxClockHz},
               "Clock written to the file (default: that of the source)");
     addOutputArguments(command, wrap->output);
+    commands.presets.add(command, "WrapAround",
+                         QList<PresetField>{{.option = "--cutoff", .key = "filter", .unit = "Hz"},
+                                            {.option = "--range", .key = "range"},
+                                            {.option = "--clock", .key = "clock", .unit = "Hz"}} +
+                             presetTexts());
 }
 
 } // namespace

@@ -39,4 +39,5 @@ void addSigmfCommand(CLI::App &import, CommandSet &commands)
     constexpr double MaxChannels = 65536;
     addInteger(command, "--channel", sigmf->channel, {{}, 1, MaxChannels},
                "Channel to import, from 1 (default: 1)");
+    addImportPresets(command, commands, "Sigmf2Wv");
 }

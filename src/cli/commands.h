@@ -6,6 +6,7 @@
 #include <functional>
 
 class Console;
+class Presets;
 
 /// Each group of commands adds itself to the parser; the chosen command leaves in `action` what is
 /// to be run. The console and the action outlive the parser's callbacks.
@@ -14,6 +15,7 @@ struct CommandSet
     CLI::App &app;
     Console &console;
     std::function<int()> &action;
+    Presets &presets;
 };
 
 void addFileCommands(CommandSet &commands);

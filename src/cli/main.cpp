@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Console.h"
+#include "Presets.h"
 #include "commands.h"
+#include "hints.h"
 
 #include <CLI/CLI.hpp>
 #include <QGuiApplication>
@@ -51,8 +53,10 @@ QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
     if (unknown.empty()) {
         return QString::fromLocal8Bit(problem.what());
     }
-    return QString("'%1' is no command, option or argument known here; see --help.")
-        .arg(QString::fromLocal8Bit(unknown.front()));
+    const QString typed = QString::fromLocal8Bit(unknown.front());
+    const QString nearest = nearestName(app, typed);
+    return QString("'%1' is no command, option or argument known here; %2see --help.")
+        .arg(typed, nearest.isEmpty() ? QString() : QString("did you mean '%1'? Or ").arg(nearest));
 }
 
 /// The arguments, last one first, as the parser takes them. Where several files may stand it takes
@@ -98,7 +102,8 @@ int run(int argc, char **argv)
     app.add_flag("--verbose", verbose, "The whole log, debug messages included");
     app.add_flag("--no-progress", noProgress, "No progress bar on a terminal");
 
-    CommandSet commands{app, console, action};
+    Presets presets;
+    CommandSet commands{app, console, action, presets};
     addFileCommands(commands);
     addMeasureCommand(commands);
     addPlotCommand(commands);
@@ -110,8 +115,10 @@ int run(int argc, char **argv)
     addComposeCommand(commands);
     addCheckCommand(commands);
     addInstrumentCommands(commands);
+    addExamples(app);
     try {
         app.parse(argumentsOf(argc, argv));
+        presets.load();
     } catch (const CLI::ParseError &problem) {
         // The library's own codes tell only help and version, which are no errors, from the rest.
         if (problem.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
@@ -125,7 +132,8 @@ int run(int argc, char **argv)
     console.setQuiet(quiet);
     console.setVerbose(verbose);
     console.setShowProgress(!noProgress);
-    return action();
+    const int code = action();
+    return code != ExitDone || presets.save() ? code : console.failed();
 }
 
 } // namespace

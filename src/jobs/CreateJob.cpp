@@ -110,6 +110,21 @@ bool CreateJob::save(TempStream &data)
     ReportLines rows = levelRows(record);
     rows.insert(1, ReportLine::row("Clock", engineeringText(record.clock, "Hz")));
     reportAll(rows);
+    warnOfOtherClock();
     emit report(ReportLine::heading("Saving file"));
     return m_output.save({.data = data.stream()}, "Saving file...");
+}
+
+void CreateJob::warnOfOtherClock()
+{
+    const double factor = request().clockHz.value_or(facts().clockHz) / facts().clockHz;
+    constexpr double Rounding = 1e-9; // of a clock that came through a field
+    if (std::fabs(factor - 1) > Rounding) {
+        emit report(ReportLine::warning(
+            QString("The samples were made for a clock of %1. At %2 all frequencies are those "
+                    "asked for times %3, all times divided by it.")
+                .arg(engineeringText(facts().clockHz, "Hz"),
+                     engineeringText(*request().clockHz, "Hz"))
+                .arg(factor, 0, 'g', 6)));
+    }
 }

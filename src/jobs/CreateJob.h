@@ -72,6 +72,7 @@ public:
 private:
     [[nodiscard]] bool work() override;
     [[nodiscard]] bool save(TempStream &data);
+    void warnOfOtherClock();
 
     WaveformOutput m_output;
 };

@@ -68,6 +68,13 @@ QString stripBraces(const QString &text)
 QString tagText(const QString &tag, const QString &text)
 {
     QString kept = stripBraces(text);
+    if (kept.size() < text.size()) {
+        Tracer::Trace(Tracer::Warning,
+                      QString("The %1 loses %2 characters: a brace can't stand in a tag and goes "
+                              "with the character behind it.")
+                          .arg(tag)
+                          .arg(text.size() - kept.size()));
+    }
     if (kept.size() > MaxTagText) {
         Tracer::Trace(Tracer::Warning,
                       QString("The %1 has %2 characters; the file takes the first %3.")

@@ -6,8 +6,12 @@
 #include "runjob.h"
 #include "windowplace.h"
 
+#include <QBoxLayout>
+#include <QFileDialog>
 #include <QFileInfo>
 #include <QLineEdit>
+#include <QMenu>
+#include <QMessageBox>
 #include <QPlainTextEdit>
 #include <QPushButton>
 #include <QRegularExpression>
@@ -18,6 +22,16 @@
 
 #include <algorithm>
 #include <utility>
+#include <vector>
+
+namespace {
+
+QString presetFilter()
+{
+    return "Settings File (*.ini)";
+}
+
+} // namespace
 
 ToolWizard::ToolWizard(Frame frame, QWidget *parent)
     : DlgBase(parent)
@@ -34,6 +48,7 @@ void ToolWizard::setUpWizard()
     m_report = findChild<QTextEdit *>("te_result");
     Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
     limitTagTexts();
+    addPresetMenu();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
     connect(m_close, &QPushButton::clicked, this, &ToolWizard::reject);
@@ -62,6 +77,72 @@ void ToolWizard::limitTagTexts()
             comment->setTextCursor(cursor);
         }
     });
+}
+
+void ToolWizard::addPresetMenu()
+{
+    auto *row = qobject_cast<QBoxLayout *>(m_previous->parentWidget()->layout());
+    // A tool may have such buttons of its own.
+    if (row == nullptr || findChild<QPushButton *>("pb_saveprofile") != nullptr) {
+        return;
+    }
+    auto *button = new QPushButton("Pre&set");
+    button->setObjectName("pb_preset");
+    button->setToolTip("Save the fields of this tool in a file, or load them from one");
+    button->setAutoDefault(false);
+    auto *menu = new QMenu(button);
+    menu->addAction("&Load Preset...", this, &ToolWizard::askAndLoad);
+    menu->addAction("&Save Preset...", this, &ToolWizard::askAndSave);
+    button->setMenu(menu);
+    row->insertWidget(0, button);
+}
+
+void ToolWizard::askAndLoad()
+{
+    const QString name = QFileDialog::getOpenFileName(this, "Load Preset", {}, presetFilter());
+    if (name.isEmpty()) {
+        return;
+    }
+    QSettings settings(name, QSettings::IniFormat);
+    settings.beginGroup(m_frame.settingsGroup);
+    if (settings.status() != QSettings::NoError || settings.childKeys().isEmpty()) {
+        QMessageBox::warning(this, windowTitle(),
+                             "The file holds no settings of this tool.\n" + name);
+        return;
+    }
+    // The settings are wanted for the files that were chosen here.
+    std::vector<std::pair<QLineEdit *, QString>> files;
+    for (QLineEdit *field : findChildren<QLineEdit *>()) {
+        if (field->objectName().contains(QRegularExpression("^le_(in|out)file"))) {
+            files.emplace_back(field, field->text());
+        }
+    }
+    readFields(settings);
+    for (const auto &[field, text] : files) {
+        field->setText(text);
+    }
+    // Whatever a page has made of the fields is made anew on the way.
+    showPage(0);
+}
+
+void ToolWizard::askAndSave()
+{
+    takeTypedValues();
+    QString name = QFileDialog::getSaveFileName(this, "Save Preset", {}, presetFilter());
+    if (name.isEmpty()) {
+        return;
+    }
+    if (!name.endsWith(".ini", Qt::CaseInsensitive)) {
+        name += ".ini";
+    }
+    QSettings settings(name, QSettings::IniFormat);
+    settings.beginGroup(m_frame.settingsGroup);
+    writeFields(settings);
+    settings.endGroup();
+    settings.sync();
+    if (settings.status() != QSettings::NoError) {
+        QMessageBox::warning(this, windowTitle(), "The settings file cannot be written.\n" + name);
+    }
 }
 
 int ToolWizard::pageAfter(int page)

@@ -23,8 +23,10 @@ class QTextEdit;
 /// The form has a stack "sw_assist" whose last page is the status page, with the report "te_result"
 /// on it, and below it the buttons "pb_prev", "pb_next" and "cb_close". The page before the last
 /// one is the output page: there Next reads Run. Output fields, where a form has them, are
-/// "le_outfile", "te_comment" and "le_copyright". A derived class calls setUpWizard() once its
-/// form is set up, and answers a few questions; it moves no page and wires no button itself.
+/// "le_outfile", "te_comment" and "le_copyright". A button with a menu saves the tool's fields as a
+/// preset, the same file as --preset of the command takes, and loads them. A derived class calls
+/// setUpWizard() once its form is set up, and answers a few questions; it moves no page and wires
+/// no button itself.
 class ToolWizard : public DlgBase
 {
     Q_OBJECT
@@ -93,6 +95,9 @@ private:
     void goBack();
     void run();
     void limitTagTexts();
+    void addPresetMenu();
+    void askAndLoad();
+    void askAndSave();
     void takeTypedValues() const;
 
     Frame m_frame;

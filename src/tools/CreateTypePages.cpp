@@ -11,26 +11,27 @@
 
 CreateTypePages::CreateTypePages(Ui::DlgWvCreate &form)
 {
-    setUp(*form.le_maxclock, signalfields::maxClock, "clk.max");
-    setUp(*form.le_minclock, signalfields::minClock, "clk.min");
-    setUp(*form.le_clockrate, signalfields::clockRate, nullptr);
+    setUp(*form.le_maxclock, signalfields::maxClock);
+    setUp(*form.le_minclock, signalfields::minClock);
+    setUp(*form.le_clockrate, signalfields::clockRate);
     fillFunctionPage(form);
     fillPulsePages(form);
     fillModulationPages(form);
     fillOtherPages(form);
 }
 
-void CreateTypePages::setUp(QtNumericEdit &edit, const SignalField &field, const char *key)
+void CreateTypePages::setUp(QtNumericEdit &edit, const SignalField &field)
 {
     const QString unit = field.unit;
-    edit.setName(field.text);
+    edit.setName(field.help == nullptr ? QString(field.text)
+                                       : QString("%1\n%2").arg(field.text, field.help));
     edit.setUnit(unit);
     edit.setScaled(unit == "Hz" || unit == "s");
     edit.setLowerPrefix(unit == "s");
     edit.setMax(field.max);
     edit.setMin(field.min);
     edit.setVal(field.start);
-    m_fields[&field] = {&edit, key};
+    m_fields[&field] = &edit;
     if (&field == &signalfields::oversampling || &field == &signalfields::carriers) {
         roundInput(edit);
     }
@@ -48,11 +49,11 @@ QFormLayout *CreateTypePages::layoutOf(QWidget *page, const QString &title)
 }
 
 void CreateTypePages::add(QFormLayout *layout, const QString &label, const SignalField &field,
-                          const char *name, const char *key)
+                          const char *name)
 {
     auto *edit = new QtNumericEdit;
     edit->setObjectName(name);
-    setUp(*edit, field, key);
+    setUp(*edit, field);
     layout->addRow(label, edit);
 }
 
@@ -70,18 +71,18 @@ void CreateTypePages::fillFunctionPage(const Ui::DlgWvCreate &form)
 {
     using namespace signalfields;
     QFormLayout *layout = layoutOf(form.page_function, "Function");
-    add(layout, "&Frequency", frequency, "le_freq", "fn.freq");
-    add(layout, "&I Amplitude", amplitudeI, "le_ampi", "fn.ampi");
-    add(layout, "&Q Amplitude", amplitudeQ, "le_ampq", "fn.ampq");
-    add(layout, "I &Offset", offsetI, "le_ofsi", "fn.ofsi");
-    add(layout, "Q Offs&et", offsetQ, "le_ofsq", "fn.ofsq");
-    add(layout, "Q P&hase Offset", phaseQ, "le_phaseq", "fn.phsq");
+    add(layout, "&Frequency", frequency, "le_freq");
+    add(layout, "&I Amplitude", amplitudeI, "le_ampi");
+    add(layout, "&Q Amplitude", amplitudeQ, "le_ampq");
+    add(layout, "I &Offset", offsetI, "le_ofsi");
+    add(layout, "Q Offs&et", offsetQ, "le_ofsq");
+    add(layout, "Q P&hase Offset", phaseQ, "le_phaseq");
     m_oversampling = new QCheckBox("&Custom\nOversampling");
     m_oversampling->setObjectName("cb_over");
     m_oversampling->setToolTip("Start from this number of samples per period");
     auto *ratio = new QtNumericEdit;
     ratio->setObjectName("le_over");
-    setUp(*ratio, oversampling, "fn.over");
+    setUp(*ratio, oversampling);
     layout->addRow(m_oversampling, ratio);
 }
 
@@ -89,57 +90,57 @@ void CreateTypePages::fillPulsePages(const Ui::DlgWvCreate &form)
 {
     using namespace signalfields;
     QFormLayout *layout = layoutOf(form.page_pulse, "Pulse");
-    add(layout, "&Rise Time", pulseRise, "le_trise", "pulse.rise");
-    add(layout, "&On Time", pulseOn, "le_ton", "pulse.on");
-    add(layout, "&Fall Time", pulseFall, "le_tfall", "pulse.fall");
-    add(layout, "&Blank Time", pulseBlank, "le_tblank", "pulse.blank");
+    add(layout, "&Rise Time", pulseRise, "le_trise");
+    add(layout, "&On Time", pulseOn, "le_ton");
+    add(layout, "&Fall Time", pulseFall, "le_tfall");
+    add(layout, "&Blank Time", pulseBlank, "le_tblank");
     m_pulseRamp = addRamp(layout, "cb_rtype");
-    add(layout, "Time R&esolution", pulseResolution, "le_pulseresolution", "pulse.tres");
+    add(layout, "Time R&esolution", pulseResolution, "le_pulseresolution");
 
     layout = layoutOf(form.page_chirp, "Chirp");
-    add(layout, "&Rise Time", chirpRise, "le_trise_2", "chirp.rise");
-    add(layout, "&On Time", chirpOn, "le_ton_2", "chirp.on");
-    add(layout, "&Fall Time", chirpFall, "le_tfall_2", "chirp.fall");
-    add(layout, "&Blank Time", chirpBlank, "le_tblank_2", "chirp.blank");
+    add(layout, "&Rise Time", chirpRise, "le_trise_2");
+    add(layout, "&On Time", chirpOn, "le_ton_2");
+    add(layout, "&Fall Time", chirpFall, "le_tfall_2");
+    add(layout, "&Blank Time", chirpBlank, "le_tblank_2");
     m_chirpRamp = addRamp(layout, "cb_rtype_2");
-    add(layout, "Time R&esolution", chirpResolution, "le_pulseresolution_2", "chirp.tres");
-    add(layout, "&Chirp Range", chirpRange, "le_chirprange", "chirp.range");
+    add(layout, "Time R&esolution", chirpResolution, "le_pulseresolution_2");
+    add(layout, "&Chirp Range", chirpRange, "le_chirprange");
 }
 
 void CreateTypePages::fillModulationPages(const Ui::DlgWvCreate &form)
 {
     using namespace signalfields;
     QFormLayout *layout = layoutOf(form.page_fm, "FM");
-    add(layout, "&Modulation Frequency", fmFrequency, "le_modfreq", "fm.modf");
-    add(layout, "&Deviation", fmDeviation, "le_dev", "fm.dev");
-    add(layout, "Modulation &Frequency, 2nd Tone", fmFrequency2, "le_modfreq_2", "fm.modf2");
-    add(layout, "D&eviation, 2nd Tone", fmDeviation2, "le_dev_2", "fm.dev2");
+    add(layout, "&Modulation Frequency", fmFrequency, "le_modfreq");
+    add(layout, "&Deviation", fmDeviation, "le_dev");
+    add(layout, "Modulation &Frequency, 2nd Tone", fmFrequency2, "le_modfreq_2");
+    add(layout, "D&eviation, 2nd Tone", fmDeviation2, "le_dev_2");
 
     layout = layoutOf(form.page_sweep, "FM Sweep");
-    add(layout, "&Deviation", sweepDeviation, "le_sweepdev", "fmswe.dev");
-    add(layout, "Sweep &Time", sweepTime, "le_sweeptime", "fmswe.time");
-    add(layout, "&Start Phase", sweepStart, "le_startphase", "fmswe.pstart");
+    add(layout, "&Deviation", sweepDeviation, "le_sweepdev");
+    add(layout, "Sweep &Time", sweepTime, "le_sweeptime");
+    add(layout, "&Start Phase", sweepStart, "le_startphase");
     // The key keeps its name from another field of old.
-    add(layout, "St&op Phase", sweepStop, "le_stopphase", "fmswe.modf");
+    add(layout, "St&op Phase", sweepStop, "le_stopphase");
 
     layout = layoutOf(form.page_am, "AM");
-    add(layout, "&Modulation Frequency", amFrequency, "le_ammodfreq", "am.modf");
-    add(layout, "&Depth", amDepth, "le_amdepth", "am.dep");
-    add(layout, "Modulation &Frequency, 2nd Tone", amFrequency2, "le_ammodfreq_2", "am.modf2");
-    add(layout, "D&epth, 2nd Tone", amDepth2, "le_amdepth_2", "am.dep2");
+    add(layout, "&Modulation Frequency", amFrequency, "le_ammodfreq");
+    add(layout, "&Depth", amDepth, "le_amdepth");
+    add(layout, "Modulation &Frequency, 2nd Tone", amFrequency2, "le_ammodfreq_2");
+    add(layout, "D&epth, 2nd Tone", amDepth2, "le_amdepth_2");
 
     layout = layoutOf(form.page_pm, "PM");
-    add(layout, "&Modulation Frequency", pmFrequency, "le_pmmodfreq", "pm.modf");
-    add(layout, "&Deviation", pmDeviation, "le_pmdev", "pm.dev");
+    add(layout, "&Modulation Frequency", pmFrequency, "le_pmmodfreq");
+    add(layout, "&Deviation", pmDeviation, "le_pmdev");
 }
 
 void CreateTypePages::fillOtherPages(const Ui::DlgWvCreate &form)
 {
     using namespace signalfields;
     QFormLayout *layout = layoutOf(form.page_multicarrier, "Multi Carrier");
-    add(layout, "Frequency &Spacing", spacing, "le_spacing", "mc.spc");
-    add(layout, "Number of &Carriers", carriers, "le_carriers", "mc.carr");
-    add(layout, "&I Offset", carrierOffsetI, "le_ioffset", "mc.iofs");
+    add(layout, "Frequency &Spacing", spacing, "le_spacing");
+    add(layout, "Number of &Carriers", carriers, "le_carriers");
+    add(layout, "&I Offset", carrierOffsetI, "le_ioffset");
     m_randomPhase = new QCheckBox("&Random Phase");
     m_randomPhase->setObjectName("cb_randomphase");
     m_randomPhase->setToolTip("Give each carrier a random phase, for a lower peak");
@@ -147,13 +148,13 @@ void CreateTypePages::fillOtherPages(const Ui::DlgWvCreate &form)
     layout->addRow(QString(), m_randomPhase);
 
     layout = layoutOf(form.page_noise, "Noise");
-    add(layout, "&Bandwidth", noiseBandwidth, "le_noisebw", "noise.bw");
-    add(layout, "&Duration", noiseDuration, "le_noiseduration", "noise.time");
+    add(layout, "&Bandwidth", noiseBandwidth, "le_noisebw");
+    add(layout, "&Duration", noiseDuration, "le_noiseduration");
 }
 
 double CreateTypePages::value(const SignalField &field) const
 {
-    return m_fields.at(&field).edit->getVal();
+    return m_fields.at(&field)->getVal();
 }
 
 CreateChoices CreateTypePages::choices(CreateKind kind) const
@@ -168,14 +169,14 @@ CreateChoices CreateTypePages::choices(CreateKind kind) const
 
 void CreateTypePages::setEnabled(const SignalField &field, bool enabled) const
 {
-    m_fields.at(&field).edit->setEnabled(enabled);
+    m_fields.at(&field)->setEnabled(enabled);
 }
 
 void CreateTypePages::writeSettings(QSettings &settings) const
 {
-    for (const auto &[field, shown] : m_fields) {
-        if (shown.key) {
-            settings.setValue(shown.key, shown.edit->getVal());
+    for (const auto &[field, edit] : m_fields) {
+        if (field->key) {
+            settings.setValue(field->key, edit->getVal());
         }
     }
     settings.setValue("fn.overen", m_oversampling->isChecked());
@@ -186,11 +187,11 @@ void CreateTypePages::writeSettings(QSettings &settings) const
 
 void CreateTypePages::readSettings(const QSettings &settings) const
 {
-    for (const auto &[field, shown] : m_fields) {
-        if (shown.key) {
+    for (const auto &[field, edit] : m_fields) {
+        if (field->key) {
             bool isNumber = false;
-            const double value = settings.value(shown.key, field->start).toDouble(&isNumber);
-            shown.edit->setVal(isNumber ? value : field->start);
+            const double value = settings.value(field->key, field->start).toDouble(&isNumber);
+            edit->setVal(isNumber ? value : field->start);
         }
     }
     m_oversampling->setChecked(settings.value("fn.overen", false).toBool());

@@ -38,15 +38,8 @@ public:
     void readSettings(const QSettings &settings) const;
 
 private:
-    struct Shown
-    {
-        QtNumericEdit *edit = nullptr;
-        const char *key = nullptr; ///< in the settings; null for a value that isn't kept
-    };
-
-    void setUp(QtNumericEdit &edit, const SignalField &field, const char *key);
-    void add(QFormLayout *layout, const QString &label, const SignalField &field, const char *name,
-             const char *key);
+    void setUp(QtNumericEdit &edit, const SignalField &field);
+    void add(QFormLayout *layout, const QString &label, const SignalField &field, const char *name);
     static QFormLayout *layoutOf(QWidget *page, const QString &title);
     static QComboBox *addRamp(QFormLayout *layout, const char *name);
     void fillPulsePages(const Ui::DlgWvCreate &form);
@@ -54,7 +47,7 @@ private:
     void fillModulationPages(const Ui::DlgWvCreate &form);
     void fillOtherPages(const Ui::DlgWvCreate &form);
 
-    std::map<const SignalField *, Shown> m_fields;
+    std::map<const SignalField *, QtNumericEdit *> m_fields;
     QCheckBox *m_oversampling = nullptr;
     QCheckBox *m_randomPhase = nullptr;
     QComboBox *m_pulseRamp = nullptr;

@@ -7,6 +7,8 @@
 #include "jobs/PolarPreview.h"
 #include "jobs/ResampleJob.h"
 
+#include <QSettings>
+
 namespace {
 
 constexpr int FirstPage = 0;
@@ -66,6 +68,22 @@ DlgPolar::~DlgPolar() = default;
 void DlgPolar::sourceChanged()
 {
     m_ui->le_outfile_2->setText(fileNameWithSuffix(sourceFile(), "_amplitude"));
+}
+
+void DlgPolar::writeFields(QSettings &settings) const
+{
+    SourceWizard::writeFields(settings);
+    settings.setValue("offset", m_ui->le_am_offset->getVal());
+    settings.setValue("gain", m_ui->le_am_amplitude->getVal());
+}
+
+void DlgPolar::readFields(const QSettings &settings)
+{
+    SourceWizard::readFields(settings);
+    const PolarRequest start;
+    m_ui->le_am_offset->setVal(settings.value("offset", start.offset).toDouble());
+    m_ui->le_am_amplitude->setVal(settings.value("gain", start.gain).toDouble());
+    slot_levels();
 }
 
 bool DlgPolar::sourceRead()

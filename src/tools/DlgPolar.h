@@ -30,6 +30,8 @@ protected:
     [[nodiscard]] bool isComplete(int page) const override;
     [[nodiscard]] bool sourceRead() override;
     void sourceChanged() override;
+    void writeFields(QSettings &settings) const override;
+    void readFields(const QSettings &settings) override;
     void sourceReleased() override;
     void makePreview() override;
 

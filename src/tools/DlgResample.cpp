@@ -53,6 +53,8 @@ void DlgResample::writeFields(QSettings &settings) const
 {
     EditWizard::writeFields(settings);
     settings.setValue("clkmode", m_ui->rb_clock->isChecked() ? 1 : 0);
+    settings.setValue("clock", m_ui->le_target_clock->getVal());
+    settings.setValue("samples", m_ui->le_target_samples->getVal());
 }
 
 void DlgResample::readFields(const QSettings &settings)
@@ -60,6 +62,10 @@ void DlgResample::readFields(const QSettings &settings)
     EditWizard::readFields(settings);
     const bool clockDecides = settings.value("clkmode", 1).toInt() != 0;
     (clockDecides ? m_ui->rb_clock : m_ui->rb_samples)->setChecked(true);
+    QtNumericEdit &clock = *m_ui->le_target_clock;
+    QtNumericEdit &samples = *m_ui->le_target_samples;
+    clock.setVal(settings.value("clock", clock.getVal()).toDouble());
+    samples.setVal(settings.value("samples", samples.getVal()).toDouble());
     slot_mode();
 }
 

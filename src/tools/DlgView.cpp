@@ -4,6 +4,7 @@
 #include "ui_DlgView.h"
 
 #include "FiguresBox.h"
+#include "saveselection.h"
 
 #include "base/EngineeringNumber.h"
 #include "display/CWidgetConstellation.h"
@@ -18,10 +19,12 @@
 
 #include <QComboBox>
 #include <QFileInfo>
+#include <QPushButton>
 #include <QScrollArea>
 #include <QSettings>
 #include <QSplitter>
 
+#include <algorithm>
 #include <cmath>
 #include <cstdlib>
 #include <numbers>
@@ -96,6 +99,12 @@ void DlgView::addSideColumn()
     m_figures->setObjectName("gb_figures");
     addSpectrumChoices();
     m_ui->vl_side->insertWidget(m_ui->vl_side->indexOf(m_ui->gb_file), m_figures);
+    m_saveSelection = new QPushButton("Save Se&lection...");
+    m_saveSelection->setObjectName("pb_save_selection");
+    m_saveSelection->setToolTip("Save the samples from the one cursor to the other, both included");
+    m_saveSelection->setAutoDefault(false);
+    m_ui->vl_side->insertWidget(m_ui->vl_side->indexOf(m_ui->gb_delta) + 1, m_saveSelection);
+    connect(m_saveSelection, &QPushButton::clicked, this, &DlgView::saveSelection);
     // No value that comes and goes moves the plots.
     const int widest = fontMetrics().horizontalAdvance("-888.888888 ms ");
     for (QLabel *label : {m_ui->l_csr_time, m_ui->l_delta_time, m_ui->l_file_time, m_ui->l_fmin}) {
@@ -343,6 +352,7 @@ void DlgView::showDelta()
     const qint64 cursor = m_ui->w_view->cursor(ViewFrame::Measuring);
     const qint64 reference = m_ui->w_view->cursor(ViewFrame::Reference);
     const bool both = cursor >= 0 && reference >= 0;
+    m_saveSelection->setEnabled(both);
     m_ui->l_delta_time->setText(both ? timeText(cursor - reference) : noValue());
     m_ui->l_delta_samples->setText(both ? QString::number(cursor - reference) : noValue());
     const double clockHz = m_ui->w_view->clockHz();
@@ -350,6 +360,15 @@ void DlgView::showDelta()
     m_ui->l_delta_rate->setText(
         hasRate ? engineeringText(clockHz / static_cast<double>(std::abs(cursor - reference)), "Hz")
                 : noValue());
+}
+
+void DlgView::saveSelection()
+{
+    const qint64 cursor = m_ui->w_view->cursor(ViewFrame::Measuring);
+    const qint64 reference = m_ui->w_view->cursor(ViewFrame::Reference);
+    ::saveSelection(this, {.fileName = m_source->info().fileName,
+                           .from = std::min(cursor, reference),
+                           .count = std::abs(cursor - reference) + 1});
 }
 
 void DlgView::showFile()

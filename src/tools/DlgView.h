@@ -9,6 +9,7 @@ class CWidgetConstellation;
 class CWidgetSpectrum;
 class FiguresBox;
 class QComboBox;
+class QPushButton;
 class QSplitter;
 class SourceWaveform;
 class ViewWindow;
@@ -56,6 +57,7 @@ private:
     void showCursorSample();
     void clearCursorValues();
     void showDelta();
+    void saveSelection();
     void showFile();
     [[nodiscard]] QString timeText(qint64 samples) const;
     void unload();
@@ -66,6 +68,7 @@ private:
     CWidgetConstellation *m_constellation = nullptr;
     QSplitter *m_plots = nullptr;
     FiguresBox *m_figures = nullptr;
+    QPushButton *m_saveSelection = nullptr;
     QComboBox *m_average = nullptr;
     QComboBox *m_length = nullptr;
     QComboBox *m_window = nullptr;

@@ -32,6 +32,7 @@ private slots:
     void cropsPieces();
     void exportsAndTakesBack();
     void refusesBadSigmf();
+    void keepsPresets();
     void listsWavFiles();
     void carriesSoundThrough();
 
@@ -361,6 +362,45 @@ void TestCliResults::refusesBadSigmf()
     QCOMPARE(lines.value(2), "1,0.5,-1.52592547e-05,2");
     QVERIFY(m_folder.store("bad.sigmf", QByteArray(700, 'x')));
     QVERIFY(run("import sigmf bad.sigmf -o bad.wv --force").lastLine().contains("is damaged"));
+}
+
+void TestCliResults::keepsPresets()
+{
+    const auto content = [&] { return sampleWords(m_folder.load("out.wv")); };
+    QCOMPARE(run("create fm --tones 2 --freq 2k --dev 75k --save-preset fm.ini -o out.wv --force")
+                 .exitCode,
+             0);
+    const QByteArray made = content();
+    QCOMPARE(m_folder.load("fm.ini"), "[WvCreate]\nfm.dev=75000\nfm.modf=2000\nver=1\nwv.main=3\n"
+                                      "wv.sub=1\n");
+    QCOMPARE(run("create fm --preset fm.ini -o out.wv --force").exitCode, 0);
+    QVERIFY(content() == made);
+    // What is given wins, and the fields of one kind don't reach another.
+    QCOMPARE(run("create fm --dev 10k --tones 2 --freq 2k -o out.wv --force").exitCode, 0);
+    const QByteArray other = content();
+    QCOMPARE(run("create fm --preset fm.ini --dev 10k -o out.wv --force").exitCode, 0);
+    QVERIFY(content() == other && other != made);
+    QCOMPARE(run("create am --preset fm.ini -o out.wv --force").exitCode, 0);
+    const QByteArray modulated = content();
+    QCOMPARE(run("create am -o out.wv --force").exitCode, 0);
+    QVERIFY(content() == modulated);
+
+    // As the dialog of the tool writes it; a value may have lost its meaning.
+    QVERIFY(m_folder.store("in.wv", toneFile(3000)));
+    QVERIFY(m_folder.store("resample.ini", "[Resample]\nclkmode=0\nclock=1e6\nsamples=1.5e3\n"));
+    QCOMPARE(run("resample in.wv --preset resample.ini -o out.wv --force").exitCode, 0);
+    QCOMPARE(tag(m_folder.load("out.wv"), "SAMPLES"), "1500");
+    QCOMPARE(run("resample in.wv --preset resample.ini --clock 2M -o out.wv --force").exitCode, 0);
+    QCOMPARE(tag(m_folder.load("out.wv"), "SAMPLES"), "6000");
+    QVERIFY(m_folder.store("bad.ini", "[Filter]\nfilterlength=1e9\n"));
+    forRows({{"range", "bad.ini", "error: --length: '1000000000' is out of range; permitted: "},
+             {"other tool", "fm.ini", "error: --preset: the file 'fm.ini' holds no settings of"},
+             {"missing", "none.ini", "error: --preset: the file 'none.ini' cannot be read"}},
+            [&](const QString &preset, const QString &reason) {
+                const CliRun answer = run("filter in.wv -o new.wv --preset " + preset);
+                QCOMPARE(answer.exitCode, 2);
+                QVERIFY2(answer.lastLine().startsWith(reason), qPrintable(answer.lastLine()));
+            });
 }
 
 void TestCliResults::listsWavFiles()

@@ -1,0 +1,10 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "jobs/SampleReadJob.h"
+
+class QWidget;
+
+/// Asks for a file and saves a piece of a waveform there, as a waveform or, by the suffix of the
+/// name, for other programs; then shows the report.
+void saveSelection(QWidget *parent, const SampleRange &piece);
