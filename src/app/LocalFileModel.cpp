@@ -1,11 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "LocalFileModel.h"
 
+#include <QDateTime>
+#include <QFileInfo>
 #include <QLocale>
 
 namespace {
 
 constexpr int SizeColumn = 1;
+constexpr int DateColumn = 3;
 
 } // namespace
 
@@ -18,13 +21,19 @@ LocalFileModel::LocalFileModel(QAbstractFileIconProvider *icons)
 
 QVariant LocalFileModel::data(const QModelIndex &index, int role) const
 {
+    // The base class watches folders, not the files that grow in them: the shown rows ask anew.
     if (index.column() == SizeColumn && !isDir(index)) {
+        const qint64 bytes = QFileInfo(filePath(index)).size();
         if (role == Qt::DisplayRole) {
-            return shortSize(size(index));
+            return shortSize(bytes);
         }
         if (role == Qt::ToolTipRole) {
-            return QString("%1 bytes").arg(QLocale().toString(size(index)));
+            return QString("%1 bytes").arg(QLocale().toString(bytes));
         }
+    }
+    if (index.column() == DateColumn && role == Qt::DisplayRole) {
+        return QLocale::system().toString(QFileInfo(filePath(index)).lastModified(),
+                                          QLocale::ShortFormat);
     }
     return QFileSystemModel::data(index, role);
 }

@@ -10,6 +10,7 @@
 #include <QFile>
 #include <QFileInfo>
 #include <QFileSystemModel>
+#include <QStandardPaths>
 
 #include <cerrno>
 #include <cstring>
@@ -113,6 +114,23 @@ bool LocalPaneFiles::rename(const QString &path, const QString &newName)
     }
     QFile file(withoutEndSlash(path));
     return file.rename(target) || fail(words, path, file.errorString());
+}
+
+QString LocalPaneFiles::moveToTrash(const QString &path)
+{
+    logStep(!isRealFolder(path)   ? "Deleting file"
+            : isEmptyFolder(path) ? "Deleting folder"
+                                  : "Deleting folder structure",
+            path);
+    // Without the folder of the trash the toolkit takes the working folder for one.
+    if (!QDir().mkpath(QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation))) {
+        return "There is no folder for it.";
+    }
+    QFile file(withoutEndSlash(path));
+    if (file.moveToTrash()) {
+        return {};
+    }
+    return file.errorString().isEmpty() ? QString("The system refuses.") : file.errorString();
 }
 
 bool LocalPaneFiles::removeFile(const QString &path)

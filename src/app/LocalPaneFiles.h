@@ -26,6 +26,8 @@ public:
     [[nodiscard]] QString removeTreeQuestion(const QString &path) const override;
     [[nodiscard]] bool createFolder(const QString &parent, const QString &name) override;
     [[nodiscard]] bool rename(const QString &path, const QString &newName) override;
+    [[nodiscard]] bool hasTrash() const override { return true; }
+    [[nodiscard]] QString moveToTrash(const QString &path) override;
     [[nodiscard]] bool removeFile(const QString &path) override;
     [[nodiscard]] bool removeEmptyFolder(const QString &path) override;
     [[nodiscard]] bool removeTree(const QString &path, QWidget *parent) override;

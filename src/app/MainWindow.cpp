@@ -3,6 +3,8 @@
 
 #include "AboutBox.h"
 #include "LocalFileModel.h"
+#include "LogPanel.h"
+#include "PathBox.h"
 #include "QCustomTreeView.h"
 #include "devicechoice.h"
 #include "instrument/ui/DlgInstrConfig.h"
@@ -18,26 +20,17 @@
 #include <QCloseEvent>
 #include <QFileInfo>
 #include <QMessageBox>
+#include <QPainter>
 #include <QPointer>
 #include <QShortcut>
 #include <QSignalBlocker>
 #include <QStatusTipEvent>
+#include <QTimer>
+#include <QWindow>
 
 namespace {
 
-constexpr int MaxLogLines = 256;
-constexpr int MaxHistory = 11;
-
-QIcon levelIcon(int level)
-{
-    if (level & (Tracer::Error | Tracer::Severe)) {
-        return QIcon(":/icons16/redflag.png");
-    }
-    if (level & Tracer::Warning) {
-        return QIcon(":/icons16/yellowled.png");
-    }
-    return QIcon(level & Tracer::Debug ? ":/icons16/debug.png" : ":/icons16/bulb.png");
-}
+constexpr int FrameWidth = 2;
 
 } // namespace
 
@@ -47,18 +40,34 @@ MainWindow::MainWindow()
     registerPictures();
     setAttribute(Qt::WA_DeleteOnClose);
     m_ui->setupUi(this);
-    m_panes[0] = {m_ui->cb_dev_1, m_ui->tb_instruments_1,
-                  m_ui->cb_flt_1, m_ui->tb_refresh_1,
-                  m_ui->l_win1,   m_ui->cb_entry1,
-                  m_ui->tv_dev_1, nullptr,
-                  nullptr,        nullptr};
-    m_panes[1] = {m_ui->cb_dev_2, m_ui->tb_instruments_2,
-                  m_ui->cb_flt_2, m_ui->tb_refresh_2,
-                  m_ui->l_win2,   m_ui->cb_entry2,
-                  m_ui->tv_dev_2, nullptr,
-                  nullptr,        nullptr};
+    m_panes[0] = {m_ui->w_pane_1,
+                  m_ui->cb_dev_1,
+                  m_ui->tb_instruments_1,
+                  m_ui->cb_flt_1,
+                  m_ui->tb_refresh_1,
+                  m_ui->l_win1,
+                  new PathBox(m_ui->cb_entry1, m_ui->pathLayout_1),
+                  m_ui->tv_dev_1,
+                  nullptr,
+                  nullptr,
+                  nullptr};
+    m_panes[1] = {m_ui->w_pane_2,
+                  m_ui->cb_dev_2,
+                  m_ui->tb_instruments_2,
+                  m_ui->cb_flt_2,
+                  m_ui->tb_refresh_2,
+                  m_ui->l_win2,
+                  new PathBox(m_ui->cb_entry2, m_ui->pathLayout_2),
+                  m_ui->tv_dev_2,
+                  nullptr,
+                  nullptr,
+                  nullptr};
+    m_log = new LogPanel(m_ui->lw_log);
     buildMenus();
     for (Pane &pane : m_panes) {
+        pane.frame->layout()->setContentsMargins(FrameWidth + 1, FrameWidth + 1, FrameWidth + 1,
+                                                 FrameWidth + 1);
+        pane.frame->installEventFilter(this);
         pane.tree->setModules(&m_modules);
         pane.tree->setPeer(otherPane(pane).tree);
     }
@@ -120,8 +129,13 @@ void MainWindow::buildMenus()
     if (!file->isEmpty()) {
         file->addSeparator();
     }
+    addEntryMenu(*file);
+    file->addSeparator();
     file->addAction(m_ui->actionExit);
-    menuBar()->addMenu("Instrument")->addAction(m_ui->actionInstrConfigure);
+    QMenu *instrument = menuBar()->addMenu("Instrument");
+    instrument->addAction("Run!\tF9", this,
+                          [this] { paneOf(m_activePane->tree).tree->slot_runwaveform(); });
+    instrument->addAction(m_ui->actionInstrConfigure);
     menuBar()->addMenu("Help")->addAction(m_ui->actionAbout);
 
     assignMnemonics(menuBar()->actions());
@@ -136,6 +150,31 @@ void MainWindow::buildMenus()
     auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
     connect(refreshKey, &QShortcut::activated, this,
             [this] { refresh(paneOf(m_activePane->tree)); });
+}
+
+/// What the panes do at a key, for those who look into the menus first. The keys themselves belong
+/// to the trees, so that a text field keeps its own.
+void MainWindow::addEntryMenu(QMenu &menu)
+{
+    struct Entry
+    {
+        const char *text;
+        void (QCustomTreeView::*slot)();
+    };
+    constexpr Entry Entries[] = {
+        {"Open\tEnter", &QCustomTreeView::openCurrent},
+        {"Copy to Other Pane\tF5", &QCustomTreeView::copyToPeer},
+        {"Create Folder\tF7", &QCustomTreeView::slot_create},
+        {"Rename\tF2", &QCustomTreeView::slot_rename},
+        {"Delete\tDel", &QCustomTreeView::slot_remove},
+        {"Delete for Good\tShift+Del", &QCustomTreeView::removeForGood},
+        {"Set As Default Folder", &QCustomTreeView::slot_default},
+    };
+    for (const Entry &entry : Entries) {
+        menu.addAction(entry.text, this,
+                       [this, slot = entry.slot] { (paneOf(m_activePane->tree).tree->*slot)(); });
+    }
+    menu.addAction("Refresh\tCtrl+R", this, [this] { refresh(paneOf(m_activePane->tree)); });
 }
 
 void MainWindow::connectPane(Pane &pane)
@@ -153,7 +192,10 @@ void MainWindow::connectPane(Pane &pane)
     connect(pane.tree, &QCustomTreeView::selectionLost, this, &MainWindow::slot_selectionLost);
     connect(pane.tree, &QCustomTreeView::otherPaneRequested, this,
             [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
-    connect(pane.history, &QComboBox::currentTextChanged, this, &MainWindow::slot_set_item);
+    connect(pane.path, &PathBox::pathChosen, this,
+            [this, &pane](const QString &path) { goTo(pane, path); });
+    connect(pane.path, &PathBox::upRequested, pane.tree, &QCustomTreeView::goUp);
+    connect(pane.path, &PathBox::homeRequested, this, [this, &pane] { goHome(pane); });
 }
 
 void MainWindow::TraceDataAvailable()
@@ -162,19 +204,7 @@ void MainWindow::TraceDataAvailable()
     if (entries.isEmpty()) {
         return;
     }
-    for (const auto &[text, level] : entries) {
-        if (text.isEmpty()) {
-            continue;
-        }
-        while (m_ui->lw_log->count() >= MaxLogLines) {
-            delete m_ui->lw_log->takeItem(0);
-        }
-        // All rows have the height of one line.
-        auto *row =
-            new QListWidgetItem(levelIcon(level), QString(text).replace('\n', ' '), m_ui->lw_log);
-        row->setToolTip(text);
-    }
-    m_ui->lw_log->scrollToBottom();
+    m_log->append(entries);
 }
 
 void MainWindow::errMsg(const QString &sTxt)
@@ -190,6 +220,19 @@ bool MainWindow::event(QEvent *event)
         return true;
     }
     return QMainWindow::event(event);
+}
+
+/// A frame in the colour of the selection tells the active pane from afar.
+bool MainWindow::eventFilter(QObject *watched, QEvent *event)
+{
+    if (event->type() == QEvent::Paint && m_activePane != nullptr &&
+        watched == m_activePane->frame) {
+        QPainter painter(m_activePane->frame);
+        painter.setPen(QPen(palette().color(QPalette::Highlight), FrameWidth));
+        constexpr double Half = FrameWidth / 2.0;
+        painter.drawRect(QRectF(m_activePane->frame->rect()).adjusted(Half, Half, -Half, -Half));
+    }
+    return QMainWindow::eventFilter(watched, event);
 }
 
 void MainWindow::menu_about()
@@ -223,14 +266,7 @@ void MainWindow::slot_itemSelected(const QString &sItem)
 {
     const Pane &pane = paneOf(sender());
     if (!sItem.isEmpty()) { // as that of a row that says why there are no entries
-        const QSignalBlocker blocker(pane.history);
-        if (pane.history->findText(sItem, Qt::MatchExactly | Qt::MatchCaseSensitive) < 0) {
-            while (pane.history->count() >= MaxHistory) {
-                pane.history->removeItem(0);
-            }
-            pane.history->addItem(sItem);
-        }
-        pane.history->setCurrentText(sItem);
+        pane.path->show(sItem);
     }
     m_modules.setSelection(sItem, pane.tree->isLocal());
     markActive(pane);
@@ -245,17 +281,32 @@ void MainWindow::slot_selectionLost()
     }
 }
 
-void MainWindow::slot_set_item(const QString &sItem)
+void MainWindow::goTo(Pane &pane, const QString &path)
 {
-    const Pane &pane = paneOf(sender());
-    pane.tree->updateAndExpandTree(sItem);
-    if (const QString shown = pane.tree->currentPath(); shown != sItem) {
+    pane.tree->updateAndExpandTree(path);
+    if (const QString shown = pane.tree->currentPath(); shown != path) {
         // What is gone leaves the list, which names again what the tree shows.
-        const QSignalBlocker blocker(pane.history);
-        pane.history->removeItem(pane.history->findText(sItem));
-        pane.history->setCurrentIndex(pane.history->findText(shown));
+        pane.path->forget(path, shown);
     }
     markActive(pane);
+}
+
+void MainWindow::openFiles(const QStringList &files)
+{
+    for (const QString &file : files) {
+        const QString path = QFileInfo(file).absoluteFilePath();
+        const ToolInfo *tool = m_modules.firstAllowed(path, true);
+        if (!QFileInfo::exists(path)) {
+            Tracer::Trace(Tracer::Error, QString("There is no file '%1'.").arg(path));
+        } else if (QFileInfo(path).isDir()) {
+            goTo(m_panes[0], path);
+        } else if (tool != nullptr) {
+            m_modules.start(*tool, path);
+        }
+    }
+    if (!files.isEmpty() && QFileInfo::exists(files.first())) {
+        goTo(m_panes[0], QFileInfo(files.first()).absoluteFilePath());
+    }
 }
 
 void MainWindow::markActive(const Pane &active)
@@ -263,14 +314,16 @@ void MainWindow::markActive(const Pane &active)
     m_activePane = &active;
     active.activeMark->setPixmap(QIcon(":/icons22/attach.png").pixmap(22, 22));
     otherPane(active).activeMark->clear();
+    for (const Pane &pane : m_panes) {
+        pane.frame->update();
+    }
 }
 
 MainWindow::Pane &MainWindow::paneOf(const QObject *widget)
 {
     const Pane &second = m_panes[1];
     const bool isSecond = widget == second.device || widget == second.filter ||
-                          widget == second.refresh || widget == second.history ||
-                          widget == second.tree;
+                          widget == second.refresh || widget == second.tree;
     return m_panes[isSecond ? 1 : 0];
 }
 
@@ -296,7 +349,6 @@ void MainWindow::loadSettings()
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->readSettings(*settings, pane + 1);
     }
-    m_instrConfig->readSettings(*settings);
     m_modules.readAllSettings(*settings);
 }
 
@@ -310,12 +362,28 @@ void MainWindow::saveSettings()
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->writeSettings(*settings, pane + 1);
     }
-    m_instrConfig->writeSettings(*settings);
+    if (m_knowsInstruments) {
+        m_instrConfig->writeSettings(*settings);
+    }
     m_modules.writeAllSettings(*settings);
     settings->sync();
     if (settings->status() != QSettings::NoError) {
         QMessageBox::critical(nullptr, windowTitle(), "The settings file cannot be written.\n");
     }
+}
+
+void MainWindow::readInstruments()
+{
+    constexpr int PollMs = 10;
+    if (m_knowsInstruments || !isVisible()) {
+        return;
+    }
+    if (windowHandle() != nullptr && !windowHandle()->isExposed()) {
+        QTimer::singleShot(PollMs, this, &MainWindow::readInstruments);
+        return;
+    }
+    m_knowsInstruments = true;
+    m_instrConfig->readSettings(*openMainStore());
 }
 
 void MainWindow::closeEvent(QCloseEvent *event)
@@ -365,6 +433,10 @@ void MainWindow::showEvent(QShowEvent *event)
 {
     QMainWindow::showEvent(event);
     m_modules.showAgain();
+    if (!m_knowsInstruments) {
+        // Instruments may take their time to answer: the window is there before they are asked.
+        QTimer::singleShot(0, this, &MainWindow::readInstruments);
+    }
     if (m_showsInstrConfig) {
         m_instrConfig->show();
     }

@@ -15,11 +15,14 @@
 
 class DlgInstrConfig;
 class LocalFileModel;
+class LogPanel;
+class PathBox;
 class QComboBox;
 class QCustomTreeView;
 class QLabel;
 class QSplitter;
 class QToolButton;
+class QMenu;
 
 namespace Ui {
 class AppMainWindow;
@@ -38,8 +41,16 @@ public:
 
     [[nodiscard]] ModulesDb &modules() { return m_modules; }
 
+    /// Whether the list of instruments was read, which waits until the window is painted.
+    [[nodiscard]] bool knowsInstruments() const { return m_knowsInstruments; }
+
+    /// Opens files in the tools that Enter would start for them, and shows the folder of the first
+    /// one in the first pane. What can't be opened is told in the log.
+    void openFiles(const QStringList &files);
+
 protected:
     bool event(QEvent *event) override;
+    bool eventFilter(QObject *watched, QEvent *event) override;
     void closeEvent(QCloseEvent *event) override;
     void hideEvent(QHideEvent *event) override;
     void showEvent(QShowEvent *event) override;
@@ -57,18 +68,18 @@ private slots:
     void slot_remoteDefaultFolderSet(VisaDevice *pcVisaDevice, const QString &sDefaultFolder);
     void slot_selectionLost();
     void slot_itemSelected(const QString &sItem);
-    void slot_set_item(const QString &sItem);
 
 private:
     /// The widgets of one pane and the models that it can show.
     struct Pane
     {
+        QWidget *frame = nullptr;
         QComboBox *device = nullptr;
         QToolButton *instruments = nullptr;
         QComboBox *filter = nullptr;
         QToolButton *refresh = nullptr;
         QLabel *activeMark = nullptr;
-        QComboBox *history = nullptr;
+        PathBox *path = nullptr;
         QCustomTreeView *tree = nullptr;
         std::unique_ptr<LocalFileModel> localModel;
         std::unique_ptr<VisaDevice> instrument;
@@ -76,7 +87,10 @@ private:
     };
 
     void buildMenus();
+    void addEntryMenu(QMenu &menu);
     void connectPane(Pane &pane);
+    void goTo(Pane &pane, const QString &path);
+    void readInstruments();
     void createDevices();
     void selectDevice(Pane &pane);
     void showLocal(Pane &pane);
@@ -85,6 +99,7 @@ private:
     [[nodiscard]] QString defaultFolder(const Pane &pane) const;
     [[nodiscard]] bool mayClose();
     void markActive(const Pane &active);
+    void goHome(Pane &pane);
     void refresh(Pane &pane);
     [[nodiscard]] Pane &paneOf(const QObject *widget);
     [[nodiscard]] Pane &otherPane(const Pane &pane);
@@ -96,10 +111,12 @@ private:
     std::unique_ptr<Ui::AppMainWindow> m_ui;
     FileIcons m_fileIcons;
     std::unique_ptr<DlgInstrConfig> m_instrConfig;
+    LogPanel *m_log = nullptr;
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;
     QString m_absentLocPath;         ///< the default folder while it isn't there
     bool m_showsInstrConfig = false; ///< again when the window comes back
     bool m_noVisa = false;
+    bool m_knowsInstruments = false; ///< the list was read from the settings
 };

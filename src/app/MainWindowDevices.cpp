@@ -3,6 +3,7 @@
 #include "MainWindow.h"
 
 #include "LocalFileModel.h"
+#include "PathBox.h"
 #include "QCustomTreeView.h"
 #include "RemotePaneFiles.h"
 #include "devicechoice.h"
@@ -51,15 +52,24 @@ void MainWindow::slot_refresh()
     refresh(paneOf(sender()));
 }
 
+void MainWindow::goHome(Pane &pane)
+{
+    pane.tree->updateAndExpandTree(pane.tree->isLocal() ? m_locPath : defaultFolder(pane));
+    markActive(pane);
+}
+
+/// What is current stays so.
 void MainWindow::refresh(Pane &pane)
 {
+    const QString current = pane.tree->currentPath();
     if (pane.tree->isLocal()) {
-        pane.tree->updateAndExpandTree(m_locPath);
+        pane.tree->updateAndExpandTree(current.isEmpty() ? m_locPath : current);
         return;
     }
-    pane.tree->updateAndExpandTree(defaultFolder(pane));
+    const QString shown = current.isEmpty() ? defaultFolder(pane) : current;
+    pane.tree->updateAndExpandTree(shown);
     if (!RemotePaneFiles::answers(*pane.remoteModel) && openInstrument(pane)) {
-        pane.tree->updateAndExpandTree(defaultFolder(pane));
+        pane.tree->updateAndExpandTree(shown);
     }
 }
 
@@ -76,12 +86,9 @@ void MainWindow::selectDevice(Pane &pane)
         pane.device->setCurrentIndex(0);
     }
     pane.tree->clearSelection();
-    {
-        // Paths of another device lead nowhere.
-        const QSignalBlocker blocker(pane.history);
-        pane.history->clear();
-    }
-    if (pane.device->currentData().toString().isEmpty()) {
+    const bool isLocal = pane.device->currentData().toString().isEmpty();
+    pane.path->restart(isLocal); // paths of another device lead nowhere
+    if (isLocal) {
         showLocal(pane);
     } else {
         showInstrument(pane);

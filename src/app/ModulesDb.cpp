@@ -48,11 +48,15 @@ QList<ToolInfo> toolTable()
     using enum ToolInfo::Selection;
     ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {});
     importData.preferredFor = {"TXT", "CSV", "DAT", "BIN", "WFM", "I", "Q"};
+    ToolInfo info = toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"});
+    info.tellsProperties = true;
+    ToolInfo view = toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"});
+    view.preferredFor = {"WV"};
     ToolInfo composer = toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"});
     composer.hasLeftWork = &DlgComposer::hasLeftWork;
     return {
-        toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}),
-        toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}),
+        info,
+        view,
         toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
         importData,
         toolInfo<DlgWvFromMat>("Import MATLAB", "/Import/From MATLAB", File, {"MAT"}),
@@ -136,8 +140,20 @@ const ToolInfo *ModulesDb::firstAllowed(const QString &path, bool local) const
 const ToolInfo *ModulesDb::firstMadeFor(const QString &path, bool local) const
 {
     const QList<const ToolInfo *> tools = allAllowed(path, local);
+    auto tool = std::find_if(tools.begin(), tools.end(),
+                             [&path](const ToolInfo *one) { return one->isPreferredFor(path); });
+    if (tool == tools.end()) {
+        tool = std::find_if(tools.begin(), tools.end(),
+                            [&path](const ToolInfo *one) { return one->isMadeFor(path); });
+    }
+    return tool != tools.end() ? *tool : nullptr;
+}
+
+const ToolInfo *ModulesDb::propertiesOf(const QString &path, bool local) const
+{
+    const QList<const ToolInfo *> tools = allAllowed(path, local);
     const auto tool = std::find_if(tools.begin(), tools.end(),
-                                   [&path](const ToolInfo *one) { return one->isMadeFor(path); });
+                                   [](const ToolInfo *one) { return one->tellsProperties; });
     return tool != tools.end() ? *tool : nullptr;
 }
 

@@ -46,6 +46,9 @@ public:
     /// The first tool that is made for an entry's type and accepts it; null if there is none.
     [[nodiscard]] const ToolInfo *firstMadeFor(const QString &path, bool local) const;
 
+    /// The tool that tells an entry's properties; null if there is none.
+    [[nodiscard]] const ToolInfo *propertiesOf(const QString &path, bool local) const;
+
     /// All tools that accept an entry, in order.
     [[nodiscard]] QList<const ToolInfo *> allAllowed(const QString &path, bool local) const;
 

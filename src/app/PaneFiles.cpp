@@ -24,3 +24,8 @@ QStringList PaneFiles::reload(const QString & /*path*/)
 {
     return {};
 }
+
+QString PaneFiles::moveToTrash(const QString & /*path*/)
+{
+    return "There is no trash here.";
+}

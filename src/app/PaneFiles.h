@@ -74,6 +74,12 @@ public:
     /// Renames within the folder; never replaces another entry.
     [[nodiscard]] virtual bool rename(const QString &path, const QString &newName) = 0;
 
+    /// Whether entries can be moved to a trash from where they can be fetched back.
+    [[nodiscard]] virtual bool hasTrash() const { return false; }
+
+    /// Moves an entry to the trash, a folder with its contents; the reason if that fails.
+    [[nodiscard]] virtual QString moveToTrash(const QString &path);
+
     /// Removes a file or a link.
     [[nodiscard]] virtual bool removeFile(const QString &path) = 0;
 

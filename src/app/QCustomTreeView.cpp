@@ -16,6 +16,8 @@
 #include <QScrollBar>
 #include <QShortcut>
 
+#include <algorithm>
+
 QCustomTreeView::QCustomTreeView(QWidget *parent)
     : QTreeView(parent)
     , m_contextMenu(new QMenu(this))
@@ -24,6 +26,7 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     setEditTriggers(NoEditTriggers);
     setDragDropMode(DragDrop);
     setSelectionBehavior(SelectRows);
+    setSelectionMode(ExtendedSelection);
     // Without this a folder of thousands of files is measured row by row.
     setUniformRowHeights(true);
     setAlternatingRowColors(true);
@@ -37,6 +40,7 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
     m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
     addKeys(Qt::Key_F5, &QCustomTreeView::copyToPeer);
+    addKeys(Qt::ShiftModifier | Qt::Key_Delete, &QCustomTreeView::removeForGood);
     addKeys(QKeySequence::Copy, &QCustomTreeView::copyToClipboard);
     addKeys(QKeySequence::Paste, &QCustomTreeView::pasteFromClipboard);
 
@@ -46,6 +50,13 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     connect(&m_revealTimer, &QTimer::timeout, this, &QCustomTreeView::revealCurrent);
     connect(verticalScrollBar(), &QScrollBar::actionTriggered, this,
             [this] { m_revealedPath.clear(); });
+    constexpr int RepaintMs = 2000;
+    connect(&m_repaintTimer, &QTimer::timeout, this, [this] {
+        if (isLocal() && isVisible()) {
+            viewport()->update();
+        }
+    });
+    m_repaintTimer.start(RepaintMs);
 }
 
 QCustomTreeView::~QCustomTreeView() = default;
@@ -273,7 +284,11 @@ void QCustomTreeView::contextMenuEvent(QContextMenuEvent *event)
     if (!m_files || !index.isValid()) {
         return;
     }
-    setCurrentIndex(index);
+    // The menu of a marked entry is that of all of them.
+    selectionModel()->setCurrentIndex(index, selectionModel()->isSelected(index)
+                                                 ? QItemSelectionModel::NoUpdate
+                                                 : QItemSelectionModel::ClearAndSelect |
+                                                       QItemSelectionModel::Rows);
     const QString path = currentPath();
     if (path.isEmpty()) {
         return;
@@ -314,18 +329,14 @@ void QCustomTreeView::keyPressEvent(QKeyEvent *event)
     switch (event->key()) {
     case Qt::Key_Return:
     case Qt::Key_Enter:
-        if (isFolderPath(currentPath())) {
-            readBeforeOpening(currentIndex());
-            setExpanded(currentIndex(), !isExpanded(currentIndex()));
+        if (event->modifiers().testFlag(Qt::AltModifier)) {
+            startProperties();
         } else {
-            startFirstTool();
+            openCurrent();
         }
         return;
     case Qt::Key_Backspace:
-        if (currentIndex().parent().isValid()) {
-            setCurrentIndex(currentIndex().parent());
-            scrollTo(currentIndex());
-        }
+        goUp();
         return;
     case Qt::Key_Asterisk:
         // Whole trees are not opened at one press: an instrument would be read to its last folder.
@@ -338,6 +349,24 @@ void QCustomTreeView::keyPressEvent(QKeyEvent *event)
             readBeforeOpening(currentIndex());
         }
         QTreeView::keyPressEvent(event);
+    }
+}
+
+void QCustomTreeView::openCurrent()
+{
+    if (isFolderPath(currentPath())) {
+        readBeforeOpening(currentIndex());
+        setExpanded(currentIndex(), !isExpanded(currentIndex()));
+    } else {
+        startFirstTool();
+    }
+}
+
+void QCustomTreeView::goUp()
+{
+    if (currentIndex().parent().isValid()) {
+        setCurrentIndex(currentIndex().parent());
+        scrollTo(currentIndex());
     }
 }
 
@@ -368,6 +397,36 @@ void QCustomTreeView::startFirstTool()
                                         : "Tools work on local files: copy '%1' to a local folder.";
         emit errMsg(words.arg(entryName(path)));
     }
+}
+
+void QCustomTreeView::startProperties()
+{
+    const QString path = currentPath();
+    if (const ToolInfo *tool = m_modules ? m_modules->propertiesOf(path, isLocal()) : nullptr) {
+        m_modules->start(*tool, path);
+    }
+}
+
+QStringList QCustomTreeView::selectedPaths() const
+{
+    const QString current = currentPath();
+    QStringList paths;
+    if (m_files) {
+        const QModelIndexList rows = selectionModel()->selectedRows();
+        for (const QModelIndex &row : rows) {
+            paths.append(m_files->pathOf(row));
+        }
+    }
+    if (!paths.contains(current)) {
+        return current.isEmpty() ? QStringList() : QStringList(current);
+    }
+    const auto liesInOther = [paths](const QString &path) {
+        return std::any_of(paths.begin(), paths.end(), [&path](const QString &folder) {
+            return isFolderPath(folder) && path != folder && path.startsWith(folder);
+        });
+    };
+    paths.removeIf(liesInOther);
+    return paths;
 }
 
 void QCustomTreeView::slot_module(int iModIndex)

@@ -17,7 +17,8 @@ class QSettings;
 class VisaDevice;
 
 /// The tree of one pane: shows the entries of its model, and turns menus, keys and drops into the
-/// operations of PaneFiles and into starts of tools.
+/// operations of PaneFiles and into starts of tools. Several entries can be marked: copies and
+/// removals act on all of them, everything else on the current one.
 ///
 /// Paths use "/", and a folder's path ends in it. Questions are asked here, in modal boxes.
 class QCustomTreeView : public QTreeView
@@ -47,9 +48,13 @@ public:
     /// Path of the current entry, empty if there is none.
     [[nodiscard]] QString currentPath() const;
 
-    /// Opens the menu that copies an entry of another pane into the folder at a position of the
+    /// Paths of the marked entries, without those that lie in a marked folder; the current one if
+    /// it isn't among them.
+    [[nodiscard]] QStringList selectedPaths() const;
+
+    /// Opens the menu that copies entries of another pane into the folder at a position of the
     /// viewport, or into that of the file there.
-    void offerCopy(const QCustomTreeView &source, const QString &path, const QPoint &position);
+    void offerCopy(const QCustomTreeView &source, const QStringList &paths, const QPoint &position);
 
     /// Saves and restores the column widths of pane 1 or 2.
     void writeSettings(QSettings &settings, int pane);
@@ -66,7 +71,16 @@ public slots:
     /// dot. Several patterns are separated by blanks, commas or semicolons.
     void filterChanged(const QString &sNewFilter);
 
-    /// Copies the current entry to the folder of the current entry of the other pane.
+    /// What Enter does: opens or closes a folder, starts the tool for a file.
+    void openCurrent();
+
+    /// Goes to the folder above.
+    void goUp();
+
+    /// Removes past the trash, where there is one.
+    void removeForGood();
+
+    /// Copies the marked entries to the folder of the current entry of the other pane.
     void copyToPeer();
 
     void slot_default();
@@ -128,7 +142,13 @@ private:
     void addKeys(const QKeySequence &key, Slot slot);
     void copyToClipboard();
     void pasteFromClipboard();
-    void setCopy(const QCustomTreeView &source, const QString &path, const QString &target);
+    void setCopy(const QCustomTreeView &source, const QStringList &paths, const QString &target);
+    [[nodiscard]] QString copySources();
+    void removeSelected(bool forGood);
+    [[nodiscard]] bool confirmRemoval(const QStringList &paths);
+    [[nodiscard]] bool removeEntry(const QString &path, bool forGood);
+    [[nodiscard]] QString neighbourOf(const QStringList &paths) const;
+    void startProperties();
     [[nodiscard]] static bool isBusy();
     void open(const QModelIndex &folder);
     void readBeforeOpening(const QModelIndex &folder);
@@ -154,8 +174,8 @@ private:
     QPersistentModelIndex m_pressedEntry; ///< that may be dragged
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
-    QString m_dropSource;
+    QTimer m_repaintTimer;                       ///< sizes of files change without a word
+    QList<QPair<QString, qint64>> m_dropSources; ///< paths and sizes
     QString m_dropTarget;
     VisaDevice *m_dropSourceDevice = nullptr; ///< null for local
-    qint64 m_dropSourceBytes = 0;
 };

@@ -9,6 +9,7 @@
 #include "instrument/remotepaths.h"
 #include "jobs/instrument/CopyJob.h"
 #include "toolframe/QtProgressDialog.h"
+#include "toolframe/questions.h"
 
 #include <QApplication>
 #include <QClipboard>
@@ -23,7 +24,10 @@
 
 namespace {
 
-/// Marks a path in the clipboard as copied from a pane of this process.
+/// Between the paths of a drag; no name on any side holds it.
+constexpr QChar PathSeparator = '\n';
+
+/// Marks paths in the clipboard as copied from a pane of this process.
 const QString clipboardFormat = "application/x-corvane-pane";
 
 QByteArray clipboardTag(const QCustomTreeView &pane)
@@ -53,12 +57,12 @@ void QCustomTreeView::mouseMoveEvent(QMouseEvent *event)
 
 void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
 {
-    const QString path = currentPath();
-    if (path.isEmpty()) {
+    const QStringList paths = selectedPaths();
+    if (paths.isEmpty()) {
         return;
     }
     auto *mime = new QMimeData;
-    mime->setText(path);
+    mime->setText(paths.join(PathSeparator));
     auto *drag = new QDrag(this);
     drag->setMimeData(mime);
     drag->setPixmap(QIcon(":/icons32/file_waveform.png").pixmap(32, 32));
@@ -114,46 +118,52 @@ void QCustomTreeView::dropEvent(QDropEvent *event)
     }
     stopAutoScroll();
     event->acceptProposedAction();
-    offerCopy(*static_cast<const QCustomTreeView *>(event->source()), event->mimeData()->text(),
-              event->position().toPoint());
+    offerCopy(*static_cast<const QCustomTreeView *>(event->source()),
+              event->mimeData()->text().split(PathSeparator), event->position().toPoint());
 }
 
-void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QString &path,
+void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QStringList &paths,
                                 const QPoint &position)
 {
-    setCopy(source, path, m_files ? m_files->pathOf(indexAt(position)) : QString());
+    setCopy(source, paths, m_files ? m_files->pathOf(indexAt(position)) : QString());
     m_copyMenu->popup(viewport()->mapToGlobal(position));
 }
 
-void QCustomTreeView::setCopy(const QCustomTreeView &source, const QString &path,
+void QCustomTreeView::setCopy(const QCustomTreeView &source, const QStringList &paths,
                               const QString &target)
 {
-    m_dropSource = path;
+    m_dropSources.clear();
+    for (const QString &path : paths) {
+        const PaneFiles *files = source.m_files.get();
+        m_dropSources.append({path, files ? files->sizeOf(files->indexOf(path)) : 0});
+    }
     m_dropSourceDevice = source.device();
-    m_dropSourceBytes = source.m_files ? source.m_files->sizeOf(source.m_files->indexOf(path)) : 0;
     m_dropTarget = folderOf(target);
 }
 
 void QCustomTreeView::copyToPeer()
 {
-    const QString path = currentPath();
-    if (m_peer && !path.isEmpty()) {
-        m_peer->setCopy(*this, path, m_peer->currentPath());
+    const QStringList paths = selectedPaths();
+    if (m_peer && !paths.isEmpty()) {
+        m_peer->setCopy(*this, paths, m_peer->currentPath());
         m_peer->slot_copy();
     }
 }
 
 void QCustomTreeView::copyToClipboard()
 {
-    const QString path = currentPath();
-    if (path.isEmpty()) {
+    const QStringList paths = selectedPaths();
+    if (paths.isEmpty()) {
         return;
     }
     auto *mime = new QMimeData;
-    mime->setText(path);
+    mime->setText(paths.join(PathSeparator));
     mime->setData(clipboardFormat, clipboardTag(*this));
     QGuiApplication::clipboard()->setMimeData(mime);
-    emit errMsg(QString("'%1' can be pasted in the other pane.").arg(entryName(path)));
+    emit errMsg(
+        (paths.size() == 1
+             ? QString("'%1' can be pasted in the other pane.").arg(entryName(paths.first()))
+             : QString("%1 entries can be pasted in the other pane.").arg(paths.size())));
 }
 
 void QCustomTreeView::pasteFromClipboard()
@@ -163,7 +173,7 @@ void QCustomTreeView::pasteFromClipboard()
         emit errMsg("Nothing was copied in the other pane.");
         return;
     }
-    setCopy(*m_peer, mime->text(), currentPath());
+    setCopy(*m_peer, mime->text().split(PathSeparator), currentPath());
     slot_copy();
 }
 
@@ -183,14 +193,34 @@ void QCustomTreeView::slot_copy()
     } else if (!m_dropSourceDevice && isLocal()) {
         emit infoTextAvailable("Copy operations between local file systems are not supported.");
     } else {
-        const QString outcome = copyEntry(this, {.sourceDevice = m_dropSourceDevice,
-                                                 .source = m_dropSource,
-                                                 .sourceBytes = m_dropSourceBytes,
-                                                 .targetDevice = device(),
-                                                 .targetFolder = m_dropTarget});
+        const QString outcome = copySources();
         updateAndExpandTree(m_dropTarget);
         emit errMsg(outcome);
     }
+}
+
+/// One after the other; after one that fails the user is asked.
+QString QCustomTreeView::copySources()
+{
+    CopyOutcome all;
+    for (const auto &[path, bytes] : std::as_const(m_dropSources)) {
+        if (!all.isComplete &&
+            !askYesNo(this, "Copy",
+                      "An error occured during copying. Do you want to proceed with "
+                      "the next file?")) {
+            break;
+        }
+        const CopyOutcome one = copyEntry(this, {.sourceDevice = m_dropSourceDevice,
+                                                 .source = path,
+                                                 .sourceBytes = bytes,
+                                                 .targetDevice = device(),
+                                                 .targetFolder = m_dropTarget});
+        all.files += one.files;
+        all.isComplete = one.isComplete;
+        all.words = one.words;
+    }
+    return all.isComplete && m_dropSources.size() > 1 ? QString("%1 files copied.").arg(all.files)
+                                                      : all.words;
 }
 
 void QCustomTreeView::slot_move() {}

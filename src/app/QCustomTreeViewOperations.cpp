@@ -84,33 +84,99 @@ void QCustomTreeView::slot_rename()
 
 void QCustomTreeView::slot_remove()
 {
-    const QString path = currentPath();
-    if (path.isEmpty()) {
-        return;
-    }
-    if (m_files->isRoot(path)) {
-        emit infoTextAvailable("Cannot delete root node.");
-        return;
-    }
-    bool done = false;
-    if (!m_files->isRealFolder(path)) {
-        if (!askYesNo(this, "Delete File",
-                      QString("Do you really want to delete the file\n%1 ?")
-                          .arg(withoutEndSlash(path)))) {
+    removeSelected(false);
+}
+
+void QCustomTreeView::removeForGood()
+{
+    removeSelected(true);
+}
+
+void QCustomTreeView::removeSelected(bool forGood)
+{
+    const QStringList paths = selectedPaths();
+    for (const QString &path : paths) {
+        if (m_files->isRoot(path)) {
+            emit infoTextAvailable("Cannot delete root node.");
             return;
         }
-        done = m_files->removeFile(path);
-    } else if (m_files->isEmptyFolder(path)) {
-        done = m_files->removeEmptyFolder(path);
-    } else {
-        if (!askYesNo(this, "Delete Folder", m_files->removeTreeQuestion(path))) {
-            return;
-        }
-        done = m_files->removeTree(path, this);
+    }
+    if (paths.isEmpty() || !confirmRemoval(paths)) {
+        return;
+    }
+    const QString next = neighbourOf(paths);
+    qsizetype removed = 0;
+    while (removed < paths.size() && removeEntry(paths.at(removed), forGood)) {
+        ++removed;
     }
     // Also after a failure: what could be removed is gone.
-    updateAndExpandTree(parentFolder(path));
+    const bool done = removed == paths.size();
+    updateAndExpandTree(done ? next : paths.at(removed));
     if (done) {
-        emit errMsg(QString("'%1' deleted.").arg(entryName(path)));
+        emit errMsg(removed == 1 ? QString("'%1' deleted.").arg(entryName(paths.first()))
+                                 : QString("%1 entries deleted.").arg(removed));
     }
+}
+
+/// The entry that is to be current when others have gone: the next one in their folder, the one
+/// before, or the folder.
+QString QCustomTreeView::neighbourOf(const QStringList &paths) const
+{
+    const QModelIndex last = m_files->indexOf(paths.last());
+    for (const int step : {1, -1}) {
+        QModelIndex sibling = last.siblingAtRow(last.row() + step);
+        while (sibling.isValid() && paths.contains(m_files->pathOf(sibling))) {
+            sibling = sibling.siblingAtRow(sibling.row() + step);
+        }
+        if (sibling.isValid()) {
+            return m_files->pathOf(sibling);
+        }
+    }
+    return parentFolder(paths.last());
+}
+
+bool QCustomTreeView::confirmRemoval(const QStringList &paths)
+{
+    const QString &path = paths.first();
+    if (paths.size() > 1) {
+        constexpr qsizetype MostNames = 10;
+        QStringList names;
+        for (const QString &one : paths.first(std::min(MostNames, paths.size()))) {
+            names.append(entryName(one));
+        }
+        return askYesNo(this, "Delete Entries",
+                        QString("Do you really want to delete these %1 entries and all their "
+                                "contents?\n%2%3")
+                            .arg(paths.size())
+                            .arg(names.join('\n'), paths.size() > MostNames ? "\n..." : ""));
+    }
+    if (!m_files->isRealFolder(path)) {
+        return askYesNo(
+            this, "Delete File",
+            QString("Do you really want to delete the file\n%1 ?").arg(withoutEndSlash(path)));
+    }
+    return m_files->isEmptyFolder(path) ||
+           askYesNo(this, "Delete Folder", m_files->removeTreeQuestion(path));
+}
+
+bool QCustomTreeView::removeEntry(const QString &path, bool forGood)
+{
+    // What has gone meanwhile fails in the usual words.
+    if (!forGood && m_files->hasTrash() && m_files->exists(path)) {
+        const QString problem = m_files->moveToTrash(path);
+        if (problem.isEmpty()) {
+            return true;
+        }
+        if (!askYesNo(this, "Delete",
+                      QString("'%1' cannot be moved to the trash: %2\n"
+                              "Do you want to delete it for good?")
+                          .arg(entryName(path), problem))) {
+            return false;
+        }
+    }
+    if (!m_files->isRealFolder(path)) {
+        return m_files->removeFile(path);
+    }
+    return m_files->isEmptyFolder(path) ? m_files->removeEmptyFolder(path)
+                                        : m_files->removeTree(path, this);
 }

@@ -58,7 +58,7 @@ QString outcomeText(const CopyJob &job, bool done)
 
 } // namespace
 
-QString copyEntry(QWidget *parent, const CopyRequest &request)
+CopyOutcome copyEntry(QWidget *parent, const CopyRequest &request)
 {
     const CopyQuestions questions{
         .proceed =
@@ -80,8 +80,8 @@ QString copyEntry(QWidget *parent, const CopyRequest &request)
                 });
             }};
     CopyJob job(request, questions);
-    const JobOutcome outcome = runJob(job, parent, nullptr);
-    return outcomeText(job, outcome == JobOutcome::Finished);
+    const bool isComplete = runJob(job, parent, nullptr) == JobOutcome::Finished;
+    return {job.copiedCount(), isComplete, outcomeText(job, isComplete)};
 }
 
 bool isRunnable(const QString &path, const VisaDevice *device)

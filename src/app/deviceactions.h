@@ -9,9 +9,15 @@ struct CopyRequest;
 
 // What the panes do with an instrument behind a modal progress dialog over `parent`.
 
+struct CopyOutcome
+{
+    qsizetype files = 0; ///< that were copied
+    bool isComplete = true;
+    QString words; ///< a sentence for the user
+};
+
 /// Copies what the request says, with the questions of CopyJob as boxes. What fails is logged.
-/// Gives a sentence on the outcome.
-[[nodiscard]] QString copyEntry(QWidget *parent, const CopyRequest &request);
+[[nodiscard]] CopyOutcome copyEntry(QWidget *parent, const CopyRequest &request);
 
 /// Whether "Run!" applies: a waveform file on an instrument; null stands for the local disk.
 [[nodiscard]] bool isRunnable(const QString &path, const VisaDevice *device);

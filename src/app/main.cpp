@@ -27,6 +27,8 @@ bool answerQuestions(int argc, char **argv)
                        {"no-multi-process", "Compose on one processor."},
                        help,
                        version});
+    parser.addPositionalArgument("file", "Files to open, each in the tool for its type.",
+                                 "[file...]");
     // False for what isn't known, which is no fault here.
     (void)parser.parse(QCoreApplication::arguments());
     if (parser.isSet(version)) {
@@ -38,6 +40,21 @@ bool answerQuestions(int argc, char **argv)
         return true;
     }
     return false;
+}
+
+/// What isn't an option.
+QStringList filesOf(const QStringList &arguments)
+{
+    QStringList files;
+    bool onlyFiles = false;
+    for (const QString &argument : arguments) {
+        if (!onlyFiles && argument == "--") {
+            onlyFiles = true;
+        } else if (onlyFiles || !argument.startsWith('-')) {
+            files.append(argument);
+        }
+    }
+    return files;
 }
 
 } // namespace
@@ -52,7 +69,10 @@ int main(int argc, char **argv)
     const auto colorStore = prepareApplication();
     auto *window = new MainWindow; // deletes itself when closed
     window->show();
-    QTimer::singleShot(0, window,
-                       [window] { window->modules().offerLeftWork(QDir::homePath() + '/'); });
+    const QStringList files = filesOf(QCoreApplication::arguments().mid(1));
+    QTimer::singleShot(0, window, [window, files] {
+        window->openFiles(files);
+        window->modules().offerLeftWork(QDir::homePath() + '/');
+    });
     return QApplication::exec();
 }

@@ -20,17 +20,24 @@ struct ToolInfo
     QStringList extensions; ///< upper case, such as "WV"; empty for files of any type
     std::function<std::unique_ptr<DlgBase>()> make;
 
-    /// Types, upper case, for which a tool that takes files of any type is the one to start.
+    /// Types, upper case, for which this tool is the one to start among those that take them.
     QStringList preferredFor = {};
+
+    /// Whether Alt+Enter starts it.
+    bool tellsProperties = false;
 
     /// Whether a crash has left work of the tool that it offers at its next start; may be empty.
     std::function<bool()> hasLeftWork = {};
 
+    [[nodiscard]] bool isPreferredFor(const QString &path) const
+    {
+        return preferredFor.contains(path.toUpper().section('.', -1));
+    }
+
     /// Whether the tool is made for files of this one's type.
     [[nodiscard]] bool isMadeFor(const QString &path) const
     {
-        const QString type = path.toUpper().section('.', -1);
-        return extensions.contains(type) || preferredFor.contains(type);
+        return extensions.contains(path.toUpper().section('.', -1)) || isPreferredFor(path);
     }
 
     /// Whether the tool works on an entry of a pane. A path that ends in "/" is a folder. All tools

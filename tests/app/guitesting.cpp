@@ -48,6 +48,7 @@ void Desk::open()
     m_window->show();
     m_window->activateWindow();
     QVERIFY(QTest::qWaitForWindowActive(m_window));
+    QTRY_VERIFY(m_window->knowsInstruments());
     for (int pane = 1; pane <= 2; ++pane) {
         QTRY_VERIFY(tree(pane)->currentIndex().isValid());
         QTRY_VERIFY(tree(pane)->model()->rowCount(tree(pane)->currentIndex()) > 0);
@@ -212,7 +213,7 @@ void dragBetween(QWidget &top, QCustomTreeView &from, QCustomTreeView &to)
 {
     if (QGuiApplication::platformName() == "offscreen") {
         // This platform has no drags: only what follows the drop can be driven.
-        to.offerCopy(from, from.currentPath(), to.visualRect(to.currentIndex()).center());
+        to.offerCopy(from, {from.currentPath()}, to.visualRect(to.currentIndex()).center());
         return;
     }
     QWindow *window = top.windowHandle();

@@ -7,8 +7,10 @@
 #include "support/rows.h"
 #include "toolframe/DlgBase.h"
 
+#include <QClipboard>
 #include <QComboBox>
 #include <QLabel>
+#include <QLineEdit>
 #include <QListWidget>
 #include <QMenu>
 #include <QMenuBar>
@@ -65,7 +67,9 @@ private slots:
     void activePaneIsMarked();
     void masksHideOtherFiles();
     void logKeepsTheLast256Lines();
-    void refreshGoesToTheDefaultFolder();
+    void pathBoxAndRefresh();
+    void logIsFilteredAndKept();
+    void opensFilesOfTheCommandLine();
 };
 
 void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
@@ -254,20 +258,77 @@ void TestMainWindow::logKeepsTheLast256Lines()
     QCOMPARE(desk.log().last(), "line 999");
 }
 
-void TestMainWindow::refreshGoesToTheDefaultFolder()
+void TestMainWindow::pathBoxAndRefresh()
 {
     Desk desk;
     desk.open();
     desk.select(2, "sub");
     desk.tree(2)->slot_default();
     QCOMPARE(desk.log().last(), QString("Set local default folder '%1/'").arg(desk.path("sub")));
+    // What is current stays so when the tree is read anew; the default folder has a button.
     desk.select(1, "tone.wv");
     QTest::mouseClick(desk.find<QToolButton>("tb_refresh_1"), Qt::LeftButton);
-    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("sub") + '/');
-    desk.select(1, "tone.wv");
     desk.tree(1)->setFocus();
     QTest::keyClick(desk.tree(1), Qt::Key_R, Qt::ControlModifier);
+    QCOMPARE(desk.tree(1)->currentPath(), desk.path("tone.wv"));
+    QTest::mouseClick(desk.find<QToolButton>("tb_home_1"), Qt::LeftButton);
     QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("sub") + '/');
+    QTest::mouseClick(desk.find<QToolButton>("tb_up_1"), Qt::LeftButton);
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("") + '/');
+    auto *box = desk.find<QComboBox>("cb_entry1");
+    const auto type = [box](const QString &path) {
+        box->setFocus();
+        box->lineEdit()->selectAll();
+        QTest::keyClicks(box->lineEdit(), path);
+        QTest::keyClick(box->lineEdit(), Qt::Key_Return);
+    };
+    type(desk.path("data.txt"));
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("data.txt"));
+    type("/no/such/place");
+    QCOMPARE(box->currentText(), desk.path("data.txt"));
+}
+
+void TestMainWindow::logIsFilteredAndKept()
+{
+    Desk desk;
+    desk.open();
+    Tracer::Trace(Tracer::Error, "something broke");
+    Tracer::Trace(Tracer::Information, "some news");
+    auto *level = desk.find<QComboBox>("cb_logLevel");
+    const auto *list = desk.find<QListWidget>("lw_log");
+    QTRY_VERIFY(desk.log().contains("some news"));
+    const auto shown = [list] {
+        QStringList texts;
+        for (int row = 0; row < list->count(); ++row) {
+            if (!list->item(row)->isHidden()) {
+                texts.append(list->item(row)->text());
+            }
+        }
+        return texts;
+    };
+    level->setCurrentIndex(2);
+    QVERIFY(shown().size() == 1 && shown().first().endsWith("something broke"));
+    level->setCurrentIndex(0);
+    QTest::keyClicks(desk.find<QLineEdit>("le_logFilter"), "NEWS");
+    QVERIFY(shown().size() == 1 && shown().first().endsWith("some news"));
+    desk.find<QListWidget>("lw_log")->setFocus();
+    QTest::keyClick(desk.find<QListWidget>("lw_log"), Qt::Key_C, Qt::ControlModifier);
+    QCOMPARE(QApplication::clipboard()->text(), shown().first() + '\n');
+    for (int k = 0; k < 300; ++k) {
+        Tracer::Trace(Tracer::Information, "chatter");
+    }
+    QTRY_VERIFY(!desk.log().contains("something broke"));
+    QVERIFY(desk.find<QLabel>("l_lastError")->text().endsWith("something broke"));
+}
+
+void TestMainWindow::opensFilesOfTheCommandLine()
+{
+    Desk desk;
+    desk.open();
+    desk.window()->openFiles({desk.path("tone.wv"), desk.path("none.wv")});
+    QTRY_COMPARE(QApplication::activeWindow()->windowTitle(), "View Waveform - tone.wv");
+    QCOMPARE(desk.tree(1)->currentPath(), desk.path("tone.wv"));
+    QVERIFY(desk.log().contains(QString("There is no file '%1'.").arg(desk.path("none.wv"))));
 }
 
 QTEST_MAIN(TestMainWindow)

@@ -3,6 +3,7 @@
 #include "app/QCustomTreeView.h"
 #include "guitesting.h"
 #include "support/rows.h"
+#include "tools/DlgView.h"
 
 #include <QApplication>
 #include <QDir>
@@ -11,6 +12,7 @@
 #include <QMouseEvent>
 #include <QSignalSpy>
 #include <QStandardItemModel>
+#include <QStandardPaths>
 #include <QTest>
 
 #include <utility>
@@ -132,7 +134,21 @@ void TestPanes::deletesAFile()
              QString("Do you really want to delete the file\n%1 ?").arg(desk.path("tone.wv")));
     QVERIFY(!QFileInfo::exists(desk.path("tone.wv")));
     QVERIFY(desk.log().contains("Deleting file 'tone.wv'..."));
-    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("") + '/');
+    // It waits in the trash, and the next Delete isn't one of the folder.
+    const QString trash =
+        QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation) + "/Trash/files/";
+    QVERIFY(QFileInfo::exists(trash + "tone.wv"));
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("readme"));
+    QVERIFY(
+        withModal([&] { pressKey(desk.tree(1), QKeySequence("Shift+Del")); }, answer("Yes", seen)));
+    QVERIFY(!QFileInfo::exists(desk.path("readme")));
+    QVERIFY(!QFileInfo::exists(trash + "readme"));
+    // Several at once, with one question.
+    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("data.txt"));
+    QTest::keyClick(desk.tree(1), Qt::Key_Up, Qt::ShiftModifier);
+    QVERIFY(withModal([&] { pressKey(desk.tree(1), Qt::Key_Delete); }, answer("Yes", seen)));
+    QVERIFY(seen.text.endsWith("\ndata.txt\nsub") || seen.text.endsWith("\nsub\ndata.txt"));
+    QVERIFY(!QFileInfo::exists(desk.path("data.txt")) && !QFileInfo::exists(desk.path("sub")));
 }
 
 void TestPanes::noKeepsTheFile()
@@ -155,7 +171,6 @@ void TestPanes::deletesAnEmptyFolderUnasked()
     QVERIFY(withModals([&] { pressKey(desk.tree(1), Qt::Key_Delete); }, {}));
     QVERIFY(!QFileInfo::exists(desk.path("sub")));
     QVERIFY(desk.log().contains("Deleting folder 'sub'..."));
-    QTRY_COMPARE(desk.tree(1)->currentPath(), desk.path("") + '/');
 }
 
 void TestPanes::deletesAFolderWithContents()
@@ -216,7 +231,7 @@ void TestPanes::keysMoveAndStart()
     QVERIFY(desk.tree(1)->hasFocus());
 
     desk.select(1, "tone.wv");
-    pressKey(desk.tree(1), Qt::Key_Return);
+    QTest::keyClick(desk.tree(1), Qt::Key_Return, Qt::AltModifier);
     const auto isReportOpen = [] {
         const QWidgetList windows = QApplication::topLevelWidgets();
         return std::any_of(windows.begin(), windows.end(), [](const QWidget *window) {
@@ -282,7 +297,7 @@ void TestPanes::doubleClickStartsTheFirstTool()
     QApplication::activeWindow()->close();
     desk.select(1, "tone.wv");
     doubleClick();
-    QTRY_VERIFY(qobject_cast<DlgInfo *>(QApplication::activeWindow()));
+    QTRY_VERIFY(qobject_cast<DlgView *>(QApplication::activeWindow()));
 }
 
 void TestPanes::localCopyIsRefused()
@@ -305,7 +320,7 @@ void TestPanes::localCopyIsRefused()
     QCOMPARE(seen.text, "Copy operations between local file systems are not supported.");
     QVERIFY(!QFileInfo::exists(desk.path("sub/tone.wv")));
 
-    to->offerCopy(*from, from->currentPath(), QPoint(5, 10000)); // below the last entry
+    to->offerCopy(*from, {from->currentPath()}, QPoint(5, 10000)); // below the last entry
     QTRY_VERIFY(openMenu());
     QVERIFY(withModal(chooseFirst, answer("OK", seen)));
     QCOMPARE(seen.text, "The target location for the copy operation must be a folder.");
