@@ -65,6 +65,11 @@ void ScreenshotRun::detachSettings()
 
 void ScreenshotRun::start()
 {
+    constexpr int PollMs = 20;
+    if (!m_window.knowsInstruments()) {
+        QTimer::singleShot(PollMs, this, &ScreenshotRun::start);
+        return;
+    }
     if (!QDir().mkpath(m_folder)) {
         complain(QString("the folder '%1' cannot be created").arg(m_folder));
         finish(1);
