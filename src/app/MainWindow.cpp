@@ -375,15 +375,16 @@ void MainWindow::saveSettings()
 void MainWindow::readInstruments()
 {
     constexpr int PollMs = 10;
-    if (m_knowsInstruments || !isVisible()) {
+    if (m_knowsInstruments || m_asksInstruments || !isVisible()) {
         return;
     }
     if (windowHandle() != nullptr && !windowHandle()->isExposed()) {
         QTimer::singleShot(PollMs, this, &MainWindow::readInstruments);
         return;
     }
-    m_knowsInstruments = true;
+    m_asksInstruments = true; // with the events of the window going on
     m_instrConfig->readSettings(*openMainStore());
+    m_knowsInstruments = true;
 }
 
 void MainWindow::closeEvent(QCloseEvent *event)

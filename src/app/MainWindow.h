@@ -118,5 +118,6 @@ private:
     QString m_absentLocPath;         ///< the default folder while it isn't there
     bool m_showsInstrConfig = false; ///< again when the window comes back
     bool m_noVisa = false;
+    bool m_asksInstruments = false;  ///< or has asked them
     bool m_knowsInstruments = false; ///< the list was read from the settings
 };
