@@ -1,13 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgInfo.h"
 
+#include "jobs/CheckJob.h"
 #include "jobs/InfoReport.h"
 #include "ui_DlgInfo.h"
-#include "wvfile/HvFileIO.h"
 
 #include <QFileInfo>
 #include <QPalette>
+#include <QPointer>
 #include <QPushButton>
+#include <QTimer>
 
 namespace {
 
@@ -47,11 +49,12 @@ QString table(const QList<InfoRow> &rows)
 }
 
 /// The report, with `folder` above the file name. Texts from the file are escaped.
-QString reportHtml(const WvFileSummary &summary, const QString &folder, const QPalette &palette)
+QString reportHtml(const WvFileSummary &summary, const SampleCheck *check, const QString &folder,
+                   const QPalette &palette)
 {
     QString html = stripeStyle(palette) + "<h2>" + folder.toHtmlEscaped() + "</h2>";
     html += "<h2>&nbsp;&nbsp;" + summary.fileName.toHtmlEscaped() + "</h2>";
-    html += table(fileRows(summary));
+    html += table(fileRows(summary) + (check != nullptr ? checkRows(*check) : QList<InfoRow>()));
     if (summary.segmentCount > 0) {
         html += "<h3> Multi Segment Waveform </h3>" + table(segmentRows(summary));
     }
@@ -71,22 +74,65 @@ DlgInfo::DlgInfo(QWidget *parent)
     connect(this, &DlgInfo::rejected, this, &DlgInfo::slot_dialog_rejected);
 }
 
-DlgInfo::~DlgInfo() = default;
+DlgInfo::~DlgInfo()
+{
+    cancelCheck();
+}
+
+void DlgInfo::cancelCheck()
+{
+    if (m_check) {
+        m_check->cancel();
+    }
+}
 
 bool DlgInfo::startModule(const QString &path)
 {
-    HvFileIO file;
     WvFileSummary summary;
-    if (!file.readWaveformInfo(path, &summary)) {
+    if (!scanWaveform(path, summary)) {
         return false;
     }
-    m_ui->te_Info->setHtml(
-        reportHtml(summary, QFileInfo(path).absolutePath(), m_ui->te_Info->palette()));
+    m_path = path;
+    m_summary = summary;
+    showReport(nullptr);
+    // The tags stand there at once; the samples of a long file take a while.
+    QTimer::singleShot(0, this, &DlgInfo::checkSamples);
     return true;
+}
+
+void DlgInfo::showReport(const SampleCheck *check)
+{
+    m_ui->te_Info->setHtml(
+        reportHtml(m_summary, check, QFileInfo(m_path).absolutePath(), m_ui->te_Info->palette()));
+}
+
+void DlgInfo::checkSamples()
+{
+    // The report of a multi-segment waveform is of its tags alone.
+    if (m_path.isEmpty() || m_summary.samples < 1) {
+        return;
+    }
+    cancelCheck();
+    // The job lets the event loop run, in which another file may be asked for, or this be deleted.
+    const QString path = m_path;
+    const auto job = std::make_shared<CheckJob>(path);
+    const QPointer<DlgInfo> self(this);
+    m_check = job;
+    const bool isDone = job->run() == JobOutcome::Finished;
+    if (self.isNull() || self->m_check != job) {
+        return;
+    }
+    self->m_check.reset();
+    if (isDone && self->m_path == path) {
+        const SampleCheck check = job->result();
+        self->showReport(&check);
+    }
 }
 
 void DlgInfo::slot_dialog_rejected()
 {
     // A report of many segments is large, and nobody sees it any more.
     m_ui->te_Info->clear();
+    m_path.clear();
+    cancelCheck();
 }

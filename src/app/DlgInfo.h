@@ -3,13 +3,19 @@
 
 #include "toolframe/DlgBase.h"
 
+#include "wvfile/WvTypes.h"
+
 #include <memory>
+
+class CheckJob;
+struct SampleCheck;
 
 namespace Ui {
 class DlgInfo;
 }
 
-/// Shows what the tags of a waveform file say, without reading its samples.
+/// Shows what the tags of a waveform file say, at once, and what its samples are measured to be
+/// when they have been read.
 class DlgInfo : public DlgBase
 {
     Q_OBJECT
@@ -24,5 +30,12 @@ private slots:
     void slot_dialog_rejected();
 
 private:
+    void showReport(const SampleCheck *check);
+    void checkSamples();
+    void cancelCheck();
+
     std::unique_ptr<Ui::DlgInfo> m_ui;
+    std::shared_ptr<CheckJob> m_check; ///< the running one, if any
+    QString m_path;                    ///< empty: nothing is shown
+    WvFileSummary m_summary;
 };

@@ -28,7 +28,10 @@ bool hasRoomFor(const QString &path, qint64 bytes)
     if (info.exists() && !info.isFile() && !info.isDir()) {
         return true;
     }
-    return fits(info.isDir() ? info.absoluteFilePath() : info.absolutePath(), "the folder", bytes);
+    const QString folder = info.isDir() ? info.absoluteFilePath() : info.absolutePath();
+    // Where nothing can be added the file is written in place, over what stands in it.
+    const bool inPlace = info.isFile() && !QFileInfo(folder).isWritable();
+    return fits(folder, "the folder", inPlace ? bytes - info.size() : bytes);
 }
 
 bool hasTemporaryRoomFor(qint64 bytes)

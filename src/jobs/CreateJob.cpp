@@ -24,7 +24,7 @@ bool SignalJob::generate(TempStream &data)
     if (!configureSignal(m_engine, m_request)) {
         return false;
     }
-    if (!data.open()) {
+    if (!data.openFor(static_cast<qint64>(m_engine.sampleCount()))) {
         return Tracer::fail("Cannot create temporary data buffer.");
     }
     m_engine.setOutput(data.stream());

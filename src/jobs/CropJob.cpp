@@ -39,7 +39,7 @@ bool CropJob::edit()
 
 bool CropJob::copy(qint64 begin, qint64 count)
 {
-    if (!m_data.open() || !m_data->writeHeader(BufferedIO::DataHeader)) {
+    if (!m_data.openFor(count) || !m_data->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot create temporary data buffer.");
     }
     if (!m_markers.initBuf(&m_markerBytes, BufferedIO::ReadWrite)) {

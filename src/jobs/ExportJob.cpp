@@ -168,6 +168,9 @@ bool ExportJob::process(SourceWaveform &source, qint64 begin, qint64 count)
     if (const QString problem = exportProblem(m_request); !problem.isEmpty()) {
         return refuse(problem);
     }
+    if (!hasRoomFor(m_fileName, count * bytesPerSample())) {
+        return false;
+    }
     if (!m_file.open()) {
         return Tracer::fail(QString("Cannot open '%1': %2").arg(m_fileName, m_file.errorString()));
     }
@@ -183,6 +186,26 @@ bool ExportJob::process(SourceWaveform &source, qint64 begin, qint64 count)
             ReportLine::warning(clippingText(m_clipped.values, 2 * count, m_clipped.largest)));
     }
     return true;
+}
+
+/// Bytes that a sample takes in the file; those of a table are guessed low.
+qint64 ExportJob::bytesPerSample() const
+{
+    switch (*exportFormat(m_request.outputFile)) {
+    case ExportFormat::Mat:
+        return 2 * sizeof(double);
+    case ExportFormat::Cf32:
+        return 2 * sizeof(float);
+    case ExportFormat::Cs16:
+        return 2 * sizeof(qint16);
+    case ExportFormat::Wav:
+    case ExportFormat::Sigmf:
+        return 2LL * wavSampleBytes(wavSample(type()));
+    case ExportFormat::Csv:
+        break;
+    }
+    constexpr qint64 ShortestLine = 8;
+    return ShortestLine;
 }
 
 bool ExportJob::writeBody(SourceWaveform &source, qint64 begin, qint64 count)

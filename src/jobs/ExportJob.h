@@ -55,6 +55,7 @@ private:
     [[nodiscard]] bool writeSigmf(SourceWaveform &source, qint64 begin, qint64 count);
     [[nodiscard]] bool writePlain(SourceWaveform &source, qint64 begin, qint64 count,
                                   DumpFormat format);
+    [[nodiscard]] qint64 bytesPerSample() const;
     [[nodiscard]] bool put(const QByteArray &bytes);
     [[nodiscard]] bool commit();
     [[nodiscard]] QByteArray encoded(std::span<const float> values, ExportType type);

@@ -80,7 +80,7 @@ bool FilterJob::edit()
     }
     Tracer::Trace(Tracer::Information, "Creating filtered waveform...");
     reportSource();
-    if (!m_data.open()) {
+    if (!m_data.openFor(source().info().samples)) {
         return Tracer::fail("Cannot create temporary data buffer for filtered data.");
     }
     emit report(ReportLine::heading("Filtering"));

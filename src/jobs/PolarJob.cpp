@@ -62,7 +62,7 @@ bool PolarJob::split(PolarLevels &levels)
     emit report(ReportLine::heading("Converting"));
     emit report(
         ReportLine::row("IN-samples", QString::number(samples), ReportLine::LabelWidth + 1));
-    if (!m_phase.open()) {
+    if (!m_phase.openFor(2LL * samples)) {
         return Tracer::fail("Cannot create temporary data buffer for phase data.");
     }
     if (!m_amplitude.open()) {

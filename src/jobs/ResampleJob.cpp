@@ -65,7 +65,7 @@ bool ResampleJob::convert()
     constexpr qsizetype LabelWidth = 13;
     emit report(ReportLine::row("IN-samples", QString::number(sourceSamples), LabelWidth));
     emit report(ReportLine::row("OUT-samples", QString::number(targetSamples), LabelWidth));
-    if (!m_data.open()) {
+    if (!m_data.openFor(targetSamples)) {
         return Tracer::fail("Cannot create temporary data buffer for resampled data.");
     }
     if (!m_markers.open()) {

@@ -36,6 +36,9 @@ std::optional<qint64> SigmfImportJob::readInput(TempStream &data, qint64 limit)
         setClock(permittedClock(metadata.sampleRate));
     }
     emit report(ReportLine::row("Datatype", metadata.type.name));
+    if (limit == 0 && !hasTemporaryRoomFor(file.samples() * BufferedIO::RecordSize)) {
+        return std::nullopt;
+    }
     const JobStep step(*this, "Reading SigMF Data...", file);
     if (!file.readSamples(*data.stream(), m_request.channel, limit)) {
         return std::nullopt;

@@ -42,6 +42,9 @@ std::optional<qint64> WavImportJob::readInput(TempStream &data, qint64 limit)
         setClock(permittedClock(header->sampleRate));
     }
     emit report(ReportLine::heading("Reading WAV-file data"));
+    if (limit == 0 && !hasTemporaryRoomFor(header->samples() * BufferedIO::RecordSize)) {
+        return std::nullopt;
+    }
     const JobStep step(*this, "Reading WAV-File Data...", file);
     if (!file.readSamples(data.stream(), limit)) {
         return std::nullopt;

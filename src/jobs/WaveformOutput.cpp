@@ -4,6 +4,7 @@
 #include "ReportText.h"
 #include "ToolJob.h"
 
+#include "base/freespace.h"
 #include "log/Tracer.h"
 #include "streams/levels.h"
 #include "streams/samplestream.h"
@@ -95,6 +96,10 @@ void WaveformOutput::reportLoop()
 
 bool WaveformOutput::write(const WvStreams &streams, const QString &stepLabel)
 {
+    constexpr qint64 FileBytesPerSample = 4;
+    if (!hasRoomFor(fileName(), FileBytesPerSample * m_record.samples)) {
+        return Tracer::fail("Waveform generation failed.");
+    }
     HvFileIO file;
     m_record.overwrite = m_options.overwrite;
     const JobStep step(m_job, stepLabel, file);

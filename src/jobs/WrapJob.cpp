@@ -155,7 +155,7 @@ bool WrapJob::build(const Joint &joint)
     const WrapSettings &settings = m_request.settings;
     const qint64 range = settings.range;
     const qint64 samples = source().info().samples;
-    if (!m_data.open() || !m_data->writeHeader(BufferedIO::DataHeader)) {
+    if (!m_data.openFor(samples) || !m_data->writeHeader(BufferedIO::DataHeader)) {
         return Tracer::fail("Cannot create temporary data buffer.");
     }
     if (!m_markers.open()) {

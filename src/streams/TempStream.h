@@ -3,6 +3,8 @@
 
 #include "BufferedIO.h"
 
+#include "base/freespace.h"
+
 #include <QTemporaryFile>
 
 /// A temporary file and the stream over it. Jobs hold their streams by value, so that the file and
@@ -19,6 +21,14 @@ public:
     /// Creates the file and its buffers for reading and writing. False if either fails, without a
     /// message: the caller says what the stream was meant for.
     [[nodiscard]] bool open() { return m_stream.initBuf(&m_file, BufferedIO::ReadWrite); }
+
+    /// As open(), for a data stream of so many samples; false, with the reason logged, too where
+    /// the temporary folder has no room for them.
+    [[nodiscard]] bool openFor(qint64 samples)
+    {
+        return hasTemporaryRoomFor(BufferedIO::HeaderSize + samples * BufferedIO::RecordSize) &&
+               open();
+    }
 
     [[nodiscard]] BufferedIO *stream() { return &m_stream; }
     BufferedIO *operator->() { return &m_stream; }

@@ -81,12 +81,16 @@ void ToolWizard::limitTagTexts()
 
 void ToolWizard::addPresetMenu()
 {
-    auto *row = qobject_cast<QBoxLayout *>(m_previous->parentWidget()->layout());
+    const QList<QBoxLayout *> rows = findChildren<QBoxLayout *>();
+    const auto row = std::find_if(rows.begin(), rows.end(), [this](const QBoxLayout *layout) {
+        return layout->indexOf(m_previous) >= 0;
+    });
     // A tool may have such buttons of its own.
-    if (row == nullptr || findChild<QPushButton *>("pb_saveprofile") != nullptr) {
+    if (row == rows.end() || findChild<QPushButton *>("pb_saveprofile") != nullptr) {
         return;
     }
-    auto *button = new QPushButton("Pre&set");
+    m_preset = new QPushButton("Pre&set");
+    QPushButton *button = m_preset;
     button->setObjectName("pb_preset");
     button->setToolTip("Save the fields of this tool in a file, or load them from one");
     button->setAutoDefault(false);
@@ -94,7 +98,7 @@ void ToolWizard::addPresetMenu()
     menu->addAction("&Load Preset...", this, &ToolWizard::askAndLoad);
     menu->addAction("&Save Preset...", this, &ToolWizard::askAndSave);
     button->setMenu(menu);
-    row->insertWidget(0, button);
+    (*row)->insertWidget(0, button);
 }
 
 void ToolWizard::askAndLoad()
@@ -224,6 +228,9 @@ void ToolWizard::updateButtons()
 {
     const int page = currentPage();
     m_previous->setEnabled(page > 0 && !m_isRunning);
+    if (m_preset != nullptr) {
+        m_preset->setEnabled(!m_isRunning);
+    }
     m_next->setVisible(page != statusPage());
     m_next->setText(page == outputPage() ? "&Run" : "&Next");
     m_next->setEnabled(isComplete(page));

@@ -105,6 +105,7 @@ private:
     QPushButton *m_next = nullptr;
     QPushButton *m_previous = nullptr;
     QPushButton *m_close = nullptr;
+    QPushButton *m_preset = nullptr; ///< null in a tool with buttons of its own
     QTextEdit *m_report = nullptr;
     bool m_isRunning = false;
 };

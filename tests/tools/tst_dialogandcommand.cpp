@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "cli/CliRun.h"
 #include "support/files.h"
+#include "support/modals.h"
 #include "support/rows.h"
 #include "support/wvbytes.h"
 #include "toolwindow.h"
@@ -11,6 +12,7 @@
 #include "tools/DlgPolar.h"
 #include "tools/DlgResample.h"
 #include "tools/DlgRescale.h"
+#include "tools/DlgView.h"
 #include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
 #include "tools/ViewFrame.h"
@@ -18,6 +20,8 @@
 #include <QComboBox>
 #include <QLabel>
 #include <QLineEdit>
+#include <QMenu>
+#include <QPushButton>
 #include <QTest>
 #include <QTextEdit>
 
@@ -36,6 +40,17 @@ void keepPicture(QWidget &window, const QString &name)
     }
 }
 
+/// Answers the question for a file with a name.
+Answer chooseFile(const QString &name)
+{
+    return [name](QWidget &window) {
+        auto *field = window.findChild<QLineEdit *>("fileNameEdit");
+        QVERIFY(field != nullptr);
+        field->setText(name);
+        QTest::keyClick(field, Qt::Key_Return);
+    };
+}
+
 } // namespace
 
 /// The window and the command line write the same file for the same wish.
@@ -49,6 +64,8 @@ private slots:
     void edits();
     void markers();
     void levels();
+    void presets();
+    void selections();
 
 private:
     /// Runs a command that writes "command.wv", and compares that with "dialog.wv", but for the
@@ -248,6 +265,77 @@ void TestDialogAndCommand::levels()
     QVERIFY(takeFile("steps_rescale.wv"));
     QCOMPARE(tag(m_folder.load("dialog.wv"), "LEVEL OFFS"), "5.500000,3.000000");
     compareWith({"level", "steps.wv", "--peak", "-3", "--pkrms", "2.5"});
+}
+
+void TestDialogAndCommand::presets()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4000)));
+    const QString file = m_folder.path("filter.ini");
+    const auto choosePreset = [&](DlgFilter &dialog, int action) {
+        auto *button = child<QPushButton>(dialog, "pb_preset");
+        return withModal([&] { button->menu()->actions().at(action)->trigger(); },
+                         chooseFile(file));
+    };
+    constexpr int Load = 0;
+    constexpr int Save = 1;
+    DlgFilter dialog;
+    QVERIFY(dialog.startModule(m_folder.path("tone.wv")));
+    dialog.show();
+    click(dialog, "pb_next");
+    auto *length = child<QtNumericEdit>(dialog, "le_filterlength");
+    auto *type = child<QComboBox>(dialog, "cb_filtertype");
+    length->setVal(77);
+    child<QtNumericEdit>(dialog, "le_filterfreq")->setVal(25e3);
+    type->setCurrentIndex(type->findData(static_cast<int>(FilterKind::Cosine)));
+    QVERIFY(choosePreset(dialog, Save));
+    const auto written = [&](const QString &options) {
+        const CliRun run = CliRun::in(
+            m_folder.path(),
+            ("filter tone.wv -o made.wv --force " + options).split(' ', Qt::SkipEmptyParts));
+        return run.exitCode == 0 ? sampleWords(m_folder.load("made.wv")) : QByteArray();
+    };
+    const QByteArray made = written("--preset filter.ini");
+    QVERIFY(!made.isEmpty());
+    QVERIFY(made == written("--length 77 --bandwidth 25k --type cosine"));
+
+    QVERIFY(!written("--type gauss --length 40 --save-preset filter.ini").isEmpty());
+    QVERIFY(choosePreset(dialog, Load));
+    QCOMPARE(length->getVal(), 40.0);
+    QCOMPARE(type->currentData().toInt(), static_cast<int>(FilterKind::Gauss));
+    QCOMPARE(child<QLineEdit>(dialog, "le_infile")->text(), m_folder.path("tone.wv"));
+    QVERIFY(m_folder.store("filter.ini", "[Polar]\ngain=1\n"));
+    Seen seen;
+    QVERIFY(withModals(
+        [&] { child<QPushButton>(dialog, "pb_preset")->menu()->actions().at(Load)->trigger(); },
+        {chooseFile(file), answer("OK", seen)}));
+    QVERIFY2(seen.text.startsWith("The file holds no settings of this tool."),
+             qPrintable(seen.text));
+}
+
+void TestDialogAndCommand::selections()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4000)));
+    DlgView view;
+    QVERIFY(view.startModule(m_folder.path("tone.wv")));
+    view.show();
+    auto *button = child<QPushButton>(view, "pb_save_selection");
+    QVERIFY(!button->isEnabled());
+    auto *frame = child<ViewFrame>(view, "w_view");
+    frame->set_csr_data(2999, 0, 0);
+    click(view, "pb_fix_ref");
+    frame->set_csr_data(1000, 0, 0);
+    QVERIFY(button->isEnabled());
+    for (const char *name : {"piece.wv", "piece.cs16"}) {
+        Seen seen;
+        QVERIFY(withModals([&] { button->click(); },
+                           {chooseFile(m_folder.path(name)), answer("OK", seen)}));
+        QVERIFY2(seen.text.contains("2000"), qPrintable(seen.text));
+    }
+    const CliRun run = CliRun::in(m_folder.path(), {"dump", "tone.wv", "--from", "1000", "--count",
+                                                    "2000", "--format", "ci16"});
+    QCOMPARE(run.exitCode, 0);
+    QVERIFY(sampleWords(m_folder.load("piece.wv")) == run.output);
+    QVERIFY(m_folder.load("piece.cs16") == run.output);
 }
 
 QTEST_MAIN(TestDialogAndCommand)
