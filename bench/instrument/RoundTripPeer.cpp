@@ -51,9 +51,11 @@ void runOnProcessor(Side side)
     sched_setaffinity(0, sizeof one, &one);
 }
 
-RoundTripPeer::RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes)
+RoundTripPeer::RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes,
+                             std::chrono::microseconds delay)
     : m_request(requestBytes)
     , m_reply(replyBytes)
+    , m_delay(delay)
 {
     const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
     sockaddr_in address{};
@@ -94,7 +96,13 @@ void RoundTripPeer::serve(int listener) const
     close(listener);
     sendAtOnce(peer);
     std::vector<char> request(m_request.size());
-    while (receiveAll(peer, request) && sendAll(peer, m_reply)) {
+    while (receiveAll(peer, request)) {
+        if (m_delay.count() > 0) {
+            std::this_thread::sleep_for(m_delay);
+        }
+        if (!sendAll(peer, m_reply)) {
+            break;
+        }
     }
     close(peer);
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <chrono>
 #include <cstddef>
 #include <thread>
 #include <vector>
@@ -18,7 +19,9 @@ void runOnProcessor(Side side);
 class RoundTripPeer
 {
 public:
-    RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes);
+    /// Replies so long after the request.
+    RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes,
+                  std::chrono::microseconds delay = {});
     ~RoundTripPeer();
     RoundTripPeer(const RoundTripPeer &) = delete;
     RoundTripPeer &operator=(const RoundTripPeer &) = delete;
@@ -33,6 +36,7 @@ private:
 
     std::vector<char> m_request;
     std::vector<char> m_reply;
+    std::chrono::microseconds m_delay;
     int m_socket = -1;
     std::thread m_server;
 };

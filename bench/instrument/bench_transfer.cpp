@@ -1,7 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // Files to and from a simulated instrument over loopback, beside two limits for the same blocks:
 // the bare calls of the VISA layer with the data in memory, and bare round trips over TCP of
-// requests and replies as large as those of VXI-11.
+// requests and replies as large as those of VXI-11. Over networks with longer round trips only
+// where the ports 111 and 5025 may be opened, as in a namespace: unshare -Urn sh -c
+// "ip link set lo up; bench_transfer".
+#include "DelayedRoad.h"
 #include "RoundTripPeer.h"
 
 #include "instrument/VisaDevice.h"
@@ -15,6 +18,8 @@
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
+#include <array>
+#include <chrono>
 #include <memory>
 #include <string>
 #include <vector>
@@ -26,6 +31,10 @@ constexpr qint64 FileBytes = 50'000'000;
 constexpr ViUInt32 WriteBlock = 1024;
 constexpr ViUInt32 ReadBlock = 32768;
 const char *const Resource = "GPIB0::28::INSTR";
+/// Blocks on a network.
+constexpr ViUInt32 NetworkBlock = 64 * 1024;
+/// The simulator itself, and where a slower road to it begins.
+constexpr std::array NetworkHosts{"127.0.0.1", "127.0.0.3"};
 const QString RemoteName = "/var/user/bench.wv";
 
 /// Record mark, RPC header and parameters of device_write and device_read, and of their replies.
@@ -46,19 +55,19 @@ void countBytes(benchmark::State &state)
     state.SetBytesProcessed(state.iterations() * FileBytes);
 }
 
-bool openDevice(benchmark::State &state, VisaDevice &device)
+bool openDevice(benchmark::State &state, VisaDevice &device, const char *resource = Resource)
 {
-    const bool isOpen = device.openResource(Resource);
+    const bool isOpen = device.openResource(resource);
     if (!isOpen) {
         state.SkipWithError("cannot open the simulated instrument");
     }
     return isOpen;
 }
 
-void put(benchmark::State &state)
+void put(benchmark::State &state, const char *resource)
 {
     VisaDevice device;
-    if (!openDevice(state, device)) {
+    if (!openDevice(state, device, resource)) {
         return;
     }
     for (auto _ : state) {
@@ -70,10 +79,10 @@ void put(benchmark::State &state)
     countBytes(state);
 }
 
-void get(benchmark::State &state)
+void get(benchmark::State &state, const char *resource)
 {
     VisaDevice device;
-    if (!openDevice(state, device) || !device.writeRemoteFile(localName(), RemoteName)) {
+    if (!openDevice(state, device, resource) || !device.writeRemoteFile(localName(), RemoteName)) {
         return;
     }
     const QString backName = folder->filePath("back.wv");
@@ -93,10 +102,10 @@ void get(benchmark::State &state)
 class BareSession
 {
 public:
-    BareSession()
+    explicit BareSession(const char *resource = Resource)
     {
         viOpenDefaultRM(&m_manager);
-        m_isOpen = viOpen(m_manager, Resource, VI_NO_LOCK, 0, &m_session) == VI_SUCCESS;
+        m_isOpen = viOpen(m_manager, resource, VI_NO_LOCK, 0, &m_session) == VI_SUCCESS;
         viSetAttribute(m_session, VI_ATTR_TMO_VALUE, 5000);
     }
     ~BareSession() { viClose(m_manager); }
@@ -131,18 +140,18 @@ private:
     bool m_isOpen = false;
 };
 
-void bareWrites(benchmark::State &state)
+void bareWrites(benchmark::State &state, const char *resource, ViUInt32 blockBytes)
 {
-    const BareSession session;
+    const BareSession session(resource);
     const std::string head = ":MMEM:DATA '/var/user/bench.wv',#8" + std::to_string(FileBytes);
-    const std::vector<char> block(WriteBlock);
+    const std::vector<char> block(blockBytes);
     bool done = session.isOpen();
     for (auto _ : state) {
         done = done && session.write(head.data(), static_cast<ViUInt32>(head.size()), false);
         ViUInt32 written = 0;
         qint64 remaining = FileBytes;
-        for (; done && remaining > WriteBlock; remaining -= WriteBlock) {
-            done = session.send(block.data(), WriteBlock, written);
+        for (; done && remaining > blockBytes; remaining -= blockBytes) {
+            done = session.send(block.data(), blockBytes, written);
         }
         done = done && session.write(block.data(), static_cast<ViUInt32>(remaining), true);
     }
@@ -178,9 +187,10 @@ void bareReads(benchmark::State &state)
     countBytes(state);
 }
 
-void roundTrips(benchmark::State &state, std::size_t request, std::size_t reply, qint64 block)
+void roundTrips(benchmark::State &state, std::size_t request, std::size_t reply, qint64 block,
+                std::chrono::microseconds delay = {})
 {
-    RoundTripPeer peer(request, reply);
+    RoundTripPeer peer(request, reply, delay);
     bool done = peer.isConnected();
     for (auto _ : state) {
         for (qint64 remaining = FileBytes; done && remaining > 0; remaining -= block) {
@@ -193,10 +203,11 @@ void roundTrips(benchmark::State &state, std::size_t request, std::size_t reply,
     countBytes(state);
 }
 
-void add(const char *name, void (*function)(benchmark::State &))
+template <typename Function>
+void add(const std::string &name, Function function)
 {
     // The fastest of some runs is the one that nothing else on the machine disturbed.
-    benchmark::RegisterBenchmark(name, function)
+    benchmark::RegisterBenchmark(name.c_str(), function)
         ->UseRealTime()
         ->Unit(benchmark::kMillisecond)
         ->Repetitions(Repetitions)
@@ -205,6 +216,69 @@ void add(const char *name, void (*function)(benchmark::State &))
             return *std::min_element(values.begin(), values.end());
         });
 }
+
+/// The same files over networks with round trips of 0, 0.3 and 1.2 ms.
+struct Networks
+{
+    struct Road
+    {
+        const char *name;
+        std::chrono::microseconds delay;
+        const char *resource;
+    };
+    static constexpr std::array<Road, 3> Roads{
+        {{"0ms", std::chrono::microseconds(0), "TCPIP0::127.0.0.1::gpib0,28::INSTR"},
+         {"0.3ms", std::chrono::microseconds(300), "TCPIP1::127.0.0.3::gpib0,28::INSTR"},
+         {"1.2ms", std::chrono::microseconds(1200), "TCPIP2::127.0.0.3::gpib0,28::INSTR"}}};
+
+    std::vector<std::unique_ptr<DelayedRoad>> roads;
+
+    /// Adds its part of the configuration of the VISA layer; nothing where the ports that an
+    /// instrument must answer on can't be had.
+    QByteArray open(quint16 target)
+    {
+        QByteArray config;
+        for (const char *host : NetworkHosts) {
+            if (listenOn(host, 111) < 0 || listenOn(host, 5025) < 0) {
+                return config;
+            }
+        }
+        for (const Road &road : Roads) {
+            quint16 port = target;
+            if (road.delay.count() > 0) {
+                roads.push_back(
+                    std::make_unique<DelayedRoad>(NetworkHosts.back(), target, road.delay));
+                port = roads.back()->port();
+            }
+            config += QString("[%1]\nport=%2\n").arg(road.resource).arg(port).toLatin1();
+        }
+        return config;
+    }
+
+    void addAll() const
+    {
+        if (roads.empty()) {
+            return;
+        }
+        for (const Road &road : Roads) {
+            const std::string name = road.name;
+            add("network/put/" + name,
+                [&road](benchmark::State &state) { put(state, road.resource); });
+            add("network/put/visa/" + name, [&road](benchmark::State &state) {
+                bareWrites(state, road.resource, NetworkBlock);
+            });
+            add("network/put/roundtrips/" + name, [&road](benchmark::State &state) {
+                roundTrips(state, WriteCallBytes + NetworkBlock, WriteReplyBytes, NetworkBlock,
+                           road.delay);
+            });
+            add("network/get/" + name,
+                [&road](benchmark::State &state) { get(state, road.resource); });
+            add("network/get/roundtrips/" + name, [&road](benchmark::State &state) {
+                roundTrips(state, ReadCallBytes, ReadReplyBytes + ReadBlock, ReadBlock, road.delay);
+            });
+        }
+    }
+};
 
 } // namespace
 
@@ -228,21 +302,24 @@ int main(int argc, char **argv)
     }
     config.write(
         QString("[GPIB0]\nhost=127.0.0.1\nport=%1\n").arg(simulator.gatewayPort()).toLatin1());
+    Networks networks;
+    config.write(networks.open(static_cast<quint16>(simulator.gatewayPort())));
     config.close();
     local.write(QByteArray(FileBytes, 'x'));
     local.close();
     qputenv("CORVANE_VISA_CONFIG", config.fileName().toLocal8Bit());
 
-    add("put", put);
-    add("put/visa", bareWrites);
+    add("put", [](benchmark::State &state) { put(state, Resource); });
+    add("put/visa", [](benchmark::State &state) { bareWrites(state, Resource, WriteBlock); });
     add("put/roundtrips", [](benchmark::State &state) {
         roundTrips(state, WriteCallBytes + WriteBlock, WriteReplyBytes, WriteBlock);
     });
-    add("get", get);
+    add("get", [](benchmark::State &state) { get(state, Resource); });
     add("get/visa", bareReads);
     add("get/roundtrips", [](benchmark::State &state) {
         roundTrips(state, ReadCallBytes, ReadReplyBytes + ReadBlock, ReadBlock);
     });
+    networks.addAll();
     benchmark::Initialize(&argc, argv);
     benchmark::RunSpecifiedBenchmarks();
     return 0;

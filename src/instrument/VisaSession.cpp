@@ -26,7 +26,7 @@ constexpr qsizetype MaxAnswerBytes = 64 * 1024 * 1024;
 constexpr int MaxErrorsPerCheck = 20;
 constexpr qint64 MaxErrorsMs = 10'000;
 /// What an instrument that has just let time run out gets to show that it is still there.
-constexpr quint32 ClearMs = 400;
+constexpr quint32 ClearMs = 200;
 constexpr quint32 QueueMs = 500;
 constexpr int MaxLoggedAnswer = 200;
 

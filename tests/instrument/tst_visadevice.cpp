@@ -2,15 +2,24 @@
 #include "FakeInstrument.h"
 #include "LogRecorder.h"
 
+#include "instrument/OperationControl.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/VisaLibrary.h"
+#include "instrument/reachability.h"
 #include "support/rows.h"
 #include "visa/visa.h"
 
+#include <QElapsedTimer>
 #include <QSignalSpy>
 #include <QTcpServer>
+#include <QTcpSocket>
 #include <QTest>
+#include <QTimer>
 
+#include <arpa/inet.h>
+#include <array>
+#include <sys/socket.h>
+#include <unistd.h>
 #include <utility>
 
 namespace {
@@ -33,6 +42,7 @@ private slots:
     void openFails();
     void openTwice();
     void hostIsUnreachable();
+    void hostIsMute();
     void sendCommand();
     void queryText();
     void lateAnswers();
@@ -135,7 +145,7 @@ void TestVisaDevice::opens()
         QVERIFY(device.closeResource());
         // One that has gone silent meanwhile holds it up for a moment alone.
         QCOMPARE(fake.takeCalls(),
-                 (QStringList{"viSetAttribute 3FFF001A 400", "viGpibControlREN 2", "viClear",
+                 (QStringList{"viSetAttribute 3FFF001A 200", "viGpibControlREN 2", "viClear",
                               "viSetAttribute 3FFF001A 5000", "viClose"}));
         QCOMPARE(takeLog(information), QStringList{"1 Device TGX-870, 100001 closed."});
         // Closed already: nothing happens, the identity stays.
@@ -232,6 +242,41 @@ void TestVisaDevice::hostIsUnreachable()
     QVERIFY(!device.openResource("TCPIP::no-such-host.invalid::INSTR"));
     QVERIFY(takeLog().first().startsWith("4 No host address found. "));
     QVERIFY(fake.takeCalls().isEmpty());
+}
+
+/// A host that swallows what is sent to it, as one that is switched off: a listener whose queue is
+/// full.
+void TestVisaDevice::hostIsMute()
+{
+    const int listener = ::socket(AF_INET, SOCK_STREAM, 0);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof address;
+    auto *generic = reinterpret_cast<sockaddr *>(&address);
+    QCOMPARE(::bind(listener, generic, length), 0);
+    QCOMPARE(::listen(listener, 0), 0);
+    QCOMPARE(::getsockname(listener, generic, &length), 0);
+    std::array<QTcpSocket, 3> waiting;
+    for (QTcpSocket &socket : waiting) {
+        socket.connectToHost(QHostAddress::LocalHost, ntohs(address.sin_port));
+        (void)socket.waitForConnected(100);
+    }
+    OperationControl control;
+    control.report = [](int) {};
+    const auto elapsedMs = [&] {
+        QElapsedTimer timer;
+        timer.start();
+        const QList<bool> found =
+            openPorts({QHostAddress::LocalHost}, {ntohs(address.sin_port)}, control);
+        return found == QList<bool>{false} ? timer.elapsed() : -1;
+    };
+    const qint64 whole = elapsedMs();
+    QVERIFY2(whole >= 4900 && whole < 5500, qPrintable(QString::number(whole)));
+    QTimer::singleShot(100, this, [&control] { control.cancelled = true; });
+    const qint64 cancelled = elapsedMs();
+    QVERIFY2(cancelled >= 0 && cancelled < 1000, qPrintable(QString::number(cancelled)));
+    ::close(listener);
 }
 
 void TestVisaDevice::sendCommand()
