@@ -88,4 +88,6 @@ void addCaptureCommand(CLI::App &instr, CommandSet &commands)
     addChoice(command, "--scaling", state->scaling, {"none", "down", "auto"},
               "Level scaling (default: auto)");
     addOutputArguments(command, state->output);
+    command.footer(
+        "Example: corvane-cli instr capture 192.168.1.30 -o a.wv --rate 2M --samples 20000");
 }

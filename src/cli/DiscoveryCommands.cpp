@@ -110,7 +110,7 @@ void addDiscoveryCommands(CLI::App &instr, CommandSet &commands)
     scan.add_flag("--json", scanned.json, "Print one JSON array");
     addNumber(scan, "--time", scanned.listenSeconds,
               {"s", LanScanJob::MinSeconds, LanScanJob::MaxSeconds},
-              "Time to listen on the network, 0.1 s to 60 s (default: 2 s)");
+              "Time to listen on the network (default: 2 s)");
     scan.footer("Example: corvane-cli instr scan lan --time 5");
     auto [doctor, asked] = addInstrumentCommand(
         instr, commands, "doctor", "Walk the way to an instrument and tell where it ends",

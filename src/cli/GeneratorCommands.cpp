@@ -94,6 +94,7 @@ void addGeneratorCommands(CLI::App &instr, CommandSet &commands)
     auto [state, shown] = addInstrumentCommand(
         instr, commands, "state", "Show what a generator plays and how its RF is set", runState);
     state.add_flag("--json", shown.json, "Print JSON");
+    state.footer("Example: corvane-cli instr state 192.168.1.20 --json");
     auto [rf, set] =
         addInstrumentCommand(instr, commands, "rf", "Set the RF side of a generator", runRf);
     addNumber(rf, "--freq", set.frequencyHz, {"Hz", C::MinFrequencyHz, C::MaxFrequencyHz},
@@ -103,6 +104,7 @@ void addGeneratorCommands(CLI::App &instr, CommandSet &commands)
     CLI::Option *on = rf.add_flag("--on", set.on, "Switch the RF output on");
     rf.add_flag("--off", set.off, "Switch the RF output off")->excludes(on);
     rf.footer("Example: corvane-cli instr rf 192.168.1.20 --freq 1.5G --level -10 --on");
-    addInstrumentCommand(instr, commands, "stop", "Stop playing; the RF output stays as it is",
-                         runStop);
+    const InstrumentCommand stop = addInstrumentCommand(
+        instr, commands, "stop", "Stop playing; the RF output stays as it is", runStop);
+    stop.app.footer("Example: corvane-cli instr stop 192.168.1.20");
 }

@@ -260,27 +260,35 @@ void addInstrumentCommands(CommandSet &commands)
     addDiscoveryCommands(*instr, commands);
     auto [info, shown] = add("info", "Show what an instrument is and can", runInfo);
     info.add_flag("--json", shown.json, "Print JSON");
+    info.footer("Example: corvane-cli instr info 192.168.1.20 --json");
 
     auto [query, asked] = add("query", "Send a query and print the answer", runQuery);
     addArgument(query, "command", asked.first, "COMMAND", "Query, such as *IDN?");
     query.footer("Example: corvane-cli instr query 192.168.1.20 '*IDN?'");
     auto [send, sent] = add("send", "Send a command", runSend);
     addArgument(send, "command", sent.first, "COMMAND", "Command, such as *RST");
+    send.footer("Example: corvane-cli instr send 192.168.1.20 ':OUTP ON'");
 
     auto [list, listed] = add("ls", "List a folder", runList);
     addArgument(list, "path", listed.first, "PATH", "Folder on the instrument");
     list.add_flag("--json", listed.json, "Print one JSON array");
     list.add_flag("--recursive", listed.recursive, "With all folders below it");
+    list.footer("Example: corvane-cli instr ls 192.168.1.20 /var/user/ --recursive");
     auto [makeFolder, made] = add("mkdir", "Make a folder", runMakeFolder);
     addArgument(makeFolder, "path", made.first, "PATH", "Folder on the instrument");
+    makeFolder.footer("Example: corvane-cli instr mkdir 192.168.1.20 /var/user/waves");
     auto [removeFolder, removed] = add("rmdir", "Remove a folder", runRemoveFolder);
     addArgument(removeFolder, "path", removed.first, "PATH", "Folder on the instrument");
     removeFolder.add_flag("--recursive", removed.recursive, "With all it holds");
+    removeFolder.footer(
+        "Example: corvane-cli instr rmdir 192.168.1.20 /var/user/waves --recursive");
     auto [move, moved] = add("mv", "Rename a file or folder", runMove);
     addArgument(move, "old", moved.first, "OLD", "Full path on the instrument");
     addArgument(move, "new", moved.second, "NEW", "Name in the same folder, or its full path");
+    move.footer("Example: corvane-cli instr mv 192.168.1.20 /var/user/a.wv b.wv");
     auto [removeFile, deleted] = add("rm", "Delete a file", runRemoveFile);
     addArgument(removeFile, "path", deleted.first, "PATH", "File on the instrument");
+    removeFile.footer("Example: corvane-cli instr rm 192.168.1.20 /var/user/a.wv");
 
     auto [get, fetched] = add("get", "Copy a file from the instrument", runGet);
     addArgument(get, "remote", fetched.first, "REMOTE", "File on the instrument");
@@ -303,7 +311,7 @@ void addInstrumentCommands(CommandSet &commands)
                 "Waveform file (*.wv) on the instrument");
     constexpr double MaxSeconds = 86400;
     addInteger(start.app, "--timeout", start.arguments.seconds, {"s", 1, MaxSeconds},
-               "Longest wait for the instrument to load it, 1 s to 86400 s (default: 100 s)");
+               "Longest wait for the instrument to load it (default: 100 s)");
     addStrict(start);
     start.app.footer("The RF output stays as it is.\n"
                      "Example: corvane-cli instr run 192.168.1.20 /var/user/a.wv");
