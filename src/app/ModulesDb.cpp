@@ -12,6 +12,7 @@
 #include "log/Tracer.h"
 #include "mnemonics.h"
 #include "toolframe/DlgBase.h"
+#include "tools/DlgExport.h"
 #include "tools/DlgFilter.h"
 #include "tools/DlgMarker.h"
 #include "tools/DlgPolar.h"
@@ -58,6 +59,7 @@ QList<ToolInfo> toolTable()
         info,
         view,
         toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
+        toolInfo<DlgExport>("Export", "/File/Export", File, {"WV"}),
         importData,
         toolInfo<DlgWvFromMat>("Import MATLAB", "/Import/From MATLAB", File, {"MAT"}),
         toolInfo<DlgWvFromRiq>("Import RIQ", "/Import/From RIQ", File, {"RIQ"}),

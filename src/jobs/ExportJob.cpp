@@ -122,16 +122,27 @@ std::optional<ExportFormat> exportFormat(const QString &fileName)
     return name == nullptr ? std::nullopt : std::optional(name->format);
 }
 
+QStringList exportSuffixes()
+{
+    QStringList suffixes;
+    for (const FormatName &known : FormatNames) {
+        suffixes << known.suffix;
+    }
+    return suffixes;
+}
+
+QList<ExportType> exportTypes(const QString &fileName)
+{
+    const FormatName *name = formatNameOf(fileName);
+    return name == nullptr ? QList<ExportType>() : typesOf(name->format);
+}
+
 QString exportProblem(const ExportRequest &request)
 {
     const FormatName *name = formatNameOf(request.outputFile);
     if (name == nullptr) {
-        QStringList suffixes;
-        for (const FormatName &known : FormatNames) {
-            suffixes << known.suffix;
-        }
         return QString("The name '%1' doesn't tell the format; permitted suffixes: %2")
-            .arg(request.outputFile, suffixes.join(", "));
+            .arg(request.outputFile, exportSuffixes().join(", "));
     }
     const QList<ExportType> types = typesOf(name->format);
     if (!request.type || types.contains(*request.type)) {

@@ -31,6 +31,12 @@ struct ExportRequest
 /// The format of a file name; nothing for a suffix that none has.
 [[nodiscard]] std::optional<ExportFormat> exportFormat(const QString &fileName);
 
+/// The suffixes of all formats.
+[[nodiscard]] QStringList exportSuffixes();
+
+/// The types among which the format of a file name leaves the choice; none if it has one form only.
+[[nodiscard]] QList<ExportType> exportTypes(const QString &fileName);
+
 /// Why name and type of the request don't go together, naming what is permitted; empty if they do.
 [[nodiscard]] QString exportProblem(const ExportRequest &request);
 

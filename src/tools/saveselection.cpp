@@ -24,17 +24,19 @@ QString title()
     return "Save Selection";
 }
 
-/// The name that was chosen; one without a suffix gets that of the chosen type.
-QString askName(QWidget *parent, const QString &source)
+QStringList exportFileTypes()
 {
-    const QStringList types{
-        "Waveform (*.wv)",           "WAV (*.wav)",   "Raw 32-bit floats (*.cf32)",
-        "Raw 16-bit words (*.cs16)", "Table (*.csv)", "MATLAB 5 (*.mat)",
-        "SigMF (*.sigmf-meta)"};
+    return {"WAV (*.wav)",   "Raw 32-bit floats (*.cf32)", "Raw 16-bit words (*.cs16)",
+            "Table (*.csv)", "MATLAB 5 (*.mat)",           "SigMF (*.sigmf-meta)"};
+}
+
+/// The name that was chosen; one without a suffix gets that of the chosen type.
+QString askName(QWidget *parent, const QString &title, const QString &initial,
+                const QStringList &types)
+{
     QString type;
-    QString name =
-        QFileDialog::getSaveFileName(parent, title(), fileNameWithSuffix(source, "_piece"),
-                                     types.join(";;"), &type, QFileDialog::DontConfirmOverwrite);
+    QString name = QFileDialog::getSaveFileName(parent, title, initial, types.join(";;"), &type,
+                                                QFileDialog::DontConfirmOverwrite);
     if (!name.isEmpty() && QFileInfo(name).suffix().isEmpty()) {
         static const QRegularExpression suffix("\\*(\\.[^)]+)\\)");
         name += suffix.match(type.isEmpty() ? types.first() : type).captured(1);
@@ -58,9 +60,15 @@ std::unique_ptr<ToolJob> makeJob(const SampleRange &piece, const QString &name)
 
 } // namespace
 
+QString askExportName(QWidget *parent, const QString &initial)
+{
+    return askName(parent, "Export Waveform", initial, exportFileTypes());
+}
+
 void saveSelection(QWidget *parent, const SampleRange &piece)
 {
-    const QString name = askName(parent, piece.fileName);
+    const QString name = askName(parent, title(), fileNameWithSuffix(piece.fileName, "_piece"),
+                                 QStringList("Waveform (*.wv)") + exportFileTypes());
     if (name.isEmpty()) {
         return;
     }

@@ -7,6 +7,7 @@
 #include "toolwindow.h"
 
 #include "display/QtNumericEdit.h"
+#include "tools/DlgExport.h"
 #include "tools/DlgFilter.h"
 #include "tools/DlgMarker.h"
 #include "tools/DlgPolar.h"
@@ -66,6 +67,7 @@ private slots:
     void levels();
     void presets();
     void selections();
+    void exports();
 
 private:
     /// Runs a command that writes "command.wv", and compares that with "dialog.wv", but for the
@@ -336,6 +338,34 @@ void TestDialogAndCommand::selections()
     QCOMPARE(run.exitCode, 0);
     QVERIFY(sampleWords(m_folder.load("piece.wv")) == run.output);
     QVERIFY(m_folder.load("piece.cs16") == run.output);
+}
+
+void TestDialogAndCommand::exports()
+{
+    QVERIFY(m_folder.store("tone.wv", toneFile(4000)));
+    DlgExport dialog;
+    QVERIFY(dialog.startModule(m_folder.path("tone.wv")));
+    dialog.show();
+    auto *target = child<QLineEdit>(dialog, "le_outfile");
+    auto *report = child<QTextEdit>(dialog, "te_result");
+    auto *values = child<QComboBox>(dialog, "cb_type");
+    QCOMPARE(target->text(), m_folder.path("tone.wav"));
+    QCOMPARE(values->currentText(), "16 bit");
+    type(child<QtNumericEdit>(dialog, "le_from"), "3000");
+    values->setCurrentText("24 bit");
+    keepPicture(dialog, "export");
+    click(dialog, "pb_run");
+    QVERIFY2(report->toPlainText().contains("Export completed"), qPrintable(report->toPlainText()));
+    const CliRun run = CliRun::in(m_folder.path(), {"export", "tone.wv", "--from", "3000", "--type",
+                                                    "s24", "-o", "command.wav"});
+    QCOMPARE(run.exitCode, 0);
+    QVERIFY(m_folder.load("tone.wav") == m_folder.load("command.wav"));
+    keepPicture(dialog, "export-done");
+    target->setText(m_folder.path("tone.csv"));
+    QVERIFY(!values->isEnabled());
+    target->setText(m_folder.path("tone.doc"));
+    click(dialog, "pb_run");
+    QVERIFY(report->toPlainText().contains("doesn't tell the format"));
 }
 
 QTEST_MAIN(TestDialogAndCommand)
