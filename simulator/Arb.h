@@ -27,6 +27,11 @@ public:
 
     [[nodiscard]] bool isOn() const { return m_on; }
     void setOn(bool on) { m_on = on; }
+
+    /// The clock rate at which the waveform is played, in Hz.
+    [[nodiscard]] double clockHz() const { return m_clockHz; }
+    void setClockHz(double clockHz) { m_clockHz = clockHz; }
+
     void reset() { *this = {}; }
 
 private:
@@ -34,6 +39,7 @@ private:
     TimePoint m_loadBegin;
     TimePoint m_loadEnd;
     bool m_on = false;
+    double m_clockHz = 0;
 };
 
 } // namespace simulator

@@ -166,6 +166,8 @@ std::optional<Options> parseOptions(std::vector<std::string> arguments, std::str
     app.footer("Models:\n" + modelNames() + "\n\nFaults:\n" + Faults::help());
     app.set_version_flag("--version", "corvane-simulator " CORVANE_VERSION);
     app.add_flag("--verbose", options.verbose, "logs each command and answer");
+    bool withoutHislip = false;
+    app.add_flag("--no-hislip", withoutHislip, "leaves port 4880 alone");
     auto *file = app.add_option("--config", config,
                                 "several instruments, one group of an INI file each, with the keys "
                                 "model, serial, firmware, options, root, seed, fault, and either "
@@ -182,8 +184,8 @@ std::optional<Options> parseOptions(std::vector<std::string> arguments, std::str
           Switch{"--firmware", raw.firmware, "firmware version, default 1.0"},
           Switch{"--options", raw.options, "answer to *OPT?, default that of the model"},
           Switch{"--address", raw.address,
-                 "own address of 127.0.0.0/8, default 127.0.0.2; the ports 111 and 5025 are "
-                 "opened there"},
+                 "own address of 127.0.0.0/8, default 127.0.0.2; the ports 111, 4880 and 5025 "
+                 "are opened there"},
           Switch{"--root", raw.root,
                  "folder that stands for the top of the file system, default a temporary one"},
           Switch{"--seed", raw.seed, "seed of the noise that an analyzer records, default 1"}}) {
@@ -213,12 +215,16 @@ std::optional<Options> parseOptions(std::vector<std::string> arguments, std::str
         if (!loadConfig(*config, options, error)) {
             return std::nullopt;
         }
+        for (InstrumentPlace &place : options.instruments) {
+            place.hislip = !withoutHislip;
+        }
         return options;
     }
     std::optional<InstrumentPlace> place = checkInstrument(raw, error);
     if (!place) {
         return std::nullopt;
     }
+    place->hislip = !withoutHislip;
     options.instruments.push_back(std::move(*place));
     return options;
 }

@@ -17,6 +17,7 @@ struct InstrumentPlace
     std::string address;                  ///< of its own; empty behind a gateway
     std::optional<std::uint16_t> gateway; ///< port; 0 lets the system choose
     unsigned gpib = 0;                    ///< address behind the gateway, 0 to 30
+    bool hislip = true;                   ///< serves this protocol too, at an own address
 };
 
 /// What the program was asked for.

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "Simulator.h"
 
+#include <protocols/hislip.h>
 #include <vxi11.h>
 
 namespace simulator {
@@ -31,7 +32,7 @@ bool Simulator::start(const std::vector<InstrumentPlace> &places, std::string &e
             return false;
         }
         const bool added = place.gateway ? addToGateway(place, instrument, error)
-                                         : addHost(place.address, instrument, error);
+                                         : addHost(place, instrument, error);
         if (!added) {
             return false;
         }
@@ -42,8 +43,9 @@ bool Simulator::start(const std::vector<InstrumentPlace> &places, std::string &e
     return true;
 }
 
-bool Simulator::addHost(const std::string &address, Instrument &instrument, std::string &error)
+bool Simulator::addHost(const InstrumentPlace &place, Instrument &instrument, std::string &error)
 {
+    const std::string &address = place.address;
     Host &host = *m_hosts.emplace_back(std::make_unique<Host>());
     std::string reason;
     if (!instrument.faults().has("no-portmapper")) {
@@ -58,6 +60,10 @@ bool Simulator::addHost(const std::string &address, Instrument &instrument, std:
             return false;
         }
     }
+    if (place.hislip && !host.hislip.open(address, reason)) {
+        error = cannotOpen("HiSLIP", address, protocols::hislip::Port, reason);
+        return false;
+    }
     if (!host.vxi11.open(address, 0, reason)) {
         error = cannotOpen("VXI-11", address, 0, reason);
         return false;
@@ -70,6 +76,9 @@ bool Simulator::addHost(const std::string &address, Instrument &instrument, std:
     }
     if (!instrument.faults().has("no-raw")) {
         host.raw.start(instrument, address + ":" + std::to_string(RawSocketServer::Port));
+    }
+    if (place.hislip) {
+        host.hislip.start(instrument, address + ' ' + HislipServer::SubAddress);
     }
     m_readyLines.push_back("ready " + address);
     return true;
@@ -103,6 +112,7 @@ void Simulator::stop()
         host->mapper.stop();
         host->vxi11.stop();
         host->raw.stop();
+        host->hislip.stop();
     }
     for (const auto &[port, gateway] : m_gateways) {
         gateway->stop();

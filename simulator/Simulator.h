@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "HislipServer.h"
 #include "Options.h"
 #include "PortMapper.h"
 #include "RawSocketServer.h"
@@ -35,9 +36,10 @@ private:
         PortMapper mapper;
         Vxi11Server vxi11;
         RawSocketServer raw;
+        HislipServer hislip;
     };
 
-    [[nodiscard]] bool addHost(const std::string &address, Instrument &instrument,
+    [[nodiscard]] bool addHost(const InstrumentPlace &place, Instrument &instrument,
                                std::string &error);
     [[nodiscard]] bool addToGateway(const InstrumentPlace &place, Instrument &instrument,
                                     std::string &error);

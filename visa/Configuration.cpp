@@ -104,7 +104,8 @@ private:
             return {};
         }
         const auto name = parseResourceName(title);
-        if (!name || (name->kind != ResourceKind::Vxi11 && name->kind != ResourceKind::Socket)) {
+        if (!name || (name->kind != ResourceKind::Vxi11 && name->kind != ResourceKind::Hislip &&
+                      name->kind != ResourceKind::Socket)) {
             return "section " + quoted(title) +
                    " is none of 'general', a GPIB board such as 'GPIB0' or a TCPIP resource.";
         }

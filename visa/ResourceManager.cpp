@@ -2,6 +2,7 @@
 #include "ResourceManager.h"
 
 #include "FindExpression.h"
+#include "HislipTransport.h"
 #include "SocketTransport.h"
 #include "UsbtmcDevices.h"
 #include "UsbtmcTransport.h"
@@ -25,6 +26,8 @@ ViStatus ResourceManager::open(const ResourceName &name, ViUInt32 timeoutMs,
                                    VI_INTF_TCPIP};
         return Vxi11Transport::open(address, deadline, transport);
     }
+    case ResourceKind::Hislip:
+        return HislipTransport::open({name.host, name.port, name.device}, deadline, transport);
     case ResourceKind::Socket:
         return SocketTransport::open(name.host, name.port, deadline, transport);
     case ResourceKind::Usb: {

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ResourceName.h"
 
+#include <protocols/hislip.h>
+
 #include <algorithm>
 #include <array>
 #include <charconv>
@@ -45,6 +47,26 @@ void dropClass(Sections &sections)
     }
 }
 
+// "hislip0" and "hislip0,4880" name a device of that protocol. False for a port that is none.
+bool takeHislip(ResourceName &name)
+{
+    if (!upperCase(name.device).starts_with("HISLIP")) {
+        return true;
+    }
+    name.kind = ResourceKind::Hislip;
+    const std::size_t comma = name.device.find(',');
+    if (comma == std::string::npos) {
+        return true;
+    }
+    const auto port = parseNumber(std::string_view(name.device).substr(comma + 1));
+    if (!port || *port == 0) {
+        return false;
+    }
+    name.port = *port == protocols::hislip::Port ? ViUInt16{0} : *port;
+    name.device.resize(comma);
+    return true;
+}
+
 std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
 {
     ResourceName name;
@@ -63,7 +85,7 @@ std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
         }
         name.kind = ResourceKind::Vxi11;
         name.device = sections.size() == 3 ? sections[2] : "inst0";
-        if (!isPlain(name.device)) {
+        if (!isPlain(name.device) || !takeHislip(name)) {
             return std::nullopt;
         }
     }
@@ -196,6 +218,9 @@ std::string resourceText(const ResourceName &name)
     switch (name.kind) {
     case ResourceKind::Vxi11:
         return "TCPIP" + board + name.host + "::" + name.device + "::INSTR";
+    case ResourceKind::Hislip:
+        return "TCPIP" + board + name.host + "::" + name.device +
+               (name.port == 0 ? std::string() : "," + std::to_string(name.port)) + "::INSTR";
     case ResourceKind::Socket:
         return "TCPIP" + board + name.host + "::" + std::to_string(name.port) + "::SOCKET";
     case ResourceKind::Usb: {

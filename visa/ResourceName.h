@@ -12,6 +12,7 @@ namespace visa {
 
 enum class ResourceKind {
     Vxi11,  ///< TCPIP[board]::host[::device][::INSTR]
+    Hislip, ///< TCPIP[board]::host::hislipN[,port][::INSTR]
     Socket, ///< TCPIP[board]::host::port::SOCKET
     Usb,    ///< USB[board]::vendor::product::serial[::interface][::INSTR]
     Gpib    ///< GPIB[board]::primary[::secondary][::INSTR]
@@ -24,8 +25,8 @@ struct ResourceName
     ViUInt16 board = 0;
 
     std::string host;
-    std::string device; ///< VXI-11 device name, "inst0" unless given
-    ViUInt16 port = 0;
+    std::string device; ///< VXI-11 device name, "inst0" unless given, or HiSLIP sub-address
+    ViUInt16 port = 0;  ///< of a socket; of HiSLIP only if it isn't the usual one
 
     ViUInt16 vendorId = 0;
     ViUInt16 productId = 0;

@@ -19,6 +19,8 @@ namespace {
 constexpr int KeepAliveIdleSeconds = 10;
 constexpr int KeepAliveIntervalSeconds = 5;
 constexpr int KeepAliveProbes = 3;
+// Nor is a peer there that takes no byte for so long.
+constexpr int UnacknowledgedMs = 20'000;
 
 void setOption(int descriptor, int level, int option, int value)
 {
@@ -97,6 +99,7 @@ ViStatus TcpSocket::connectTo(HostAddress address, std::uint16_t port, const Dea
     setOption(m_descriptor, IPPROTO_TCP, TCP_KEEPIDLE, KeepAliveIdleSeconds);
     setOption(m_descriptor, IPPROTO_TCP, TCP_KEEPINTVL, KeepAliveIntervalSeconds);
     setOption(m_descriptor, IPPROTO_TCP, TCP_KEEPCNT, KeepAliveProbes);
+    setOption(m_descriptor, IPPROTO_TCP, TCP_USER_TIMEOUT, UnacknowledgedMs);
 
     setPort(address, port);
     if (::connect(m_descriptor, reinterpret_cast<const sockaddr *>(&address.storage),

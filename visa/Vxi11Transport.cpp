@@ -141,12 +141,16 @@ ViStatus Vxi11Transport::callDevice(std::uint32_t procedure, protocols::XdrCode<
                                     const Arguments &arguments, std::size_t dataSize,
                                     protocols::XdrValue<Results> &results, const Deadline &deadline)
 {
+    // A peer that answers on neither channel costs its time-out once, not with each call.
+    if (m_isGone) {
+        return VI_ERROR_TMO;
+    }
     const ViStatus status =
         m_core.call<Arguments, Results>(coreProcedure(procedure), encode, arguments, dataSize,
                                         results, deadline.extendedBy(ReplyGraceMs));
     m_isSilent = status == VI_ERROR_TMO;
     if (status == VI_ERROR_TMO || status == VI_ERROR_ABORT) {
-        abortRunningCall();
+        m_isGone = !abortRunningCall() && m_isSilent;
     }
     if (status != VI_SUCCESS) {
         return status;
@@ -263,22 +267,22 @@ ViStatus Vxi11Transport::controlRemote(ViUInt16 mode, const Deadline &deadline)
     }
 }
 
-void Vxi11Transport::abortRunningCall()
+/// False if the instrument has an abort channel and doesn't answer there.
+bool Vxi11Transport::abortRunningCall()
 {
     if (m_abortPort == 0 || !m_core.isOpen()) {
-        return;
+        return true;
     }
     const Deadline deadline = Deadline::after(AbortMs);
     const Waker ownWaker; // the session's may be what ended the call
     RpcConnection connection(ownWaker);
     if (connection.connect(m_hostAddresses, m_abortPort, deadline) != VI_SUCCESS) {
-        return;
+        return false;
     }
     const RpcProcedure abort{DEVICE_ASYNC, DEVICE_ASYNC_VERSION, device_abort};
     protocols::XdrValue<Device_Error> reply(xdr_Device_Error);
-    // The call that was aborted has failed already; that its end could not be told is no news.
-    (void)connection.call<Device_Link, Device_Error>(abort, xdr_Device_Link, m_link, 0, reply,
-                                                     deadline);
+    return connection.call<Device_Link, Device_Error>(abort, xdr_Device_Link, m_link, 0, reply,
+                                                      deadline) == VI_SUCCESS;
 }
 
 } // namespace visa

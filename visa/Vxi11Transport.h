@@ -52,7 +52,7 @@ private:
     callDevice(std::uint32_t procedure, protocols::XdrCode<Arguments> *encode,
                const Arguments &arguments, std::size_t dataSize,
                protocols::XdrValue<Results> &results, const Deadline &deadline);
-    void abortRunningCall();
+    bool abortRunningCall();
 
     Vxi11Address m_address;
     Waker m_waker;
@@ -60,6 +60,7 @@ private:
     RpcConnection m_core;
     bool m_hasLink = false;
     bool m_isSilent = false; // the last call got no answer in time
+    bool m_isGone = false;   // nor did the abort of it: only a new session may try again
     int m_link = 0;
     std::uint16_t m_abortPort = 0;  // 0: the instrument offers no abort channel
     std::size_t m_largestWrite = 0; // bytes that one device_write may carry

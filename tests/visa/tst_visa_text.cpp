@@ -40,6 +40,10 @@ void TestVisaText::resourceNames()
     const QByteArray longest = "TCPIP::" + QByteArray(255 - 8 - 14, 'h');
     const QByteArray tooLong = longest + 'h';
     forRows<Row>({{"TCPIP::192.168.1.5::INSTR", "TCPIP0::192.168.1.5::inst0::INSTR"},
+                  {"TCPIP::box::hislip0", "TCPIP0::box::hislip0::INSTR"},
+                  {"TCPIP1::box::HiSLIP1,4880::INSTR", "TCPIP1::box::HiSLIP1::INSTR"},
+                  {"TCPIP::box::hislip0,5880::INSTR", "TCPIP0::box::hislip0,5880::INSTR"},
+                  {"TCPIP::box::hislip0,0::INSTR", ""},
                   {"tcpip2::bench-7::inst1::instr", "TCPIP2::bench-7::inst1::INSTR"},
                   {"TCPIP0::gate::gpib0,28", "TCPIP0::gate::gpib0,28::INSTR"},
                   {"TCPIP::10.0.0.1::5025::SOCKET", "TCPIP0::10.0.0.1::5025::SOCKET"},
