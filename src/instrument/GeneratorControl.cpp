@@ -74,9 +74,14 @@ bool GeneratorControl::read(GeneratorState &state)
     state.clockHz = numberOf(m_session.ask(arb("CLOC?"), AnswerMs));
     state.frequencyHz = numberOf(m_session.ask(":FREQ?", AnswerMs));
     state.levelDbm = numberOf(m_session.ask(":POW?", AnswerMs));
-    state.output = switchOf(m_session.ask(":OUTP?", AnswerMs));
+    state.output = readOutput();
     const bool isAnswered = state.arb || state.frequencyHz || state.levelDbm || state.output;
     return isAnswered || Tracer::fail("The instrument doesn't tell its state.");
+}
+
+std::optional<bool> GeneratorControl::readOutput()
+{
+    return switchOf(m_session.ask(":OUTP?", AnswerMs));
 }
 
 bool GeneratorControl::send(const QString &command)

@@ -40,6 +40,7 @@ public:
     GeneratorControl(VisaSession &session, const InstrumentIdentity &identity);
 
     [[nodiscard]] bool read(GeneratorState &state);
+    [[nodiscard]] std::optional<bool> readOutput();
     [[nodiscard]] bool change(const GeneratorChange &change);
     [[nodiscard]] bool stop();
 

@@ -427,6 +427,11 @@ bool VisaDevice::readState(GeneratorState &state)
     return GeneratorControl(m_parts->session, m_parts->identity).read(state);
 }
 
+std::optional<bool> VisaDevice::readOutput()
+{
+    return GeneratorControl(m_parts->session, m_parts->identity).readOutput();
+}
+
 bool VisaDevice::changeState(const GeneratorChange &change)
 {
     return GeneratorControl(m_parts->session, m_parts->identity).change(change);

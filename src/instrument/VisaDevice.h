@@ -12,6 +12,7 @@
 
 #include <functional>
 #include <memory>
+#include <optional>
 
 class BufferedIO;
 struct ArbIntervals;
@@ -160,6 +161,8 @@ public:
     [[nodiscard]] bool stopArb();
     /// What the generator plays and how its RF side is set. False if it can't be asked.
     [[nodiscard]] bool readState(GeneratorState &state);
+    /// Whether the RF output is on; nothing if the instrument doesn't tell.
+    [[nodiscard]] std::optional<bool> readOutput();
     /// Sets what the change names, the output last.
     [[nodiscard]] bool changeState(const GeneratorChange &change);
     /// Other times than those of real instruments.

@@ -375,6 +375,14 @@ void TestInstrCommands::limitsOfTheInstrument()
     QCOMPARE(outcome.log.size(), 2);
     QVERIFY(outcome.log.first().startsWith("warning: " + fast));
     QVERIFY(load(remote("fast.wv")) == load(fast) && load(remote("n.txt")) == "1");
+    // A whole file of which only the head is looked at is none that was cut off.
+    QCOMPARE(runProgram({"create", "noise", "--duration", "20ms", "-o", local("n.wv")}).exitCode,
+             0);
+    QVERIFY(QFile::rename(local("n.wv"), remote("n.wv")));
+    outcome = run({"run", device, "/var/user/n.wv", "--strict"});
+    QCOMPARE(outcome.exitCode, 0);
+    QCOMPARE(outcome.log, QStringList{"warning: The RF output is off."});
+    QCOMPARE(run({"stop", device}).exitCode, 0);
     outcome = run({"run", device, "/var/user/fast.wv", "--strict"});
     QCOMPARE(outcome.exitCode, 1);
     QVERIFY2(outcome.lastLine().contains("200 MHz"), qPrintable(outcome.lastLine()));

@@ -1,12 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "StartJob.h"
 
-#include "instrument/GeneratorControl.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
 #include "log/Tracer.h"
-
-#include <QTemporaryFile>
 
 #include <utility>
 
@@ -30,10 +27,7 @@ bool StartJob::talk(VisaDevice &device)
         Tracer::Trace(Tracer::Error, "Cannot select ARB waveform.");
     }
     (void)device.setTimeoutMs(savedTimeoutMs);
-    GeneratorState state;
-    if (started && device.readState(state)) {
-        m_isOutputOff = state.output == false;
-    }
+    m_isOutputOff = started && device.readOutput() == false;
     if (m_isOutputOff) {
         emit report(ReportLine::warning("The RF output is off."));
     }
@@ -48,18 +42,17 @@ bool StartJob::isFit(VisaDevice &device)
     }
     constexpr qint64 HeadBytes = 64 * 1024;
     QByteArray head;
-    QTemporaryFile file;
-    if (!device.readRemoteHead(nativePath(m_path, device.pathSeparator()), HeadBytes, head) ||
-        !file.open() || file.write(head) != head.size() || !file.flush()) {
+    if (!device.readRemoteHead(nativePath(m_path, device.pathSeparator()), HeadBytes, head)) {
         return Tracer::fail("The waveform cannot be checked.");
     }
-    const bool isStrict = m_check == WaveformCheck::Strict;
     if (!isWaveformHead(head)) {
-        return !isStrict || Tracer::fail(QString("The file '%1' is no waveform.").arg(m_path));
+        return m_check != WaveformCheck::Strict ||
+               Tracer::fail(QString("The file '%1' is no waveform.").arg(m_path));
     }
-    const std::optional<WaveformNeeds> needs = needsOf(file.fileName());
-    if (!needs) {
-        return !isStrict;
+    const WaveformNeeds needs = needsOfHead(head);
+    // Files of some kinds tell the number of samples by the size of their block alone.
+    if (needs.samples == 0 && m_check != WaveformCheck::Strict) {
+        return true;
     }
-    return mayPlay(waveformProblems(*needs, summaryOf(device)), m_check);
+    return mayPlay(waveformProblems(needs, summaryOf(device)), m_check);
 }

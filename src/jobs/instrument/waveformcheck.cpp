@@ -7,10 +7,14 @@
 #include "wvfile/HvFileIO.h"
 
 #include <QFile>
+#include <QRegularExpression>
 
 #include <algorithm>
 
 namespace {
+
+/// More than any memory takes, and exact in any number.
+constexpr double LargestCount = 1e15;
 
 QStringList problemsOn(const WaveformNeeds &needs, const BasebandLimits &limits,
                        const QString &owner)
@@ -62,6 +66,22 @@ std::optional<WaveformNeeds> needsOf(const QString &fileName)
     }
     return WaveformNeeds{.samples = std::max<qint64>(summary.samples, 0),
                          .clockHz = std::max(summary.clock, 0.0)};
+}
+
+WaveformNeeds needsOfHead(const QByteArray &head)
+{
+    // No text of a tag holds braces, so that what looks like the begin of a tag is one.
+    const QString whole = QString::fromLatin1(head);
+    static const QRegularExpression block(R"(\{\s*WAVEFORM[^{}]*#)",
+                                          QRegularExpression::CaseInsensitiveOption);
+    const QString text = whole.left(block.match(whole).capturedStart());
+    const auto number = [&text](const char *tag) {
+        const QRegularExpression form(QString(R"(\{\s*%1\s*:\s*([^}\s]+)\s*\})").arg(tag),
+                                      QRegularExpression::CaseInsensitiveOption);
+        return form.match(text).captured(1).toDouble();
+    };
+    return {.samples = static_cast<qint64>(std::clamp(number("SAMPLES"), 0.0, LargestCount)),
+            .clockHz = std::max(number("CLOCK"), 0.0)};
 }
 
 QStringList waveformProblems(const WaveformNeeds &needs, const InstrumentSummary &instrument)

@@ -32,6 +32,9 @@ struct WaveformNeeds
 /// Of a waveform file; nothing, with the reason logged, if it is none.
 [[nodiscard]] std::optional<WaveformNeeds> needsOf(const QString &fileName);
 
+/// Of the tags that stand before the samples in the first bytes of a waveform file.
+[[nodiscard]] WaveformNeeds needsOfHead(const QByteArray &head);
+
 /// Why the instrument can't play a waveform: one text for each limit of its basebands that is
 /// broken, of the baseband that comes nearest where there are two. Empty where it can, or where
 /// nobody knows its limits.
