@@ -54,7 +54,7 @@ bool isUnknownTag(const QString &text)
 
 void readTags(const QJsonArray &array, QByteArray &tags)
 {
-    for (const QJsonValue &value : array) {
+    for (const auto &value : array) {
         const QString text = value.toString();
         if (isUnknownTag(text)) {
             tags += text.toLatin1();
@@ -67,7 +67,7 @@ void readTags(const QJsonArray &array, QByteArray &tags)
 
 bool readCaptures(const QJsonArray &array, qint64 offset, QList<SigmfMetadata::Capture> &captures)
 {
-    for (const QJsonValue &value : array) {
+    for (const auto &value : array) {
         const QJsonObject object = value.toObject();
         const std::optional<qint64> begin = count(object, "core:sample_start", 0);
         const std::optional<qint64> header = count(object, "core:header_bytes", 0);
@@ -87,7 +87,7 @@ void readMarks(const QJsonArray &array, qint64 offset, std::vector<SigmfMetadata
 {
     static const QStringList labels{"M1", "M2", "M3", "M4"};
     qint64 others = 0;
-    for (const QJsonValue &value : array) {
+    for (const auto &value : array) {
         const QJsonObject object = value.toObject();
         const auto marker = labels.indexOf(object.value("core:label").toString());
         const std::optional<qint64> begin = count(object, "core:sample_start", -1);

@@ -45,7 +45,7 @@ QJsonValue knownOrNull(double value)
 
 QString samplesText(const WvFileSummary &summary)
 {
-    const QString count = known(static_cast<double>(summary.samples));
+    QString count = known(static_cast<double>(summary.samples));
     if (!summary.isCutOff) {
         return count;
     }

@@ -74,7 +74,7 @@ QString foreignKind(const QString &fileName)
     if (head.startsWith("{TYPE")) {
         return {};
     }
-    if (const QString kind = kindBySignature(head); !kind.isEmpty()) {
+    if (QString kind = kindBySignature(head); !kind.isEmpty()) {
         return kind;
     }
     const QByteArray start = head.trimmed();
