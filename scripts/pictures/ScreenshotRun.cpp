@@ -7,6 +7,7 @@
 #include "toolframe/DlgBase.h"
 #include "toolframe/QtProgressDialog.h"
 
+#include <QAction>
 #include <QApplication>
 #include <QComboBox>
 #include <QDir>
@@ -141,6 +142,11 @@ void ScreenshotRun::takePictures()
         }
     }
     done = save(m_window, "main-window.png") && done;
+    auto *colors = m_window.findChild<QDialog *>("DlgColors");
+    m_window.findChild<QAction *>("actionColors")->trigger();
+    QCoreApplication::processEvents();
+    done = save(*colors, "colors.png") && done;
+    colors->close();
     if (offersInstruments()) {
         done = saveInstruments() && done;
     }

@@ -21,7 +21,7 @@ class ScreenshotRun : public QObject
     Q_OBJECT
 
 public:
-    /// Writes "main-window.png" and, if `file` isn't empty, pictures of all tools that take it,
+    /// Writes "main-window.png", "colors.png" and, if `file` isn't empty, pictures of all tools that take it,
     /// such as "waveform-info.png", into `folder`, which is made when missing. With instruments in
     /// the list also "instruments.png", "two-instruments.png" and "transfer.png". The window must
     /// live longer than the run.

@@ -3,6 +3,8 @@
 
 #include "app/MainWindow.h"
 #include "app/startup.h"
+#include "appearance/ColorSet.h"
+#include "appearance/StyleSheet.h"
 
 #include <QApplication>
 #include <QCommandLineParser>
@@ -17,6 +19,8 @@ int main(int argc, char **argv)
                                      "FILE of all tools that take it.");
     // The window reads these itself.
     parser.addOptions({{"debug", "As of corvane."}, {"no-visa", "As of corvane."}});
+    const QCommandLineOption colors("colors", "Number of the color preset.", "N");
+    parser.addOption(colors);
     parser.addHelpOption();
     parser.addPositionalArgument("FOLDER", "Made when missing.");
     parser.addPositionalArgument("FILE", "A waveform.", "[FILE]");
@@ -28,6 +32,12 @@ int main(int argc, char **argv)
     }
     ScreenshotRun::detachSettings();
     const auto colorStore = prepareApplication();
+    bool isPreset = false;
+    const int preset = parser.value(colors).toInt(&isPreset);
+    if (isPreset && preset >= 0 && preset < ColorPresetCount) {
+        setColorPreset(static_cast<ColorPreset>(preset));
+        applyColors();
+    }
     auto *window = new MainWindow; // deletes itself when closed
     ScreenshotRun run(*window, arguments.at(0), arguments.value(1));
     QMetaObject::invokeMethod(&run, &ScreenshotRun::start, Qt::QueuedConnection);

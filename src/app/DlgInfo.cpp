@@ -94,6 +94,7 @@ bool DlgInfo::startModule(const QString &path)
     }
     m_path = path;
     m_summary = summary;
+    m_result.reset();
     showReport(nullptr);
     // The tags stand there at once; the samples of a long file take a while.
     QTimer::singleShot(0, this, &DlgInfo::checkSamples);
@@ -104,6 +105,15 @@ void DlgInfo::showReport(const SampleCheck *check)
 {
     m_ui->te_Info->setHtml(
         reportHtml(m_summary, check, QFileInfo(m_path).absolutePath(), m_ui->te_Info->palette()));
+}
+
+void DlgInfo::changeEvent(QEvent *event)
+{
+    // The stripes have colours of their own.
+    if (event->type() == QEvent::StyleChange && !m_path.isEmpty()) {
+        showReport(m_result.get());
+    }
+    DlgBase::changeEvent(event);
 }
 
 void DlgInfo::checkSamples()
@@ -125,6 +135,7 @@ void DlgInfo::checkSamples()
     self->m_check.reset();
     if (isDone && self->m_path == path) {
         const SampleCheck check = job->result();
+        self->m_result = std::make_shared<const SampleCheck>(check);
         self->showReport(&check);
     }
 }
@@ -134,5 +145,6 @@ void DlgInfo::slot_dialog_rejected()
     // A report of many segments is large, and nobody sees it any more.
     m_ui->te_Info->clear();
     m_path.clear();
+    m_result.reset();
     cancelCheck();
 }

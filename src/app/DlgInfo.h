@@ -26,6 +26,9 @@ public:
 
     [[nodiscard]] bool startModule(const QString &path) override;
 
+protected:
+    void changeEvent(QEvent *event) override;
+
 private slots:
     void slot_dialog_rejected();
 
@@ -38,4 +41,5 @@ private:
     std::shared_ptr<CheckJob> m_check; ///< the running one, if any
     QString m_path;                    ///< empty: nothing is shown
     WvFileSummary m_summary;
+    std::shared_ptr<const SampleCheck> m_result; ///< of the samples, once they were checked
 };

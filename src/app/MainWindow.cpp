@@ -6,7 +6,12 @@
 #include "LogPanel.h"
 #include "PathBox.h"
 #include "QCustomTreeView.h"
+#include "appearance/ColorSet.h"
+#include "appearance/StyleSheet.h"
+#include "appearance/ui/DlgColors.h"
 #include "devicechoice.h"
+#include "display/CWidgetBase.h"
+#include "display/CWidgetTimeline.h"
 #include "instrument/ui/DlgInstrConfig.h"
 #include "mnemonics.h"
 #include "settingsstores.h"
@@ -74,6 +79,8 @@ MainWindow::MainWindow()
     const QStringList arguments = QCoreApplication::arguments();
     m_noVisa = arguments.contains("--no-visa");
     m_instrConfig = std::make_unique<DlgInstrConfig>(m_noVisa, this);
+    m_colors = std::make_unique<DlgColors>(openColorStore(), this);
+    connect(m_colors.get(), &DlgColors::colorsChanged, this, &MainWindow::slot_colors_updated);
 
     Tracer::setMask(arguments.contains("--debug") ? Tracer::DebugMask : Tracer::DefaultMask);
     connect(&m_tracer, &Tracer::TraceDataAvailable, this, &MainWindow::TraceDataAvailable);
@@ -136,6 +143,7 @@ void MainWindow::buildMenus()
     instrument->addAction("Run!\tF9", this,
                           [this] { paneOf(m_activePane->tree).tree->slot_runwaveform(); });
     instrument->addAction(m_ui->actionInstrConfigure);
+    menuBar()->addMenu("Program")->addAction(m_ui->actionColors);
     menuBar()->addMenu("Help")->addAction(m_ui->actionAbout);
 
     assignMnemonics(menuBar()->actions());
@@ -146,6 +154,7 @@ void MainWindow::buildMenus()
     connect(m_ui->actionExit, &QAction::triggered, this, &MainWindow::close);
     connect(m_ui->actionInstrConfigure, &QAction::triggered, this,
             &MainWindow::menu_showinstrconfig);
+    connect(m_ui->actionColors, &QAction::triggered, this, &MainWindow::menu_showcolors);
     connect(m_ui->actionAbout, &QAction::triggered, this, &MainWindow::menu_about);
     auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
     connect(refreshKey, &QShortcut::activated, this,
@@ -245,6 +254,26 @@ void MainWindow::menu_showinstrconfig()
     m_instrConfig->show();
     m_instrConfig->raise();
     m_instrConfig->activateWindow();
+}
+
+void MainWindow::menu_showcolors()
+{
+    m_colors->show();
+    m_colors->raise();
+    m_colors->activateWindow();
+}
+
+void MainWindow::slot_colors_updated()
+{
+    applyColors();
+    const QWidgetList widgets = QApplication::allWidgets();
+    for (QWidget *widget : widgets) {
+        if (auto *plot = qobject_cast<CWidgetBase *>(widget)) {
+            plot->setColors(static_cast<int>(colorPreset()));
+        } else if (auto *timeline = qobject_cast<CWidgetTimeline *>(widget)) {
+            timeline->setColors(static_cast<int>(colorPreset()));
+        }
+    }
 }
 
 void MainWindow::slot_infoTextAvailable(const QString &sInfoText)
@@ -396,6 +425,7 @@ void MainWindow::closeEvent(QCloseEvent *event)
     hide();
     saveSettings();
     m_instrConfig->close();
+    m_colors->close();
     m_modules.closeAll();
     event->accept();
 }
@@ -426,6 +456,8 @@ void MainWindow::hideEvent(QHideEvent *event)
 {
     m_showsInstrConfig = m_instrConfig->isVisible();
     m_instrConfig->hide();
+    m_showsColors = m_colors->isVisible();
+    m_colors->hide();
     m_modules.hideAll();
     QMainWindow::hideEvent(event);
 }
@@ -440,5 +472,8 @@ void MainWindow::showEvent(QShowEvent *event)
     }
     if (m_showsInstrConfig) {
         m_instrConfig->show();
+    }
+    if (m_showsColors) {
+        m_colors->show();
     }
 }

@@ -13,6 +13,7 @@
 #include <array>
 #include <memory>
 
+class DlgColors;
 class DlgInstrConfig;
 class LocalFileModel;
 class LogPanel;
@@ -60,6 +61,8 @@ private slots:
     void errMsg(const QString &sTxt);
     void menu_about();
     void menu_showinstrconfig();
+    void menu_showcolors();
+    void slot_colors_updated();
     void slot_refresh();
     void instrListUpdated();
     void newDeviceSelection(int iIndex);
@@ -112,11 +115,13 @@ private:
     FileIcons m_fileIcons;
     std::unique_ptr<DlgInstrConfig> m_instrConfig;
     LogPanel *m_log = nullptr;
+    std::unique_ptr<DlgColors> m_colors;
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;
     QString m_absentLocPath;         ///< the default folder while it isn't there
     bool m_showsInstrConfig = false; ///< again when the window comes back
+    bool m_showsColors = false;
     bool m_noVisa = false;
     bool m_asksInstruments = false;  ///< or has asked them
     bool m_knowsInstruments = false; ///< the list was read from the settings

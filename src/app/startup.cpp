@@ -2,6 +2,7 @@
 #include "startup.h"
 
 #include "AboutBox.h"
+#include "appearance/StyleSheet.h"
 #include "settingsstores.h"
 #include "toolframe/pictures.h"
 
@@ -27,5 +28,7 @@ std::unique_ptr<QSettings> prepareApplication()
     QApplication::setApplicationVersion(programVersion());
     registerPictures();
     QApplication::setWindowIcon(programIcon());
-    return openColorStore();
+    auto colors = openColorStore();
+    startColors(*colors);
+    return colors;
 }

@@ -5,6 +5,6 @@
 
 #include <memory>
 
-/// Gives the application object, which exists, its name, version, pictures and icon. Returns the
-/// store of the colours, to be kept until the event loop has ended.
+/// Gives the application object, which exists, its name, version, pictures, icon and colours.
+/// Returns the store of the colours, to be kept until the event loop has ended.
 [[nodiscard]] std::unique_ptr<QSettings> prepareApplication();

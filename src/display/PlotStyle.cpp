@@ -2,13 +2,15 @@
 #include "PlotStyle.h"
 
 #include <algorithm>
-#include <utility>
+#include <functional>
 
-PlotStyle PlotStyle::current()
+namespace {
+
+PlotStyle styleOf(const std::function<QColor(int)> &colorOfSlot)
 {
     PlotStyle style;
     for (int slot = 0; slot < ColorSlotCount; ++slot) {
-        style.palette[static_cast<std::size_t>(slot)] = colorOf(slot);
+        style.palette[static_cast<std::size_t>(slot)] = colorOfSlot(slot);
     }
     constexpr double SmallestPointSize = 7.5; // points; below it digits run together
     if (style.font.pointSizeF() > 0) {
@@ -17,28 +19,18 @@ PlotStyle PlotStyle::current()
     return style;
 }
 
+} // namespace
+
+PlotStyle PlotStyle::current()
+{
+    return styleOf([](int slot) { return colorOf(slot); });
+}
+
 PlotStyle PlotStyle::themed(PlotTheme theme)
 {
-    PlotStyle style = current();
-    if (theme == PlotTheme::Light) {
-        const std::pair<ColorSlot, QColor> colors[] = {
-            {ColorSlot::PanelBackground, {255, 255, 255}},
-            {ColorSlot::MarkedBackground, {238, 240, 244}},
-            {ColorSlot::TextboxBackground, {250, 250, 250}},
-            {ColorSlot::TextboxFrame, {120, 120, 120}},
-            {ColorSlot::GridLines, {120, 126, 134}},
-            {ColorSlot::Text, {24, 26, 30}},
-            {ColorSlot::CursorLine, {60, 60, 60}},
-            {ColorSlot::PrimaryMarker, {0, 128, 60}},
-            {ColorSlot::SecondaryMarker, {190, 40, 110}},
-            {ColorSlot::AverageTrace, {20, 84, 176}},
-            {ColorSlot::PeakTrace, {196, 78, 0}},
-        };
-        for (const auto &[slot, color] : colors) {
-            style.palette[static_cast<std::size_t>(slot)] = color;
-        }
-    }
-    return style;
+    const ColorPreset preset =
+        theme == PlotTheme::Light ? ColorPreset::Chalk : ColorPreset::Classic;
+    return styleOf([preset](int slot) { return presetColor(preset, slot); });
 }
 
 QColor PlotStyle::color(ColorSlot slot, int alpha) const

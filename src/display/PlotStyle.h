@@ -10,7 +10,7 @@
 
 /// The ground of pictures that are made for documents.
 enum class PlotTheme {
-    Dark = 0, ///< as on the screen
+    Dark = 0,
     Light = 1,
 };
 
@@ -23,7 +23,7 @@ struct PlotStyle
     /// The current colours and the application's font, a little smaller. Needs a QGuiApplication.
     [[nodiscard]] static PlotStyle current();
 
-    /// The same on a light ground, if that is wanted.
+    /// The colours of a preset for pictures, the same whatever the user has chosen.
     [[nodiscard]] static PlotStyle themed(PlotTheme theme);
 
     [[nodiscard]] QColor color(ColorSlot slot) const

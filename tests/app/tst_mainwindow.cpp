@@ -92,10 +92,20 @@ void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
             keys.insert(key);
         }
     }
-    QCOMPARE(titles, QStringList({"File", "Analyze", "Import", "Edit", "Instrument", "Help"}));
+    QCOMPARE(titles,
+             QStringList({"File", "Analyze", "Import", "Edit", "Instrument", "Program", "Help"}));
     QVERIFY(findEntry(*desk.window(), "File", "Exit"));
     QVERIFY(findEntry(*desk.window(), "Analyze", "File Info"));
     QVERIFY(findEntry(*desk.window(), "Help", "About"));
+    QAction *colors = findEntry(*desk.window(), "Program", "Colors...");
+    QVERIFY(colors);
+    colors->trigger();
+    const auto *dialog = desk.window()->findChild<QDialog *>("DlgColors");
+    QVERIFY(dialog && dialog->isVisible());
+    desk.window()->hide();
+    QVERIFY(!dialog->isVisible());
+    desk.window()->show();
+    QVERIFY(dialog->isVisible());
 }
 
 void TestMainWindow::selectionEnablesTools()

@@ -75,6 +75,7 @@ class TestPictures : public QObject
     Q_OBJECT
 
 private slots:
+    static void initTestCase() { setColorPreset(ColorPreset::Classic); } // of dark pictures
     void constantsLieAtTheirLevel();
     void envelopeIsFilled();
     void markerEdges();
