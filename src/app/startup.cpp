@@ -26,6 +26,7 @@ std::unique_ptr<QSettings> prepareApplication()
 {
     QApplication::setApplicationName("corvane");
     QApplication::setApplicationVersion(programVersion());
+    QGuiApplication::setDesktopFileName("org.halvorn.corvane");
     registerPictures();
     QApplication::setWindowIcon(programIcon());
     auto colors = openColorStore();

@@ -28,6 +28,7 @@ void addMarkerCommands(CommandSet &commands);
 void addImportCommands(CommandSet &commands);
 void addComposeCommand(CommandSet &commands);
 void addCheckCommand(CommandSet &commands);
+void addCompletionCommand(CommandSet &commands);
 void addInstrumentCommands(CommandSet &commands);
 void addSigmfCommand(CLI::App &import, CommandSet &commands);
 void addCaptureCommand(CLI::App &instr, CommandSet &commands);

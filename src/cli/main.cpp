@@ -115,6 +115,7 @@ int run(int argc, char **argv)
     addComposeCommand(commands);
     addCheckCommand(commands);
     addInstrumentCommands(commands);
+    addCompletionCommand(commands);
     addExamples(app);
     try {
         app.parse(argumentsOf(argc, argv));
