@@ -2,6 +2,7 @@
 #include "MainWindow.h"
 
 #include "AboutBox.h"
+#include "GuideWindow.h"
 #include "LocalFileModel.h"
 #include "LogPanel.h"
 #include "PathBox.h"
@@ -144,7 +145,9 @@ void MainWindow::buildMenus()
                           [this] { paneOf(m_activePane->tree).tree->slot_runwaveform(); });
     instrument->addAction(m_ui->actionInstrConfigure);
     menuBar()->addMenu("Program")->addAction(m_ui->actionColors);
-    menuBar()->addMenu("Help")->addAction(m_ui->actionAbout);
+    QMenu *help = menuBar()->addMenu("Help");
+    help->addAction(m_ui->actionGuide);
+    help->addAction(m_ui->actionAbout);
 
     assignMnemonics(menuBar()->actions());
     const QList<QAction *> menus = menuBar()->actions();
@@ -154,6 +157,8 @@ void MainWindow::buildMenus()
     connect(m_ui->actionExit, &QAction::triggered, this, &MainWindow::close);
     connect(m_ui->actionInstrConfigure, &QAction::triggered, this,
             &MainWindow::menu_showinstrconfig);
+    m_ui->actionGuide->setShortcutContext(Qt::ApplicationShortcut); // in the tools, too
+    connect(m_ui->actionGuide, &QAction::triggered, this, &MainWindow::menu_showguide);
     connect(m_ui->actionColors, &QAction::triggered, this, &MainWindow::menu_showcolors);
     connect(m_ui->actionAbout, &QAction::triggered, this, &MainWindow::menu_about);
     auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
@@ -261,6 +266,16 @@ void MainWindow::menu_showcolors()
     m_colors->show();
     m_colors->raise();
     m_colors->activateWindow();
+}
+
+void MainWindow::menu_showguide()
+{
+    if (!m_guide) {
+        m_guide = std::make_unique<GuideWindow>(this);
+    }
+    m_guide->show();
+    m_guide->raise();
+    m_guide->activateWindow();
 }
 
 void MainWindow::slot_colors_updated()
@@ -426,6 +441,9 @@ void MainWindow::closeEvent(QCloseEvent *event)
     saveSettings();
     m_instrConfig->close();
     m_colors->close();
+    if (m_guide) {
+        m_guide->close();
+    }
     m_modules.closeAll();
     event->accept();
 }

@@ -15,6 +15,7 @@
 
 class DlgColors;
 class DlgInstrConfig;
+class GuideWindow;
 class LocalFileModel;
 class LogPanel;
 class PathBox;
@@ -62,6 +63,7 @@ private slots:
     void menu_about();
     void menu_showinstrconfig();
     void menu_showcolors();
+    void menu_showguide();
     void slot_colors_updated();
     void slot_refresh();
     void instrListUpdated();
@@ -116,6 +118,7 @@ private:
     std::unique_ptr<DlgInstrConfig> m_instrConfig;
     LogPanel *m_log = nullptr;
     std::unique_ptr<DlgColors> m_colors;
+    std::unique_ptr<GuideWindow> m_guide; ///< once it was asked for
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
     QString m_locPath;

@@ -16,6 +16,7 @@
 #include <QMenuBar>
 #include <QScrollBar>
 #include <QTest>
+#include <QTextBrowser>
 #include <QToolButton>
 
 namespace {
@@ -97,6 +98,16 @@ void TestMainWindow::menusHaveNoEmptyEntryAndUniqueMnemonics()
     QVERIFY(findEntry(*desk.window(), "File", "Exit"));
     QVERIFY(findEntry(*desk.window(), "Analyze", "File Info"));
     QVERIFY(findEntry(*desk.window(), "Help", "About"));
+    // Every link of the guide leads to a page.
+    findEntry(*desk.window(), "Help", "Guide")->trigger();
+    auto *guide = desk.window()->findChild<QTextBrowser *>("tb_guide");
+    QVERIFY(guide && guide->toPlainText().contains("Corvane guide"));
+    for (const char *page : {"from-matlab", "loop", "three-bursts", "capture", "script"}) {
+        QVERIFY2(guide->toMarkdown().contains(QString("(%1.md)").arg(page)), page);
+        guide->setSource(QUrl(QString("qrc:/guide/%1.md").arg(page)));
+        QVERIFY2(guide->toPlainText().contains("corvane-cli"), page);
+        guide->backward();
+    }
     QAction *colors = findEntry(*desk.window(), "Program", "Colors...");
     QVERIFY(colors);
     colors->trigger();
