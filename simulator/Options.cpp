@@ -130,8 +130,10 @@ std::optional<InstrumentPlace> checkInstrument(const RawInstrument &raw, std::st
 
     if (!raw.gateway) {
         place.address = raw.address.value_or(std::string(DefaultAddress));
-        if (!isLoopback(place.address)) {
-            return refuse("address", place.address, "it has to be one of 127.0.0.0/8");
+        place.announce = raw.announce;
+        if (!raw.announce && !isLoopback(place.address)) {
+            return refuse("address", place.address,
+                          "it has to be one of 127.0.0.0/8, unless --announce is given");
         }
         if (raw.gpib) {
             return refuse("gpib", *raw.gpib, "it goes with a gateway only");
@@ -191,6 +193,10 @@ std::optional<Options> parseOptions(std::vector<std::string> arguments, std::str
           Switch{"--seed", raw.seed, "seed of the noise that an analyzer records, default 1"}}) {
         app.add_option(one.name, one.value, one.help)->excludes(file);
     }
+    app.add_flag("--announce", raw.announce,
+                 "answers searches of the network (VXI-11 broadcasts, multicast DNS) on the "
+                 "interface of --address, which may be any address of this machine then")
+        ->excludes(file);
     app.add_option("--fault", raw.faults, "NAME[=VALUE]: a fault to show; may be repeated")
         ->expected(1)
         ->take_all()

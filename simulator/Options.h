@@ -18,6 +18,7 @@ struct InstrumentPlace
     std::optional<std::uint16_t> gateway; ///< port; 0 lets the system choose
     unsigned gpib = 0;                    ///< address behind the gateway, 0 to 30
     bool hislip = true;                   ///< serves this protocol too, at an own address
+    bool announce = false;                ///< can be found on its network
 };
 
 /// What the program was asked for.
@@ -47,6 +48,7 @@ struct RawInstrument
     std::optional<std::string> gpib{};
     std::optional<std::string> seed{};
     std::vector<std::string> faults{};
+    bool announce = false; ///< the address may be any of this machine then
 };
 
 /// Checks the values and fills in what is missing. Nothing, with the reason in `error`, when one of

@@ -49,6 +49,12 @@ bool PortMapper::open(const std::string &address, std::string &error)
     return m_udp.isValid();
 }
 
+bool PortMapper::openForBroadcasts(std::string &error)
+{
+    m_broadcasts = bindSharedUdp(Port, error);
+    return m_broadcasts.isValid();
+}
+
 void PortMapper::start(std::vector<Mapping> mappings)
 {
     m_mappings = std::move(mappings);
@@ -66,6 +72,7 @@ void PortMapper::stop()
         m_thread.join();
     }
     m_udp.reset();
+    m_broadcasts.reset();
 }
 
 RpcStatus PortMapper::call(std::uint32_t procedure, XdrReader &arguments, XdrWriter &results) const
@@ -123,32 +130,44 @@ void PortMapper::serveTcp(int fd) const
 
 void PortMapper::serveUdp() const
 {
-    const std::array programs{program()};
-    std::array<std::uint8_t, MaxCallSize> buffer{};
-    XdrWriter reply;
     for (;;) {
-        std::array<pollfd, 2> events{{{m_wake.get(), POLLIN, 0}, {m_udp.get(), POLLIN, 0}}};
+        // A descriptor of -1 is passed over.
+        std::array<pollfd, 3> events{
+            {{m_wake.get(), POLLIN, 0}, {m_udp.get(), POLLIN, 0}, {m_broadcasts.get(), POLLIN, 0}}};
         if (::poll(events.data(), events.size(), -1) < 0 && errno != EINTR) {
             return;
         }
         if (events[0].revents != 0) {
             return;
         }
-        sockaddr_in peer{};
-        socklen_t length = sizeof(peer);
-        const ssize_t count = ::recvfrom(m_udp.get(), buffer.data(), buffer.size(), MSG_DONTWAIT,
-                                         reinterpret_cast<sockaddr *>(&peer), &length);
-        if (count <= 0) {
-            continue;
+        for (const pollfd &event : std::span(events).subspan(1)) {
+            if (event.revents != 0) {
+                answerDatagram(event.fd);
+            }
         }
-        const std::span<const std::uint8_t> call =
-            std::span(buffer).first(static_cast<std::size_t>(count));
-        if (answerRpcCall(call, programs, reply)) {
-            // A datagram goes without the mark of a record.
-            const auto bytes = reply.bytes().subspan(protocols::RecordMarkSize);
-            (void)::sendto(m_udp.get(), bytes.data(), bytes.size(), MSG_NOSIGNAL,
-                           reinterpret_cast<const sockaddr *>(&peer), length);
-        }
+    }
+}
+
+/// The answer leaves by the socket of the own address, so that the caller learns it.
+void PortMapper::answerDatagram(int fd) const
+{
+    const std::array programs{program()};
+    std::array<std::uint8_t, MaxCallSize> buffer{};
+    XdrWriter reply;
+    sockaddr_in peer{};
+    socklen_t length = sizeof(peer);
+    const ssize_t count = ::recvfrom(fd, buffer.data(), buffer.size(), MSG_DONTWAIT,
+                                     reinterpret_cast<sockaddr *>(&peer), &length);
+    if (count <= 0) {
+        return;
+    }
+    const std::span<const std::uint8_t> call =
+        std::span(buffer).first(static_cast<std::size_t>(count));
+    if (answerRpcCall(call, programs, reply)) {
+        // A datagram goes without the mark of a record.
+        const auto bytes = reply.bytes().subspan(protocols::RecordMarkSize);
+        (void)::sendto(m_udp.get(), bytes.data(), bytes.size(), MSG_NOSIGNAL,
+                       reinterpret_cast<const sockaddr *>(&peer), length);
     }
 }
 

@@ -35,6 +35,9 @@ public:
 
     /// Opens both sockets. False with the protocol and the reason in `error`.
     [[nodiscard]] bool open(const std::string &address, std::string &error);
+
+    /// Answers calls to all hosts of the network as well; after open(). Same failures.
+    [[nodiscard]] bool openForBroadcasts(std::string &error);
     void start(std::vector<Mapping> mappings);
     void stop();
 
@@ -44,10 +47,12 @@ private:
     [[nodiscard]] RpcProgram program() const;
     void serveTcp(int fd) const;
     void serveUdp() const;
+    void answerDatagram(int fd) const;
 
     TcpServer m_tcp;
     UniqueFd m_udp;
-    UniqueFd m_wake; ///< an event that ends the UDP thread
+    UniqueFd m_broadcasts; ///< may be none
+    UniqueFd m_wake;       ///< an event that ends the UDP thread
     std::thread m_thread;
     std::vector<Mapping> m_mappings;
 };

@@ -64,6 +64,9 @@ bool Simulator::addHost(const InstrumentPlace &place, Instrument &instrument, st
         error = cannotOpen("HiSLIP", address, protocols::hislip::Port, reason);
         return false;
     }
+    if (place.announce && !openAnnouncer(place, host, error)) {
+        return false;
+    }
     if (!host.vxi11.open(address, 0, reason)) {
         error = cannotOpen("VXI-11", address, 0, reason);
         return false;
@@ -80,7 +83,31 @@ bool Simulator::addHost(const InstrumentPlace &place, Instrument &instrument, st
     if (place.hislip) {
         host.hislip.start(instrument, address + ' ' + HislipServer::SubAddress);
     }
+    if (place.announce) {
+        host.announcer.start();
+    }
     m_readyLines.push_back("ready " + address);
+    return true;
+}
+
+bool Simulator::openAnnouncer(const InstrumentPlace &place, Host &host, std::string &error)
+{
+    const InstrumentSetup &setup = place.instrument;
+    std::string reason;
+    if (!setup.faults.has("no-portmapper") && !host.mapper.openForBroadcasts(reason)) {
+        error = cannotOpen("VXI-11 broadcasts", "0.0.0.0", PortMapper::Port, reason);
+        return false;
+    }
+    if (!host.announcer.open({.address = place.address,
+                              .model = std::string(setup.model->name),
+                              .serial = setup.serial,
+                              .firmware = setup.firmware,
+                              .hislip = place.hislip,
+                              .raw = !setup.faults.has("no-raw")},
+                             reason)) {
+        error = cannotOpen("multicast DNS", place.address, Announcer::Port, reason);
+        return false;
+    }
     return true;
 }
 
@@ -113,6 +140,7 @@ void Simulator::stop()
         host->vxi11.stop();
         host->raw.stop();
         host->hislip.stop();
+        host->announcer.stop();
     }
     for (const auto &[port, gateway] : m_gateways) {
         gateway->stop();

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "Announcer.h"
 #include "HislipServer.h"
 #include "Options.h"
 #include "PortMapper.h"
@@ -37,10 +38,13 @@ private:
         Vxi11Server vxi11;
         RawSocketServer raw;
         HislipServer hislip;
+        Announcer announcer;
     };
 
     [[nodiscard]] bool addHost(const InstrumentPlace &place, Instrument &instrument,
                                std::string &error);
+    [[nodiscard]] static bool openAnnouncer(const InstrumentPlace &place, Host &host,
+                                            std::string &error);
     [[nodiscard]] bool addToGateway(const InstrumentPlace &place, Instrument &instrument,
                                     std::string &error);
 

@@ -15,7 +15,10 @@ namespace {
 
 constexpr int Backlog = 64;
 
-UniqueFd bindSocket(const std::string &address, std::uint16_t port, int type, std::string &error)
+enum class Sharing { Alone, Shared };
+
+UniqueFd bindSocket(const std::string &address, std::uint16_t port, int type, Sharing sharing,
+                    std::string &error)
 {
     sockaddr_in name{};
     name.sin_family = AF_INET;
@@ -28,7 +31,7 @@ UniqueFd bindSocket(const std::string &address, std::uint16_t port, int type, st
     const int on = 1;
     // A restarted instrument gets its ports back although old connections linger.
     if (!fd.isValid() ||
-        (type == SOCK_STREAM &&
+        ((type == SOCK_STREAM || sharing == Sharing::Shared) &&
          ::setsockopt(fd.get(), SOL_SOCKET, SO_REUSEADDR, &on, sizeof(on)) != 0) ||
         ::bind(fd.get(), reinterpret_cast<const sockaddr *>(&name), sizeof(name)) != 0 ||
         (type == SOCK_STREAM && ::listen(fd.get(), Backlog) != 0)) {
@@ -42,12 +45,17 @@ UniqueFd bindSocket(const std::string &address, std::uint16_t port, int type, st
 
 UniqueFd listenTcp(const std::string &address, std::uint16_t port, std::string &error)
 {
-    return bindSocket(address, port, SOCK_STREAM, error);
+    return bindSocket(address, port, SOCK_STREAM, Sharing::Alone, error);
 }
 
 UniqueFd bindUdp(const std::string &address, std::uint16_t port, std::string &error)
 {
-    return bindSocket(address, port, SOCK_DGRAM, error);
+    return bindSocket(address, port, SOCK_DGRAM, Sharing::Shared, error);
+}
+
+UniqueFd bindSharedUdp(std::uint16_t port, std::string &error)
+{
+    return bindSocket("0.0.0.0", port, SOCK_DGRAM, Sharing::Shared, error);
 }
 
 std::uint16_t localPort(int fd)

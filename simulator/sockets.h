@@ -18,6 +18,10 @@ namespace simulator {
 /// As above, a bound UDP socket.
 [[nodiscard]] UniqueFd bindUdp(const std::string &address, std::uint16_t port, std::string &error);
 
+/// A UDP socket that gets what is sent to all hosts of a network, beside those that are bound to
+/// one address.
+[[nodiscard]] UniqueFd bindSharedUdp(std::uint16_t port, std::string &error);
+
 /// The port that a socket is bound to; 0 when it is not.
 [[nodiscard]] std::uint16_t localPort(int fd);
 
