@@ -207,8 +207,12 @@ void ConstellationPainter::paintAxisTexts(QPainter &painter, const QRectF &area,
                             std::max(area.right() - plot.right() - 3, 1.0), height),
                      int(Qt::AlignLeft | Qt::AlignVCenter) | Qt::TextDontClip, "I");
     const double width = metrics.horizontalAdvance("Q") + 1;
-    painter.drawText(QRectF(plot.center().x() + 4, plot.top() + 2, width, height), Qt::AlignCenter,
-                     "Q");
+    const QRectF label(plot.center().x() + 4, plot.top() + 2, width, height);
+    // Within the plot, whose ground may be as dark or as light as the text.
+    constexpr int PlateAlpha = 200;
+    fillArea(painter, label.adjusted(-2, 0, 2, 0),
+             m_style.color(ColorSlot::PanelBackground, PlateAlpha));
+    painter.drawText(label, Qt::AlignCenter, "Q");
 }
 
 void ConstellationPainter::paintValueBox(QPainter &painter, const QRectF &area) const
