@@ -52,7 +52,7 @@ private:
     Announcement m_instrument;
     UniqueFd m_socket; ///< hears the queries
     UniqueFd m_sender; ///< of the own address, so that answers come from there
-    UniqueFd m_wake; ///< an event that ends the thread
+    UniqueFd m_wake;   ///< an event that ends the thread
     std::thread m_thread;
 };
 
