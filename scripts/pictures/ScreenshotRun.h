@@ -21,10 +21,10 @@ class ScreenshotRun : public QObject
     Q_OBJECT
 
 public:
-    /// Writes "main-window.png", "colors.png" and, if `file` isn't empty, pictures of all tools that take it,
-    /// such as "waveform-info.png", into `folder`, which is made when missing. With instruments in
-    /// the list also "instruments.png", "two-instruments.png" and "transfer.png". The window must
-    /// live longer than the run.
+    /// Writes "main-window.png", "colors.png" and, if `file` isn't empty, pictures of all tools
+    /// that take it, such as "waveform-info.png", into `folder`, which is made when missing. With
+    /// instruments in the list also "instruments.png", "two-instruments.png" and "transfer.png".
+    /// The window must live longer than the run.
     ScreenshotRun(MainWindow &window, QString folder, const QString &file);
 
     /// Makes the windows use settings of no user but the instrument list, and keep none, so that
