@@ -258,7 +258,7 @@ bool WavFileAccess::readSamples(BufferedIO *stream, qint64 limit)
             }
         }
         if (count > 0 &&
-            !stream->writeBytes(static_cast<int>(count) * BufferedIO::RecordSize, values.data())) {
+            !stream->writeBlock(static_cast<int>(count) * BufferedIO::RecordSize, values.data())) {
             return Tracer::fail("Cannot write to temporary file.");
         }
         if (static_cast<qint64>(count) < wanted) {
