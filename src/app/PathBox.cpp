@@ -16,7 +16,7 @@ namespace {
 /// A typed path with "~" for the home folder, as shells take it.
 QString typedPath(const QString &text, bool local)
 {
-    const QString path = text.trimmed();
+    QString path = text.trimmed();
     if (local && (path == "~" || path.startsWith("~/"))) {
         return QDir::homePath() + path.mid(1);
     }

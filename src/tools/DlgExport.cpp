@@ -16,6 +16,7 @@
 #include <QFileInfo>
 #include <QFormLayout>
 #include <QHBoxLayout>
+#include <QLabel>
 #include <QLineEdit>
 #include <QPushButton>
 #include <QSettings>
@@ -52,7 +53,9 @@ DlgExport::DlgExport(QWidget *parent)
     target->addWidget(browse);
     auto *form = new QFormLayout;
     form->addRow("Source", m_source);
-    form->addRow("E&xport To", target);
+    auto *targetLabel = new QLabel("E&xport To");
+    targetLabel->setBuddy(m_target);
+    form->addRow(targetLabel, target);
     form->addRow("&Values", m_type);
     form->addRow("&First Sample", m_from);
     form->addRow("&Number of Samples", m_count);
