@@ -339,13 +339,12 @@ void MainWindow::openFiles(const QStringList &files)
 {
     for (const QString &file : files) {
         const QString path = QFileInfo(file).absoluteFilePath();
-        const ToolInfo *tool = m_modules.firstAllowed(path, true);
         if (!QFileInfo::exists(path)) {
             Tracer::Trace(Tracer::Error, QString("There is no file '%1'.").arg(path));
         } else if (QFileInfo(path).isDir()) {
             goTo(m_panes[0], path);
-        } else if (tool != nullptr) {
-            m_modules.start(*tool, path);
+        } else {
+            m_modules.open(path);
         }
     }
     if (!files.isEmpty() && QFileInfo::exists(files.first())) {

@@ -167,6 +167,7 @@ DlgBase &ModulesDb::dialog(const ToolInfo &info)
     if (!tool->dialog) {
         tool->dialog = info.make();
         tool->dialog->instrumentsUpdated(m_instruments);
+        connect(tool->dialog.get(), &DlgBase::openRequested, this, &ModulesDb::open);
         if (!m_settingsFile.isEmpty()) {
             QSettings settings(m_settingsFile, QSettings::IniFormat);
             tool->dialog->readSettings(settings);
@@ -187,6 +188,13 @@ bool ModulesDb::start(const ToolInfo &tool, const QString &path)
     window.raise();
     window.activateWindow();
     return true;
+}
+
+void ModulesDb::open(const QString &path)
+{
+    if (const ToolInfo *tool = firstAllowed(path, true)) {
+        start(*tool, path);
+    }
 }
 
 void ModulesDb::offerLeftWork(const QString &folder)

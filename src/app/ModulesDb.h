@@ -56,6 +56,9 @@ public:
     /// start; logged.
     bool start(const ToolInfo &tool, const QString &path);
 
+    /// Starts the tool that Enter would start for a local file.
+    void open(const QString &path);
+
     /// Starts, with a folder, each tool that has work to offer which a crash has left.
     void offerLeftWork(const QString &folder);
 

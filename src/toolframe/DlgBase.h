@@ -24,6 +24,10 @@ public:
     /// The list of configured instruments has changed, or the dialog was just made.
     virtual void instrumentsUpdated(const QList<InstrConfigEntry> &instruments);
 
+signals:
+    /// The user wants to look at a file in the tool for its type.
+    void openRequested(const QString &path);
+
 public slots:
     /// Saves the tool's group of settings.
     virtual void writeSettings(QSettings &settings);

@@ -49,6 +49,7 @@ void ToolWizard::setUpWizard()
     Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
     limitTagTexts();
     addPresetMenu();
+    addViewButton();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
     connect(m_close, &QPushButton::clicked, this, &ToolWizard::reject);
@@ -99,6 +100,22 @@ void ToolWizard::addPresetMenu()
     menu->addAction("&Save Preset...", this, &ToolWizard::askAndSave);
     button->setMenu(menu);
     (*row)->insertWidget(0, button);
+}
+
+void ToolWizard::addViewButton()
+{
+    m_view = new QPushButton("&View", this);
+    m_view->setObjectName("pb_view");
+    m_view->setToolTip("Look at the new file");
+    m_view->setAutoDefault(false);
+    m_view->hide();
+    const QList<QBoxLayout *> rows = findChildren<QBoxLayout *>();
+    for (QBoxLayout *row : rows) {
+        if (row->indexOf(m_previous) >= 0) {
+            row->insertWidget(row->indexOf(m_previous), m_view);
+        }
+    }
+    connect(m_view, &QPushButton::clicked, this, [this] { emit openRequested(m_result); });
 }
 
 void ToolWizard::askAndLoad()
@@ -236,6 +253,7 @@ void ToolWizard::updateButtons()
     m_next->setEnabled(isComplete(page));
     m_next->setDefault(page != statusPage());
     m_close->setDefault(page == statusPage());
+    m_view->setVisible(page == statusPage() && !m_isRunning && !m_result.isEmpty());
 }
 
 /// A click on a button takes the focus, and with it the text, from a field; a key doesn't.
@@ -269,6 +287,7 @@ void ToolWizard::goBack()
 void ToolWizard::run()
 {
     m_report->clear();
+    m_result.clear();
     showPage(statusPage());
     const QStringList files = outputFiles();
     for (const QString &file : files) {
@@ -283,6 +302,9 @@ void ToolWizard::run()
         const QScopedValueRollback<bool> running(m_isRunning, true);
         updateButtons();
         outcome = runJob(*job, this, m_report);
+    }
+    if (outcome == JobOutcome::Finished) {
+        m_result = files.value(0);
     }
     updateButtons();
     jobEnded(outcome);

@@ -24,7 +24,8 @@ class QTextEdit;
 /// on it, and below it the buttons "pb_prev", "pb_next" and "cb_close". The page before the last
 /// one is the output page: there Next reads Run. Output fields, where a form has them, are
 /// "le_outfile", "te_comment" and "le_copyright". A button with a menu saves the tool's fields as a
-/// preset, the same file as --preset of the command takes, and loads them. A derived class calls
+/// preset, the same file as --preset of the command takes, and loads them; beside the report of a
+/// job that has ended well another one opens what it has written. A derived class calls
 /// setUpWizard() once its form is set up, and answers a few questions; it moves no page and wires
 /// no button itself.
 class ToolWizard : public DlgBase
@@ -96,6 +97,7 @@ private:
     void run();
     void limitTagTexts();
     void addPresetMenu();
+    void addViewButton();
     void askAndLoad();
     void askAndSave();
     void takeTypedValues() const;
@@ -106,6 +108,8 @@ private:
     QPushButton *m_previous = nullptr;
     QPushButton *m_close = nullptr;
     QPushButton *m_preset = nullptr; ///< null in a tool with buttons of its own
+    QPushButton *m_view = nullptr;   ///< shown beside the report of a job that has ended well
+    QString m_result;                ///< what that job has written
     QTextEdit *m_report = nullptr;
     bool m_isRunning = false;
 };

@@ -23,6 +23,7 @@
 #include <QLabel>
 #include <QPushButton>
 #include <QSettings>
+#include <QSignalSpy>
 #include <QStackedWidget>
 #include <QTest>
 #include <QTextEdit>
@@ -128,6 +129,9 @@ void TestTools::resampleWritesTheFileAndReports()
     const QString report = reportOf(dialog).toPlainText();
     QVERIFY2(report.contains("Resampling completed"), qPrintable(report));
     QVERIFY(report.contains(" OUT-samples: \t8000"));
+    QSignalSpy wanted(&dialog, &DlgBase::openRequested);
+    click(dialog, "pb_view");
+    QCOMPARE(wanted.value(0).value(0).toString(), path("tone_resample.wv"));
     WvFileSummary summary;
     QVERIFY(HvFileIO().readWaveformInfo(path("tone_resample.wv"), &summary));
     QCOMPARE(summary.samples, 8000);
@@ -186,6 +190,7 @@ void TestTools::cancelledConversionLeavesNothing()
     cancelNextJob();
     click(dialog, "pb_next");
     QVERIFY(reportOf(dialog).toPlainText().endsWith("Resampling failed"));
+    QVERIFY(child<QPushButton>(dialog, "pb_view")->isHidden());
     QVERIFY(reportOf(dialog).toHtml().contains("color:#c00000"));
     QVERIFY(!QFile::exists(path("long_resample.wv")));
     QVERIFY(m_streams.isEmpty());
