@@ -10,7 +10,7 @@ GeneratorJob::GeneratorJob(InstrumentRef instrument, Operation operation, Genera
     : InstrumentJob(std::move(instrument),
                     operation == Operation::Read ? "Reading..." : "Sending...", parent)
     , m_operation(operation)
-    , m_change(std::move(change))
+    , m_change(change)
 {
 }
 
