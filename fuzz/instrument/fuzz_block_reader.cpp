@@ -85,9 +85,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     pieceBytes = std::size_t{1} << (mode % 16);
     longestSilence = static_cast<int>(mode / 16 % 8);
     VisaSession session;
-    require(static_cast<bool>(session.open("GPIB0::28::INSTR")));
-    (void)takeErrors();
     OperationControl control{[](int percent) { require(percent >= 0 && percent <= 100); }};
+    require(static_cast<bool>(session.open("GPIB0::28::INSTR", control)));
+    (void)takeErrors();
     BlockReader reader(session, control);
     if (mode < 128) {
         samples.clear();

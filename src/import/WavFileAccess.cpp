@@ -32,7 +32,9 @@ void toFloats(const WavHeader &header, std::span<char> bytes, std::span<float> v
     const int width = header.bitsPerSample / 8;
     if (width == 2) {
         std::vector<qint16> words(values.size());
-        std::memcpy(words.data(), bytes.data(), bytes.size());
+        if (!words.empty()) {
+            std::memcpy(words.data(), bytes.data(), bytes.size());
+        }
         convertWords(words, true, values.data());
         return;
     }

@@ -53,9 +53,12 @@ void readPax(const QByteArray &content, QString &name, qint64 &size)
 {
     for (qsizetype at = 0; at < content.size();) {
         const auto blank = content.indexOf(' ', at);
-        const qsizetype length = blank < 0 ? 0 : content.mid(at, blank - at).toInt();
-        if (length <= blank - at || length > content.size() - at) {
+        if (blank < 0) {
             return;
+        }
+        const qsizetype length = content.mid(at, blank - at).toInt();
+        if (length <= blank - at + 1 || length > content.size() - at) {
+            return; // no room for a record, or beyond the end
         }
         const QByteArray record = content.mid(blank + 1, at + length - blank - 2);
         if (record.startsWith("path=")) {
