@@ -70,7 +70,9 @@ CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberR
 std::optional<double> numberIn(const QString &text, const QString &unit)
 {
     const auto number = parseNumber(text, unit, true);
-    if (!number || !number->trailing.isEmpty()) {
+    // Two words of a shell's line that fell into one are no number.
+    static const QRegularExpression twoNumbers("[0-9.,][ \\t\\r\\n]+[0-9.,]");
+    if (!number || !number->trailing.isEmpty() || text.contains(twoNumbers)) {
         return std::nullopt;
     }
     QString prefix = text.simplified();

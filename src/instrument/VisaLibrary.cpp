@@ -75,12 +75,21 @@ bool VisaLibrary::load()
 {
     QStringList reasons;
     for (const QString &name : candidates()) {
+        // The loader would wait for ever for the other end of a pipe.
+        if (const QFileInfo file(name); file.exists() && !file.isFile() && !file.isDir()) {
+            reasons.append(QString("'%1' is not a regular file").arg(name));
+            continue;
+        }
         QLibrary library(name);
         if (library.load()) {
             Tracer::Trace(Tracer::Information,
                           QString("Using VISA library '%1'").arg(library.fileName()));
             m_functions = resolveAll(library);
             m_isLoaded = true;
+            if (m_functions.viOpenDefaultRM == nullptr) {
+                Tracer::Trace(Tracer::Warning,
+                              QString("'%1' is no VISA library.").arg(library.fileName()));
+            }
             return true;
         }
         reasons.append(library.errorString());
