@@ -25,6 +25,9 @@ constexpr ViUInt32 DestroyLinkMs = 1000;
 
 // Replies without error and without a byte moved, after which the peer counts as broken.
 constexpr int MostIdleReplies = 16;
+/// What is read ahead at once, and the smallest pieces for which it is.
+constexpr std::size_t AheadBytes = 32U * 1024U;
+constexpr std::size_t SmallestSeries = 1024;
 
 ViStatus statusOf(Device_ErrorCode error)
 {
@@ -162,6 +165,9 @@ ViStatus Vxi11Transport::write(std::span<const std::uint8_t> data, bool end,
                                const Deadline &deadline, std::size_t &count)
 {
     count = 0;
+    // The instrument drops an answer that a new message interrupts.
+    m_ahead.drop();
+    m_lastPart = 0;
     int idleReplies = 0;
     while (count < data.size()) {
         const auto part = data.subspan(count, std::min(data.size() - count, m_largestWrite));
@@ -195,41 +201,95 @@ ViStatus Vxi11Transport::write(std::span<const std::uint8_t> data, bool end,
     return VI_SUCCESS;
 }
 
+void Vxi11Transport::Ahead::drop()
+{
+    bytes.clear();
+    taken = 0;
+    hasEnd = false;
+}
+
+/// Each read costs a round trip, so a controller that takes a long message in small pieces of one
+/// size gets them out of a large one.
 ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions &options,
                               const Deadline &deadline, std::size_t &count)
 {
     count = 0;
-    int idleReplies = 0;
-    for (;;) {
-        const auto target = buffer.subspan(count, std::min(buffer.size() - count, LargestRead));
-        Device_ReadParms arguments{};
-        arguments.lid = m_link;
-        arguments.requestSize = static_cast<unsigned>(target.size());
-        arguments.io_timeout = deadline.remainingMs();
-        if (options.terminator) {
-            arguments.flags = DEVICE_FLAG_TERMCHRSET;
-            arguments.termChar = static_cast<char>(*options.terminator);
-        }
-        protocols::XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
-        const ViStatus status = callDevice<Device_ReadParms, ReadReply>(
-            device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
-        if (reply->size > target.size()) {
-            return VI_ERROR_IO;
-        }
-        count += reply->size;
-        if (status != VI_SUCCESS) {
+    const bool isSeries = buffer.size() >= SmallestSeries && buffer.size() == m_lastPart &&
+                          buffer.size() < AheadBytes && options.stopsAtEnd && !options.terminator;
+    m_lastPart = 0;
+    ViStatus status = VI_SUCCESS;
+    if (isSeries && m_ahead.left() == 0) {
+        status = readAhead(deadline);
+    }
+    if (m_ahead.left() > 0 || m_ahead.hasEnd) {
+        status = takeAhead(buffer, options, count);
+        if (status != VI_SUCCESS_MAX_CNT) {
             return status;
         }
-        if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd) {
+        status = VI_SUCCESS;
+    }
+    if (status == VI_SUCCESS && count < buffer.size()) {
+        std::size_t more = 0;
+        status = readDevice(buffer.subspan(count), options, deadline, more);
+        count += more;
+    } else if (status == VI_SUCCESS) {
+        status = VI_SUCCESS_MAX_CNT;
+    }
+    m_lastPart = status == VI_SUCCESS_MAX_CNT ? buffer.size() : 0;
+    return status;
+}
+
+/// Holds what one reply of the device brings: a slow one isn't waited for.
+ViStatus Vxi11Transport::readAhead(const Deadline &deadline)
+{
+    m_ahead.drop();
+    m_ahead.bytes.resize(AheadBytes);
+    std::size_t count = 0;
+    const ViStatus status = readReply(m_ahead.bytes, {}, deadline, count);
+    m_ahead.bytes.resize(count);
+    m_ahead.hasEnd = status == VI_SUCCESS;
+    return status == VI_SUCCESS_MAX_CNT ? VI_SUCCESS : status;
+}
+
+/// VI_SUCCESS_MAX_CNT where the message goes on, whether or not the buffer is full.
+ViStatus Vxi11Transport::takeAhead(std::span<std::uint8_t> buffer, const ReadOptions &options,
+                                   std::size_t &count)
+{
+    const auto source = std::span(m_ahead.bytes).subspan(m_ahead.taken);
+    count = std::min(source.size(), buffer.size());
+    bool isTerminated = false;
+    if (options.terminator) {
+        const auto part = source.first(count);
+        const auto found = std::ranges::find(part, *options.terminator);
+        isTerminated = found != part.end();
+        count = static_cast<std::size_t>(found - part.begin()) + (isTerminated ? 1 : 0);
+    }
+    std::ranges::copy(source.first(count), buffer.begin());
+    m_ahead.taken += count;
+    if (m_ahead.left() == 0 && m_ahead.hasEnd) {
+        m_ahead.drop();
+        if (options.stopsAtEnd) {
             return VI_SUCCESS;
         }
-        if ((reply->reason & DEVICE_REASON_CHR) != 0 && options.terminator) {
-            return VI_SUCCESS_TERM_CHAR;
+    }
+    return isTerminated ? VI_SUCCESS_TERM_CHAR : VI_SUCCESS_MAX_CNT;
+}
+
+ViStatus Vxi11Transport::readDevice(std::span<std::uint8_t> buffer, const ReadOptions &options,
+                                    const Deadline &deadline, std::size_t &count)
+{
+    count = 0;
+    int idleReplies = 0;
+    for (;;) {
+        std::size_t more = 0;
+        const ViStatus status =
+            readReply(buffer.subspan(count, std::min(buffer.size() - count, LargestRead)), options,
+                      deadline, more);
+        count += more;
+        if (status != VI_SUCCESS_MAX_CNT || count == buffer.size()) {
+            return status;
         }
-        if (count == buffer.size()) {
-            return VI_SUCCESS_MAX_CNT;
-        }
-        idleReplies = reply->size == 0 ? idleReplies + 1 : 0;
+        idleReplies = more == 0 ? idleReplies + 1 : 0;
         if (idleReplies > MostIdleReplies) {
             return VI_ERROR_IO;
         }
@@ -237,6 +297,37 @@ ViStatus Vxi11Transport::read(std::span<std::uint8_t> buffer, const ReadOptions 
             return VI_ERROR_TMO;
         }
     }
+}
+
+/// One device_read. VI_SUCCESS_MAX_CNT where the message goes on, whatever came.
+ViStatus Vxi11Transport::readReply(std::span<std::uint8_t> target, const ReadOptions &options,
+                                   const Deadline &deadline, std::size_t &count)
+{
+    Device_ReadParms arguments{};
+    arguments.lid = m_link;
+    arguments.requestSize = static_cast<unsigned>(target.size());
+    arguments.io_timeout = deadline.remainingMs();
+    if (options.terminator) {
+        arguments.flags = DEVICE_FLAG_TERMCHRSET;
+        arguments.termChar = static_cast<char>(*options.terminator);
+    }
+    protocols::XdrValue<ReadReply> reply(decodeReadReply, {.target = target});
+    const ViStatus status = callDevice<Device_ReadParms, ReadReply>(
+        device_read, xdr_Device_ReadParms, arguments, 0, reply, deadline);
+    if (reply->size > target.size()) {
+        return VI_ERROR_IO;
+    }
+    count = reply->size;
+    if (status != VI_SUCCESS) {
+        return status;
+    }
+    if ((reply->reason & DEVICE_REASON_END) != 0 && options.stopsAtEnd) {
+        return VI_SUCCESS;
+    }
+    if ((reply->reason & DEVICE_REASON_CHR) != 0 && options.terminator) {
+        return VI_SUCCESS_TERM_CHAR;
+    }
+    return VI_SUCCESS_MAX_CNT;
 }
 
 ViStatus Vxi11Transport::callGeneric(std::uint32_t procedure, const Deadline &deadline)
@@ -251,6 +342,7 @@ ViStatus Vxi11Transport::callGeneric(std::uint32_t procedure, const Deadline &de
 
 ViStatus Vxi11Transport::clear(const Deadline &deadline)
 {
+    m_ahead.drop();
     return callGeneric(device_clear, deadline);
 }
 

@@ -54,6 +54,25 @@ private:
                protocols::XdrValue<Results> &results, const Deadline &deadline);
     bool abortRunningCall();
 
+    /// What was read ahead of the controller's own reads.
+    struct Ahead
+    {
+        std::vector<std::uint8_t> bytes;
+        std::size_t taken = 0; ///< bytes that the controller has
+        bool hasEnd = false;   ///< the message ends behind the bytes
+
+        [[nodiscard]] std::size_t left() const { return bytes.size() - taken; }
+        void drop();
+    };
+
+    [[nodiscard]] ViStatus readDevice(std::span<std::uint8_t> buffer, const ReadOptions &options,
+                                      const Deadline &deadline, std::size_t &count);
+    [[nodiscard]] ViStatus readReply(std::span<std::uint8_t> target, const ReadOptions &options,
+                                     const Deadline &deadline, std::size_t &count);
+    [[nodiscard]] ViStatus readAhead(const Deadline &deadline);
+    [[nodiscard]] ViStatus takeAhead(std::span<std::uint8_t> buffer, const ReadOptions &options,
+                                     std::size_t &count);
+
     Vxi11Address m_address;
     Waker m_waker;
     std::vector<HostAddress> m_hostAddresses;
@@ -64,6 +83,8 @@ private:
     int m_link = 0;
     std::uint16_t m_abortPort = 0;  // 0: the instrument offers no abort channel
     std::size_t m_largestWrite = 0; // bytes that one device_write may carry
+    std::size_t m_lastPart = 0;     // bytes of the last read if it left some of its message
+    Ahead m_ahead;
 };
 
 } // namespace visa

@@ -9,6 +9,7 @@
 
 #include "instrument/VisaDevice.h"
 #include "simulator/SimulatorProcess.h"
+#include "streams/TempStream.h"
 #include "visa/visa.h"
 
 #include <QCoreApplication>
@@ -92,6 +93,24 @@ void get(benchmark::State &state, const char *resource)
         state.ResumeTiming();
         if (!device.readRemoteFile(RemoteName, backName)) {
             state.SkipWithError("get failed");
+            return;
+        }
+    }
+    countBytes(state);
+}
+
+/// As a capture takes its samples: in small pieces, into a stream on the temporary disk.
+void getStream(benchmark::State &state)
+{
+    VisaDevice device;
+    if (!openDevice(state, device, Resource) || !device.writeRemoteFile(localName(), RemoteName)) {
+        return;
+    }
+    for (auto _ : state) {
+        TempStream stream;
+        if (!stream.open() || !device.sendCommand(":MMEM:DATA? '" + RemoteName + "'") ||
+            !device.readBinaryBlock(stream.stream(), FileBytes)) {
+            state.SkipWithError("reading the block failed");
             return;
         }
     }
@@ -315,6 +334,7 @@ int main(int argc, char **argv)
         roundTrips(state, WriteCallBytes + WriteBlock, WriteReplyBytes, WriteBlock);
     });
     add("get", [](benchmark::State &state) { get(state, Resource); });
+    add("get/stream", getStream);
     add("get/visa", bareReads);
     add("get/roundtrips", [](benchmark::State &state) {
         roundTrips(state, ReadCallBytes, ReadReplyBytes + ReadBlock, ReadBlock);

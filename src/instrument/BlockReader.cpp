@@ -6,6 +6,7 @@
 
 #include "base/OutputFile.h"
 #include "base/ProgressClock.h"
+#include "base/WriteBehind.h"
 #include "log/Tracer.h"
 #include "streams/BufferedIO.h"
 
@@ -14,14 +15,14 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <utility>
+#include <span>
 
 namespace {
 
 constexpr qint64 FileBlockBytes = 32768;
-/// Blocks that go to the local file at once: a write for each would hold up the next request.
-constexpr qint64 BlocksPerWrite = 8;
 constexpr qint64 StreamBlockBytes = 2048;
+/// Bytes that go to the disk at once.
+constexpr qint64 WriteBytes = 256 * 1024;
 /// Short reads in a row that are taken for a slow instrument.
 constexpr int MaxRetries = 3;
 /// Digits of the byte count; one digit tells their number.
@@ -95,9 +96,11 @@ bool BlockReader::readFile(const QString &remotePath, const QString &localPath, 
     Transcript::received(Transcript::blockText(*length));
     QElapsedTimer rateTimer;
     rateTimer.start();
-    const bool received = receiveFile(file, *length);
+    WriteBehind behind([&file](std::span<const char> bytes) { return file.write(bytes); },
+                       WriteBytes, FileBlockBytes);
+    const bool received = receiveFile(behind, *length);
     // After a failure too, so that the file tells how far it came.
-    const bool written = writePending(file);
+    const bool written = behind.finish();
     if (!received) {
         return false;
     }
@@ -244,17 +247,15 @@ bool BlockReader::readTerminator(qint64 length) const
                                           .arg(length)));
 }
 
-bool BlockReader::receiveFile(OutputFile &file, qint64 length)
+bool BlockReader::receiveFile(WriteBehind &file, qint64 length)
 {
     note(QString("Read block size is %1 bytes.").arg(FileBlockBytes));
-    m_buffer.resize(BlocksPerWrite * FileBlockBytes);
-    m_pending = 0;
     ProgressClock progress(m_control.report, m_control.cancelled);
     int retries = 0;
     for (qint64 remaining = length; remaining > 0;) {
         const auto wanted = static_cast<quint32>(std::min(remaining, FileBlockBytes));
         quint32 count = 0;
-        const ViStatus status = m_session.read(m_buffer.data() + m_pending, wanted, count);
+        const ViStatus status = m_session.read(file.room(), wanted, count);
         if (!VisaSession::isGoodRead(status)) {
             (void)fail("Reading binary data block failed.");
             Tracer::Trace(Tracer::Error,
@@ -265,7 +266,7 @@ bool BlockReader::receiveFile(OutputFile &file, qint64 length)
         }
         if (count != wanted) {
             if (retries == MaxRetries) {
-                const QByteArray block(m_buffer.constData() + m_pending, count);
+                const QByteArray block(file.room(), count);
                 return failIncomplete(length - remaining, length, block, status);
             }
             Tracer::Trace(Tracer::Debug,
@@ -274,8 +275,7 @@ bool BlockReader::receiveFile(OutputFile &file, qint64 length)
         } else {
             retries = 0;
         }
-        m_pending += count;
-        if (m_pending + FileBlockBytes > m_buffer.size() && !writePending(file)) {
+        if (!file.add(count)) {
             return fail(localWriteFailed);
         }
         remaining -= count;
@@ -284,12 +284,6 @@ bool BlockReader::receiveFile(OutputFile &file, qint64 length)
         }
     }
     return true;
-}
-
-bool BlockReader::writePending(OutputFile &file)
-{
-    const qint64 count = std::exchange(m_pending, 0);
-    return file.write({m_buffer.constData(), static_cast<size_t>(count)});
 }
 
 bool BlockReader::failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
@@ -408,7 +402,11 @@ std::optional<qint64> BlockReader::readStreamLength() const
 
 std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 length, qint64 maximum)
 {
-    m_buffer.resize(StreamBlockBytes);
+    WriteBehind behind(
+        [&stream](std::span<const char> bytes) {
+            return stream.writeBlock(static_cast<int>(bytes.size()), bytes.data());
+        },
+        WriteBytes, StreamBlockBytes);
     m_control.report(0);
     QElapsedTimer progress;
     progress.start();
@@ -416,11 +414,11 @@ std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 leng
     while (received < length) {
         const auto wanted = static_cast<quint32>(std::min(length - received, StreamBlockBytes));
         quint32 count = 0;
-        if (!VisaSession::isGoodRead(m_session.read(m_buffer.data(), wanted, count))) {
+        if (!VisaSession::isGoodRead(m_session.read(behind.room(), wanted, count))) {
             (void)fail("Reading failed.");
             return std::nullopt;
         }
-        if (!stream.writeBytes(static_cast<int>(count), m_buffer.constData())) {
+        if (!behind.add(count)) {
             (void)fail("Cannot write data to temporary buffer.");
             return std::nullopt;
         }
@@ -432,6 +430,10 @@ std::optional<qint64> BlockReader::receiveStream(BufferedIO &stream, qint64 leng
         if (count < wanted) {
             break;
         }
+    }
+    if (!behind.finish()) {
+        (void)fail("Cannot write data to temporary buffer.");
+        return std::nullopt;
     }
     return received;
 }

@@ -11,6 +11,7 @@
 
 class BufferedIO;
 class OutputFile;
+class WriteBehind;
 
 /// Reads one definite-length block of IEEE 488.2: "#", one digit n, n digits with the byte count,
 /// the data, and one terminating byte; of a file also "#(", the byte count and ")". Lives for one
@@ -38,10 +39,9 @@ private:
     [[nodiscard]] std::optional<qint64> readBracketLength() const;
     [[nodiscard]] std::optional<qint64> lengthIn(const QByteArray &digits) const;
     [[nodiscard]] bool readTerminator(qint64 length) const;
-    [[nodiscard]] bool receiveFile(OutputFile &file, qint64 length);
+    [[nodiscard]] bool receiveFile(WriteBehind &file, qint64 length);
     [[nodiscard]] bool failIncomplete(qint64 total, qint64 length, const QByteArray &lastBlock,
                                       ViStatus status) const;
-    [[nodiscard]] bool writePending(OutputFile &file);
     [[nodiscard]] bool abandon();
     [[nodiscard]] std::optional<qint64> readStreamLength() const;
     [[nodiscard]] std::optional<qint64> receiveStream(BufferedIO &stream, qint64 length,
@@ -49,6 +49,4 @@ private:
 
     VisaSession &m_session;
     OperationControl &m_control;
-    QByteArray m_buffer;
-    qint64 m_pending = 0; ///< bytes at the front of the buffer that are not in the file yet
 };

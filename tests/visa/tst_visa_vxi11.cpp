@@ -27,6 +27,7 @@ private slots:
     void cleanup() { closeManager(); }
     void reads();
     void readRequests();
+    void longMessageInPieces();
     void writes();
     void deviceErrors();
     void brokenReplies();
@@ -105,6 +106,59 @@ void TestVisaVxi11::readRequests()
     QCOMPARE(calls[1].word(1), 5U);
     QCOMPARE(calls[1].word(4), 128U);
     QCOMPARE(calls[1].word(5), std::uint32_t{';'});
+}
+
+void TestVisaVxi11::longMessageInPieces()
+{
+    constexpr ViUInt32 Piece = 2048;
+    QByteArray message;
+    for (int i = 0; i < 100'000; ++i) {
+        message += char(11 + i % 241);
+    }
+    message[40'000] = '\n';
+    std::size_t sent = 0;
+    const Vxi11Peer peer([&](PeerConnection &connection, const PeerCall &call) {
+        if (call.procedure == Vxi11Peer::Write || call.procedure == Vxi11Peer::Clear) {
+            sent = 0;
+        } else if (call.procedure == Vxi11Peer::Read) {
+            // Some replies are shorter than asked, as those of a busy instrument.
+            const std::size_t most = call.word(1) > 30'000 ? 29'000 : call.word(1);
+            const std::string part = message.mid(qsizetype(sent), qsizetype(most)).toStdString();
+            sent += part.size();
+            connection.send(call.reply(Vxi11Peer::readReply(
+                0, sent == std::size_t(message.size()) ? Vxi11Peer::ReasonEnd : 0, part)));
+            return true;
+        }
+        return false;
+    });
+    const ViSession session = open(peer);
+    QByteArray received;
+    Result last{VI_SUCCESS_MAX_CNT, {}};
+    while (last.first == VI_SUCCESS_MAX_CNT) {
+        last = read(session, Piece);
+        received += last.second;
+    }
+    QCOMPARE(last.first, VI_SUCCESS);
+    QVERIFY(received == message);
+    QVERIFY(peer.calls(Vxi11Peer::Read).size() < 12); // of 49 pieces
+
+    // What was read ahead goes with the message that it belongs to.
+    QCOMPARE(write(session, "*IDN?"), VI_SUCCESS);
+    for (const bool clears : {false, true}) {
+        for (int i = 0; i < 4; ++i) {
+            QCOMPARE(read(session, Piece).first, VI_SUCCESS_MAX_CNT);
+        }
+        QCOMPARE(clears ? viClear(session) : write(session, "*IDN?"), VI_SUCCESS);
+        QCOMPARE(read(session, 3), Result(VI_SUCCESS_MAX_CNT, message.left(3)));
+        QCOMPARE(write(session, "*IDN?"), VI_SUCCESS);
+    }
+    for (int i = 0; i < 19; ++i) {
+        QCOMPARE(read(session, Piece).first, VI_SUCCESS_MAX_CNT);
+    }
+    // A terminator set meanwhile ends the read of what is here already.
+    QCOMPARE(viSetAttribute(session, VI_ATTR_TERMCHAR_EN, VI_TRUE), VI_SUCCESS);
+    QCOMPARE(read(session, 10'000),
+             Result(VI_SUCCESS_TERM_CHAR, message.mid(19 * Piece, 40'001 - 19 * Piece)));
 }
 
 void TestVisaVxi11::writes()
