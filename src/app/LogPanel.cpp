@@ -2,6 +2,7 @@
 #include "LogPanel.h"
 
 #include "base/OutputFile.h"
+#include "instrument/Transcript.h"
 
 #include <QAction>
 #include <QApplication>
@@ -158,7 +159,9 @@ void LogPanel::copy() const
 bool LogPanel::save(const QString &fileName) const
 {
     OutputFile file(fileName);
-    return file.open() && file.write(shownText().toUtf8()) && file.commit();
+    return (file.open() && file.write(shownText().toUtf8()) && file.commit()) ||
+           Tracer::fail(
+               QString("Cannot save the log as '%1': %2").arg(fileName, file.errorString()));
 }
 
 void LogPanel::chooseFile()
@@ -167,6 +170,22 @@ void LogPanel::chooseFile()
         QFileDialog::getSaveFileName(this, "Save Log", "corvane.log", "Log (*.log *.txt)");
     if (!fileName.isEmpty()) {
         save(fileName);
+    }
+}
+
+/// Asks for a file and records there what is said to instruments, or ends that.
+void LogPanel::toggleTranscript(bool starts)
+{
+    if (!starts) {
+        Transcript::stop();
+        return;
+    }
+    const QString fileName =
+        QFileDialog::getSaveFileName(this, "Record Instrument Transcript", "corvane-transcript.txt",
+                                     "Text (*.txt)", nullptr, QFileDialog::DontConfirmOverwrite);
+    if (!fileName.isEmpty() && Transcript::start(fileName)) {
+        Tracer::Trace(Tracer::Information,
+                      QString("What instruments are told and answer goes to '%1'.").arg(fileName));
     }
 }
 
@@ -184,6 +203,12 @@ void LogPanel::openMenu(const QPoint &position)
     menu->addAction("Copy", this, &LogPanel::copy);
     menu->addAction("Save...", this, &LogPanel::chooseFile);
     menu->addAction("Select All", m_list, &QListWidget::selectAll);
+    menu->addSeparator();
+    QAction *transcript = menu->addAction("Record Instrument Transcript...");
+    transcript->setToolTip("Adds each command and answer, with its time, to a text file");
+    transcript->setCheckable(true);
+    transcript->setChecked(Transcript::isRunning());
+    connect(transcript, &QAction::triggered, this, &LogPanel::toggleTranscript);
     menu->addSeparator();
     menu->addAction("Clear", this, &LogPanel::clear);
     menu->popup(m_list->viewport()->mapToGlobal(position));

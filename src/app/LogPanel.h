@@ -33,6 +33,7 @@ public:
 public slots:
     void copy() const;
     void chooseFile();
+    void toggleTranscript(bool starts);
     void clear();
 
 private:
