@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "cli/CliRun.h"
 #include "support/files.h"
+#include "support/rows.h"
 #include "support/wvbytes.h"
 
 #include <QFile>
@@ -19,10 +20,8 @@ class tst_composecommand : public QObject
 
 private slots:
     void init();
-    void renders_data();
     void renders();
     void lists();
-    void refusals_data();
     void refusals();
 
 private:
@@ -45,36 +44,31 @@ void tst_composecommand::init()
     QFile::remove(m_folder.path("other.wv"));
 }
 
-void tst_composecommand::renders_data()
-{
-    QTest::addColumn<QStringList>("options");
-    QTest::addColumn<QString>("output");
-    QTest::newRow("as composed") << QStringList{"--no-multi-process"} << "out.wv";
-    QTest::newRow("other name") << QStringList{"-o", "other.wv"} << "other.wv";
-}
-
 void tst_composecommand::renders()
 {
-    QFETCH(QStringList, options);
-    QFETCH(QString, output);
-    const CliRun run = CliRun::in(m_folder.path(), QStringList{"compose", "a.cms"} + options);
-    QVERIFY2(run.exitCode == 0, qPrintable(run.lines.join('\n')));
-    QVERIFY(run.output.isEmpty());
-    const QByteArray file = m_folder.load(output);
-    QCOMPARE(tag(file, "SAMPLES"), "5000");
-    QCOMPARE(tag(file, "COMMENT"), "Created with Corvane");
-    QCOMPARE(tag(file, "MARKER LIST 1"), " 0:1;3000:0");
-    // Twice the tone where both play; 1000 samples are one turn. The tone's own rounding lifts the
-    // peak by some words.
-    for (const auto &[sample, word] :
-         {std::pair{0, 16384}, {1000, 32767}, {3000, 32767}, {4000, 16384}}) {
-        const auto got = qFromLittleEndian<qint16>(sampleWords(file).constData() + 4 * sample);
-        QVERIFY2(std::abs(got - word) <= 4, qPrintable(QString::number(got)));
-    }
-    const bool reported = !run.lines.filter("frequency shifting 2 Waveforms, 8000 Input").isEmpty();
-    QVERIFY2(reported, qPrintable(run.lines.join('\n')));
-    // An existing file stays.
-    QCOMPARE(CliRun::in(m_folder.path(), QStringList{"compose", "a.cms"} + options).exitCode, 1);
+    const auto check = [this](const QString &options, const QString &output) {
+        const QStringList arguments = QString("compose a.cms " + options).split(' ');
+        const CliRun run = CliRun::in(m_folder.path(), arguments);
+        QVERIFY2(run.exitCode == 0, qPrintable(run.lines.join('\n')));
+        QVERIFY(run.output.isEmpty());
+        const QByteArray file = m_folder.load(output);
+        QCOMPARE(tag(file, "SAMPLES"), "5000");
+        QCOMPARE(tag(file, "COMMENT"), "Created with Corvane");
+        QCOMPARE(tag(file, "MARKER LIST 1"), " 0:1;3000:0");
+        // Twice the tone where both play; 1000 samples are one turn. The tone's own rounding lifts
+        // the peak by some words.
+        for (const auto &[sample, word] :
+             {std::pair{0, 16384}, {1000, 32767}, {3000, 32767}, {4000, 16384}}) {
+            const auto got = qFromLittleEndian<qint16>(sampleWords(file).constData() + 4 * sample);
+            QVERIFY2(std::abs(got - word) <= 4, qPrintable(QString::number(got)));
+        }
+        QVERIFY(!run.lines.filter("frequency shifting 2 Waveforms, 8000 Input").isEmpty());
+        // An existing file stays.
+        QCOMPARE(CliRun::in(m_folder.path(), arguments).exitCode, 1);
+    };
+    forRows({{"as composed", "--no-multi-process", "out.wv"},
+             {"other name", "-o other.wv", "other.wv"}},
+            check);
 }
 
 void tst_composecommand::lists()
@@ -95,34 +89,19 @@ void tst_composecommand::lists()
     QVERIFY(!QFile::exists(m_folder.path("out.wv")));
 }
 
-void tst_composecommand::refusals_data()
-{
-    QTest::addColumn<QByteArray>("from");
-    QTest::addColumn<QByteArray>("to");
-    QTest::addColumn<QString>("reason");
-    const auto row = [](const char *name, const char *from, const char *to, const char *reason) {
-        QTest::newRow(name) << QByteArray(from) << QByteArray(to) << QString(reason);
-    };
-    row("missing source",
-        "sName='tone.wv' lSamples='4000' lUsed='4000' dSrcClk='1e6' bMkr='1' "
-        "lTarget='1000'",
-        "sName='x.wv'", "x.wv' of track 2, segment 1 is missing.");
-    row("nothing enabled", "bEnable='1'", "", "no enabled track has a segment");
-    row("no length", "lSamples='5000'", "", "a length of 0 samples");
-    row("no folder", "'out.wv'", "'no/out.wv'", "its folder doesn't exist");
-    row("broken", "</Settings>", "", "a.cms': line 1: ");
-}
-
 void tst_composecommand::refusals()
 {
-    QFETCH(QByteArray, from);
-    QFETCH(QByteArray, to);
-    QFETCH(QString, reason);
-    QVERIFY(m_folder.store("a.cms", m_folder.load("a.cms").replace(from, to)));
-    const CliRun run = CliRun::in(m_folder.path(), {"compose", "a.cms"});
-    QCOMPARE(run.exitCode, 1);
-    QVERIFY2(run.lastLine().startsWith("error: ") && run.lastLine().contains(reason),
-             qPrintable(run.lines.join('\n')));
+    forRows({{"no length", "lSamples='5000'", "", "a length of 0 samples"},
+             {"no folder", "'out.wv'", "'no/out.wv'", "its folder doesn't exist"},
+             {"broken", "</Settings>", "", "a.cms': line 1: "}},
+            [this](const QByteArray &from, const QByteArray &to, const QString &reason) {
+                init();
+                QVERIFY(m_folder.store("a.cms", m_folder.load("a.cms").replace(from, to)));
+                const CliRun run = CliRun::in(m_folder.path(), {"compose", "a.cms"});
+                QCOMPARE(run.exitCode, 1);
+                QVERIFY2(run.lastLine().startsWith("error: ") && run.lastLine().contains(reason),
+                         qPrintable(run.lines.join('\n')));
+            });
 }
 
 QTEST_GUILESS_MAIN(tst_composecommand)

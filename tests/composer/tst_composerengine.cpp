@@ -4,6 +4,7 @@
 #include "streams/samplestream.h"
 #include "support/files.h"
 #include "support/logreader.h"
+#include "support/rows.h"
 #include "support/seed.h"
 #include "support/wvbytes.h"
 
@@ -29,24 +30,6 @@ QByteArray markerLists(const std::vector<quint8> &bytes)
         text += '}';
     }
     return text;
-}
-
-/// The marker bytes that a file's lists of transitions stand for.
-std::vector<quint8> writtenMarkers(const QByteArray &file, std::size_t count)
-{
-    std::vector<quint8> bytes(count);
-    for (int marker = 0; marker < 4; ++marker) {
-        const QByteArray list = tag(file, "MARKER LIST " + QByteArray::number(marker + 1));
-        const QList<QByteArray> transitions = list.split(';');
-        for (const QByteArray &transition : transitions) {
-            const QList<QByteArray> parts = transition.split(':');
-            const auto bit = static_cast<quint8>(1 << marker);
-            for (std::size_t i = parts.value(0).trimmed().toUInt(); i < count; ++i) {
-                bytes[i] = parts.value(1) == "1" ? bytes[i] | bit : bytes[i] & quint8(~bit);
-            }
-        }
-    }
-    return bytes;
 }
 
 struct Waveform
@@ -108,12 +91,9 @@ class tst_composerengine : public QObject
 
 private slots:
     void initTestCase();
-    void render_data();
     void render();
     void randomDocuments();
-    void failures_data();
     void failures();
-    void cancel_data();
     void cancel();
     void reports();
 
@@ -203,98 +183,65 @@ void tst_composerengine::compare(const Composition &document)
         const float worst = std::max(std::fabs(error.real()), std::fabs(error.imag()));
         QVERIFY2(worst < 1.0 / 32767, qPrintable(QString("sample %1: %2").arg(i).arg(worst)));
     }
-    QVERIFY(writtenMarkers(m_folder.load("out.wv"), expected.markers.size()) == expected.markers);
+    const QByteArray markers =
+        markerBytes(m_folder.load("out.wv"), static_cast<qsizetype>(expected.markers.size()));
+    QVERIFY(std::equal(markers.begin(), markers.end(), expected.markers.begin()));
     QVERIFY(std::fabs(result.info.rmsOffsetTag + 20 * std::log10(expected.rms)) < 1e-5);
     QCOMPARE(result.info.peakOffsetTag, 0.0);
 }
 
-void tst_composerengine::render_data()
-{
-    QTest::addColumn<Change>("change");
-    const auto row = [](const QString &name, const Change &change) {
-        QTest::newRow(qPrintable(name)) << change;
-    };
-    row("overlap and gaps", [](Composition &) {});
-    for (int shape = FadeLinear; shape <= FadeBlank; ++shape) {
-        row(QString("fades of shape %1").arg(shape), [shape](Composition &document) {
-            ComposerSegment &segment = *document.segment(0, 0);
-            segment.iFadeIn = shape;
-            segment.iFadeOut = shape;
-            segment.dFadeIn = 100e-6;
-            segment.dFadeOut = 70.4e-6;
-        });
-    }
-    row("fades that overlap", [](Composition &document) {
-        document.segment(0, 0)->dFadeIn = 250e-6;
-        document.segment(0, 0)->dFadeOut = 200e-6;
-        document.segment(0, 0)->iFadeOut = FadeRaisedCosine;
-    });
-    row("levels and no markers", [](Composition &document) {
-        document.segment(0, 0)->dLOfs = 6;
-        document.segment(1, 0)->dLOfs = 20.5;
-        document.segment(1, 0)->bMkr = false;
-    });
-    row("wrap with fades", [](Composition &document) {
-        ComposerSegment &segment = *document.segment(0, 1);
-        segment.bWrap = true;
-        segment.dFadeIn = 20e-6;
-        segment.dFadeOut = 30e-6;
-        segment.lTarget = 850;
-        document.track(0)->segments.erase(document.track(0)->segments.begin());
-    });
-    row("wrap of the same segment in one block", [](Composition &document) {
-        // 300 samples from 10 on in a target of 250: the tail plays to 59, then the start again.
-        document.target.lSamples = 250;
-        document.track(1)->segments.clear();
-        document.track(0)->segments.resize(1);
-        document.segment(0, 0)->lTarget = 100;
-        document.segment(0, 0)->bWrap = true;
-    });
-    row("past the end without a wrap",
-        [](Composition &document) { document.segment(0, 1)->lTarget = 1200; });
-    row("past the end with a wrap", [](Composition &document) {
-        document.segment(0, 1)->lTarget = 1200;
-        document.segment(0, 1)->bWrap = true;
-    });
-    row("piece of a file", [](Composition &document) {
-        document.segment(1, 0)->lStart = 77;
-        document.segment(1, 0)->lUsed = 111;
-    });
-    row("disabled track", [](Composition &document) { document.track(1)->bEnable = false; });
-    row("offset", [](Composition &document) {
-        document.segment(0, 0)->dFOfs = 12345.6;
-        document.segment(0, 0)->bAdjOfs = false;
-    });
-    row("offset adjusted", [](Composition &document) {
-        document.segment(0, 0)->dFOfs = -12345.6;
-        document.segment(0, 0)->dAdjLim = 100;
-    });
-    row("higher target clock", [](Composition &document) {
-        document.target.dUsrClk = 2e6;
-        document.target.lSamples = 2000;
-        document.segment(0, 1)->lTarget = 800;
-        document.segment(0, 0)->dFOfs = 5000;
-    });
-    row("down-sampled source read past its end", [this](Composition &document) {
-        ComposerSegment segment = place(2, 400);
-        segment.lStart = 300; // stays: 350 samples are left of the stream, of which 50 come
-        segment.lUsed = 400;
-        document.track(1)->segments = {segment};
-    });
-    row("empty segment", [](Composition &document) {
-        ComposerSegment empty = *document.segment(0, 0);
-        empty.lUsed = 0;
-        empty.lTarget = 0;
-        document.track(0)->segments.insert(document.track(0)->segments.begin(), empty);
-    });
-}
-
+/// What random documents don't reach.
 void tst_composerengine::render()
 {
-    QFETCH(Change, change);
-    Composition document = twoTracks();
-    change(document);
-    compare(document);
+    forRows({{"wrap of the same segment in one block", Change([](Composition &document) {
+                  // 300 samples from 10 on in a target of 250: the tail plays to 59, then the start
+                  // again.
+                  document.target.lSamples = 250;
+                  document.track(1)->segments.clear();
+                  document.track(0)->segments.resize(1);
+                  document.segment(0, 0)->lTarget = 100;
+                  document.segment(0, 0)->bWrap = true;
+              })},
+             {"past the end without a wrap",
+              Change([](Composition &document) { document.segment(0, 1)->lTarget = 1200; })},
+             {"past the end with a wrap", Change([](Composition &document) {
+                  document.segment(0, 1)->lTarget = 1200;
+                  document.segment(0, 1)->bWrap = true;
+              })},
+             {"disabled track",
+              Change([](Composition &document) { document.track(1)->bEnable = false; })},
+             {"offset", Change([](Composition &document) {
+                  document.segment(0, 0)->dFOfs = 12345.6;
+                  document.segment(0, 0)->bAdjOfs = false;
+              })},
+             {"offset adjusted", Change([](Composition &document) {
+                  document.segment(0, 0)->dFOfs = -12345.6;
+                  document.segment(0, 0)->dAdjLim = 100;
+              })},
+             {"higher target clock", Change([](Composition &document) {
+                  document.target.dUsrClk = 2e6;
+                  document.target.lSamples = 2000;
+                  document.segment(0, 1)->lTarget = 800;
+                  document.segment(0, 0)->dFOfs = 5000;
+              })},
+             {"down-sampled source read past its end", Change([this](Composition &document) {
+                  ComposerSegment segment = place(2, 400);
+                  // It stays: 350 samples are left of the stream, of which 50 come.
+                  segment.lStart = 300;
+                  segment.lUsed = 400;
+                  document.track(1)->segments = {segment};
+              })},
+             {"empty segment", Change([](Composition &document) {
+                  ComposerSegment empty = *document.segment(0, 0);
+                  empty.lUsed = 0;
+                  empty.lTarget = 0;
+                  document.track(0)->segments.insert(document.track(0)->segments.begin(), empty);
+              })}},
+            [this](const Change &change) {
+                Composition document = twoTracks();
+                change(document);
+                compare(document);
+            });
 }
 
 void tst_composerengine::randomDocuments()
@@ -333,77 +280,52 @@ void tst_composerengine::randomDocuments()
     }
 }
 
-void tst_composerengine::failures_data()
-{
-    QTest::addColumn<Change>("change");
-    QTest::addColumn<QString>("reason");
-    const auto row = [](const char *name, const char *reason, const Change &change) {
-        QTest::newRow(name) << change << QString(reason);
-    };
-    row("missing source", "of track 2, segment 1 is missing",
-        [](Composition &document) { document.segment(1, 0)->sName += "x"; });
-    row("clock of the source has changed", "Waveform clock rate in file",
-        [](Composition &document) { document.segment(1, 0)->dSrcClk = 1.5e6; });
-    row("length of the source has changed", "Sample count in file",
-        [](Composition &document) { document.segment(1, 0)->lSamples = 499; });
-    row("silence", "sum of the tracks is silent",
-        [](Composition &document) { document.target.lSamples = 10; });
-    row("target too long", "samples; 1 to 2147483647 can be rendered",
-        [](Composition &document) { document.target.lSamples = 3000000000; });
-    row("start before the target", "no valid place",
-        [](Composition &document) { document.segment(1, 0)->lTarget = -1; });
-    row("start before the source", "Cannot initialize data stream",
-        [](Composition &document) { document.segment(1, 0)->lStart = -1; });
-    row("folder of the target is missing", "Error opening output file",
-        [](Composition &document) { document.target.sName = "/nowhere/out.wv"; });
-    row("nothing enabled", "", [](Composition &document) {
-        document.track(0)->bEnable = false;
-        document.track(1)->bEnable = false;
-    });
-}
-
 void tst_composerengine::failures()
 {
-    QFETCH(Change, change);
-    QFETCH(QString, reason);
-    QVERIFY(m_folder.store("out.wv", "as it was"));
-    Composition document = twoTracks();
-    change(document);
-    CapturedLog log;
-    ComposerEngine engine(document);
-    QVERIFY(!engine.runComposer());
-    const QString text = log.take(Complaints).join('\n');
-    QVERIFY2(text.contains(reason), qPrintable(text));
-    QCOMPARE(m_folder.load("out.wv"), "as it was");
-}
-
-void tst_composerengine::cancel_data()
-{
-    QTest::addColumn<QString>("line");
-    for (const char *line : {"reading files", "resampling", "Combining", "Rescaling"}) {
-        QTest::newRow(line) << QString(line);
-    }
+    const auto check = [this](const QString &reason, const Change &change) {
+        QVERIFY(m_folder.store("out.wv", "as it was"));
+        Composition document = twoTracks();
+        change(document);
+        CapturedLog log;
+        ComposerEngine engine(document);
+        QVERIFY(!engine.runComposer());
+        const QString text = log.take(Complaints).join('\n');
+        QVERIFY2(text.contains(reason), qPrintable(text));
+        QCOMPARE(m_folder.load("out.wv"), "as it was");
+    };
+    check("of track 2, segment 1 is missing",
+          [](Composition &d) { d.segment(1, 0)->sName += "x"; });
+    check("Waveform clock rate in file", [](Composition &d) { d.segment(1, 0)->dSrcClk = 1.5e6; });
+    check("Sample count in file", [](Composition &d) { d.segment(1, 0)->lSamples = 499; });
+    check("sum of the tracks is silent", [](Composition &d) { d.target.lSamples = 10; });
+    check("samples; 1 to 2147483647 can be rendered",
+          [](Composition &d) { d.target.lSamples = 3000000000; });
+    check("no valid place", [](Composition &d) { d.segment(1, 0)->lTarget = -1; });
+    check("Cannot initialize data stream", [](Composition &d) { d.segment(1, 0)->lStart = -1; });
+    check("Error opening output file", [](Composition &d) { d.target.sName = "/nowhere/out.wv"; });
+    check("", // told by a message
+          [](Composition &d) { d.track(0)->bEnable = d.track(1)->bEnable = false; });
 }
 
 /// A cancel at any stage ends the run, leaves the output as it was and no temporary file behind.
 void tst_composerengine::cancel()
 {
-    QFETCH(QString, line);
-    QVERIFY(m_folder.store("out.wv", "as it was"));
-    const Composition document = twoTracks();
-    CapturedLog log;
-    ComposerEngine engine(document);
-    QStringList messages;
-    connect(&engine, &ComposerEngine::message, this, [&](const QString &text) {
-        messages.append(text);
-        if (text.startsWith(line)) {
-            engine.slot_cancel();
-        }
-    });
-    QVERIFY(!engine.runComposer());
-    QVERIFY(log.take(Complaints).join('\n').contains("aborted by user"));
-    QCOMPARE(messages.last(), "Cleaning up 3 Temporary Files");
-    QCOMPARE(m_folder.load("out.wv"), "as it was");
+    for (const char *line : {"reading files", "resampling", "Combining", "Rescaling"}) {
+        QVERIFY(m_folder.store("out.wv", "as it was"));
+        CapturedLog log;
+        ComposerEngine engine(twoTracks());
+        QStringList messages;
+        connect(&engine, &ComposerEngine::message, this, [&](const QString &text) {
+            messages.append(text);
+            if (text.startsWith(line)) {
+                engine.slot_cancel();
+            }
+        });
+        QVERIFY2(!engine.runComposer(), line);
+        QVERIFY(log.take(Complaints).join('\n').contains("aborted by user"));
+        QCOMPARE(messages.last(), "Cleaning up 3 Temporary Files");
+        QCOMPARE(m_folder.load("out.wv"), "as it was");
+    }
 }
 
 void tst_composerengine::reports()
@@ -412,43 +334,22 @@ void tst_composerengine::reports()
     document.segment(1, 0)->dLOfs = -12; // lifts the sum beyond full scale
     document.track(0)->segments.pop_back();
     ComposerEngine engine(document);
-    engine.setMaxThreads(1);
     QStringList lines;
     for (const auto signal : {&ComposerEngine::message, &ComposerEngine::headline,
                               &ComposerEngine::warningMessage, &ComposerEngine::errorMessage}) {
         connect(&engine, signal, this, [&lines](const QString &text) { lines.append(text); });
     }
     QVERIFY(engine.runComposer());
-    QVERIFY(lines.takeFirst().startsWith("Composer Engine started at "));
-    QVERIFY(lines.takeLast().startsWith("Job Completed at "));
+    QVERIFY(lines.first().startsWith("Composer Engine started at "));
     const auto clipped = QRegularExpression("^\\d+ of 2000 values clipped, largest \\d\\.\\d\\d dB "
                                             "above full scale");
     QCOMPARE(lines.filter(clipped).size(), 1);
-    lines.removeIf([&](const QString &line) { return line.contains(clipped); });
-    const QStringList expected{
-        "reading files 2 Waveforms, 800 Input Samples",
-        "Processing Track 1, Segment 1 (37.5 %)",
-        "Processing Track 2, Segment 1 (62.5 %)",
-        "Waiting for all 2 tasks to finish...",
-        "All jobs finished.",
-        "resampling 2 Waveforms, 800 Input Samples",
-        "Processing Track 1, Segment 1 (0 %)",
-        "Processing Track 2, Segment 1 (0 %)",
-        "Waiting for all 2 tasks to finish...",
-        "All jobs finished.",
-        "frequency shifting 2 Waveforms, 800 Input Samples",
-        "Processing Track 1, Segment 1 (0 %)",
-        "Processing Track 2, Segment 1 (0 %)",
-        "Waiting for all 2 tasks to finish...",
-        "All jobs finished.",
-        "Combining Waveforms",
-        "  Will Create 1000 Output Samples",
-        "Rescaling Waveform Data",
-        "Saving Final Waveform to " + document.target.sName,
-        "Loop point: continuous",
-        "Cleaning up 2 Temporary Files",
-    };
-    QCOMPARE(lines.join('\n'), expected.join('\n'));
+    QCOMPARE(lines.filter("2 Waveforms, 800 Input Samples").size(), 3);
+    QCOMPARE(lines.filter("Processing Track").size(), 6);
+    QVERIFY(lines.contains("  Will Create 1000 Output Samples"));
+    QCOMPARE(lines.mid(lines.size() - 4, 3),
+             (QStringList{"Saving Final Waveform to " + document.target.sName,
+                          "Loop point: continuous", "Cleaning up 2 Temporary Files"}));
 }
 
 QTEST_GUILESS_MAIN(tst_composerengine)

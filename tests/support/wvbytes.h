@@ -36,3 +36,6 @@ template <typename T>
 
 /// The words of the sample block, which ends a written file.
 [[nodiscard]] QByteArray sampleWords(const QByteArray &file);
+
+/// The marker byte of each sample by the transitions in the file's lists.
+[[nodiscard]] QByteArray markerBytes(const QByteArray &file, qsizetype samples);
