@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "jobrun.h"
 #include "jobs/DumpJob.h"
+#include "jobs/InfoReport.h"
 #include "jobs/LevelJob.h"
 #include "jobs/MeasureJob.h"
 #include "jobs/WavImportJob.h"
@@ -27,13 +28,19 @@ class TestJobs : public QObject
 private slots:
     void init();
     void importScales();
-    void importTellsItsSteps();
     void importSetsTheClock();
-    void importFails();
     void measuresRanges();
     void cancelKeepsLaterStepsFromStarting();
     void cancelAfterTheEndIsHarmless();
     void clippingIsTold();
+    void levelCopyKeepsTheRest();
+    void keepsEveryWord();
+    void keepsLongUnknownTags();
+    void levelCopyCompletesMarkers();
+    void levelDefaults();
+    void tagTexts();
+    void showsNoNegativeZero();
+    void listsSegments();
 
 private:
     [[nodiscard]] QString path(const QString &name) const { return m_folder.path(name); }
@@ -70,6 +77,19 @@ private:
     WaveformOutput m_output;
     std::vector<float> m_values;
 };
+
+using Level = std::optional<double>;
+
+/// The bytes of a level copy of a file with these bytes; null if it fails.
+QByteArray levelCopy(const QByteArray &source, Level peakDb = {}, Level peakToRmsDb = {})
+{
+    const TestFolder folder;
+    if (!folder.store("in.wv", source)) {
+        return {};
+    }
+    LevelJob job({folder.path("in.wv"), {folder.path("out.wv"), {}, {}}, peakDb, peakToRmsDb});
+    return job.run() == JobOutcome::Finished ? folder.load("out.wv") : QByteArray();
+}
 
 } // namespace
 
@@ -109,27 +129,6 @@ void TestJobs::importScales()
             });
 }
 
-void TestJobs::importTellsItsSteps()
-{
-    QVERIFY(m_folder.store(
-        "in.wav", wavFile(formatChunk() + chunk("data", words({0x7FFF, 0x7FFF, 0, 0, 0, 0})))));
-    WavImportJob job({path("in.wav"), {.output = {path("out.wv"), "a{bc}d", "me"}}});
-    const JobRun run(job);
-    QCOMPARE(run.steps, (QStringList{"Reading WAV-File Data...", "Analyzing Levels...",
-                                     "Rescaling...", "Creating Waveform File..."}));
-    QCOMPARE(
-        run.report,
-        (QStringList{"Reading directory entry from cache.", "Opening file.",
-                     "Reading WAV-file data", "Scaling", "Samples:     3", "Peak Offset: 0.00 dB",
-                     // One sample of three at full scale: 10 log10(3)
-                     "Peak/RMS:    4.77 dB", "Saving", "File:        " + path("out.wv"),
-                     "Loop point: continuous", "Import completed"}));
-    const QByteArray result = m_folder.load("out.wv");
-    QCOMPARE(tag(result, "COMMENT"), "ac");
-    QCOMPARE(tag(result, "COPYRIGHT"), "me");
-    QVERIFY(QDateTime::fromString(tag(result, "DATE"), "yyyy-MM-dd;HH:mm:ss").isValid());
-}
-
 void TestJobs::importSetsTheClock()
 {
     forRows({{"given", 44100, 2.5e6, "2500000.000000", 0},
@@ -145,26 +144,6 @@ void TestJobs::importSetsTheClock()
                 QCOMPARE(tag(m_folder.load("out.wv"), "CLOCK"), clock);
                 QCOMPARE(tag(m_folder.load("out.wv"), "CLOCK MARKER"), clock);
                 QCOMPARE(takeLog(Tracer::Warning).size(), warnings);
-            });
-}
-
-void TestJobs::importFails()
-{
-    const QByteArray data = chunk("data", QByteArray(12, '\1'));
-    forRows({{"cut data", wavFile(formatChunk() + data).chopped(1), "out.wv",
-              QStringList{"Cannot read data from .wav file."}},
-             {"no folder", wavFile(formatChunk() + data), "missing/out.wv",
-              QStringList{QString("Error opening output file '%1': No such file or directory")
-                              .arg(path("missing/out.wv")),
-                          "Waveform generation failed."}}},
-            [&](const QByteArray &bytes, const QString &output, const QStringList &errors) {
-                QVERIFY(m_folder.store("in.wav", bytes));
-                WavImportJob job({path("in.wav"), {.output = {path(output), {}, {}}}});
-                const JobRun run(job);
-                QCOMPARE(run.outcome, JobOutcome::Failed);
-                QCOMPARE(takeMessages(Tracer::Error), errors);
-                QCOMPARE(run.report.last(), "Import failed");
-                QVERIFY(!QFile::exists(path(output)));
             });
 }
 
@@ -273,6 +252,136 @@ void TestJobs::clippingIsTold()
     QVERIFY(warning({1, -2, 1.001F, 0, 0, 1.5F})
                 .startsWith("3 of 6 values clipped, largest 6.02 dB above full scale."));
     QVERIFY(warning({std::nanf(""), 0}).startsWith("1 of 2 values clipped, largest 0.00 dB"));
+}
+
+void TestJobs::levelCopyKeepsTheRest()
+{
+    const QByteArray samples = words({1, 2, -3, 4, 0x7FFF, -0x7FFF, 0, -1});
+    const QByteArray source =
+        wvFile("{X: y}{TYPE: TVX-WV,0}{COMMENT:c d}{CLOCK:2500000.25}{CLOCK MARKER:5}"
+               "{SAMPLES:4}{clock marker: 7}{COPYRIGHT:me}{CLOCK MARKER: 6}{CLOCK MARKERS:{}"
+               "{LEVEL OFFS:3,1}{CONTROL LENGTH:4}{MARKER LIST 4: 0:0;3:1}"
+               "{MARKER LIST 1: 0:1;1:0;2:1}{MARKER LIST 2: 0:0}",
+               samples);
+    QByteArray copy = levelCopy(source, -2, 4.5);
+    copy.replace(tag(copy, "DATE"), "now");
+    QCOMPARE(copy,
+             wvFile("{TYPE: TVX-WV,0}{COMMENT:c d}{COPYRIGHT:me}{DATE:now}{CLOCK:2500000.250000}"
+                    "{CLOCK MARKER:2500000.250000}{LEVEL OFFS:6.500000,2.000000}{SAMPLES:4}"
+                    "{X: y}{clock marker: 7}{CLOCK MARKERS: {}{CONTROL LENGTH: 4}"
+                    "{MARKER LIST 1: 0:1;1:0;2:1}{MARKER LIST 2: 0:0}{MARKER LIST 3: 0:0}"
+                    "{MARKER LIST 4: 0:0;3:1}",
+                    samples));
+    // A copy of the copy changes nothing more.
+    QByteArray again = levelCopy(copy, -2, 4.5);
+    again.replace(tag(again, "DATE"), "now");
+    QCOMPARE(again, copy);
+}
+
+void TestJobs::keepsEveryWord()
+{
+    QByteArray samples;
+    QByteArray expected;
+    for (int word = -0x8000; word <= 0x7FFF; ++word) {
+        samples += littleEndian(static_cast<qint16>(word));
+        // The writer never goes below -32767, so one word can't come back.
+        expected += littleEndian(static_cast<qint16>(std::max(word, -0x7FFF)));
+    }
+    QVERIFY(sampleWords(levelCopy(wvFile(plainTags, samples), 0, 0)) == expected);
+}
+
+void TestJobs::keepsLongUnknownTags()
+{
+    QVERIFY(!levelCopy(wvFile(plainTags, words({1, 2}))).contains("MARKER LIST"));
+
+    // Longer than any block that they are copied in, with the name of a dropped tag in the middle.
+    const QByteArray longTag =
+        "{LONG: " + QByteArray(300000, 'a') + "{CLOCK MARKER:1" + QByteArray(65536, 'b') + '}';
+    const QByteArray dropped = "{CLOCK MARKER:" + QByteArray(200000, '1') + '}';
+    const QByteArray copy =
+        levelCopy(wvFile(plainTags + longTag + dropped + "{Z: }" + dropped, words({1, 2})), 0, 0);
+    QVERIFY(copy.contains("{SAMPLES:1}" + longTag + "{Z: }{WAVEFORM"));
+}
+
+void TestJobs::levelCopyCompletesMarkers()
+{
+    forRows({{"ends high", "{CONTROL LENGTH:4}{MARKER LIST 1: 0:0;2:1}", " 0:0;2:1", " 0:0"},
+             // Each trace goes on as its own list ends.
+             {"shorter than another list",
+              "{CONTROL LENGTH:4}{MARKER LIST 1: 0:1;3:0}{MARKER LIST 2: 0:0;1:1}", " 0:1;3:0",
+              " 0:0;1:1"},
+             {"longer than the samples", "{CONTROL LENGTH:20}{MARKER LIST 1: 0:0;5:1;15:0}",
+              " 0:0;5:1", " 0:0"}},
+            [](const QByteArray &tags, const QByteArray &first, const QByteArray &second) {
+                const QByteArray copy =
+                    levelCopy(wvFile(plainTags + tags, QByteArray(40, '\1')), 0, 0);
+                QCOMPARE(tag(copy, "CONTROL LENGTH"), " 10");
+                QCOMPARE(tag(copy, "MARKER LIST 1"), first);
+                QCOMPARE(tag(copy, "MARKER LIST 2"), second);
+            });
+}
+
+void TestJobs::levelDefaults()
+{
+    // What isn't given is what the samples measure; the written RMS offset is ratio - peak.
+    const double first = (0x4000 - 0.5) / 32767;
+    const double second = (100 - 0.5) / 32767;
+    const auto offset = [](double level) { return 20 * std::log10(1 / (level + 1e-7)); };
+    const double rms = offset(std::sqrt(first * first + second * second));
+    const double peak = offset(std::sqrt(2 * first * first));
+    forRows({{"both", Level(), Level(), rms, peak},
+             {"peak given", Level(-4.0), Level(), rms - peak + 4, 4.0},
+             {"ratio given", Level(), Level(2.0), peak + 2, peak}},
+            [](const Level &given, const Level &ratio, double writtenRms, double writtenPeak) {
+                const QByteArray copy =
+                    levelCopy(wvFile("{TYPE: TGX-WV,0}{CLOCK:1000}{LEVEL OFFS:3.5,1.25}",
+                                     words({0x4000, 0x4000, 100, 100})),
+                              given, ratio);
+                QCOMPARE(
+                    tag(copy, "LEVEL OFFS"),
+                    QByteArray(QString::asprintf("%.6f,%.6f", writtenRms, writtenPeak).toLatin1()));
+            });
+}
+
+void TestJobs::tagTexts()
+{
+    forRows({{"braces", "a{bc}d", "ac", 1},
+             {"brace pair", "x{}y", "xy", 1},
+             {"tag in a tag", "a{SAMPLES:1}{", "aAMPLES:1", 1},
+             {"brace before a line break", "a\n{\nWAVEFORM-5:#}}", "a\nWAVEFORM-5:#", 2},
+             {"umlaut", QString::fromUtf8("Prüf"), QString::fromUtf8("Prüf"), 1},
+             {"tilde ends a text", "a~b", "a~b", 1}},
+            [](const QString &text, const QString &kept, int warnings) {
+                (void)takeLog();
+                QCOMPARE(tagText("comment", text), kept);
+                QCOMPARE(takeLog(Tracer::Warning).filter("comment").size(), warnings);
+            });
+}
+
+void TestJobs::showsNoNegativeZero()
+{
+    WvWriteJob record;
+    record.peakOffset = record.rmsOffset = -1e-5;
+    QCOMPARE(levelRows(record).at(1).value, "0.00 dB");
+    QCOMPARE(std::signbit(offsetDb(1.0)), false);
+    // The guard against silence shows in no digit that is written.
+    QVERIFY(std::fabs(offsetDb(0.5) - 20 * std::log10(2.0)) < 1e-9);
+    QVERIFY(std::fabs(offsetDb(0) - 240) < 1e-9);
+}
+
+void TestJobs::listsSegments()
+{
+    WvFileSummary summary;
+    summary.segmentCount = 1;
+    summary.segments = {{"b.wv", 2, 3, 2, 5e5, 1000, 1000000}};
+    const QStringList lines = infoText(summary).section("Segments:", 1).split('\n');
+    const QStringList expected{
+        "Segment 1: b.wv", "Clock: 500 kHz",    "Start Sample, Samples: 1000, 1000000",
+        "Play Time: 2 s",  "Peak Offset: 2 dB", "Peak/RMS: 1 dB"};
+    for (qsizetype i = 0; i < expected.size(); ++i) {
+        // After the count, the settings file and the two modes.
+        QCOMPARE(lines.value(4 + i).simplified(), expected.at(i));
+    }
 }
 
 QTEST_GUILESS_MAIN(TestJobs)

@@ -26,7 +26,6 @@ class TestSignalJobs : public QObject
 private slots:
     void seedsRepeat();
     void statesLevelsAndClock();
-    void reportsACreation();
     void reportsAConversion();
     void convertsLengths();
     void stopsAndSparesTheTarget();
@@ -108,22 +107,6 @@ void TestSignalJobs::statesLevelsAndClock()
                 QVERIFY(std::fabs(levels.value(1).toDouble() - peakOffset) < near);
                 QCOMPARE(tag(file, "CLOCK"), QByteArray::number(clock, 'f', 6));
             });
-}
-
-void TestSignalJobs::reportsACreation()
-{
-    CreateRequest request = requestFor(CreateKind::Am, path("out.wv"));
-    CreateJob job(request);
-    const JobRun run(job);
-    const QByteArray file = m_folder.load("out.wv");
-    const double crest = tag(file, "LEVEL OFFS").split(',').value(0).toDouble();
-    QCOMPARE(
-        run.report,
-        (QStringList{"Creating signal", "Level scaling", "Signal statistics",
-                     "Samples:     " + tag(file, "SAMPLES"), "Clock:       10.24 MHz",
-                     "Peak Offset: 0.00 dB", QString("Peak/RMS:    %1 dB").arg(crest, 0, 'f', 2),
-                     "Saving file", "Loop point: continuous", "Signal creation completed"}));
-    QCOMPARE(run.steps, (QStringList{"Creating waveform data...", "Scaling...", "Saving file..."}));
 }
 
 void TestSignalJobs::reportsAConversion()
