@@ -2,6 +2,7 @@
 #include "jobrun.h"
 #include "jobs/CreateJob.h"
 #include "jobs/ResampleJob.h"
+#include "support/FullDisk.h"
 #include "support/files.h"
 #include "support/logreader.h"
 #include "support/rows.h"
@@ -12,9 +13,7 @@
 
 #include <algorithm>
 #include <cmath>
-#include <csignal>
 #include <memory>
-#include <sys/resource.h>
 #include <utility>
 
 /// The jobs that make and convert signals, from request to file: what they state, report, repeat,
@@ -170,9 +169,6 @@ void TestSignalJobs::stopsAndSparesTheTarget()
     const QString mine = folder.path("mine.wv");
     const QByteArray before = toneFile(50'000);
     QVERIFY(folder.store("mine.wv", before));
-    rlimit whole{};
-    QCOMPARE(getrlimit(RLIMIT_FSIZE, &whole), 0);
-    const auto oldHandler = std::signal(SIGXFSZ, SIG_IGN);
     const auto check = [&](bool creates, const QString &at, bool cancels, const QString &report) {
         std::unique_ptr<ToolJob> job;
         if (creates) {
@@ -183,6 +179,7 @@ void TestSignalJobs::stopsAndSparesTheTarget()
             job = std::make_unique<ResampleJob>(request);
         }
         bool reached = false;
+        std::unique_ptr<FullDisk> full;
         Tracer listener;
         connect(&listener, &Tracer::TraceDataAvailable, this, [&] {
             if (takeLog(Tracer::DefaultMask).filter(at).isEmpty() || std::exchange(reached, true)) {
@@ -195,12 +192,11 @@ void TestSignalJobs::stopsAndSparesTheTarget()
                 }
                 job->cancel();
             } else {
-                const rlimit full{1000, whole.rlim_max};
-                setrlimit(RLIMIT_FSIZE, &full);
+                full = std::make_unique<FullDisk>(1000);
             }
         });
         const JobRun run(*job);
-        setrlimit(RLIMIT_FSIZE, &whole);
+        full.reset();
         QVERIFY(reached);
         QCOMPARE(run.outcome, cancels ? JobOutcome::Cancelled : JobOutcome::Failed);
         QCOMPARE(run.report.last(), report);
@@ -217,7 +213,6 @@ void TestSignalJobs::stopsAndSparesTheTarget()
               "Rescaling failed"},
              {"resample, saving", false, "Samples   :", true, "Resampling failed"}},
             check);
-    std::signal(SIGXFSZ, oldHandler);
 }
 
 QTEST_GUILESS_MAIN(TestSignalJobs)

@@ -34,11 +34,6 @@ const QByteArray headTags = "#DATE#{CLOCK:1000000.000000}{CLOCK MARKER:500000.00
                             "{LEVEL OFFS:3.010300,0.000000}{SAMPLES:2}";
 const QByteArray smallBlock = "{WAVEFORM-9: #" + words({32767, -32766, 0, 32767}) + '}';
 
-QString creating(const QString &path)
-{
-    return "1|Creating waveform file " + path + "...";
-}
-
 } // namespace
 
 class TestWvWriter : public QObject
@@ -49,10 +44,8 @@ private slots:
     void bytes();
     void markerTags();
     void levels();
-    void logLines();
     void refused();
     void failures();
-    void readWriteReadIdentity();
     void longMarkerLists();
     void cancelSparesWhatStoodThere();
 };
@@ -140,32 +133,6 @@ void TestWvWriter::levels()
         });
 }
 
-void TestWvWriter::logLines()
-{
-    WvWriteJob job = smallJob();
-    job.clock = 1.5;
-    job.levelsValid = false;
-    job.iSamples = {0.5F, 0};
-    job.qSamples = {0, 0};
-    job.markers = {0, 1};
-    WriteRun run;
-    QVERIFY(run.write(job));
-    QCOMPARE(run.log,
-             QStringList({creating(run.path), "1|Calculating Peak and RMS data from waveform...",
-                          "1|========== Signal Statistics ==========", "1|ARB clock :1.500 Hz",
-                          "1|MKR clock :500000.000 Hz", "1|Samples   :2",
-                          "1|RMS       : 0.35 (RMS-Offset:  9.03 dBfs)",
-                          "1|PEAK      : 0.50 (PK-Offset:  6.02 dBfs)", "1|Pk/Av     : 3.01 dB",
-                          "1|=======================================",
-                          "1|Creating marker trace from memory buffer...",
-                          "1|Waveform file generated."}));
-    // Levels that were given are taken, and told without a measured value.
-    job.levelsValid = true;
-    job.rmsOffset = 3.0103;
-    QVERIFY(run.write(job));
-    QVERIFY(run.log.contains("1|RMS       : 0.00 (RMS-Offset:  3.01 dBfs)"));
-}
-
 void TestWvWriter::refused()
 {
     const auto refuse = [](const WvWriteJob &job, BufferedIO *data, BufferedIO *markers,
@@ -210,42 +177,6 @@ void TestWvWriter::failures()
     WriteRun data;
     QVERIFY(!data.write(job, cut.stream()));
     QVERIFY(data.log.contains("4|Error reading waveform data from temporary file."));
-}
-
-/// Samples, markers and unknown tags survive the way through the streams and a new file.
-void TestWvWriter::readWriteReadIdentity()
-{
-    QList<int> values;
-    for (int word = -32767; word <= 32767; ++word) {
-        values << word << -word;
-    }
-    const QByteArray source =
-        "{TYPE: TVX-WV,0}{COMMENT:c}{CLOCK:1000000}{FREE: text}{SAMPLES:65535}"
-        "{MARKER LIST 1: 0:1;100:0;65534:1}{MARKER LIST 2: 0:0;7:1;9:0}{MARKER LIST 4: 0:1;1:0}" +
-        sampleBlock(words(values));
-    ReadRun first(source, true);
-    QVERIFY2(first.read().ok, qPrintable(first.log.join('\n')));
-    WvWriteJob job;
-    job.type = typeForFormat(first.info.format);
-    job.clock = job.markerClock = first.info.clock;
-    job.samples = first.info.samples;
-    job.rmsOffset = first.info.rmsOffset;
-    job.peakOffset = first.info.peakOffset;
-    job.comment = first.info.comment;
-    job.levelsValid = true;
-    WriteRun run;
-    QVERIFY(run.write(job, first.info.dataStream, first.info.markerStream, first.info.tagsStream));
-    QVERIFY(run.bytes.startsWith("{TYPE: TVX-WV,0}{COMMENT:c}#DATE#{CLOCK:1000000.000000}"));
-    QVERIFY(run.bytes.contains("{SAMPLES:65535}{FREE: text}{CONTROL LENGTH: 65535}"
-                               "{MARKER LIST 1: 0:1;100:0;65534:1}{MARKER LIST 2: 0:0;7:1;9:0}"
-                               "{MARKER LIST 3: 0:0}{MARKER LIST 4: 0:1;1:0}" +
-                               sampleBlock(words(values))));
-    ReadRun second(run.bytes, true);
-    QVERIFY(second.read().ok);
-    QVERIFY(second.dataDevice.bytes == first.dataDevice.bytes);
-    QVERIFY(second.markers() == first.markers());
-    QCOMPARE(second.info.rmsOffset, first.info.rmsOffset);
-    QCOMPARE(second.info.rmsOffsetTag, QByteArray::number(first.info.rmsOffset, 'f', 6).toDouble());
 }
 
 /// Lists longer than one block of text, and transitions at the seams of the blocks.
