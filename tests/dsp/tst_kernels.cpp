@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "dsp/fft.h"
-#include "dsp/fir.h"
 #include "dsp/vectormath.h"
 #include "dsp/windows.h"
 #include "support/rows.h"
@@ -96,7 +95,6 @@ private slots:
     void fftEqualsDirectSum();
     void fftEqualsPlainForm();
     void windowsFollowTheirRows();
-    void sincFirIsALowPass();
     void sinesAreExact();
     void sinesOfNoNumber();
 };
@@ -170,27 +168,6 @@ void TestKernels::windowsFollowTheirRows()
     QVERIFY(applyWindow(four, 2));
     QCOMPARE(four[2].real(), windowList(4, 2)[2]);
     QVERIFY(!applyWindow({}, 1));
-}
-
-void TestKernels::sincFirIsALowPass()
-{
-    constexpr int n = 101;
-    constexpr double cutoff = 0.1;
-    const std::vector<double> h = sincFir(n, cutoff);
-    QCOMPARE(h[50], 1.0 * windowList(n, 1)[50]);
-    const auto gain = [&h](double frequency) {
-        Complex sum = 0;
-        for (std::size_t i = 0; i < h.size(); ++i) {
-            sum += h[i] * std::polar(1.0, -2 * pi * frequency * static_cast<double>(i));
-        }
-        return std::abs(sum);
-    };
-    // The ideal pulse sums to 1 / (2 cutoff).
-    QVERIFY(std::abs(gain(0.0) - 1 / (2 * cutoff)) < 0.001 * gain(0.0));
-    QVERIFY(std::abs(gain(cutoff) / gain(0.0) - 0.5) < 0.01); // -6 dB at the edge
-    for (double f = 0.14; f <= 0.5; f += 0.01) {
-        QVERIFY2(gain(f) < 3e-4 * gain(0.0), qPrintable(QString::number(f)));
-    }
 }
 
 void TestKernels::sinesAreExact()

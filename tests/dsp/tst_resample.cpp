@@ -125,7 +125,6 @@ private slots:
     void longRunsKeepTheirPlace();
     void threadsDontChangeTheResult();
     void filterMask();
-    void evenLengthLeadsByOneSample();
     void markers();
     void failures();
     void stepBeyondTheFilterFails();
@@ -198,19 +197,16 @@ void TestResample::longRunsKeepTheirPlace()
 void TestResample::threadsDontChangeTheResult()
 {
     const Samples samples = randomSamples(300000);
-    Samples results[2];
-    double offsets[2];
+    std::vector<std::pair<Samples, double>> results;
     for (const unsigned threads : {1U, 5U}) {
         setThreadLimit(threads);
         Run run;
         QVERIFY(run.prepare(samples, 301013));
         run.apply({.length = 50});
         QVERIFY(run.resample.run());
-        results[threads / 5] = readStream(*run.output.stream());
-        offsets[threads / 5] = run.resample.rmsOffset();
+        results.emplace_back(readStream(*run.output.stream()), run.resample.rmsOffset());
     }
     QVERIFY(results[0] == results[1]);
-    QCOMPARE(offsets[0], offsets[1]);
 }
 
 void TestResample::filterMask()
@@ -238,22 +234,6 @@ void TestResample::filterMask()
     QVERIFY(std::abs(gain(0.1) - 0.5) < 0.01);
     for (double f = 0.15; f <= 0.5; f += 0.01) {
         QVERIFY2(gain(f) < 1e-3, qPrintable(QString::number(f)));
-    }
-}
-
-void TestResample::evenLengthLeadsByOneSample()
-{
-    Samples impulse(300);
-    impulse[100] = 1;
-    for (const int length : {51, 50}) {
-        Run run;
-        QVERIFY(run.prepare(impulse, 300));
-        run.apply({.length = length});
-        QVERIFY(run.resample.run());
-        const Samples result = readStream(*run.output.stream());
-        const auto top = std::max_element(result.begin(), result.end(),
-                                          [](auto a, auto b) { return std::abs(a) < std::abs(b); });
-        QCOMPARE(top - result.begin(), length == 51 ? 100 : 99);
     }
 }
 

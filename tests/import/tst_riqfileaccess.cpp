@@ -139,16 +139,12 @@ void TestRiqFileAccess::refusesWithItsWords()
     };
     forRows({{"magic", block.with<qint32>(0, 0x12345678), "Invalid magic number in common header."},
              {"tag", block.with<qint16>(16, 902), "Invalid attribute tag in common header."},
-             {"version", block.with<qint16>(4, 0), at("Invalid version numbers in data")},
              {"no header", block.with<quint32>(24, 0x20000000), at("No optional header in data")},
-             {"no trace", block.with<qint16>(20, 0), at("Invalid trace length set in data")},
              {"negative", block.with<qint16>(20, -1), at("Invalid trace length set in data")},
              {"short header", block.with<qint8>(23, 55),
               at("Invalid opt. data block length found in data")},
              {"negative header", block.with<qint8>(23, -1),
               at("Invalid opt. data block length found in data")},
-             {"sample size", block.with<qint16>(30, 2),
-              at("Invalid number of bytes/sample set in data")},
              {"rate", block.with<qint32>(32, 0), at("Invalid sample rate set in data")},
              {"bandwidth", block.with<qint32>(40, 0), at("Invalid IF bandwidth set in data")}},
             [this, &block](const QByteArray &second, const QString &words) {
