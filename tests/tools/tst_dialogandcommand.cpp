@@ -33,14 +33,6 @@ using namespace toolwindow;
 
 namespace {
 
-/// For a look at a window: its picture goes to the folder of CORVANE_PICTURES, if that is set.
-void keepPicture(QWidget &window, const QString &name)
-{
-    if (const QString folder = qEnvironmentVariable("CORVANE_PICTURES"); !folder.isEmpty()) {
-        QVERIFY(window.grab().save(folder + '/' + name + ".png"));
-    }
-}
-
 /// Answers the question for a file with a name.
 Answer chooseFile(const QString &name)
 {
@@ -153,7 +145,6 @@ void TestDialogAndCommand::edits()
             child<QComboBox>(dialog, "cb_windowtype")->setCurrentText("Hann");
             type(child<QtNumericEdit>(dialog, "le_filterfreq"), "200k");
             type(child<QtNumericEdit>(dialog, "le_filterlength"), "101");
-            keepPicture(dialog, "filter");
         });
         click(dialog, "pb_next");
         compareWith({"filter", "tone.wv", "--type", "root-cosine", "--window", "hann",
@@ -164,16 +155,13 @@ void TestDialogAndCommand::edits()
         throughPages(dialog, [&dialog] {
             type(child<QtNumericEdit>(dialog, "le_filterrange"), "50");
             type(child<QtNumericEdit>(dialog, "le_filterfreq"), "20k");
-            keepPicture(dialog, "wrap");
         });
         click(dialog, "pb_next");
         compareWith({"wrap", "tone.wv", "--range", "50", "--cutoff", "20k"});
     }
     DlgPolar dialog;
-    throughPages(dialog, [&dialog] {
-        type(child<QtNumericEdit>(dialog, "le_am_amplitude"), "0.5");
-        keepPicture(dialog, "polar");
-    });
+    throughPages(dialog,
+                 [&dialog] { type(child<QtNumericEdit>(dialog, "le_am_amplitude"), "0.5"); });
     type(child<QLineEdit>(dialog, "le_outfile_2"), m_folder.path("amplitude.wv"));
     click(dialog, "pb_next");
     const CliRun run = CliRun::in(m_folder.path(), {"polar", "tone.wv", "--gain", "0.5", "--phase",
@@ -217,7 +205,6 @@ void TestDialogAndCommand::markers()
     apply("M 1", "Pattern", "1", "7");
     QCOMPARE(shown(0, 9), "150514151");
     apply("M 1", "Low", "1", "4321");
-    keepPicture(dialog, "markers");
     click(dialog, "rb_before");
     QCOMPARE(shown(0, 9), "111111111");
     click(dialog, "rb_after");
@@ -260,7 +247,6 @@ void TestDialogAndCommand::levels()
     QVERIFY(warning->text().startsWith("Warning: The crest factor"));
     type(crest, "-1");
     QVERIFY(warning->text().contains("below 0 dB"));
-    keepPicture(dialog, "level");
     type(peak, "-3");
     type(crest, "2.5");
     click(dialog, "pb_run");
@@ -353,14 +339,12 @@ void TestDialogAndCommand::exports()
     QCOMPARE(values->currentText(), "16 bit");
     type(child<QtNumericEdit>(dialog, "le_from"), "3000");
     values->setCurrentText("24 bit");
-    keepPicture(dialog, "export");
     click(dialog, "pb_run");
     QVERIFY2(report->toPlainText().contains("Export completed"), qPrintable(report->toPlainText()));
     const CliRun run = CliRun::in(m_folder.path(), {"export", "tone.wv", "--from", "3000", "--type",
                                                     "s24", "-o", "command.wav"});
     QCOMPARE(run.exitCode, 0);
     QVERIFY(m_folder.load("tone.wav") == m_folder.load("command.wav"));
-    keepPicture(dialog, "export-done");
     target->setText(m_folder.path("tone.csv"));
     QVERIFY(!values->isEnabled());
     target->setText(m_folder.path("tone.doc"));
