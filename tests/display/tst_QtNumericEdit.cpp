@@ -2,17 +2,13 @@
 #include "display/QtNumericEdit.h"
 #include "log/Tracer.h"
 #include "support/logreader.h"
+#include "support/modals.h"
 #include "support/rows.h"
 
 #include <QApplication>
-#include <QContextMenuEvent>
-#include <QMenu>
 #include <QSignalSpy>
 #include <QTest>
 #include <QVBoxLayout>
-#include <QWheelEvent>
-
-#include <algorithm>
 
 namespace {
 
@@ -46,30 +42,10 @@ struct Window
     }
 };
 
-/// Turns the wheel over a widget; tells whether the event was taken.
-bool turnWheel(QWidget *widget, int delta)
-{
-    const QPointF center = widget->rect().center();
-    QWheelEvent event(center, widget->mapToGlobal(center), QPoint(), QPoint(0, delta), Qt::NoButton,
-                      Qt::NoModifier, Qt::NoScrollPhase, false);
-    event.setAccepted(false);
-    QApplication::sendEvent(widget, &event);
-    return event.isAccepted();
-}
-
 void typeText(QWidget *widget, const QString &text)
 {
     QTest::keyClick(widget, Qt::Key_A, Qt::ControlModifier);
     QTest::keyClicks(widget, text);
-}
-
-/// Opens the field's context menu as the right button does; null if none appears.
-QMenu *openMenu(QtNumericEdit *field)
-{
-    const QPoint center = field->rect().center();
-    QContextMenuEvent event(QContextMenuEvent::Mouse, center, field->mapToGlobal(center));
-    QApplication::sendEvent(field, &event);
-    return qobject_cast<QMenu *>(QApplication::activePopupWidget());
 }
 
 } // namespace
@@ -212,7 +188,7 @@ void TestQtNumericEdit::stepping()
                     QTest::keyClick(w.field, key);
                     QCOMPARE(w.field->getVal(), expected);
                     w.field->setVal(start);
-                    QCOMPARE(turnWheel(w.field, 120 * direction), expected != start);
+                    QCOMPARE(turnWheel(*w.field, 120 * direction), expected != start);
                     QCOMPARE(w.field->getVal(), expected);
                 }
                 QCOMPARE(updates.count(), result != start ? 2 : 0);
@@ -244,18 +220,7 @@ void TestQtNumericEdit::contextMenu()
     w.field->setVal(1500);
     w.show();
     QSignalSpy updates(w.field, &QtNumericEdit::valueUpdated);
-    const auto choose = [&w](const QString &text) {
-        QMenu *menu = openMenu(w.field);
-        QVERIFY(menu);
-        const QList<QAction *> actions = menu->actions();
-        const auto found = std::find_if(actions.begin(), actions.end(),
-                                        [&](QAction *each) { return each->text() == text; });
-        QVERIFY2(found != actions.end() && (*found)->isEnabled(), qPrintable(text));
-        QTest::mouseClick(menu, Qt::LeftButton, Qt::NoModifier,
-                          menu->actionGeometry(*found).center());
-        QTRY_VERIFY(!QApplication::activePopupWidget());
-    };
-
+    const auto choose = [&w](const char *text) { QVERIFY2(chooseFromMenu(*w.field, text), text); };
     // The digit 5 of "1.5 kHz" weighs 100 Hz; the menu must not forget it by taking the focus.
     w.field->setCursorPosition(2);
     choose("Set Step from Csr");

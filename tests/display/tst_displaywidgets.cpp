@@ -6,45 +6,17 @@
 #include "displaysamples.h"
 #include "support/files.h"
 #include "support/logreader.h"
+#include "support/modals.h"
 
 #include <QApplication>
 #include <QClipboard>
-#include <QContextMenuEvent>
-#include <QMenu>
 #include <QMouseEvent>
 #include <QSignalSpy>
 #include <QTest>
-#include <QWheelEvent>
 
 #include <cmath>
 
 namespace {
-
-QMenu *openMenu(QWidget &widget)
-{
-    const QPoint center = widget.rect().center();
-    QContextMenuEvent event(QContextMenuEvent::Mouse, center, widget.mapToGlobal(center));
-    QApplication::sendEvent(&widget, &event);
-    return qobject_cast<QMenu *>(QApplication::activePopupWidget());
-}
-
-/// Chooses an entry of the context menu with the mouse.
-bool chooseEntry(QWidget &widget, const QString &text)
-{
-    QMenu *menu = openMenu(widget);
-    if (menu == nullptr) {
-        return false;
-    }
-    for (QAction *action : menu->actions()) {
-        if (action->text() == text && action->isEnabled()) {
-            QTest::mouseClick(menu, Qt::LeftButton, Qt::NoModifier,
-                              menu->actionGeometry(action).center());
-            return true;
-        }
-    }
-    menu->close();
-    return false;
-}
 
 /// Moves the mouse over a widget, with a button held or none.
 void moveTo(QWidget &widget, const QPointF &place, Qt::MouseButton held = Qt::NoButton)
@@ -135,12 +107,7 @@ void TestDisplayWidgets::traceMouse()
     QSignalSpy in(&trace, &CWidgetIQTrace::zoom_in);
     QSignalSpy out(&trace, &CWidgetIQTrace::zoom_out);
     for (const int delta : {120, -120, -120}) {
-        const QPointF center = trace.rect().center();
-        QWheelEvent event(center, trace.mapToGlobal(center), QPoint(), QPoint(0, delta),
-                          Qt::NoButton, Qt::NoModifier, Qt::NoScrollPhase, false);
-        event.setAccepted(false);
-        QApplication::sendEvent(&trace, &event);
-        QVERIFY(event.isAccepted());
+        QVERIFY(turnWheel(trace, delta));
     }
     QCOMPARE(in.count(), 1);
     QCOMPARE(out.count(), 2);
@@ -247,8 +214,8 @@ void TestDisplayWidgets::colorModesFromTheMenu()
     const QStringList names{"Black/White", "Blue", "Noise (Blue)", "Rainbow"};
     QList<QImage> pictures;
     for (const QString &name : names) {
-        QVERIFY(chooseEntry(spectrum, name));
-        QVERIFY(chooseEntry(constellation, name));
+        QVERIFY(chooseFromMenu(spectrum, name));
+        QVERIFY(chooseFromMenu(constellation, name));
         const QImage picture = spectrum.picture();
         QVERIFY(!pictures.contains(picture));
         pictures += picture;
@@ -259,7 +226,7 @@ void TestDisplayWidgets::colorModesFromTheMenu()
     QCOMPARE(constellation.colorMode(), 3);
     // The picture goes to the clipboard the same way.
     QApplication::clipboard()->clear();
-    QVERIFY(chooseEntry(spectrum, "Copy Picture"));
+    QVERIFY(chooseFromMenu(spectrum, "Copy Picture"));
     QCOMPARE(QApplication::clipboard()->image().convertToFormat(QImage::Format_RGB32),
              pictures.last().convertToFormat(QImage::Format_RGB32));
 }

@@ -43,13 +43,9 @@ void InstrListTest::init()
                                       "gateway=0\ngpib=5\n",
                                       2),
              qPrintable(m_simulator->errorOutput()));
-    const QString configuration = m_folder.filePath("visa.ini");
-    QFile file(configuration);
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.write(QString("[GPIB0]\nhost=127.0.0.1\nport=%1\naddresses=5,9,28\n")
-                   .arg(m_simulator->gatewayPort())
-                   .toLatin1());
-    qputenv("CORVANE_VISA_CONFIG", QFile::encodeName(configuration));
+    QVERIFY(m_folder.store("visa.ini", "[GPIB0]\nhost=127.0.0.1\naddresses=5,9,28\nport=" +
+                                           QByteArray::number(m_simulator->gatewayPort()) + '\n'));
+    qputenv("CORVANE_VISA_CONFIG", QFile::encodeName(m_folder.path("visa.ini")));
     QFile::remove(iniFile());
 
     m_dialog = std::make_unique<DlgInstrConfig>();

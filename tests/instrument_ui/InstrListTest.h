@@ -3,10 +3,10 @@
 
 #include "instrument/ui/DlgInstrConfig.h"
 #include "simulator/SimulatorProcess.h"
+#include "support/files.h"
 
 #include <QLabel>
 #include <QSignalSpy>
-#include <QTemporaryDir>
 #include <QTreeWidget>
 
 #include <memory>
@@ -55,9 +55,9 @@ protected:
     {
         return m_dialog->findChild<QLabel *>("l_hint")->isVisible();
     }
-    [[nodiscard]] QString iniFile() const { return m_folder.filePath("corvane.ini"); }
+    [[nodiscard]] QString iniFile() const { return m_folder.path("corvane.ini"); }
 
-    QTemporaryDir m_folder;
+    TestFolder m_folder;
     std::unique_ptr<SimulatorProcess> m_simulator;
     std::unique_ptr<DlgInstrConfig> m_dialog;
     std::unique_ptr<QSignalSpy> m_changes;

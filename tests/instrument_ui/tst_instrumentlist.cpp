@@ -1,11 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "instrument/InstrumentList.h"
 #include "instrument/LogRecorder.h"
+#include "support/files.h"
 #include "support/rows.h"
 
-#include <QFile>
 #include <QSettings>
-#include <QTemporaryDir>
 #include <QTest>
 
 namespace {
@@ -35,9 +34,9 @@ private slots:
     void readsWhatWasWrittenByHand();
 
 private:
-    [[nodiscard]] QString fileName() const { return m_folder.filePath("settings.ini"); }
+    [[nodiscard]] QString fileName() const { return m_folder.path("settings.ini"); }
 
-    QTemporaryDir m_folder;
+    TestFolder m_folder;
 };
 
 void TestInstrumentList::add()
@@ -138,11 +137,10 @@ void TestInstrumentList::shorterListLeavesNothingBehind()
 
 void TestInstrumentList::readsWhatWasWrittenByHand()
 {
-    QFile file(fileName());
-    QVERIFY(file.open(QIODevice::WriteOnly));
-    file.write("[General]\ninstr0=TCPIP::10.0.0.1::INSTR\nmodel0=TGX-870\ncomment0=left, below\n"
-               "instr1=\ninstr2=GPIB0::5::INSTR\n");
-    file.close();
+    QVERIFY(m_folder.store(
+        "settings.ini",
+        "[General]\ninstr0=TCPIP::10.0.0.1::INSTR\nmodel0=TGX-870\ncomment0=left, below\n"
+        "instr1=\ninstr2=GPIB0::5::INSTR\n"));
     InstrumentList list;
     list.read(QSettings(fileName(), QSettings::IniFormat));
     // The empty one is the end, whatever follows.

@@ -3,11 +3,14 @@
 
 #include <QAbstractButton>
 #include <QApplication>
+#include <QContextMenuEvent>
 #include <QInputDialog>
 #include <QLineEdit>
+#include <QMenu>
 #include <QMessageBox>
 #include <QTest>
 #include <QTimer>
+#include <QWheelEvent>
 
 #include <algorithm>
 
@@ -133,4 +136,35 @@ void cancelNextJob()
                   QTest::mouseClick(window.findChild<QAbstractButton *>("pb_cancel"),
                                     Qt::LeftButton);
               });
+}
+
+bool chooseFromMenu(QWidget &widget, const QString &text)
+{
+    const QPoint center = widget.rect().center();
+    QContextMenuEvent event(QContextMenuEvent::Mouse, center, widget.mapToGlobal(center));
+    QApplication::sendEvent(&widget, &event);
+    auto *menu = qobject_cast<QMenu *>(QApplication::activePopupWidget());
+    if (menu == nullptr) {
+        return false;
+    }
+    const QList<QAction *> actions = menu->actions();
+    const auto found = std::find_if(actions.begin(), actions.end(), [&](const QAction *each) {
+        return each->text() == text && each->isEnabled();
+    });
+    if (found == actions.end()) {
+        menu->close();
+        return false;
+    }
+    QTest::mouseClick(menu, Qt::LeftButton, {}, menu->actionGeometry(*found).center());
+    return QTest::qWaitFor([] { return QApplication::activePopupWidget() == nullptr; }, LimitMs);
+}
+
+bool turnWheel(QWidget &widget, int delta)
+{
+    const QPointF center = widget.rect().center();
+    QWheelEvent event(center, widget.mapToGlobal(center), {}, {0, delta}, Qt::NoButton,
+                      Qt::NoModifier, Qt::NoScrollPhase, false);
+    event.setAccepted(false);
+    QApplication::sendEvent(&widget, &event);
+    return event.isAccepted();
 }

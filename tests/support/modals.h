@@ -46,3 +46,10 @@ void whenModal(const Answer &action);
 
 /// Cancels the next job that runs long enough to show its progress.
 void cancelNextJob();
+
+/// Chooses an entry of the context menu of a widget's middle with the mouse. False if the menu
+/// doesn't come or has no such entry that is enabled.
+[[nodiscard]] bool chooseFromMenu(QWidget &widget, const QString &text);
+
+/// Turns the wheel over a widget's middle; tells whether the event was taken.
+bool turnWheel(QWidget &widget, int delta);
