@@ -6,6 +6,8 @@
 #include <sys/socket.h>
 #include <unistd.h>
 
+#include <algorithm>
+
 bool PeerConnection::send(std::string_view bytes)
 {
     while (!bytes.empty()) {
@@ -33,6 +35,14 @@ std::string PeerConnection::receive(std::size_t size)
     return bytes;
 }
 
+std::string PeerConnection::receiveSome(std::size_t most)
+{
+    std::string bytes(most, '\0');
+    const ssize_t count = ::recv(m_descriptor, bytes.data(), most, 0);
+    bytes.resize(static_cast<std::size_t>(std::max<ssize_t>(count, 0)));
+    return bytes;
+}
+
 std::string PeerConnection::receiveUntil(char last)
 {
     std::string bytes;
@@ -55,6 +65,14 @@ void PeerConnection::waitForClose()
 void PeerConnection::shutDown()
 {
     ::shutdown(m_descriptor, SHUT_RDWR);
+}
+
+void PeerConnection::reset()
+{
+    // To be connected to nobody ends a connection by a reset.
+    sockaddr nobody{};
+    nobody.sa_family = AF_UNSPEC;
+    ::connect(m_descriptor, &nobody, sizeof nobody);
 }
 
 ScriptedPeer::ScriptedPeer(Script script, const std::string &address, std::uint16_t port)

@@ -22,12 +22,16 @@ public:
     bool send(std::string_view bytes);
     /// Exactly so many bytes; less when the other side closed.
     std::string receive(std::size_t size);
+    /// What comes next, at most so many bytes; nothing when the other side closed.
+    std::string receiveSome(std::size_t most);
     /// Up to and with the byte; without it when the other side closed.
     std::string receiveUntil(char last);
     /// Returns when the other side has closed; throws what it sends away.
     void waitForClose();
     /// The other side sees the end; what was sent still arrives.
     void shutDown();
+    /// The other side sees a reset; what was sent may be lost.
+    void reset();
 
 private:
     int m_descriptor;
