@@ -169,7 +169,9 @@ std::vector<std::string> Link::fullHeader(bool common, bool absolute,
         return nodes;
     }
     std::vector<std::string> full;
-    if (!absolute) {
+    // No header of this instrument goes deeper; a message of relative ones must not pile them up.
+    constexpr std::size_t DeepestPath = 16;
+    if (!absolute && m_path.size() < DeepestPath) {
         full = m_path;
     }
     full.insert(full.end(), nodes.begin(), nodes.end());

@@ -94,7 +94,7 @@ void TcpServer::accept()
         (void)::setsockopt(fd.get(), IPPROTO_TCP, TCP_NODELAY, &on, sizeof(on));
         (void)::setsockopt(fd.get(), SOL_SOCKET, SO_KEEPALIVE, &on, sizeof(on));
         const std::lock_guard lock(m_mutex);
-        if (m_connections.size() >= MaxConnections) {
+        if (m_connections.size() >= MaxConnections && !endIdlest()) {
             continue;
         }
         Connection &connection = m_connections.emplace_back();
@@ -105,6 +105,30 @@ void TcpServer::accept()
             m_connections.pop_back();
         }
     }
+}
+
+bool TcpServer::endIdlest()
+{
+    // In milliseconds: whoever has said something within that time stays.
+    constexpr std::uint32_t LongIdle = 60'000;
+    Connection *idlest = nullptr;
+    std::uint32_t longest = LongIdle;
+    for (Connection &connection : m_connections) {
+        tcp_info info{};
+        socklen_t size = sizeof(info);
+        if (!connection.isLeaving &&
+            ::getsockopt(connection.fd.get(), IPPROTO_TCP, TCP_INFO, &info, &size) == 0 &&
+            info.tcpi_last_data_recv >= longest) {
+            longest = info.tcpi_last_data_recv;
+            idlest = &connection;
+        }
+    }
+    if (idlest == nullptr) {
+        return false;
+    }
+    idlest->isLeaving = true;
+    ::shutdown(idlest->fd.get(), SHUT_RDWR);
+    return true;
 }
 
 void TcpServer::serve(Connection &connection)

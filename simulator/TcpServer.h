@@ -23,7 +23,7 @@ public:
     /// socket was shut down.
     using Session = std::function<void(int fd)>;
 
-    /// Further connections are closed at once.
+    /// Further ones take the place of idle ones, or are closed at once if there is none.
     static constexpr std::size_t MaxConnections = 256;
 
     TcpServer() = default;
@@ -47,12 +47,15 @@ private:
         UniqueFd fd;
         std::thread thread;
         bool finished = false;
+        bool isLeaving = false; ///< told to end
     };
 
     void accept();
     void wake();
     void serve(Connection &connection);
     void join(bool all);
+    /// Ends the connection that has been idle for longest, if that was long. The list is locked.
+    [[nodiscard]] bool endIdlest();
 
     UniqueFd m_listener;
     UniqueFd m_wake; ///< an event: a connection ended, or all is to end

@@ -67,6 +67,42 @@ bool takeHislip(ResourceName &name)
     return true;
 }
 
+// An address of IPv6 stands in brackets, which keep its colons from separating sections.
+std::string withoutBrackets(const std::string &host)
+{
+    return host.starts_with('[') && host.ends_with(']') ? host.substr(1, host.size() - 2) : host;
+}
+
+std::string hostText(const std::string &host)
+{
+    return host.find(':') == std::string::npos ? host : '[' + host + ']';
+}
+
+// The sections of a resource string; nothing for one with a lonely colon or bracket.
+Sections sectionsOf(std::string_view text)
+{
+    const std::size_t open = text.find('[');
+    const std::size_t close = text.find(']');
+    Sections sections = split(text.substr(0, open), "::");
+    if (open != std::string_view::npos) {
+        if (close == std::string_view::npos || close < open || sections.size() != 2 ||
+            !sections.back().empty()) {
+            return {};
+        }
+        const Sections rest = split(text.substr(close + 1), "::");
+        if (!rest.front().empty()) {
+            return {};
+        }
+        sections.back() = text.substr(open, close - open + 1);
+        sections.insert(sections.end(), rest.begin() + 1, rest.end());
+    }
+    // A colon of a section would merge with the separator behind it.
+    const auto hasColon = [](const std::string &section) {
+        return !section.starts_with('[') && section.find(':') != std::string::npos;
+    };
+    return std::any_of(sections.begin(), sections.end(), hasColon) ? Sections() : sections;
+}
+
 std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
 {
     ResourceName name;
@@ -89,7 +125,7 @@ std::optional<ResourceName> parseTcpip(Sections sections, ViUInt16 board)
             return std::nullopt;
         }
     }
-    name.host = sections[1];
+    name.host = withoutBrackets(sections[1]);
     if (!isPlain(name.host)) {
         return std::nullopt;
     }
@@ -188,15 +224,11 @@ std::optional<ViUInt16> parseNumber(std::string_view text, ViUInt16 largest)
 
 std::optional<ResourceName> parseResourceName(std::string_view text)
 {
-    Sections sections = split(text, "::");
-    const std::string interface = upperCase(sections.front());
-    // A colon of a section would merge with the separator behind it.
-    const auto hasColon = [](const std::string &section) {
-        return section.find(':') != std::string::npos;
-    };
-    if (sections.size() < 2 || std::any_of(sections.begin(), sections.end(), hasColon)) {
+    Sections sections = sectionsOf(text);
+    if (sections.size() < 2) {
         return std::nullopt;
     }
+    const std::string interface = upperCase(sections.front());
     std::optional<ResourceName> name;
     if (const auto tcpip = boardNumber(interface, "TCPIP")) {
         name = parseTcpip(std::move(sections), *tcpip);
@@ -217,12 +249,13 @@ std::string resourceText(const ResourceName &name)
     const std::string board = std::to_string(name.board) + "::";
     switch (name.kind) {
     case ResourceKind::Vxi11:
-        return "TCPIP" + board + name.host + "::" + name.device + "::INSTR";
+        return "TCPIP" + board + hostText(name.host) + "::" + name.device + "::INSTR";
     case ResourceKind::Hislip:
-        return "TCPIP" + board + name.host + "::" + name.device +
+        return "TCPIP" + board + hostText(name.host) + "::" + name.device +
                (name.port == 0 ? std::string() : "," + std::to_string(name.port)) + "::INSTR";
     case ResourceKind::Socket:
-        return "TCPIP" + board + name.host + "::" + std::to_string(name.port) + "::SOCKET";
+        return "TCPIP" + board + hostText(name.host) + "::" + std::to_string(name.port) +
+               "::SOCKET";
     case ResourceKind::Usb: {
         std::array<char, 32> ids{};
         std::snprintf(ids.data(), ids.size(), "0x%04X::0x%04X::", unsigned{name.vendorId},

@@ -156,6 +156,8 @@ ViStatus UsbtmcTransport::write(std::span<const std::uint8_t> data, bool end,
             // Leaves the endpoint ready for the next command; the write has failed either way.
             if (error == ETIMEDOUT) {
                 (void)control(USBTMC_IOCTL_ABORT_BULK_OUT);
+            } else if (error == EPIPE) {
+                (void)control(USBTMC_IOCTL_CLEAR_OUT_HALT);
             }
             return error == EINTR ? VI_ERROR_TMO : statusOf(error);
         }
@@ -192,6 +194,8 @@ ViStatus UsbtmcTransport::read(std::span<std::uint8_t> buffer, const ReadOptions
             }
             if (error == ETIMEDOUT) {
                 (void)control(USBTMC_IOCTL_ABORT_BULK_IN);
+            } else if (error == EPIPE) {
+                (void)control(USBTMC_IOCTL_CLEAR_IN_HALT);
             }
             return error == EINTR ? VI_ERROR_TMO : statusOf(error);
         }

@@ -77,7 +77,7 @@ int runScan(InstrumentArguments &arguments)
 int runDoctor(InstrumentArguments &arguments)
 {
     const QString host = arguments.first.trimmed();
-    if (host.isEmpty() || host.contains("::")) {
+    if (host.isEmpty() || hostOf(resourceOf(host)) != host) {
         return arguments.console.wrongUsage("HOST: '" + host + "' is no host name or address");
     }
     DoctorJob job(host);

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "LanSearch.h"
 
+#include "remotepaths.h"
+
 #include "OperationControl.h"
 #include "portmapmessage.h"
 
@@ -170,7 +172,7 @@ void LanSearch::addVxi11(const QHostAddress &sender)
 {
     LanFinding &finding = findingAt(sender);
     finding.byVxi11 = true;
-    const QString resource = "TCPIP::" + sender.toString() + "::INSTR";
+    const QString resource = networkHead(sender.toString()) + "INSTR";
     if (!finding.resources.contains(resource)) {
         finding.resources.append(resource);
     }
@@ -178,7 +180,7 @@ void LanSearch::addVxi11(const QHostAddress &sender)
 
 void LanSearch::addRecords(const QHostAddress &sender, const QList<DnsRecord> &records)
 {
-    const QString head = "TCPIP::" + sender.toString() + "::";
+    const QString head = networkHead(sender.toString());
     QStringList resources;
     bool isInstrument = false;
     for (const DnsRecord &record : records) {

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "reachability.h"
 
+#include "remotepaths.h"
+
 #include "OperationControl.h"
 
 #include "log/Tracer.h"
@@ -64,7 +66,7 @@ void report(quint16 port, bool isOpen)
 
 QList<quint16> portsOf(const QString &resource)
 {
-    const QString device = resource.section("::", 2, 2);
+    const QString device = resourceSections(resource).value(2);
     if (!device.startsWith("hislip", Qt::CaseInsensitive)) {
         return {111, 5025};
     }
@@ -156,7 +158,7 @@ QList<bool> openPorts(const QList<QHostAddress> &addresses, const QList<quint16>
 
 bool isHostReachable(const QString &resource, const OperationControl &control)
 {
-    const QString host = resource.section("::", 1, 1);
+    const QString host = hostOf(resource);
     Tracer::Trace(Tracer::Information, QString("Trying to access device '%1'").arg(host));
     QString problem;
     const QList<QHostAddress> addresses = addressesOf(host, control, problem);

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "remotepaths.h"
 
+#include <QHostAddress>
+#include <QRegularExpression>
 #include <QStringList>
 
 #include <algorithm>
@@ -144,9 +146,26 @@ bool isSameName(const QString &one, const QString &other, bool unixFileSystem)
     return one.compare(other, unixFileSystem ? Qt::CaseSensitive : Qt::CaseInsensitive) == 0;
 }
 
+QStringList resourceSections(const QString &resource)
+{
+    static const QRegularExpression separator("::(?![^\\[]*\\])");
+    return resource.split(separator);
+}
+
+QString hostOf(const QString &resource)
+{
+    const QString host = resourceSections(resource).value(1);
+    return host.startsWith('[') && host.endsWith(']') ? host.mid(1, host.size() - 2) : host;
+}
+
+QString networkHead(const QString &host)
+{
+    return "TCPIP::" + (host.contains(':') ? '[' + host + ']' : host) + "::";
+}
+
 QString plainResource(const QString &resource)
 {
-    QStringList parts = resource.trimmed().toUpper().split("::");
+    QStringList parts = resourceSections(resource.trimmed().toUpper());
     // A number that is left out is 0, a kind that is left out INSTR.
     if (!parts.first().isEmpty() && !parts.first().back().isDigit()) {
         parts.first() += '0';
@@ -190,9 +209,11 @@ QList<RemoteFileEntry> parseCatalogue(const QString &answer)
 
 QString resourceOf(const QString &text)
 {
-    QString trimmed = text.trimmed();
-    if (trimmed.isEmpty() || trimmed.contains("::")) {
+    const QString trimmed = text.trimmed();
+    const bool isAddress = QHostAddress(trimmed).protocol() == QAbstractSocket::IPv6Protocol ||
+                           trimmed.startsWith('[');
+    if (trimmed.isEmpty() || (trimmed.contains("::") && !isAddress)) {
         return trimmed;
     }
-    return "TCPIP::" + trimmed + "::INSTR";
+    return networkHead(trimmed.startsWith('[') ? hostOf("::" + trimmed) : trimmed) + "INSTR";
 }

@@ -87,6 +87,15 @@ struct RemotePath
 /// Whether an instrument that takes no notice of the case of names has the one for the other.
 [[nodiscard]] bool isSameName(const QString &one, const QString &other, bool unixFileSystem);
 
+/// The parts of a resource string between its "::"; those of an IPv6 address in brackets are none.
+[[nodiscard]] QStringList resourceSections(const QString &resource);
+
+/// The host, without brackets, of a TCPIP resource.
+[[nodiscard]] QString hostOf(const QString &resource);
+
+/// "TCPIP::", a host, in brackets if it is an IPv6 address, and "::".
+[[nodiscard]] QString networkHead(const QString &host);
+
 /// A resource string by which two can be compared: the same for all spellings of one resource.
 [[nodiscard]] QString plainResource(const QString &resource);
 

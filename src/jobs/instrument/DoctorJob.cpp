@@ -6,6 +6,7 @@
 #include "instrument/VisaDevice.h"
 #include "instrument/portmapmessage.h"
 #include "instrument/reachability.h"
+#include "instrument/remotepaths.h"
 #include "log/Tracer.h"
 
 #include <QCoreApplication>
@@ -147,10 +148,10 @@ QStringList DoctorJob::roads(const QList<bool> &areOpen) const
 {
     QStringList resources;
     if (areOpen.at(PortMapper) && areOpen.at(PlainScpi)) {
-        resources.append("TCPIP::" + m_host + "::INSTR");
+        resources.append(networkHead(m_host) + "INSTR");
     }
     if (areOpen.at(Hislip)) {
-        resources.append("TCPIP::" + m_host + "::hislip0::INSTR");
+        resources.append(networkHead(m_host) + "hislip0::INSTR");
     }
     return resources;
 }
