@@ -15,8 +15,7 @@ AboutBox::AboutBox(QWidget *parent)
                     "arbitrary-waveform signal generators.</p>"
                     "<p>Made by the Corvane developers, Halvorn.<br/>"
                     "Apache License 2.0.</p>"
-                    "<p>Icons: Tango icon theme, public domain,<br/>"
-                    "and drawings of the project's own.</p>")
+                    "<p>Icons: drawings of the project's own.</p>")
                 .arg(programVersion(), CORVANE_BUILD_DATE));
     setStandardButtons(QMessageBox::Close);
     setEscapeButton(QMessageBox::Close);

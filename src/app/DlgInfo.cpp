@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgInfo.h"
 
+#include "appearance/lineicon.h"
 #include "jobs/CheckJob.h"
 #include "jobs/InfoReport.h"
 #include "ui_DlgInfo.h"
@@ -68,6 +69,7 @@ DlgInfo::DlgInfo(QWidget *parent)
     , m_ui(std::make_unique<Ui::DlgInfo>())
 {
     m_ui->setupUi(this);
+    m_ui->cb_close->setIcon(lineIcon("close"));
     m_ui->te_Info->document()->setDocumentMargin(12);
     m_ui->te_Info->document()->setDefaultStyleSheet("td { padding: 3px 6px; }");
     connect(m_ui->cb_close, &QPushButton::clicked, this, &DlgInfo::reject);

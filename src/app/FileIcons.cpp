@@ -1,23 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "FileIcons.h"
 
+#include "appearance/lineicon.h"
+
 #include <QFileInfo>
 #include <QStringList>
 
-QIcon FileIcons::picture(const QString &name)
-{
-    QIcon icon(":/icons16/" + name + ".png");
-    icon.addFile(":/icons32/" + name + ".png");
-    return icon;
-}
-
 FileIcons::FileIcons()
-    : m_drive(picture("drive"))
-    , m_folder(picture("folder"))
-    , m_waveform(picture("file_waveform"))
-    , m_text(picture("file_ascii"))
-    , m_settings(picture("file_settings"))
-    , m_binary(picture("file_binary"))
+    : m_drive(lineIcon("drive"))
+    , m_folder(lineIcon("folder"))
+    , m_waveform(lineIcon("file_waveform"))
+    , m_text(lineIcon("file_ascii"))
+    , m_settings(lineIcon("file_settings"))
+    , m_binary(lineIcon("file_binary"))
 {
 }
 

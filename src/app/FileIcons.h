@@ -13,9 +13,6 @@ class FileIcons : public QAbstractFileIconProvider
 public:
     FileIcons();
 
-    /// A picture by its name, such as "file_waveform".
-    [[nodiscard]] static QIcon picture(const QString &name);
-
     [[nodiscard]] QIcon icon(IconType type) const override;
     [[nodiscard]] QIcon icon(const QFileInfo &info) const override;
     [[nodiscard]] QString type(const QFileInfo &info) const override;

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "LogPanel.h"
 
+#include "appearance/lineicon.h"
 #include "base/OutputFile.h"
 #include "instrument/Transcript.h"
 
@@ -10,7 +11,6 @@
 #include <QComboBox>
 #include <QFileDialog>
 #include <QHBoxLayout>
-#include <QIcon>
 #include <QLabel>
 #include <QLineEdit>
 #include <QListWidget>
@@ -23,6 +23,7 @@
 namespace {
 
 constexpr int MaxLines = 256;
+constexpr int IconSize = 16;
 constexpr int LevelRole = Qt::UserRole;
 constexpr int Errors = Tracer::Error | Tracer::Severe;
 
@@ -42,12 +43,12 @@ constexpr std::array<LevelChoice, 3> LevelChoices{{
 QIcon levelIcon(int level)
 {
     if ((level & Errors) != 0) {
-        return QIcon(":/icons16/redflag.png");
+        return lineIcon("redflag");
     }
     if ((level & Tracer::Warning) != 0) {
-        return QIcon(":/icons16/yellowled.png");
+        return lineIcon("yellowled");
     }
-    return QIcon((level & Tracer::Debug) != 0 ? ":/icons16/debug.png" : ":/icons16/bulb.png");
+    return lineIcon((level & Tracer::Debug) != 0 ? "debug" : "bulb");
 }
 
 } // namespace
@@ -66,6 +67,7 @@ LogPanel::LogPanel(QListWidget *list)
     column->setContentsMargins(0, 0, 0, 0);
     column->setSpacing(2);
     addChoices();
+    m_list->setIconSize(QSize(IconSize, IconSize));
     column->addWidget(m_list);
     m_list->show();
     m_list->setContextMenuPolicy(Qt::CustomContextMenu);
@@ -200,9 +202,9 @@ void LogPanel::openMenu(const QPoint &position)
 {
     auto *menu = new QMenu(this);
     menu->setAttribute(Qt::WA_DeleteOnClose);
-    menu->addAction("Copy", this, &LogPanel::copy);
-    menu->addAction("Save...", this, &LogPanel::chooseFile);
-    menu->addAction("Select All", m_list, &QListWidget::selectAll);
+    menu->addAction(lineIcon("copy"), "Copy", this, &LogPanel::copy);
+    menu->addAction(lineIcon("save"), "Save...", this, &LogPanel::chooseFile);
+    menu->addAction(lineIcon("select_all"), "Select All", m_list, &QListWidget::selectAll);
     menu->addSeparator();
     QAction *transcript = menu->addAction("Record Instrument Transcript...");
     transcript->setToolTip("Adds each command and answer, with its time, to a text file");
@@ -210,6 +212,6 @@ void LogPanel::openMenu(const QPoint &position)
     transcript->setChecked(Transcript::isRunning());
     connect(transcript, &QAction::triggered, this, &LogPanel::toggleTranscript);
     menu->addSeparator();
-    menu->addAction("Clear", this, &LogPanel::clear);
+    menu->addAction(lineIcon("clear"), "Clear", this, &LogPanel::clear);
     menu->popup(m_list->viewport()->mapToGlobal(position));
 }

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MainWindow.h"
 
-#include "AboutBox.h"
 #include "GuideWindow.h"
 #include "LocalFileModel.h"
 #include "LogPanel.h"
@@ -9,6 +8,7 @@
 #include "QCustomTreeView.h"
 #include "appearance/ColorSet.h"
 #include "appearance/StyleSheet.h"
+#include "appearance/lineicon.h"
 #include "appearance/ui/DlgColors.h"
 #include "devicechoice.h"
 #include "display/CWidgetBase.h"
@@ -18,7 +18,6 @@
 #include "settingsstores.h"
 #include "splittersettings.h"
 #include "toolframe/QtProgressDialog.h"
-#include "toolframe/pictures.h"
 #include "toolframe/questions.h"
 #include "toolframe/windowplace.h"
 #include "ui_MainWindow.h"
@@ -43,9 +42,11 @@ constexpr int FrameWidth = 2;
 MainWindow::MainWindow()
     : m_ui(std::make_unique<Ui::AppMainWindow>())
 {
-    registerPictures();
     setAttribute(Qt::WA_DeleteOnClose);
     m_ui->setupUi(this);
+    for (QToolButton *button : {m_ui->tb_refresh_1, m_ui->tb_refresh_2}) {
+        button->setIcon(lineIcon("refresh"));
+    }
     m_panes[0] = {m_ui->w_pane_1,
                   m_ui->cb_dev_1,
                   m_ui->tb_instruments_1,
@@ -81,6 +82,8 @@ MainWindow::MainWindow()
     m_noVisa = arguments.contains("--no-visa");
     m_instrConfig = std::make_unique<DlgInstrConfig>(m_noVisa, this);
     m_colors = std::make_unique<DlgColors>(openColorStore(), this);
+    setGuidePage(*m_instrConfig, "connecting-an-instrument");
+    setGuidePage(*m_colors, "colors");
     connect(m_colors.get(), &DlgColors::colorsChanged, this, &MainWindow::slot_colors_updated);
 
     Tracer::setMask(arguments.contains("--debug") ? Tracer::DebugMask : Tracer::DefaultMask);
@@ -97,8 +100,7 @@ MainWindow::MainWindow()
     for (Pane &pane : m_panes) {
         pane.remoteModel = std::make_unique<RemoteDirModel>();
         pane.remoteModel->setDevice(pane.instrument.get());
-        pane.remoteModel->setIconProvider(
-            [](const QString &name) { return FileIcons::picture(name); });
+        pane.remoteModel->setIconProvider(&lineIcon);
         fillDeviceChoice(*pane.device, {});
     }
     connect(m_instrConfig.get(), &DlgInstrConfig::updateInstruments, this,
@@ -128,67 +130,6 @@ MainWindow::~MainWindow()
         pane.remoteModel.reset();
         pane.instrument.reset();
     }
-}
-
-void MainWindow::buildMenus()
-{
-    QMenu *file = menuBar()->addMenu("File");
-    m_modules.buildMenu(menuBar());
-    if (!file->isEmpty()) {
-        file->addSeparator();
-    }
-    addEntryMenu(*file);
-    file->addSeparator();
-    file->addAction(m_ui->actionExit);
-    QMenu *instrument = menuBar()->addMenu("Instrument");
-    instrument->addAction("Run!\tF9", this,
-                          [this] { paneOf(m_activePane->tree).tree->slot_runwaveform(); });
-    instrument->addAction(m_ui->actionInstrConfigure);
-    menuBar()->addMenu("Program")->addAction(m_ui->actionColors);
-    QMenu *help = menuBar()->addMenu("Help");
-    help->addAction(m_ui->actionGuide);
-    help->addAction(m_ui->actionAbout);
-
-    assignMnemonics(menuBar()->actions());
-    const QList<QAction *> menus = menuBar()->actions();
-    for (const QAction *menu : menus) {
-        assignMnemonics(menu->menu()->actions());
-    }
-    connect(m_ui->actionExit, &QAction::triggered, this, &MainWindow::close);
-    connect(m_ui->actionInstrConfigure, &QAction::triggered, this,
-            &MainWindow::menu_showinstrconfig);
-    m_ui->actionGuide->setShortcutContext(Qt::ApplicationShortcut); // in the tools, too
-    connect(m_ui->actionGuide, &QAction::triggered, this, &MainWindow::menu_showguide);
-    connect(m_ui->actionColors, &QAction::triggered, this, &MainWindow::menu_showcolors);
-    connect(m_ui->actionAbout, &QAction::triggered, this, &MainWindow::menu_about);
-    auto *refreshKey = new QShortcut(QKeySequence("Ctrl+R"), this);
-    connect(refreshKey, &QShortcut::activated, this,
-            [this] { refresh(paneOf(m_activePane->tree)); });
-}
-
-/// What the panes do at a key, for those who look into the menus first. The keys themselves belong
-/// to the trees, so that a text field keeps its own.
-void MainWindow::addEntryMenu(QMenu &menu)
-{
-    struct Entry
-    {
-        const char *text;
-        void (QCustomTreeView::*slot)();
-    };
-    constexpr Entry Entries[] = {
-        {"Open\tEnter", &QCustomTreeView::openCurrent},
-        {"Copy to Other Pane\tF5", &QCustomTreeView::copyToPeer},
-        {"Create Folder\tF7", &QCustomTreeView::slot_create},
-        {"Rename\tF2", &QCustomTreeView::slot_rename},
-        {"Delete\tDel", &QCustomTreeView::slot_remove},
-        {"Delete for Good\tShift+Del", &QCustomTreeView::removeForGood},
-        {"Set As Default Folder", &QCustomTreeView::slot_default},
-    };
-    for (const Entry &entry : Entries) {
-        menu.addAction(entry.text, this,
-                       [this, slot = entry.slot] { (paneOf(m_activePane->tree).tree->*slot)(); });
-    }
-    menu.addAction("Refresh\tCtrl+R", this, [this] { refresh(paneOf(m_activePane->tree)); });
 }
 
 void MainWindow::connectPane(Pane &pane)
@@ -249,38 +190,10 @@ bool MainWindow::eventFilter(QObject *watched, QEvent *event)
     return QMainWindow::eventFilter(watched, event);
 }
 
-void MainWindow::menu_about()
-{
-    AboutBox(this).exec();
-}
-
-void MainWindow::menu_showinstrconfig()
-{
-    m_instrConfig->show();
-    m_instrConfig->raise();
-    m_instrConfig->activateWindow();
-}
-
-void MainWindow::menu_showcolors()
-{
-    m_colors->show();
-    m_colors->raise();
-    m_colors->activateWindow();
-}
-
-void MainWindow::menu_showguide()
-{
-    if (!m_guide) {
-        m_guide = std::make_unique<GuideWindow>(this);
-    }
-    m_guide->show();
-    m_guide->raise();
-    m_guide->activateWindow();
-}
-
 void MainWindow::slot_colors_updated()
 {
     applyColors();
+    markActive(*m_activePane); // its picture is none of the style
     const QWidgetList widgets = QApplication::allWidgets();
     for (QWidget *widget : widgets) {
         if (auto *plot = qobject_cast<CWidgetBase *>(widget)) {
@@ -354,8 +267,10 @@ void MainWindow::openFiles(const QStringList &files)
 
 void MainWindow::markActive(const Pane &active)
 {
+    constexpr int MarkSize = 16;
     m_activePane = &active;
-    active.activeMark->setPixmap(QIcon(":/icons22/attach.png").pixmap(22, 22));
+    active.activeMark->setPixmap(
+        lineIcon("attach").pixmap(QSize(MarkSize, MarkSize), devicePixelRatioF()));
     otherPane(active).activeMark->clear();
     for (const Pane &pane : m_panes) {
         pane.frame->update();

@@ -2,6 +2,8 @@
 #include "ModulesDb.h"
 
 #include "DlgInfo.h"
+#include "GuideWindow.h"
+#include "appearance/lineicon.h"
 #include "composer/ui/DlgComposer.h"
 #include "import/ui/DlgWvFromData.h"
 #include "import/ui/DlgWvFromMat.h"
@@ -43,35 +45,52 @@ QMenu *findOrAddMenu(QMenuBar &bar, const QString &title)
     return bar.addMenu(title);
 }
 
+QIcon iconOf(const ToolInfo &tool)
+{
+    return tool.icon.isEmpty() ? QIcon() : lineIcon(tool.icon);
+}
+
 /// The tools, in the order of the menus.
 QList<ToolInfo> toolTable()
 {
     using enum ToolInfo::Selection;
-    ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {});
+    ToolInfo importData = toolInfo<DlgWvFromData>("Import Data", "/Import/From Data", File, {},
+                                                  "import_data", "imports");
     importData.preferredFor = {"TXT", "CSV", "DAT", "BIN", "WFM", "I", "Q"};
-    ToolInfo info = toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"});
+    ToolInfo info = toolInfo<DlgInfo>("Waveform Info", "/Analyze/File Info", File, {"WV"}, "info",
+                                      "waveform-info");
     info.tellsProperties = true;
-    ToolInfo view = toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"});
+    ToolInfo view =
+        toolInfo<DlgView>("View", "/Analyze/View Content", File, {"WV"}, "view", "view");
     view.preferredFor = {"WV"};
-    ToolInfo composer = toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"});
+    ToolInfo composer = toolInfo<DlgComposer>("Composer", "/Edit/Composer", FileOrFolder, {"CMS"},
+                                              "composer", "composer");
     composer.hasLeftWork = &DlgComposer::hasLeftWork;
     return {
         info,
         view,
-        toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}),
-        toolInfo<DlgExport>("Export", "/File/Export", File, {"WV"}),
+        toolInfo<DlgWvCreate>("Create Signal", "/File/Create", FileOrFolder, {}, "create",
+                              "create-signal"),
+        toolInfo<DlgExport>("Export", "/File/Export", File, {"WV"}, "export",
+                            "export-waveforms-for-other-programs"),
         importData,
-        toolInfo<DlgWvFromMat>("Import MATLAB", "/Import/From MATLAB", File, {"MAT"}),
-        toolInfo<DlgWvFromRiq>("Import RIQ", "/Import/From RIQ", File, {"RIQ"}),
-        toolInfo<DlgWvFromWav>("Import WAV", "/Import/From WAV", File, {"WAV"}),
-        toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {}),
-        toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}),
-        toolInfo<DlgFilter>("Filter", "/Edit/Filter", File, {"WV"}),
-        toolInfo<DlgRescale>("Level", "/Edit/Level", File, {"WV"}),
-        toolInfo<DlgMarker>("Edit Markers", "/Edit/Markers", File, {"WV"}),
-        toolInfo<DlgPolar>("To Polar", "/Edit/To Polar", File, {"WV"}),
+        toolInfo<DlgWvFromMat>("Import MATLAB", "/Import/From MATLAB", File, {"MAT"},
+                               "import_matlab", "imports"),
+        toolInfo<DlgWvFromRiq>("Import RIQ", "/Import/From RIQ", File, {"RIQ"}, "import_riq",
+                               "imports"),
+        toolInfo<DlgWvFromWav>("Import WAV", "/Import/From WAV", File, {"WAV"}, "import_wav",
+                               "imports"),
+        toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {},
+                               "import_analyzer",
+                               "import-from-analyzer-capture-view-trim-play-it-back"),
+        toolInfo<DlgResample>("Resample", "/Edit/Resample", File, {"WV"}, "resample", "resample"),
+        toolInfo<DlgFilter>("Filter", "/Edit/Filter", File, {"WV"}, "filter", "filter"),
+        toolInfo<DlgRescale>("Level", "/Edit/Level", File, {"WV"}, "level", "level"),
+        toolInfo<DlgMarker>("Edit Markers", "/Edit/Markers", File, {"WV"}, "markers", "markers"),
+        toolInfo<DlgPolar>("To Polar", "/Edit/To Polar", File, {"WV"}, "polar", "to-polar"),
         composer,
-        toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}),
+        toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}, "wrap",
+                                "analyze-wraparound"),
     };
 }
 
@@ -106,7 +125,7 @@ void ModulesDb::buildMenu(QMenuBar *bar)
         if (title.isEmpty() || entry.isEmpty()) {
             continue;
         }
-        QAction *action = findOrAddMenu(*bar, title)->addAction(entry);
+        QAction *action = findOrAddMenu(*bar, title)->addAction(iconOf(tool.info), entry);
         action->setEnabled(false);
         connect(action, &QAction::triggered, this, &ModulesDb::menuActionTriggered);
         m_menuActions.append({action, &tool.info});
@@ -117,7 +136,7 @@ QList<ModulesDb::ToolAction> ModulesDb::contextActions(QObject *parent) const
 {
     QList<ToolAction> actions;
     for (const Tool &tool : m_tools) {
-        actions.append({new QAction(tool.info.name, parent), &tool.info});
+        actions.append({new QAction(iconOf(tool.info), tool.info.name, parent), &tool.info});
     }
     return actions;
 }
@@ -166,6 +185,7 @@ DlgBase &ModulesDb::dialog(const ToolInfo &info)
     Q_ASSERT(tool != m_tools.end());
     if (!tool->dialog) {
         tool->dialog = info.make();
+        setGuidePage(*tool->dialog, info.guidePage);
         tool->dialog->instrumentsUpdated(m_instruments);
         connect(tool->dialog.get(), &DlgBase::openRequested, this, &ModulesDb::open);
         if (!m_settingsFile.isEmpty()) {

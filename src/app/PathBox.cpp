@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "PathBox.h"
 
+#include "appearance/lineicon.h"
+
 #include <QComboBox>
 #include <QCompleter>
 #include <QDir>
@@ -8,7 +10,6 @@
 #include <QHBoxLayout>
 #include <QLineEdit>
 #include <QSignalBlocker>
-#include <QStyle>
 #include <QToolButton>
 
 namespace {
@@ -58,19 +59,19 @@ PathBox::PathBox(QComboBox *box, QHBoxLayout *row)
     });
     struct Button
     {
-        QStyle::StandardPixmap picture;
+        const char *icon;
         const char *name;
         const char *toolTip;
         void (PathBox::*request)();
     };
     const Button buttons[] = {
-        {QStyle::SP_FileDialogToParent, "tb_up", "Folder above (Backspace)", &PathBox::upRequested},
-        {QStyle::SP_DirHomeIcon, "tb_home", "Default folder", &PathBox::homeRequested},
+        {"up", "tb_up", "Folder above (Backspace)", &PathBox::upRequested},
+        {"home", "tb_home", "Default folder", &PathBox::homeRequested},
     };
     for (const Button &button : buttons) {
         auto *made = new QToolButton;
         made->setObjectName(button.name + m_box->objectName().right(1).prepend('_'));
-        made->setIcon(m_box->style()->standardIcon(button.picture));
+        made->setIcon(lineIcon(button.icon));
         made->setToolTip(button.toolTip);
         made->setAutoRaise(true);
         made->setFocusPolicy(Qt::NoFocus); // the keys stay in the tree

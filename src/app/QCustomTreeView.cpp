@@ -2,6 +2,7 @@
 #include "QCustomTreeView.h"
 
 #include "PaneFiles.h"
+#include "appearance/lineicon.h"
 #include "deviceactions.h"
 #include "instrument/remotepaths.h"
 #include "mnemonics.h"
@@ -10,7 +11,6 @@
 #include <QAction>
 #include <QContextMenuEvent>
 #include <QHeaderView>
-#include <QIcon>
 #include <QMenu>
 #include <QRegularExpression>
 #include <QScrollBar>
@@ -38,7 +38,7 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     addOperation("Create Folder", "folder_new", Qt::Key_F7, &QCustomTreeView::slot_create);
     addOperation("Rename", "rename", Qt::Key_F2, &QCustomTreeView::slot_rename);
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
-    m_copyMenu->addAction("Copy to", this, &QCustomTreeView::slot_copy);
+    m_copyMenu->addAction(lineIcon("copy"), "Copy to", this, &QCustomTreeView::slot_copy);
     addKeys(Qt::Key_F5, &QCustomTreeView::copyToPeer);
     addKeys(Qt::ShiftModifier | Qt::Key_Delete, &QCustomTreeView::removeForGood);
     addKeys(QKeySequence::Copy, &QCustomTreeView::copyToClipboard);
@@ -64,7 +64,7 @@ QCustomTreeView::~QCustomTreeView() = default;
 QAction *QCustomTreeView::addOperation(const QString &text, const QString &picture,
                                        const QKeySequence &key, Slot slot)
 {
-    QAction *action = m_contextMenu->addAction(QIcon(":/icons16/" + picture + ".png"), text);
+    QAction *action = m_contextMenu->addAction(lineIcon(picture), text);
     action->setShortcut(key);
     action->setShortcutContext(Qt::WidgetShortcut);
     action->setShortcutVisibleInContextMenu(true);

@@ -4,6 +4,7 @@
 
 #include "ModulesDb.h"
 #include "PaneFiles.h"
+#include "appearance/lineicon.h"
 #include "deviceactions.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
@@ -16,7 +17,6 @@
 #include <QDrag>
 #include <QDragEnterEvent>
 #include <QGuiApplication>
-#include <QIcon>
 #include <QMenu>
 #include <QMimeData>
 #include <QMouseEvent>
@@ -65,7 +65,7 @@ void QCustomTreeView::startDrag(Qt::DropActions /*supportedActions*/)
     mime->setText(paths.join(PathSeparator));
     auto *drag = new QDrag(this);
     drag->setMimeData(mime);
-    drag->setPixmap(QIcon(":/icons32/file_waveform.png").pixmap(32, 32));
+    drag->setPixmap(lineIcon("file_waveform").pixmap(32, 32));
     drag->exec(Qt::CopyAction);
 }
 

@@ -4,10 +4,15 @@
 #include "AboutBox.h"
 #include "appearance/StyleSheet.h"
 #include "settingsstores.h"
-#include "toolframe/pictures.h"
 
 #include <QApplication>
 #include <QIcon>
+
+// Outside the namespace, as the macro wants it.
+static void initPictures()
+{
+    Q_INIT_RESOURCE(program);
+}
 
 namespace {
 
@@ -27,7 +32,7 @@ std::unique_ptr<QSettings> prepareApplication()
     QApplication::setApplicationName("corvane");
     QApplication::setApplicationVersion(programVersion());
     QGuiApplication::setDesktopFileName("org.halvorn.corvane");
-    registerPictures();
+    initPictures();
     QApplication::setWindowIcon(programIcon());
     auto colors = openColorStore();
     startColors(*colors);

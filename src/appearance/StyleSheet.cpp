@@ -2,6 +2,7 @@
 #include "StyleSheet.h"
 
 #include "ColorSet.h"
+#include "lineicon.h"
 
 #include <QApplication>
 #include <QColor>
@@ -290,8 +291,7 @@ QPalette applicationPalette()
     palette.setColor(QPalette::ToolTipBase, colorOf(TextBackground));
     palette.setColor(QPalette::ToolTipText, text);
     palette.setColor(QPalette::PlaceholderText, colorOf(AppTextDisabled));
-    const bool dark = luminance(colorOf(WindowBackground)) < luminance(text);
-    palette.setColor(QPalette::Link, colorOf(dark ? PeakTrace : AverageTrace));
+    palette.setColor(QPalette::Link, accentColor());
     for (const auto role : {QPalette::WindowText, QPalette::Text, QPalette::ButtonText}) {
         palette.setColor(QPalette::Disabled, role, colorOf(AppTextDisabled));
     }

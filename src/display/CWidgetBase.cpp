@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CWidgetBase.h"
 
+#include "appearance/lineicon.h"
 #include "plotexport.h"
 #include "view/plotscale.h"
 
@@ -160,9 +161,10 @@ void CWidgetBase::contextMenuEvent(QContextMenuEvent *event)
     if (!menu->isEmpty()) {
         menu->addSeparator();
     }
-    menu->addAction(tr("Copy Picture"), this, &CWidgetBase::copyPicture);
-    menu->addAction(tr("Save Picture..."), this, &CWidgetBase::choosePictureFile);
-    menu->addAction(tr("Save Data..."), this, &CWidgetBase::chooseDataFile)->setEnabled(hasData());
+    menu->addAction(lineIcon("copy"), tr("Copy Picture"), this, &CWidgetBase::copyPicture);
+    menu->addAction(lineIcon("save"), tr("Save Picture..."), this, &CWidgetBase::choosePictureFile);
+    menu->addAction(lineIcon("export"), tr("Save Data..."), this, &CWidgetBase::chooseDataFile)
+        ->setEnabled(hasData());
     menu->popup(event->globalPos());
     event->accept();
 }

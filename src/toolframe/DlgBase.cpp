@@ -1,12 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgBase.h"
 
-#include "pictures.h"
-
 DlgBase::DlgBase(QWidget *parent)
     : QDialog(parent)
 {
-    registerPictures();
     // Tools are windows beside the main window, some of them large: they can be maximised.
     setWindowFlags(Qt::Window | Qt::WindowTitleHint | Qt::WindowSystemMenuHint |
                    Qt::WindowMinMaxButtonsHint | Qt::WindowCloseButtonHint);

@@ -2,13 +2,12 @@
 #include "QtProgressDialog.h"
 
 #include "QtProgressWidget.h"
-#include "pictures.h"
 
+#include "appearance/lineicon.h"
 #include "base/vectorstate.h"
 
 #include <QApplication>
 #include <QCloseEvent>
-#include <QIcon>
 #include <QLabel>
 #include <QPushButton>
 #include <QVBoxLayout>
@@ -60,7 +59,6 @@ QtProgressDialog::QtProgressDialog(const QString &labelText, QWidget *parent,
     , m_bar(new QtProgressWidget)
     , m_cancelButton(new QPushButton(cancelText))
 {
-    registerPictures();
     setWindowTitle(parent ? parent->window()->windowTitle() : QCoreApplication::applicationName());
     setWindowModality(Qt::ApplicationModal);
     setMinimumWidth(420);
@@ -72,7 +70,7 @@ QtProgressDialog::QtProgressDialog(const QString &labelText, QWidget *parent,
     m_times->setForegroundRole(QPalette::PlaceholderText);
     m_bar->setObjectName("w_progress");
     m_cancelButton->setObjectName("pb_cancel");
-    m_cancelButton->setIcon(QIcon(":/icons16/cancel.png"));
+    m_cancelButton->setIcon(lineIcon("cancel"));
     m_cancelButton->setToolTip("Stop this operation");
 
     auto *layout = new QVBoxLayout(this);

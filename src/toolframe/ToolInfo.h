@@ -26,6 +26,9 @@ struct ToolInfo
     /// Whether Alt+Enter starts it.
     bool tellsProperties = false;
 
+    QString icon = {};      ///< name of its lineIcon(); empty for none
+    QString guidePage = {}; ///< its heading in the user guide, as links write it
+
     /// Whether a crash has left work of the tool that it offers at its next start; may be empty.
     std::function<bool()> hasLeftWork = {};
 
@@ -58,7 +61,14 @@ struct ToolInfo
 /// A tool whose dialog is of a class that needs nothing but a parent.
 template <typename Dialog>
 [[nodiscard]] ToolInfo toolInfo(const QString &name, const QString &menuPath,
-                                ToolInfo::Selection selection, const QStringList &extensions)
+                                ToolInfo::Selection selection, const QStringList &extensions,
+                                const QString &icon = {}, const QString &guidePage = {})
 {
-    return {name, menuPath, selection, extensions, [] { return std::make_unique<Dialog>(); }};
+    return {.name = name,
+            .menuPath = menuPath,
+            .selection = selection,
+            .extensions = extensions,
+            .make = [] { return std::make_unique<Dialog>(); },
+            .icon = icon,
+            .guidePage = guidePage};
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ToolWizard.h"
 
+#include "appearance/lineicon.h"
 #include "jobs/ReportText.h"
 #include "questions.h"
 #include "runjob.h"
@@ -52,6 +53,7 @@ void ToolWizard::setUpWizard()
     addViewButton();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
+    m_close->setIcon(lineIcon("close"));
     connect(m_close, &QPushButton::clicked, this, &ToolWizard::reject);
     showPage(0);
 }
@@ -90,7 +92,7 @@ void ToolWizard::addPresetMenu()
     if (row == rows.end() || findChild<QPushButton *>("pb_saveprofile") != nullptr) {
         return;
     }
-    m_preset = new QPushButton("Pre&set");
+    m_preset = new QPushButton(lineIcon("settings"), "Pre&set");
     QPushButton *button = m_preset;
     button->setObjectName("pb_preset");
     button->setToolTip("Save the fields of this tool in a file, or load them from one");
@@ -104,7 +106,7 @@ void ToolWizard::addPresetMenu()
 
 void ToolWizard::addViewButton()
 {
-    m_view = new QPushButton("&View", this);
+    m_view = new QPushButton(lineIcon("view"), "&View", this);
     m_view->setObjectName("pb_view");
     m_view->setToolTip("Look at the new file");
     m_view->setAutoDefault(false);

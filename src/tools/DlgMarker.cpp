@@ -3,6 +3,7 @@
 
 #include "ViewFrame.h"
 
+#include "appearance/lineicon.h"
 #include "base/limits.h"
 #include "jobs/MarkerJob.h"
 #include "log/Tracer.h"
@@ -58,7 +59,9 @@ QWidget *DlgMarker::makeControls()
     le_pattern->setValidator(
         new QRegularExpressionValidator(QRegularExpression("[01]+"), le_pattern));
     pb_apply->setObjectName("pb_apply");
+    pb_apply->setIcon(lineIcon("markers"));
     pb_undo->setObjectName("pb_undo");
+    pb_undo->setIcon(lineIcon("undo"));
     pb_undo->setToolTip("Take the last change back");
     rb_before->setObjectName("rb_before");
     rb_after->setObjectName("rb_after");

@@ -6,6 +6,7 @@
 #include "FiguresBox.h"
 #include "saveselection.h"
 
+#include "appearance/lineicon.h"
 #include "base/EngineeringNumber.h"
 #include "display/CWidgetConstellation.h"
 #include "display/CWidgetIQTrace.h"
@@ -48,6 +49,9 @@ DlgView::DlgView(QWidget *parent)
     m_ui->cb_ViewMode->addItems({"I/Q Envelope", "Log Mag Envelope", "Log Mag Average ",
                                  "Lin Mag Average", "Phase", "Frequency"});
     m_ui->cb_SpectrumMode->addItems({"Spectrum", "Waterfall", "CCDF"});
+    m_ui->pb_fix_ref->setIcon(lineIcon("set_ref"));
+    m_ui->pb_fix_ref->setToolButtonStyle(Qt::ToolButtonTextBesideIcon);
+    m_ui->cb_close->setIcon(lineIcon("close"));
     addPlots();
     addSideColumn();
     connect(m_ui->w_view, &ViewFrame::windowChanged, this, &DlgView::showWindow);
@@ -101,6 +105,7 @@ void DlgView::addSideColumn()
     m_ui->vl_side->insertWidget(m_ui->vl_side->indexOf(m_ui->gb_file), m_figures);
     m_saveSelection = new QPushButton("Save Se&lection...");
     m_saveSelection->setObjectName("pb_save_selection");
+    m_saveSelection->setIcon(lineIcon("save"));
     m_saveSelection->setToolTip("Save the samples from the one cursor to the other, both included");
     m_saveSelection->setAutoDefault(false);
     m_ui->vl_side->insertWidget(m_ui->vl_side->indexOf(m_ui->gb_delta) + 1, m_saveSelection);

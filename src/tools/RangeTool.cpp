@@ -3,6 +3,7 @@
 
 #include "ViewFrame.h"
 
+#include "appearance/lineicon.h"
 #include "display/CWidgetIQTrace.h"
 #include "display/QtNumericEdit.h"
 #include "display/TracePainter.h"
@@ -78,6 +79,8 @@ RangeTool::RangeTool(QString title, QString settingsGroup, QString suffix, QWidg
     buttons->addWidget(m_target, 1);
     buttons->addWidget(m_run);
     QPushButton *close = makeButton("cb_close", "Close", {});
+    close->setIcon(lineIcon("close"));
+    m_run->setIcon(lineIcon("render"));
     buttons->addWidget(close);
     auto *column = new QVBoxLayout(this);
     column->addWidget(m_view, 1);
@@ -125,8 +128,8 @@ QGroupBox *RangeTool::makeCursorBox()
                            : &RangeTool::slot_mkr_pos_time_user_2);
         auto *set = makeButton("pb_set_" + number, "Set",
                                "Set marker " + number + " to current cursor position");
-        auto *start = makeButton("pb_begin_" + number, "|<", "Move marker to beginning");
-        auto *end = makeButton("pb_end_" + number, ">|", "Move marker to end");
+        auto *start = makeButton("pb_begin_" + number, {}, "Move marker to beginning");
+        auto *end = makeButton("pb_end_" + number, {}, "Move marker to end");
         connect(set, &QPushButton::clicked, this, [this, which] {
             if (const qint64 sample = m_view->cursor(ViewFrame::Measuring); sample >= 0) {
                 moveCursor(which, sample + 1);
@@ -137,6 +140,12 @@ QGroupBox *RangeTool::makeCursorBox()
                 [this, which] { moveCursor(which, m_source ? m_source->info().samples : 1); });
         auto *label = new QLabel("Cursor " + number);
         label->setBuddy(cursor.position);
+        set->setIcon(lineIcon("set"));
+        start->setIcon(lineIcon("cursor_start"));
+        end->setIcon(lineIcon("cursor_end"));
+        for (QPushButton *button : {set, start, end}) {
+            button->setAccessibleName(button->toolTip());
+        }
         const std::array<QWidget *, 6> row{label, cursor.position, cursor.time, set, start, end};
         for (int column = 0; QWidget * widget : row) {
             grid->addWidget(widget, which, column++);
@@ -145,7 +154,8 @@ QGroupBox *RangeTool::makeCursorBox()
             field->setMinimumWidth(field->fontMetrics().horizontalAdvance("1234567890 us"));
         }
         for (QPushButton *button : {set, start, end}) {
-            button->setMaximumWidth(button->fontMetrics().horizontalAdvance("Set") + 24);
+            button->setMaximumWidth(button->fontMetrics().horizontalAdvance(button->text()) +
+                                    button->iconSize().width() + 28);
         }
     }
     return box;

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ViewFrame.h"
 
+#include "appearance/lineicon.h"
 #include "display/CWidgetIQTrace.h"
 #include "display/CWidgetOverview.h"
 #include "display/CWidgetTimeline.h"
@@ -95,25 +96,26 @@ void ViewFrame::addNavigation()
     struct Button
     {
         const char *name;
-        QString text;
+        const char *icon;
         const char *toolTip;
         const char *shortcut;
         void (ViewFrame::*slot)();
     };
     const Button buttons[] = {
-        {"pb_start", "|<", "Move to Beginning", "Home", &ViewFrame::slot_move_start},
-        {"pb_reverse", "<<", "Move Backwards", "PgUp", &ViewFrame::slot_reverse},
-        {"pb_reverse_little", "<", "Step Backwards", "Left", &ViewFrame::slot_reverse_little},
-        {"pb_play", QChar(0x25B6), "Start Playback", "Space", &ViewFrame::slot_play},
-        {"pb_stop", QChar(0x25A0), "Stop Playback", "S", &ViewFrame::slot_stop},
-        {"pb_forward_little", ">", "Step Forward", "Right", &ViewFrame::slot_forward_little},
-        {"pb_forward", ">>", "Move Forward", "PgDown", &ViewFrame::slot_forward},
-        {"pb_end", ">|", "Move to End", "End", &ViewFrame::slot_move_end},
-        {"pb_zoomin", "X+", "X Zoom In", "+", &ViewFrame::slot_zoomin},
-        {"pb_zoomout", QString("X") + QChar(0x2212), "X Zoom Out", "-", &ViewFrame::slot_zoomout},
-        {"pb_zoomin_y", "Y+", "Y Zoom In", "Ctrl++", &ViewFrame::slot_zoomin_y},
-        {"pb_zoomout_y", QString("Y") + QChar(0x2212), "Y Zoom Out", "Ctrl+-",
-         &ViewFrame::slot_zoomout_y},
+        {"pb_start", "jump_start", "Move to Beginning", "Home", &ViewFrame::slot_move_start},
+        {"pb_reverse", "move_back", "Move Backwards", "PgUp", &ViewFrame::slot_reverse},
+        {"pb_reverse_little", "step_back", "Step Backwards", "Left",
+         &ViewFrame::slot_reverse_little},
+        {"pb_play", "play", "Start Playback", "Space", &ViewFrame::slot_play},
+        {"pb_stop", "stop", "Stop Playback", "S", &ViewFrame::slot_stop},
+        {"pb_forward_little", "step_forward", "Step Forward", "Right",
+         &ViewFrame::slot_forward_little},
+        {"pb_forward", "move_forward", "Move Forward", "PgDown", &ViewFrame::slot_forward},
+        {"pb_end", "jump_end", "Move to End", "End", &ViewFrame::slot_move_end},
+        {"pb_zoomin", "zoom_in_x", "X Zoom In", "+", &ViewFrame::slot_zoomin},
+        {"pb_zoomout", "zoom_out_x", "X Zoom Out", "-", &ViewFrame::slot_zoomout},
+        {"pb_zoomin_y", "zoom_in_y", "Y Zoom In", "Ctrl++", &ViewFrame::slot_zoomin_y},
+        {"pb_zoomout_y", "zoom_out_y", "Y Zoom Out", "Ctrl+-", &ViewFrame::slot_zoomout_y},
     };
     constexpr int Side = 30;
     constexpr int Gap = 12;
@@ -123,7 +125,8 @@ void ViewFrame::addNavigation()
         }
         auto *made = new KeyButton;
         made->setObjectName(button.name);
-        made->setText(button.text);
+        made->setIcon(lineIcon(button.icon));
+        made->setAccessibleName(button.toolTip);
         made->setToolTip(button.toolTip);
         made->setShortcut(QKeySequence(button.shortcut));
         made->setMinimumSize(Side, Side);

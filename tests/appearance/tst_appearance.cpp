@@ -2,8 +2,10 @@
 #include "appearance/ColorSet.h"
 #include "appearance/QtColorTriangle.h"
 #include "appearance/StyleSheet.h"
+#include "appearance/lineicon.h"
 #include "appearance/ui/DlgColors.h"
 #include "display/QtNumericEdit.h"
+#include "log/Tracer.h"
 #include "support/files.h"
 #include "support/modals.h"
 #include "support/rows.h"
@@ -11,6 +13,7 @@
 #include <QAbstractButton>
 #include <QApplication>
 #include <QComboBox>
+#include <QDir>
 #include <QFile>
 #include <QFileDialog>
 #include <QLineEdit>
@@ -36,6 +39,7 @@ private slots:
     void setsComeBackFromFiles();
     void firstStartFollowsTheDesktop();
     void rulesCoverAllClasses();
+    void iconsFollowTheSet();
     void dialogEditsAndSaves();
     void triangleShowsAndPicks();
 
@@ -81,6 +85,10 @@ void TestAppearance::presetsCanBeRead()
         check(AppTextDisabled, {WindowBackground, TextBackground}, 3);
         for (int slot = static_cast<int>(TriggerSymbol); slot <= static_cast<int>(Ref4); ++slot) {
             check(static_cast<ColorSlot>(slot), {PanelBackground}, 3);
+        }
+        for (const ColorSlot ground : {WindowBackground, ButtonBase, TextBackground, Selection}) {
+            QVERIFY2(contrastRatio(accentColor(), colorOf(ground)) >= 3,
+                     qPrintable(colorSlotName(static_cast<int>(ground))));
         }
         check(GridLines, {PanelBackground}, 2);
         check(Borders, {WindowBackground, TextBackground}, 1.7);
@@ -223,6 +231,40 @@ void TestAppearance::rulesCoverAllClasses()
     QTest::keyClick(&field, Qt::Key_1);
     QCOMPARE(ground(), qRgb(200, 200, 230));
     qApp->setStyleSheet({});
+}
+
+void TestAppearance::iconsFollowTheSet()
+{
+    (void)lineIcon("copy"); // makes the drawings known
+    const QStringList drawings = QDir(":/icons").entryList();
+    QVERIFY(drawings.size() > 50);
+    const auto has = [](const QImage &picture, const QColor &color) {
+        for (int i = 0; i < picture.width() * picture.height(); ++i) {
+            if (picture.pixel(i % picture.width(), i / picture.width()) == color.rgb()) {
+                return true;
+            }
+        }
+        return false;
+    };
+    const QStringList lamps{"cancel", "device_offline", "redflag", "yellowled"};
+    for (const QString &drawing : drawings) {
+        const QIcon icon = lineIcon(drawing.chopped(4));
+        for (const ColorPreset preset : {ColorPreset::Copper, ColorPreset::Chalk}) {
+            setColorPreset(preset);
+            const QImage shown = icon.pixmap(QSize(16, 16), 2.0).toImage();
+            QCOMPARE(shown.size(), QSize(32, 32));
+            QVERIFY2(has(shown, colorOf(AppText)) || has(shown, accentColor()) ||
+                         lamps.contains(drawing.chopped(4)),
+                     qPrintable(drawing));
+            const QImage dimmed = icon.pixmap(QSize(16, 16), 2.0, QIcon::Disabled).toImage();
+            QVERIFY2(has(dimmed, colorOf(AppTextDisabled)), qPrintable(drawing));
+            QVERIFY2(!has(dimmed, colorOf(AppText)) && !has(dimmed, accentColor()),
+                     qPrintable(drawing));
+        }
+    }
+    (void)Tracer::takeEntries();
+    QVERIFY(lineIcon("nothing").isNull());
+    QCOMPARE(Tracer::takeEntries().size(), 1);
 }
 
 void TestAppearance::dialogEditsAndSaves()

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "InstrListTest.h"
 
+#include "appearance/lineicon.h"
 #include "instrument/LogRecorder.h"
 
 #include <QFile>
@@ -24,8 +25,7 @@ QString stateOf(const QTreeWidgetItem *item)
 {
     const QImage shown = item->icon(0).pixmap(16, 16).toImage();
     for (const char *state : {"online", "busy", "offline"}) {
-        if (shown ==
-            QIcon(QString(":/icons16/device_%1.png").arg(state)).pixmap(16, 16).toImage()) {
+        if (shown == lineIcon(QString("device_%1").arg(state)).pixmap(16, 16).toImage()) {
             return state;
         }
     }

@@ -5,6 +5,7 @@
 #include "appearance/QtColorTriangle.h"
 #include "appearance/QtCustomHorLine.h"
 #include "appearance/QtCustomLabel.h"
+#include "appearance/lineicon.h"
 #include "display/QtNumericEdit.h"
 #include "log/Tracer.h"
 
@@ -284,8 +285,9 @@ QWidget *DlgColors::buildButtons()
     auto *page = new QWidget;
     auto *row = new QHBoxLayout(page);
     row->setContentsMargins(0, 0, 0, 0);
-    const auto addButton = [&row, this](const QString &text, const QString &name, auto slot) {
-        auto *button = new QPushButton(text);
+    const auto addButton = [&row, this](const QString &icon, const QString &text,
+                                        const QString &name, auto slot) {
+        auto *button = new QPushButton(lineIcon(icon), text);
         button->setObjectName(name);
         button->setAutoDefault(false);
         row->addWidget(button);
@@ -293,10 +295,10 @@ QWidget *DlgColors::buildButtons()
     };
     m_takeOver->setAutoDefault(false); // Enter in a field takes its text alone
     m_pick->setAutoDefault(false);
-    addButton("&Load...", "pb_load", &DlgColors::slot_load);
-    addButton("Save &as...", "pb_saveas", &DlgColors::slot_saveas);
+    addButton("open", "&Load...", "pb_load", &DlgColors::slot_load);
+    addButton("save", "Save &as...", "pb_saveas", &DlgColors::slot_saveas);
     row->addStretch();
-    addButton("Close", "cb_close", &DlgColors::reject);
+    addButton("close", "Close", "cb_close", &DlgColors::reject);
     return page;
 }
 

@@ -4,6 +4,7 @@
 #include "DlgWvEdit.h"
 #include "DlgWvSettings.h"
 
+#include "appearance/lineicon.h"
 #include "composer/wholenumbers.h"
 #include "log/Tracer.h"
 
@@ -363,10 +364,16 @@ void CWidgetTrackEdit::extendContextMenu(QMenu &menu)
     QMenu *information = menu.addMenu(QStringLiteral("Center Information"));
     information->addActions(m_infoActions->actions());
     QMenu *zoomMenu = menu.addMenu(QStringLiteral("Zoom"));
-    zoomMenu->addAction(QStringLiteral("To Beginning"), this, &CWidgetTrackEdit::moveStart);
-    zoomMenu->addAction(QStringLiteral("To End"), this, &CWidgetTrackEdit::moveEnd);
-    zoomMenu->addAction(QStringLiteral("Fit All"), this, &CWidgetTrackEdit::zoomFit);
-    zoomMenu->addAction(QStringLiteral("Zoom In"), this, &CWidgetTrackEdit::zoomIn);
-    zoomMenu->addAction(QStringLiteral("Zoom Out"), this, &CWidgetTrackEdit::zoomOut);
+    const auto icon = [](const char *name) { return lineIcon(QString::fromLatin1(name)); };
+    zoomMenu->addAction(icon("jump_start"), QStringLiteral("To Beginning"), this,
+                        &CWidgetTrackEdit::moveStart);
+    zoomMenu->addAction(icon("jump_end"), QStringLiteral("To End"), this,
+                        &CWidgetTrackEdit::moveEnd);
+    zoomMenu->addAction(icon("zoom_fit"), QStringLiteral("Fit All"), this,
+                        &CWidgetTrackEdit::zoomFit);
+    zoomMenu->addAction(icon("zoom_in"), QStringLiteral("Zoom In"), this,
+                        &CWidgetTrackEdit::zoomIn);
+    zoomMenu->addAction(icon("zoom_out"), QStringLiteral("Zoom Out"), this,
+                        &CWidgetTrackEdit::zoomOut);
     menu.addAction(QStringLiteral("Set End to Cursor"), this, &CWidgetTrackEdit::set_wvend);
 }

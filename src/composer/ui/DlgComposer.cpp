@@ -5,6 +5,7 @@
 #include "DlgProgress.h"
 #include "formfields.h"
 
+#include "appearance/lineicon.h"
 #include "base/EngineeringNumber.h"
 #include "jobs/ComposeJob.h"
 #include "log/Tracer.h"
@@ -63,11 +64,16 @@ DlgComposer::DlgComposer(QWidget *parent)
 
 DlgComposer::~DlgComposer() = default;
 
-QPushButton *DlgComposer::addButton(QLayout *row, const char *objectName, const char *text,
-                                    const char *toolTip, const std::function<void()> &action)
+QPushButton *DlgComposer::addButton(QLayout *row, const char *objectName, const char *icon,
+                                    const char *text, const char *toolTip,
+                                    const std::function<void()> &action)
 {
     auto *button = named(objectName, new QPushButton(QString::fromLatin1(text), this));
     button->setToolTip(QString::fromLatin1(toolTip));
+    button->setAccessibleName(QString::fromLatin1(toolTip));
+    if (*icon != 0) {
+        button->setIcon(lineIcon(QString::fromLatin1(icon)));
+    }
     button->setAutoDefault(false);
     connect(button, &QPushButton::clicked, this, action);
     row->addWidget(button);
@@ -89,45 +95,48 @@ QLayout *DlgComposer::insertRow()
     row->addWidget(new QLabel(QStringLiteral("Waveform"), this));
     le_wvname->setAccessibleName(QStringLiteral("Waveform to insert"));
     row->addWidget(le_wvname, 1);
-    addButton(row, "pb_select", "...", "Select the Waveform to Insert", [this] {
+    addButton(row, "pb_select", "", "...", "Select the Waveform to Insert", [this] {
         slot_wvselect();
     })->setMaximumWidth(36);
     row->addSpacing(8);
-    addButton(row, "pb_insert", "Insert", "Insert at the Cursor, Moving What Follows",
+    addButton(row, "pb_insert", "insert", "Insert", "Insert at the Cursor, Moving What Follows",
               [this] { slot_insert(); });
-    addButton(row, "pb_overwrite", "Overwrite", "Replace What Lies Behind the Cursor",
+    addButton(row, "pb_overwrite", "overwrite", "Overwrite", "Replace What Lies Behind the Cursor",
               [this] { slot_overwrite(); });
-    addButton(row, "pb_extract", "Extract", "Remove the Segments at the Cursor, Closing the Gap",
-              [this] { slot_extract(); });
-    addButton(row, "pb_lift", "Lift", "Remove the Segments at the Cursor, Leaving a Gap",
+    addButton(row, "pb_extract", "extract", "Extract",
+              "Remove the Segments at the Cursor, Closing the Gap", [this] { slot_extract(); });
+    addButton(row, "pb_lift", "lift", "Lift", "Remove the Segments at the Cursor, Leaving a Gap",
               [this] { slot_lift(); });
-    pb_undo =
-        addButton(row, "pb_undo", "Undo", "Undo the last Action", [this] { m_tracks->popUndo(); });
-    pb_undo->setMinimumWidth(fontMetrics().horizontalAdvance(QStringLiteral("Undo (256)")) + 28);
+    pb_undo = addButton(row, "pb_undo", "undo", "Undo", "Undo the last Action",
+                        [this] { m_tracks->popUndo(); });
+    pb_undo->setMinimumWidth(fontMetrics().horizontalAdvance(QStringLiteral("Undo (256)")) +
+                             pb_undo->iconSize().width() + 32);
     return row;
 }
 
 QLayout *DlgComposer::viewRow()
 {
     auto *row = new QHBoxLayout;
-    addButton(row, "pb_start", "Start", "Show the Beginning", [this] { m_tracks->moveStart(); });
-    addButton(row, "pb_zoomin", "Zoom In", "Zoom In", [this] { m_tracks->zoomIn(); });
-    addButton(row, "pb_zoomout", "Zoom Out", "Zoom Out", [this] { m_tracks->zoomOut(); });
-    addButton(row, "pb_zoomfit", "Fit", "Show All", [this] { m_tracks->zoomFit(); });
-    addButton(row, "pb_end", "End", "Show the End", [this] { m_tracks->moveEnd(); });
+    addButton(row, "pb_start", "jump_start", "Start", "Show the Beginning",
+              [this] { m_tracks->moveStart(); });
+    addButton(row, "pb_zoomin", "zoom_in", "Zoom In", "Zoom In", [this] { m_tracks->zoomIn(); });
+    addButton(row, "pb_zoomout", "zoom_out", "Zoom Out", "Zoom Out",
+              [this] { m_tracks->zoomOut(); });
+    addButton(row, "pb_zoomfit", "zoom_fit", "Fit", "Show All", [this] { m_tracks->zoomFit(); });
+    addButton(row, "pb_end", "jump_end", "End", "Show the End", [this] { m_tracks->moveEnd(); });
     row->addStretch(1);
     row->addWidget(l_duration);
     row->addSpacing(12);
     row->addWidget(l_rate);
     row->addStretch(1);
     row->addWidget(new QLabel(QStringLiteral("Cursor"), this));
-    addButton(row, "pb_csr_begin", "|<", "Cursor to the Beginning", [this] {
+    addButton(row, "pb_csr_begin", "cursor_start", "", "Cursor to the Beginning", [this] {
         m_tracks->setCsrBegin();
     })->setMaximumWidth(36);
     row->addWidget(le_csr_sample);
     row->addWidget(new QLabel(QStringLiteral("Cursor Time"), this));
     row->addWidget(le_csr_time);
-    addButton(row, "pb_csr_end", ">|", "Cursor to the End", [this] {
+    addButton(row, "pb_csr_end", "cursor_end", "", "Cursor to the End", [this] {
         m_tracks->setCsrEnd();
     })->setMaximumWidth(36);
     for (QtNumericEdit *field : {le_csr_sample, le_csr_time}) {
@@ -136,7 +145,8 @@ QLayout *DlgComposer::viewRow()
     // The style makes buttons wider than their texts, which this row has no room for.
     for (const char *name : {"pb_start", "pb_zoomin", "pb_zoomout", "pb_zoomfit", "pb_end"}) {
         auto *button = findChild<QPushButton *>(QLatin1String(name));
-        button->setMaximumWidth(fontMetrics().horizontalAdvance(button->text()) + 24);
+        button->setMaximumWidth(fontMetrics().horizontalAdvance(button->text()) +
+                                button->iconSize().width() + 28);
     }
     return row;
 }
@@ -144,18 +154,23 @@ QLayout *DlgComposer::viewRow()
 QLayout *DlgComposer::documentRow()
 {
     auto *row = new QHBoxLayout;
-    addButton(row, "pb_addtrack", "Add Track", "Add an Empty Track", [this] { slot_addtrack(); });
-    addButton(row, "pb_deltrack", "Delete Track", "Delete the Selected Tracks",
+    addButton(row, "pb_addtrack", "track_add", "Add Track", "Add an Empty Track",
+              [this] { slot_addtrack(); });
+    addButton(row, "pb_deltrack", "track_delete", "Delete Track", "Delete the Selected Tracks",
               [this] { slot_deltrack(); });
-    addButton(row, "pb_clearall", "Clear All", "Delete Everything", [this] { slot_clearall(); });
+    addButton(row, "pb_clearall", "delete", "Clear All", "Delete Everything",
+              [this] { slot_clearall(); });
     row->addStretch(1);
-    addButton(row, "pb_settings", "Settings", "Clock, Length and File of the Target",
+    addButton(row, "pb_settings", "settings", "Settings", "Clock, Length and File of the Target",
               [this] { m_tracks->targetSettings(); });
-    addButton(row, "pb_load", "Load", "Load a Composition (Ctrl+O)", [this] { slot_load(); });
-    addButton(row, "pb_save", "Save", "Save the Composition (Ctrl+S)", [this] { slot_save(); });
+    addButton(row, "pb_load", "open", "Load", "Load a Composition (Ctrl+O)",
+              [this] { slot_load(); });
+    addButton(row, "pb_save", "save", "Save", "Save the Composition (Ctrl+S)",
+              [this] { slot_save(); });
     row->addStretch(1);
-    addButton(row, "pb_create", "Create", "Render the Waveform", [this] { slot_create(); });
-    addButton(row, "pb_close", "Close", "Close the Window", [this] { close(); });
+    addButton(row, "pb_create", "render", "Create", "Render the Waveform",
+              [this] { slot_create(); });
+    addButton(row, "pb_close", "close", "Close", "Close the Window", [this] { close(); });
     return row;
 }
 

@@ -65,7 +65,7 @@ private:
     [[nodiscard]] QLayout *insertRow();
     [[nodiscard]] QLayout *viewRow();
     [[nodiscard]] QLayout *documentRow();
-    QPushButton *addButton(QLayout *row, const char *objectName, const char *text,
+    QPushButton *addButton(QLayout *row, const char *objectName, const char *icon, const char *text,
                            const char *toolTip, const std::function<void()> &action);
     void addKeys();
     void refreshLabels();

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgProgress.h"
 
+#include "appearance/lineicon.h"
 #include "base/ProgressClock.h"
 #include "toolframe/runjob.h"
 
@@ -32,6 +33,8 @@ DlgProgress::DlgProgress(QWidget *parent)
     pb_close = buttons->addButton(QStringLiteral("Close"), QDialogButtonBox::RejectRole);
     pb_cancel->setObjectName(QStringLiteral("pb_cancel"));
     pb_close->setObjectName(QStringLiteral("pb_close"));
+    pb_cancel->setIcon(lineIcon(QStringLiteral("cancel")));
+    pb_close->setIcon(lineIcon(QStringLiteral("close")));
     auto *layout = new QVBoxLayout(this);
     layout->addLayout(bars);
     layout->addWidget(te_messages, 1);

@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ContentTree.h"
 
+#include "appearance/lineicon.h"
+
 #include <QHeaderView>
-#include <QIcon>
 #include <QSignalBlocker>
 
 namespace {
 
-constexpr char CancelIcon[] = ":/icons16/Resources/cancel.png";
 constexpr int KeyRole = Qt::UserRole;
 
 } // namespace
@@ -33,7 +33,7 @@ void ContentTree::addEntry(const QString &name, const QVariant &key, bool usable
         item->setCheckState(0, Qt::Unchecked);
     } else {
         item->setFlags(Qt::ItemIsEnabled | Qt::ItemIsSelectable);
-        item->setIcon(0, QIcon(CancelIcon));
+        item->setIcon(0, lineIcon("cancel"));
     }
     for (const auto &[label, value] : rows) {
         auto *row = new QTreeWidgetItem(item, {label, value});
@@ -47,7 +47,7 @@ void ContentTree::addDeadItem(const QString &text)
     const QSignalBlocker blocker(this);
     auto *item = new QTreeWidgetItem(this, {text});
     item->setFlags(Qt::ItemIsEnabled);
-    item->setIcon(0, QIcon(CancelIcon));
+    item->setIcon(0, lineIcon("cancel"));
     item->setFirstColumnSpanned(true);
 }
 

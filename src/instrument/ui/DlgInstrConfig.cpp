@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "DlgInstrConfig.h"
 
+#include "appearance/lineicon.h"
 #include "instrument/InstrumentSummary.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
 #include "jobs/instrument/LanScanJob.h"
 #include "jobs/instrument/ScanJob.h"
 #include "log/Tracer.h"
-#include "toolframe/pictures.h"
 #include "toolframe/runjob.h"
 #include "toolframe/windowplace.h"
 #include "ui_DlgInstrConfig.h"
@@ -48,8 +48,15 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     , m_ui(std::make_unique<Ui::DlgInstrConfig>())
     , m_noVisa(noVisa)
 {
-    registerPictures();
     m_ui->setupUi(this);
+    const std::pair<QPushButton *, const char *> icons[] = {
+        {m_ui->pb_add, "add"},       {m_ui->pb_scan_usb, "scan"},   {m_ui->pb_scan_gpib, "scan"},
+        {m_ui->pb_scan_lan, "scan"}, {m_ui->pb_refresh, "refresh"}, {m_ui->pb_delete, "delete"},
+        {m_ui->pb_clear, "clear"},   {m_ui->pb_close, "close"},
+    };
+    for (const auto &[button, icon] : icons) {
+        button->setIcon(lineIcon(icon));
+    }
     m_hint = new QLabel(noVisa ? "No instruments.\n\nThe program was started without VISA and "
                                  "cannot reach any."
                                : "No instruments yet.\n\nAdd one by its address above, or scan the "
@@ -108,7 +115,7 @@ void DlgInstrConfig::addActions()
         }
     });
     QAction *remove = add("&Delete", {QKeySequence::Delete});
-    remove->setIcon(QIcon(":/icons16/delete.png"));
+    remove->setIcon(lineIcon("delete"));
     connect(remove, &QAction::triggered, this, &DlgInstrConfig::instr_removedevice);
 }
 
@@ -408,7 +415,7 @@ QTreeWidgetItem *DlgInstrConfig::showItem(const InstrConfigEntry &entry, const Q
     item->setText(DeviceColumn, instrumentName(entry.model, entry.serial));
     item->setText(ValueColumn, entry.interface);
     item->setText(CommentColumn, entry.comment);
-    item->setIcon(DeviceColumn, QIcon(":/icons16/" + icon + ".png"));
+    item->setIcon(DeviceColumn, lineIcon(icon));
     item->setFlags(Qt::ItemIsEnabled | Qt::ItemIsSelectable | Qt::ItemIsUserCheckable);
     item->setCheckState(DeviceColumn, entry.enabled ? Qt::Checked : Qt::Unchecked);
     item->setToolTip(DeviceColumn, state);
