@@ -115,8 +115,9 @@ void MainWindow::menu_showguide()
     if (!m_guide) {
         m_guide = std::make_unique<GuideWindow>(this);
     }
-    m_guide->showPage(guidePageOf(QApplication::activeWindow()));
+    const QString page = guidePageOf(QApplication::activeWindow());
     m_guide->show();
+    m_guide->showPage(page); // its place depends on the width
     m_guide->raise();
     m_guide->activateWindow();
 }
