@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "MainWindow.h"
 
+#include "GeneratorLine.h"
 #include "GuideWindow.h"
 #include "LocalFileModel.h"
 #include "LogPanel.h"
@@ -55,6 +56,7 @@ MainWindow::MainWindow()
                   m_ui->l_win1,
                   new PathBox(m_ui->cb_entry1, m_ui->pathLayout_1),
                   m_ui->tv_dev_1,
+                  new GeneratorLine(m_ui->w_pane_1),
                   nullptr,
                   nullptr,
                   nullptr};
@@ -66,14 +68,17 @@ MainWindow::MainWindow()
                   m_ui->l_win2,
                   new PathBox(m_ui->cb_entry2, m_ui->pathLayout_2),
                   m_ui->tv_dev_2,
+                  new GeneratorLine(m_ui->w_pane_2),
                   nullptr,
                   nullptr,
                   nullptr};
     m_log = new LogPanel(m_ui->lw_log);
+    connect(&m_modules, &ModulesDb::sendRequested, this, &MainWindow::sendToInstrument);
     buildMenus();
     for (Pane &pane : m_panes) {
         pane.frame->layout()->setContentsMargins(FrameWidth + 1, FrameWidth + 1, FrameWidth + 1,
                                                  FrameWidth + 1);
+        pane.frame->layout()->addWidget(pane.generator);
         pane.frame->installEventFilter(this);
         pane.tree->setModules(&m_modules);
         pane.tree->setPeer(otherPane(pane).tree);
@@ -147,6 +152,8 @@ void MainWindow::connectPane(Pane &pane)
     connect(pane.tree, &QCustomTreeView::selectionLost, this, &MainWindow::slot_selectionLost);
     connect(pane.tree, &QCustomTreeView::otherPaneRequested, this,
             [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
+    connect(pane.tree, &QCustomTreeView::generatorChanged, pane.generator, &GeneratorLine::refresh);
+    connect(pane.generator, &GeneratorLine::said, this, &MainWindow::errMsg);
     connect(pane.path, &PathBox::pathChosen, this,
             [this, &pane](const QString &path) { goTo(pane, path); });
     connect(pane.path, &PathBox::upRequested, pane.tree, &QCustomTreeView::goUp);
@@ -307,6 +314,7 @@ void MainWindow::loadSettings()
     for (int pane = 0; pane < 2; ++pane) {
         m_panes.at(static_cast<std::size_t>(pane)).tree->readSettings(*settings, pane + 1);
     }
+    m_formerResources = settings->value("pane_resources").toStringList();
     m_modules.readAllSettings(*settings);
 }
 
@@ -321,6 +329,7 @@ void MainWindow::saveSettings()
         m_panes.at(static_cast<std::size_t>(pane)).tree->writeSettings(*settings, pane + 1);
     }
     if (m_knowsInstruments) {
+        settings->setValue("pane_resources", QStringList{m_panes[0].resource, m_panes[1].resource});
         m_instrConfig->writeSettings(*settings);
     }
     m_modules.writeAllSettings(*settings);
@@ -343,6 +352,7 @@ void MainWindow::readInstruments()
     m_asksInstruments = true; // with the events of the window going on
     m_instrConfig->readSettings(*openMainStore());
     m_knowsInstruments = true;
+    showAgain(m_formerResources);
 }
 
 void MainWindow::closeEvent(QCloseEvent *event)

@@ -7,6 +7,7 @@
 #include "instrument/VisaDevice.h"
 #include "log/Tracer.h"
 
+#include <QHash>
 #include <QMainWindow>
 #include <QString>
 
@@ -15,6 +16,7 @@
 
 class DlgColors;
 class DlgInstrConfig;
+class GeneratorLine;
 class GuideWindow;
 class LocalFileModel;
 class LogPanel;
@@ -86,9 +88,12 @@ private:
         QLabel *activeMark = nullptr;
         PathBox *path = nullptr;
         QCustomTreeView *tree = nullptr;
+        GeneratorLine *generator = nullptr;
         std::unique_ptr<LocalFileModel> localModel;
         std::unique_ptr<VisaDevice> instrument;
         std::unique_ptr<RemoteDirModel> remoteModel; ///< the files of the instrument
+        QString resource{};                ///< of the instrument that is shown; empty for the disk
+        QHash<QString, QString> visited{}; ///< where the user was on each of them
     };
 
     void buildMenus();
@@ -101,6 +106,8 @@ private:
     void showLocal(Pane &pane);
     void showInstrument(Pane &pane);
     [[nodiscard]] bool openInstrument(Pane &pane);
+    void showAgain(const QStringList &resources);
+    void sendToInstrument(const QString &path);
     [[nodiscard]] QString defaultFolder(const Pane &pane) const;
     [[nodiscard]] bool mayClose();
     void markActive(const Pane &active);
@@ -121,6 +128,7 @@ private:
     std::unique_ptr<GuideWindow> m_guide; ///< once it was asked for
     std::array<Pane, 2> m_panes;
     const Pane *m_activePane = nullptr;
+    QStringList m_formerResources; ///< of the panes when the program was closed
     QString m_locPath;
     QString m_absentLocPath;         ///< the default folder while it isn't there
     bool m_showsInstrConfig = false; ///< again when the window comes back

@@ -2,6 +2,7 @@
 // What the panes show: the local file system or one of the instruments.
 #include "MainWindow.h"
 
+#include "GeneratorLine.h"
 #include "LocalFileModel.h"
 #include "PathBox.h"
 #include "QCustomTreeView.h"
@@ -71,6 +72,7 @@ void MainWindow::refresh(Pane &pane)
     if (!RemotePaneFiles::answers(*pane.remoteModel) && openInstrument(pane)) {
         pane.tree->updateAndExpandTree(shown);
     }
+    pane.generator->showDevice(pane.instrument.get());
 }
 
 void MainWindow::newDeviceSelection(int /*iIndex*/)
@@ -85,8 +87,12 @@ void MainWindow::selectDevice(Pane &pane)
         const QSignalBlocker blocker(pane.device);
         pane.device->setCurrentIndex(0);
     }
+    if (const QString path = pane.tree->currentPath(); !path.isEmpty()) {
+        pane.visited.insert(pane.resource, path);
+    }
+    pane.resource = pane.device->currentData().toString();
     pane.tree->clearSelection();
-    const bool isLocal = pane.device->currentData().toString().isEmpty();
+    const bool isLocal = pane.resource.isEmpty();
     pane.path->restart(isLocal); // paths of another device lead nowhere
     if (isLocal) {
         showLocal(pane);
@@ -98,15 +104,17 @@ void MainWindow::selectDevice(Pane &pane)
 void MainWindow::showLocal(Pane &pane)
 {
     pane.tree->setModel(pane.localModel.get());
+    pane.generator->showDevice(nullptr);
     (void)pane.instrument->closeResource();
     pane.remoteModel->refresh();
     pane.tree->filterChanged(pane.filter->currentText());
-    pane.tree->updateAndExpandTree(m_locPath);
+    pane.tree->updateAndExpandTree(pane.visited.value({}, m_locPath));
 }
 
 void MainWindow::showInstrument(Pane &pane)
 {
     // The folders that were open on another instrument are of no meaning here.
+    pane.generator->showDevice(nullptr);
     (void)pane.instrument->closeResource();
     pane.remoteModel->refresh();
     pane.tree->setModel(pane.remoteModel.get());
@@ -116,7 +124,39 @@ void MainWindow::showInstrument(Pane &pane)
                       QString("Device is '%1' , Serial is '%2'")
                           .arg(pane.instrument->model(), pane.instrument->serial()));
     }
-    pane.tree->updateAndExpandTree(defaultFolder(pane));
+    pane.tree->updateAndExpandTree(pane.visited.value(pane.resource, defaultFolder(pane)));
+    pane.generator->showDevice(pane.instrument.get());
+}
+
+/// Those that are still in the list.
+void MainWindow::showAgain(const QStringList &resources)
+{
+    for (std::size_t i = 0; i < m_panes.size(); ++i) {
+        const QString resource = resources.value(static_cast<qsizetype>(i));
+        const int index = resource.isEmpty() ? -1 : m_panes.at(i).device->findData(resource);
+        if (index > 0) {
+            m_panes.at(i).device->setCurrentIndex(index);
+        }
+    }
+}
+
+/// That of the pane which isn't in use, or else of the other.
+void MainWindow::sendToInstrument(const QString &path)
+{
+    Pane &active = paneOf(m_activePane->tree);
+    Pane *target = &otherPane(active);
+    if (target->resource.isEmpty()) {
+        target = &active;
+    }
+    if (target->resource.isEmpty() || !target->instrument->isOpen()) {
+        slot_infoTextAvailable("No pane shows an instrument.\n"
+                               "Choose one in the list above a pane first.");
+        return;
+    }
+    show();
+    raise();
+    activateWindow();
+    target->tree->takeFile(path, defaultFolder(*target));
 }
 
 bool MainWindow::openInstrument(Pane &pane)

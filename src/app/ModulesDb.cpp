@@ -188,6 +188,7 @@ DlgBase &ModulesDb::dialog(const ToolInfo &info)
         setGuidePage(*tool->dialog, info.guidePage);
         tool->dialog->instrumentsUpdated(m_instruments);
         connect(tool->dialog.get(), &DlgBase::openRequested, this, &ModulesDb::open);
+        connect(tool->dialog.get(), &DlgBase::sendRequested, this, &ModulesDb::sendRequested);
         if (!m_settingsFile.isEmpty()) {
             QSettings settings(m_settingsFile, QSettings::IniFormat);
             tool->dialog->readSettings(settings);

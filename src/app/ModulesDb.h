@@ -84,6 +84,10 @@ public:
 private slots:
     void menuActionTriggered();
 
+signals:
+    /// A tool's user wants a waveform file on an instrument.
+    void sendRequested(const QString &path);
+
 private:
     struct Tool
     {

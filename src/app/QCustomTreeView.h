@@ -56,6 +56,11 @@ public:
     /// viewport, or into that of the file there.
     void offerCopy(const QCustomTreeView &source, const QStringList &paths, const QPoint &position);
 
+    /// Copies a file of the disk into the folder of the current entry, or the default one where
+    /// there is none, and offers to start it where it is a waveform on a generator. False if it
+    /// isn't there in the end.
+    bool takeFile(const QString &localPath, const QString &defaultFolder);
+
     /// Saves and restores the column widths of pane 1 or 2.
     void writeSettings(QSettings &settings, int pane);
     void readSettings(const QSettings &settings, int pane);
@@ -117,6 +122,9 @@ signals:
 
     /// The user wants to go on in the other pane.
     void otherPaneRequested();
+
+    /// A waveform was started on the instrument of the pane.
+    void generatorChanged();
 
     /// No entry is the current one any more.
     void selectionLost();

@@ -199,6 +199,31 @@ void QCustomTreeView::slot_copy()
     }
 }
 
+bool QCustomTreeView::takeFile(const QString &localPath, const QString &defaultFolder)
+{
+    if (isBusy() || isLocal()) {
+        return false;
+    }
+    const QString current = currentPath();
+    m_dropSources = {{localPath, 0}};
+    m_dropSourceDevice = nullptr;
+    m_dropTarget = folderOf(current.isEmpty() ? defaultFolder : current);
+    const QString outcome = copySources();
+    const QString sent = m_dropTarget + entryName(localPath);
+    updateAndExpandTree(sent);
+    emit errMsg(outcome);
+    if (currentPath() != sent) {
+        return false;
+    }
+    if (!device()->isAnalyzer() && isRunnable(sent, device()) &&
+        askYesNo(this, "Run!",
+                 QString("'%1' is on %2, %3.\nDo you want to start it?")
+                     .arg(entryName(sent), device()->model(), device()->serial()))) {
+        slot_runwaveform();
+    }
+    return true;
+}
+
 /// One after the other; after one that fails the user is asked.
 QString QCustomTreeView::copySources()
 {

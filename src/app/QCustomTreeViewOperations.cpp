@@ -26,6 +26,7 @@ void QCustomTreeView::slot_runwaveform()
     const QString path = currentPath();
     if (!isBusy() && isRunnable(path, device())) {
         emit errMsg(runWaveform(this, *device(), path));
+        emit generatorChanged();
     }
 }
 

@@ -9,6 +9,8 @@
 #include "toolframe/questions.h"
 #include "toolframe/runjob.h"
 
+#include <algorithm>
+
 namespace {
 
 /// Lets one window at a time ask for the user: the question, then the progress again.
@@ -41,6 +43,15 @@ QString replaceText(const QStringList &paths)
                      .arg(paths.size());
 }
 
+bool askMisfits(QWidget *parent, const QString &title, const QStringList &problems)
+{
+    constexpr qsizetype MostShown = 10;
+    const bool isCut = problems.size() > MostShown;
+    return askYesNo(parent, title,
+                    problems.first(std::min(problems.size(), MostShown)).join('\n') +
+                        (isCut ? "\n..." : "") + "\nDo you want to proceed all the same?");
+}
+
 QString outcomeText(const CopyJob &job, bool done)
 {
     if (!done && job.fileCount() <= 1) {
@@ -71,6 +82,10 @@ CopyOutcome copyEntry(QWidget *parent, const CopyRequest &request)
                 return askBetween(
                     [&] { return askYesNo(parent, "Overwrite File", replaceText(paths)); });
             },
+        .sendMisfits =
+            [&](const QStringList &problems) {
+                return askBetween([&] { return askMisfits(parent, "Send Waveform", problems); });
+            },
         .goOn =
             [&] {
                 return askBetween([&] {
@@ -92,8 +107,13 @@ bool isRunnable(const QString &path, const VisaDevice *device)
 QString runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
 {
     StartJob job({.device = &device}, path);
+    job.setCheck(WaveformCheck::Warned);
+    job.setQuestion([&](const QStringList &problems) {
+        return askBetween([&] { return askMisfits(parent, "Run!", problems); });
+    });
     const bool started = runJob(job, parent, nullptr) == JobOutcome::Finished;
-    return QString(started ? "'%1' plays on %2, %3."
-                           : "'%1' was not started on %2, %3; see the log.")
-        .arg(entryName(path), device.model(), device.serial());
+    const char *words = !started            ? "'%1' was not started on %2, %3; see the log."
+                        : job.isOutputOff() ? "'%1' plays on %2, %3; its RF output is off."
+                                            : "'%1' plays on %2, %3.";
+    return QString(words).arg(entryName(path), device.model(), device.serial());
 }

@@ -26,8 +26,10 @@ int runCheck(CheckArguments &arguments)
     if (arguments.resource.isEmpty() == arguments.model.isEmpty()) {
         return console.wrongUsage("give either --for RES or --model NAME");
     }
-    if (!arguments.model.isEmpty()) {
-        const std::optional<InstrumentSummary> model = summaryOfModel(arguments.model);
+    const bool namesModel = summaryOfModel(arguments.resource).has_value();
+    const QString modelName = namesModel ? arguments.resource : arguments.model;
+    if (!modelName.isEmpty()) {
+        const std::optional<InstrumentSummary> model = summaryOfModel(modelName);
         if (!model) {
             return console.wrongUsage("--model: '" + arguments.model +
                                       "' is no model that is known here");
@@ -38,7 +40,7 @@ int runCheck(CheckArguments &arguments)
     if (!needs) {
         return console.failed();
     }
-    if (arguments.model.isEmpty()) {
+    if (modelName.isEmpty()) {
         IdentifyJob job({.resource = resourceOf(arguments.resource)});
         if (const int exitCode = runInstrumentJob(console, job); exitCode != ExitDone) {
             return exitCode;
@@ -65,11 +67,12 @@ void addCheckCommand(CommandSet &commands)
         addCommand(commands.app, "check", "Tell whether an instrument can play a waveform",
                    commands.action, state, runCheck);
     addText(command, "file", state->file, "Waveform file")->type_name("FILE")->required();
-    addText(command, "--for", state->resource, "Instrument that is to play it")->type_name("RES");
+    addText(command, "--for", state->resource, "Instrument that is to play it, or its model")
+        ->type_name("RES|MODEL");
     addText(command, "--model", state->model,
             "Model that is to play it, with the largest memory that it is sold with")
         ->type_name("NAME");
     command.add_flag("--json", state->json, "Print JSON");
     command.footer("Exit status 3: it can't.\n"
-                   "Example: corvane-cli check a.wv --model TGX-870");
+                   "Example: corvane-cli check a.wv --for TGX-870");
 }

@@ -69,12 +69,22 @@ bool GeneratorControl::read(GeneratorState &state)
     }
     // Old errors would be taken for errors of these queries.
     (void)m_session.checkErrorQueue();
-    state.waveform = textOf(m_session.ask(arb("WAV:SEL?"), AnswerMs).value_or(QString()));
-    state.arb = switchOf(m_session.ask(arb("STAT?"), AnswerMs));
-    state.clockHz = numberOf(m_session.ask(arb("CLOC?"), AnswerMs));
-    state.frequencyHz = numberOf(m_session.ask(":FREQ?", AnswerMs));
-    state.levelDbm = numberOf(m_session.ask(":POW?", AnswerMs));
-    state.output = readOutput();
+    constexpr int MostSilences = 3; // of one that has said nothing at all
+    int silences = 0;
+    const auto ask = [&](const QString &query) -> std::optional<QString> {
+        if (silences == MostSilences) {
+            return std::nullopt;
+        }
+        std::optional<QString> answer = m_session.ask(query, AnswerMs);
+        silences = answer ? -MostSilences : silences + 1;
+        return answer;
+    };
+    state.frequencyHz = numberOf(ask(":FREQ?"));
+    state.levelDbm = numberOf(ask(":POW?"));
+    state.output = switchOf(ask(":OUTP?"));
+    state.waveform = textOf(ask(arb("WAV:SEL?")).value_or(QString()));
+    state.arb = switchOf(ask(arb("STAT?")));
+    state.clockHz = numberOf(ask(arb("CLOC?")));
     const bool isAnswered = state.arb || state.frequencyHz || state.levelDbm || state.output;
     return isAnswered || Tracer::fail("The instrument doesn't tell its state.");
 }

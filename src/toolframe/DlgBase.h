@@ -28,6 +28,9 @@ signals:
     /// The user wants to look at a file in the tool for its type.
     void openRequested(const QString &path);
 
+    /// The user wants a waveform file on the instrument that a pane shows.
+    void sendRequested(const QString &path);
+
 public slots:
     /// Saves the tool's group of settings.
     virtual void writeSettings(QSettings &settings);

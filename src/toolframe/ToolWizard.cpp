@@ -50,7 +50,7 @@ void ToolWizard::setUpWizard()
     Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
     limitTagTexts();
     addPresetMenu();
-    addViewButton();
+    addResultButtons();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
     m_close->setIcon(lineIcon("close"));
@@ -104,20 +104,31 @@ void ToolWizard::addPresetMenu()
     (*row)->insertWidget(0, button);
 }
 
-void ToolWizard::addViewButton()
+void ToolWizard::addResultButtons()
 {
-    m_view = new QPushButton(lineIcon("view"), "&View", this);
-    m_view->setObjectName("pb_view");
-    m_view->setToolTip("Look at the new file");
-    m_view->setAutoDefault(false);
-    m_view->hide();
+    m_view = addResultButton("pb_view", "&View", "Look at the new file");
+    m_view->setIcon(lineIcon("view"));
+    connect(m_view, &QPushButton::clicked, this, [this] { emit openRequested(m_result); });
+    m_send = addResultButton("pb_send", "&Send to Instrument",
+                             "Copy the new file to the instrument that a pane shows");
+    m_send->setIcon(lineIcon("copy_to"));
+    connect(m_send, &QPushButton::clicked, this, [this] { emit sendRequested(m_result); });
+}
+
+QPushButton *ToolWizard::addResultButton(const char *name, const QString &text, const QString &tip)
+{
+    auto *button = new QPushButton(text, this);
+    button->setObjectName(name);
+    button->setToolTip(tip);
+    button->setAutoDefault(false);
+    button->hide();
     const QList<QBoxLayout *> rows = findChildren<QBoxLayout *>();
     for (QBoxLayout *row : rows) {
         if (row->indexOf(m_previous) >= 0) {
-            row->insertWidget(row->indexOf(m_previous), m_view);
+            row->insertWidget(row->indexOf(m_previous), button);
         }
     }
-    connect(m_view, &QPushButton::clicked, this, [this] { emit openRequested(m_result); });
+    return button;
 }
 
 void ToolWizard::askAndLoad()
@@ -255,7 +266,9 @@ void ToolWizard::updateButtons()
     m_next->setEnabled(isComplete(page));
     m_next->setDefault(page != statusPage());
     m_close->setDefault(page == statusPage());
-    m_view->setVisible(page == statusPage() && !m_isRunning && !m_result.isEmpty());
+    const bool hasResult = page == statusPage() && !m_isRunning && !m_result.isEmpty();
+    m_view->setVisible(hasResult);
+    m_send->setVisible(hasResult && m_result.endsWith(".wv", Qt::CaseInsensitive));
 }
 
 /// A click on a button takes the focus, and with it the text, from a field; a key doesn't.

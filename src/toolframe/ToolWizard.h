@@ -97,7 +97,9 @@ private:
     void run();
     void limitTagTexts();
     void addPresetMenu();
-    void addViewButton();
+    void addResultButtons();
+    [[nodiscard]] QPushButton *addResultButton(const char *name, const QString &text,
+                                               const QString &tip);
     void askAndLoad();
     void askAndSave();
     void takeTypedValues() const;
@@ -109,7 +111,8 @@ private:
     QPushButton *m_close = nullptr;
     QPushButton *m_preset = nullptr; ///< null in a tool with buttons of its own
     QPushButton *m_view = nullptr;   ///< shown beside the report of a job that has ended well
-    QString m_result;                ///< what that job has written
+    QPushButton *m_send = nullptr;
+    QString m_result; ///< what that job has written
     QTextEdit *m_report = nullptr;
     bool m_isRunning = false;
 };

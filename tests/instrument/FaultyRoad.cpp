@@ -37,6 +37,13 @@ FaultyRoad::FaultyRoad(const std::string &address, std::string targetAddress,
 {
 }
 
+FaultyRoad::~FaultyRoad()
+{
+    const std::lock_guard lock(m_mutex);
+    m_isEnding = true;
+    m_end.notify_all();
+}
+
 void FaultyRoad::arm(const RoadFault &fault)
 {
     const std::lock_guard lock(m_mutex);
@@ -71,7 +78,8 @@ void FaultyRoad::carryReplies(PeerConnection &target, PeerConnection &client)
         }
         const RoadFault fault = faultOfNextReply();
         if (fault.kind == RoadFault::Late) {
-            std::this_thread::sleep_for(fault.delay);
+            std::unique_lock lock(m_mutex);
+            m_end.wait_for(lock, fault.delay, [this] { return m_isEnding; });
         } else if (fault.kind == RoadFault::Reset) {
             client.reset();
             break;

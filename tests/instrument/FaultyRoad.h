@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <condition_variable>
 #include <mutex>
 #include <string>
 
@@ -30,6 +31,7 @@ class FaultyRoad
 {
 public:
     FaultyRoad(const std::string &address, std::string targetAddress, std::uint16_t targetPort);
+    ~FaultyRoad();
 
     [[nodiscard]] std::uint16_t port() const { return m_peer.port(); }
 
@@ -49,6 +51,8 @@ private:
     std::uint16_t m_targetPort;
     std::mutex m_mutex;
     RoadFault m_fault;
+    bool m_isEnding = false;
+    std::condition_variable m_end;
     std::atomic<int> m_replyCount{0};
     std::atomic<bool> m_isSilent{false};
     ScriptedPeer m_peer; // last: its threads use the others

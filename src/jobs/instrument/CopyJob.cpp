@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "CopyJob.h"
 
+#include "waveformcheck.h"
+
 #include "base/ProgressClock.h"
 #include "instrument/VisaDevice.h"
 #include "instrument/remotepaths.h"
@@ -58,7 +60,7 @@ bool CopyJob::work()
     }
     const bool agreed = (!isFolderRequest() || !m_questions.proceed ||
                          m_questions.proceed(m_files.size(), m_totalBytes)) &&
-                        mayReplace();
+                        mayReplace() && maySend();
     if (!agreed) {
         cancel();
         return false;
@@ -172,6 +174,19 @@ bool CopyJob::mayReplace() const
         }
     }
     return existing.isEmpty() || m_questions.replace(existing);
+}
+
+bool CopyJob::maySend() const
+{
+    if (m_request.sourceDevice || !m_request.targetDevice || !m_questions.sendMisfits) {
+        return true;
+    }
+    const InstrumentSummary instrument = summaryOf(*m_request.targetDevice);
+    QStringList problems;
+    for (const File &file : m_files) {
+        problems += problemsOfFile(file.source, instrument, m_files.size() > 1, Doubts::LeftOut);
+    }
+    return problems.isEmpty() || m_questions.sendMisfits(problems);
 }
 
 bool CopyJob::copy(const File &file)

@@ -37,6 +37,9 @@ struct CopyQuestions
     /// Whether local files that exist may be replaced. A file on an instrument is replaced unasked.
     std::function<bool(const QStringList &paths)> replace;
 
+    /// Whether to send waveforms that the instrument can't play, for these reasons.
+    std::function<bool(const QStringList &problems)> sendMisfits;
+
     /// Whether to go on with the next file after one that failed.
     std::function<bool()> goOn;
 };
@@ -74,6 +77,7 @@ private:
     [[nodiscard]] bool collectRemote();
     void addFile(const QString &relativeName, qint64 bytes);
     [[nodiscard]] bool mayReplace() const;
+    [[nodiscard]] bool maySend() const;
     [[nodiscard]] bool copy(const File &file);
     [[nodiscard]] bool send(const QString &local, const QString &remote);
     [[nodiscard]] bool fetch(const QString &remote, const QString &local);

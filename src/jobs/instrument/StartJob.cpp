@@ -54,5 +54,13 @@ bool StartJob::isFit(VisaDevice &device)
     if (needs.samples == 0 && m_check != WaveformCheck::Strict) {
         return true;
     }
-    return mayPlay(waveformProblems(needs, summaryOf(device)), m_check);
+    const InstrumentSummary instrument = summaryOf(device);
+    const QStringList certain = waveformProblems(needs, instrument, Doubts::LeftOut);
+    if (m_question && m_check == WaveformCheck::Warned) {
+        if (!certain.isEmpty() && !m_question(certain)) {
+            cancel();
+        }
+        return !isCancelled();
+    }
+    return mayPlay(waveformProblems(needs, instrument), m_check);
 }

@@ -44,17 +44,11 @@ bool TransferJob::areFit(const VisaDevice &device)
                 return !isStrict || !local.endsWith(".wv", Qt::CaseInsensitive) ||
                        Tracer::fail(QString("The file '%1' is no waveform.").arg(local));
             }
-            const std::optional<WaveformNeeds> needs = needsOf(local);
-            if (!needs) {
-                return !isStrict;
+            if (isStrict && !needsOf(local)) {
+                return false;
             }
-            QStringList problems = waveformProblems(*needs, instrument);
-            if (m_request.locals.size() > 1) {
-                for (QString &problem : problems) {
-                    problem.prepend(local + ": ");
-                }
-            }
-            return mayPlay(problems, m_request.check);
+            return mayPlay(problemsOfFile(local, instrument, m_request.locals.size() > 1),
+                           m_request.check);
         });
 }
 

@@ -17,7 +17,7 @@ namespace {
 constexpr double LargestCount = 1e15;
 
 QStringList problemsOn(const WaveformNeeds &needs, const BasebandLimits &limits,
-                       const QString &owner)
+                       const QString &owner, Doubts doubts)
 {
     QStringList problems;
     if (limits.size > 0 && needs.samples > limits.size) {
@@ -31,7 +31,7 @@ QStringList problemsOn(const WaveformNeeds &needs, const BasebandLimits &limits,
                             .arg(engineeringText(needs.clockHz, "Hz"), owner,
                                  engineeringText(limits.clock, "Hz")));
     }
-    if (needs.clockHz > limits.bandwidth) {
+    if (doubts == Doubts::Told && needs.clockHz > limits.bandwidth) {
         problems.append(QString("At its clock of %1 the waveform may reach beyond the bandwidth of "
                                 "%2, which is %3.")
                             .arg(engineeringText(needs.clockHz, "Hz"), owner,
@@ -84,7 +84,8 @@ WaveformNeeds needsOfHead(const QByteArray &head)
             .clockHz = std::max(number("CLOCK"), 0.0)};
 }
 
-QStringList waveformProblems(const WaveformNeeds &needs, const InstrumentSummary &instrument)
+QStringList waveformProblems(const WaveformNeeds &needs, const InstrumentSummary &instrument,
+                             Doubts doubts)
 {
     if (instrument.analyzer) {
         return {QString("The %1 is an analyzer, which plays no waveforms.").arg(instrument.model)};
@@ -96,13 +97,30 @@ QStringList waveformProblems(const WaveformNeeds &needs, const InstrumentSummary
     for (size_t i = 0; i < instrument.baseband.size(); ++i) {
         if (const auto &limits = instrument.baseband[i]) {
             const QString owner = QString("baseband %1 of the %2").arg(i + 1).arg(instrument.model);
-            const QStringList problems = problemsOn(needs, *limits, owner);
+            const QStringList problems = problemsOn(needs, *limits, owner, doubts);
             if (!fewest || problems.size() < fewest->size()) {
                 fewest = problems;
             }
         }
     }
     return fewest.value_or(QStringList());
+}
+
+QStringList problemsOfFile(const QString &fileName, const InstrumentSummary &instrument,
+                           bool isOneOfMany, Doubts doubts)
+{
+    const std::optional<WaveformNeeds> needs =
+        isWaveformFile(fileName) ? needsOf(fileName) : std::nullopt;
+    if (!needs) {
+        return {};
+    }
+    QStringList problems = waveformProblems(*needs, instrument, doubts);
+    if (isOneOfMany) {
+        for (QString &problem : problems) {
+            problem.prepend(fileName + ": ");
+        }
+    }
+    return problems;
 }
 
 std::optional<InstrumentSummary> summaryOfModel(const QString &model)

@@ -35,11 +35,22 @@ struct WaveformNeeds
 /// Of the tags that stand before the samples in the first bytes of a waveform file.
 [[nodiscard]] WaveformNeeds needsOfHead(const QByteArray &head);
 
+/// What is said of a clock above the bandwidth: most waveforms with one stay within it all the
+/// same.
+enum class Doubts { Told, LeftOut };
+
 /// Why the instrument can't play a waveform: one text for each limit of its basebands that is
 /// broken, of the baseband that comes nearest where there are two. Empty where it can, or where
 /// nobody knows its limits.
 [[nodiscard]] QStringList waveformProblems(const WaveformNeeds &needs,
-                                           const InstrumentSummary &instrument);
+                                           const InstrumentSummary &instrument,
+                                           Doubts doubts = Doubts::Told);
+
+/// The same for a file of the disk, with its name in front where it is one of many; empty for a
+/// file that is no waveform.
+[[nodiscard]] QStringList problemsOfFile(const QString &fileName,
+                                         const InstrumentSummary &instrument, bool isOneOfMany,
+                                         Doubts doubts = Doubts::Told);
 
 /// A model with the largest basebands that it is sold with. Nothing if there is no such model.
 [[nodiscard]] std::optional<InstrumentSummary> summaryOfModel(const QString &model);
