@@ -69,6 +69,7 @@ DlgInfo::DlgInfo(QWidget *parent)
     , m_ui(std::make_unique<Ui::DlgInfo>())
 {
     m_ui->setupUi(this);
+    m_ui->te_Info->setAccessibleName("Information");
     m_ui->cb_close->setIcon(lineIcon("close"));
     m_ui->te_Info->document()->setDocumentMargin(12);
     m_ui->te_Info->document()->setDefaultStyleSheet("td { padding: 3px 6px; }");

@@ -82,11 +82,13 @@ LogPanel::LogPanel(QListWidget *list)
 void LogPanel::addChoices()
 {
     m_level->setObjectName("cb_logLevel");
+    m_level->setAccessibleName("Messages that are shown");
     m_level->setToolTip("Messages that are shown");
     for (const LevelChoice &choice : LevelChoices) {
         m_level->addItem(choice.name, choice.mask);
     }
     m_text->setObjectName("le_logFilter");
+    m_text->setAccessibleName("Filter of the messages");
     m_text->setPlaceholderText("Filter");
     m_text->setToolTip("Shows the messages that hold this text");
     m_text->setClearButtonEnabled(true);

@@ -95,6 +95,9 @@ const std::vector<Rule> &rules()
         {"QToolButton::menu-indicator, QPushButton::menu-indicator { image: url(@/down.svg); "
          "width: 8px; height: 8px; }",
          {}},
+        {"QPushButton::menu-indicator { subcontrol-origin: padding; subcontrol-position: center "
+         "right; right: 5px; }",
+         {}},
         // Fields
         {"QLineEdit, QTextEdit, QPlainTextEdit, QSpinBox, QDoubleSpinBox, QAbstractSpinBox { "
          "background-color: %1; color: %2; border: 1px solid %3; border-radius: 2px; padding: 2px "

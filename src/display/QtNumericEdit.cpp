@@ -70,6 +70,7 @@ void QtNumericEdit::setPrecision(int digits)
 void QtNumericEdit::setName(const QString &name)
 {
     m_name = name;
+    setAccessibleName(name);
     refreshToolTip();
 }
 

@@ -48,6 +48,7 @@ void ToolWizard::setUpWizard()
     m_close = findChild<QPushButton *>("cb_close");
     m_report = findChild<QTextEdit *>("te_result");
     Q_ASSERT(m_pages && m_next && m_previous && m_close && m_report);
+    m_report->setAccessibleName("Report");
     limitTagTexts();
     addPresetMenu();
     addResultButtons();
@@ -92,7 +93,7 @@ void ToolWizard::addPresetMenu()
     if (row == rows.end() || findChild<QPushButton *>("pb_saveprofile") != nullptr) {
         return;
     }
-    m_preset = new QPushButton(lineIcon("settings"), "Pre&set");
+    m_preset = new QPushButton(lineIcon("settings"), "Preset");
     QPushButton *button = m_preset;
     button->setObjectName("pb_preset");
     button->setToolTip("Save the fields of this tool in a file, or load them from one");

@@ -3,6 +3,7 @@
 
 #include "saveselection.h"
 
+#include "appearance/lineicon.h"
 #include "display/QtNumericEdit.h"
 #include "jobs/InfoReport.h"
 #include "log/Tracer.h"
@@ -42,6 +43,7 @@ DlgExport::DlgExport(QWidget *parent)
     m_type->setObjectName("cb_type");
     m_type->setToolTip("How a value is stored, where the format leaves a choice");
     m_report->setObjectName("te_result");
+    m_report->setAccessibleName("Report");
     m_report->setReadOnly(true);
     m_run->setObjectName("pb_run");
     m_run->setDefault(true);
@@ -52,7 +54,7 @@ DlgExport::DlgExport(QWidget *parent)
     target->addWidget(m_target, 1);
     target->addWidget(browse);
     auto *form = new QFormLayout;
-    form->addRow("Source", m_source);
+    form->addRow("&Source", m_source);
     auto *targetLabel = new QLabel("E&xport To");
     targetLabel->setBuddy(m_target);
     form->addRow(targetLabel, target);
@@ -61,6 +63,8 @@ DlgExport::DlgExport(QWidget *parent)
     form->addRow("&Number of Samples", m_count);
     auto *close = new QPushButton("Close");
     close->setObjectName("cb_close");
+    close->setIcon(lineIcon("close"));
+    m_run->setIcon(lineIcon("export"));
     close->setAutoDefault(false);
     auto *buttons = new QHBoxLayout;
     buttons->addStretch(1);

@@ -46,6 +46,10 @@ DlgMarker::~DlgMarker() = default;
 QWidget *DlgMarker::makeControls()
 {
     cb_markers->setObjectName("cb_markers");
+    cb_markers->setAccessibleName("Marker trace");
+    cb_maction->setAccessibleName("Change");
+    le_pattern->setAccessibleName("Pattern");
+    lw_edits->setAccessibleName("Changes so far");
     cb_markers->setToolTip("Select Affected Marker Traces");
     for (int marker = 1; marker <= MarkerCount; ++marker) {
         cb_markers->addItem(QString("M %1").arg(marker));

@@ -63,11 +63,13 @@ RangeTool::RangeTool(QString title, QString settingsGroup, QString suffix, QWidg
     m_mode->addItem("Log Mag Average", static_cast<int>(TraceMode::LogMagAverage));
     m_mode->addItem("Log Mag Envelope", static_cast<int>(TraceMode::LogMagEnvelope));
     m_mode->addItem("I/Q Envelope", static_cast<int>(TraceMode::IqEnvelope));
+    m_mode->setAccessibleName("View Mode");
     m_view->addButton(m_mode);
     m_target->setObjectName("l_target");
     m_target->setTextFormat(Qt::PlainText);
     m_target->setWordWrap(true);
     m_report->setObjectName("te_result");
+    m_report->setAccessibleName("Report");
     m_report->setReadOnly(true);
     constexpr int ReportHeight = 84;
     m_report->setFixedHeight(ReportHeight);

@@ -4,6 +4,7 @@
 #include "app/QCustomTreeView.h"
 #include "guitesting.h"
 #include "log/Tracer.h"
+#include "support/accessible.h"
 #include "support/logreader.h"
 #include "support/rows.h"
 #include "toolframe/DlgBase.h"
@@ -70,6 +71,7 @@ class TestMainWindow : public QObject
 private slots:
     void menusHaveNoEmptyEntryAndUniqueMnemonics();
     void everyWindowHasItsPage();
+    void windowsCanBeUsedByKeysAndEars();
     void selectionEnablesTools();
     void registryPlacesAndStartsTools();
     void historyHoldsElevenEntries();
@@ -166,6 +168,39 @@ void TestMainWindow::everyWindowHasItsPage()
         }
     }
     QVERIFY(pages.size() >= 8);
+}
+
+void TestMainWindow::windowsCanBeUsedByKeysAndEars()
+{
+    Desk desk;
+    desk.open();
+    (void)takeLog();
+    ModulesDb &modules = desk.window()->modules();
+    QList<QWidget *> windows{desk.window(), desk.window()->findChild<QDialog *>("DlgInstrConfig"),
+                             desk.window()->findChild<QDialog *>("DlgColors")};
+    for (const auto &[action, tool] : modules.contextActions(desk.window())) {
+        windows.append(&modules.dialog(*tool));
+    }
+    QStringList found;
+    for (QWidget *window : std::as_const(windows)) {
+        for (const QString &barrier : barriers(*window)) {
+            found += window->windowTitle() + ": " + barrier;
+        }
+        // A screen of 1920 x 1080 at 150 %, and one of 1366 x 768, with room for a bar.
+        window->ensurePolished();
+        const QSize least = window->minimumSizeHint().expandedTo(window->minimumSize());
+        if (least.width() > 1280 || least.height() > 680) {
+            found += QString("%1 needs %2 x %3")
+                         .arg(window->windowTitle())
+                         .arg(least.width())
+                         .arg(least.height());
+        }
+    }
+    for (const QString &one : std::as_const(found)) {
+        qWarning("%s", qPrintable(one)); // a message holds but a few
+    }
+    QVERIFY(found.isEmpty());
+    QCOMPARE(takeLog(), QStringList()); // as of an icon that isn't there
 }
 
 void TestMainWindow::selectionEnablesTools()

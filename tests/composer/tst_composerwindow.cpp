@@ -4,6 +4,7 @@
 #include "composer/ui/DlgComposer.h"
 #include "composer/ui/DlgProgress.h"
 #include "display/QtNumericEdit.h"
+#include "support/accessible.h"
 #include "support/files.h"
 #include "support/modals.h"
 #include "support/wvbytes.h"
@@ -206,6 +207,7 @@ void tst_composerwindow::segmentSettings()
     };
     QVERIFY(open([](QWidget &dialog) {
         QCOMPARE(dialog.windowTitle(), "Segment Settings - Track 1");
+        QCOMPARE(barriers(dialog).join(", "), QString());
         const auto field = [&](const char *name) {
             return dialog.findChild<QtNumericEdit *>(QLatin1String(name));
         };
@@ -246,6 +248,7 @@ void tst_composerwindow::targetSettings()
     insert("long.wv", 0);
     QVERIFY(withModal([this] { press("pb_settings"); },
                       [](QWidget &dialog) {
+                          QCOMPARE(barriers(dialog).join(", "), QString());
                           dialog.findChild<QRadioButton *>("rb_fixed")->click();
                           auto *clock = dialog.findChild<QtNumericEdit *>("le_clockrate");
                           clock->selectAll();

@@ -268,7 +268,7 @@ QWidget *DlgColors::buildOverall()
         grid->addWidget(slider, row, 1);
         grid->addWidget(field, row, 2);
     };
-    addRow("Bri&ghtness:", m_brightness, m_brightnessEdit, 0);
+    addRow("Bright&ness:", m_brightness, m_brightnessEdit, 0);
     addRow("&Contrast:", m_contrast, m_contrastEdit, 1);
     connect(m_brightness, &QSlider::valueChanged, this,
             qOverload<int>(&DlgColors::slot_brightness));

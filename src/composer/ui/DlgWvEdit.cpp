@@ -56,6 +56,7 @@ DlgWvEdit::DlgWvEdit(const ComposerSegment &segment, const SegmentBorders &start
     browseButton->setAutoDefault(false);
     auto *file = new QHBoxLayout;
     file->addWidget(new QLabel(QStringLiteral("Source File"), this));
+    le_file->setAccessibleName(QStringLiteral("Waveform file"));
     file->addWidget(le_file, 1);
     file->addWidget(browseButton);
     auto *layout = new QVBoxLayout(this);

@@ -15,6 +15,7 @@ constexpr int KeyRole = Qt::UserRole;
 ContentTree::ContentTree(QWidget *parent)
     : QTreeWidget(parent)
 {
+    setAccessibleName("Content of the file");
     setColumnCount(2);
     setHeaderLabels({"Content", "Value"});
     header()->setSectionResizeMode(0, QHeaderView::ResizeToContents);

@@ -106,6 +106,7 @@ void DlgWvFromData::addFormatPage()
     column->addWidget(group);
     m_head = new QTextEdit;
     m_head->setObjectName("te_preview");
+    m_head->setAccessibleName("Start of the file");
     m_head->setReadOnly(true);
     m_head->setFont(QFont("Courier"));
     m_head->setLineWrapMode(QTextEdit::NoWrap);

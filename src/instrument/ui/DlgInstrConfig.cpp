@@ -57,6 +57,7 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     for (const auto &[button, icon] : icons) {
         button->setIcon(lineIcon(icon));
     }
+    m_ui->tw_instruments->setAccessibleName("Instruments");
     m_hint = new QLabel(noVisa ? "No instruments.\n\nThe program was started without VISA and "
                                  "cannot reach any."
                                : "No instruments yet.\n\nAdd one by its address above, or scan the "

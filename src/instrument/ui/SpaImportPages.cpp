@@ -158,6 +158,7 @@ void SpaImportPages::addSettingsPage()
 void SpaImportPages::addCapturePage()
 {
     te_capture = reportText("te_capture");
+    te_capture->setAccessibleName("Progress of the capture");
     w_progress = make<QtProgressWidget>("w_progress");
     QSizePolicy policy = w_progress->sizePolicy();
     policy.setRetainSizeWhenHidden(true);
