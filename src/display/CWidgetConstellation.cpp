@@ -13,6 +13,7 @@ CWidgetConstellation::CWidgetConstellation(QWidget *parent)
 {
     setPlotMargins(ConstellationPainter::margins(plotStyle().font));
     setMouseTracking(true);
+    setAccessibleName("Constellation");
 }
 
 void CWidgetConstellation::setData(const QList<CWidgetBase::IQData> &samples)
@@ -80,6 +81,8 @@ void CWidgetConstellation::col_viridis()
 void CWidgetConstellation::setCursorSample(const std::optional<IqSample> &sample)
 {
     m_scene.cursor = sample;
+    setAccessibleDescription(
+        sample ? QString::asprintf("Cursor: I %.6f, Q %.6f", sample->i, sample->q) : QString());
     update();
 }
 

@@ -26,6 +26,7 @@ CWidgetIQTrace::CWidgetIQTrace(QWidget *parent)
     : CWidgetBase(parent)
 {
     setPlotMargins(TracePainter::margins(plotStyle().font));
+    setAccessibleName("Trace of the samples");
 }
 
 void CWidgetIQTrace::setData(const QList<CWidgetBase::IQData> &samples,

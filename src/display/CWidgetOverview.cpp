@@ -14,6 +14,7 @@
 CWidgetOverview::CWidgetOverview(QWidget *parent)
     : CWidgetBase(parent)
 {
+    setAccessibleName("Whole waveform");
 }
 
 void CWidgetOverview::setOverview(const Overview &overview, double clockHz)

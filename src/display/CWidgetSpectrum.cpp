@@ -24,6 +24,7 @@ CWidgetSpectrum::CWidgetSpectrum(QWidget *parent)
     : CWidgetBase(parent)
 {
     setMouseTracking(true);
+    setAccessibleName("Spectrum");
     setView(static_cast<int>(m_scene.mode));
 }
 
@@ -244,7 +245,13 @@ std::optional<FrequencyBand> CWidgetSpectrum::markedBand() const
 void CWidgetSpectrum::drawPlot(QPainter &painter, const QRectF &area)
 {
     updateLines();
-    SpectrumPainter(plotStyle(), m_scene).paint(painter, area);
+    const SpectrumPainter spectrum(plotStyle(), m_scene);
+    spectrum.paint(painter, area);
+    // The lines under the markers may have changed with the samples.
+    if (const QString markers = spectrum.markerTexts().join(", ");
+        markers != accessibleDescription()) {
+        setAccessibleDescription(markers);
+    }
 }
 
 void CWidgetSpectrum::writeData(QTextStream &stream)

@@ -103,6 +103,7 @@ CWidgetTimeline::CWidgetTimeline(QWidget *parent)
     , m_style(PlotStyle::current())
 {
     setSizePolicy(QSizePolicy::Expanding, QSizePolicy::Fixed);
+    setAccessibleName("Visible part of the waveform");
 }
 
 void CWidgetTimeline::setWaveform(qint64 total, double clockHz)

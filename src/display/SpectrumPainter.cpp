@@ -217,10 +217,6 @@ void SpectrumPainter::paintMarkers(QPainter &painter, const QRectF &plot) const
         return;
     }
     const auto levelAt = [&](double share) { return trace.level[trace.pointAt(share)]; };
-    const auto frequencyAt = [&](double share) {
-        return trace.shareOf(trace.pointAt(share)) * bandwidth();
-    };
-    QStringList lines;
     const auto flag = [&](double share, ColorSlot slot) {
         const double x = xOfShare(plot, trace.shareOf(trace.pointAt(share)));
         if (x >= plot.left() && x <= plot.right()) {
@@ -231,12 +227,33 @@ void SpectrumPainter::paintMarkers(QPainter &painter, const QRectF &plot) const
     };
     if (m_scene.deltaMarker) {
         flag(*m_scene.deltaMarker, ColorSlot::SecondaryMarker);
+    }
+    if (m_scene.marker) {
+        flag(*m_scene.marker, ColorSlot::PrimaryMarker);
+    }
+    const QStringList lines = markerTexts();
+    if (!lines.isEmpty()) {
+        drawCaption(painter, m_style, plot, Qt::AlignRight | Qt::AlignBottom, lines.join('\n'));
+    }
+}
+
+QStringList SpectrumPainter::markerTexts() const
+{
+    const SpectrumTrace &trace = m_scene.trace;
+    QStringList lines;
+    if (trace.level.empty()) {
+        return lines;
+    }
+    const auto levelAt = [&](double share) { return trace.level[trace.pointAt(share)]; };
+    const auto frequencyAt = [&](double share) {
+        return trace.shareOf(trace.pointAt(share)) * bandwidth();
+    };
+    if (m_scene.deltaMarker) {
         lines += translated("Ref  %1  %2 dBFS")
                      .arg(frequencyText(frequencyAt(*m_scene.deltaMarker)))
                      .arg(levelAt(*m_scene.deltaMarker), 0, 'f', 2);
     }
     if (m_scene.marker) {
-        flag(*m_scene.marker, ColorSlot::PrimaryMarker);
         lines.prepend(translated("Mkr  %1  %2 dBFS")
                           .arg(frequencyText(frequencyAt(*m_scene.marker)))
                           .arg(levelAt(*m_scene.marker), 0, 'f', 2));
@@ -247,9 +264,7 @@ void SpectrumPainter::paintMarkers(QPainter &painter, const QRectF &plot) const
                                         frequencyAt(*m_scene.deltaMarker)))
                      .arg(levelAt(*m_scene.marker) - levelAt(*m_scene.deltaMarker), 0, 'f', 2);
     }
-    if (!lines.isEmpty()) {
-        drawCaption(painter, m_style, plot, Qt::AlignRight | Qt::AlignBottom, lines.join('\n'));
-    }
+    return lines;
 }
 
 void SpectrumPainter::paintSpectrumTexts(QPainter &painter, const QRectF &plot) const

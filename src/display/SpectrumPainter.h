@@ -12,6 +12,7 @@
 #include <QMargins>
 #include <QPointF>
 #include <QRectF>
+#include <QStringList>
 
 #include <optional>
 
@@ -79,6 +80,10 @@ public:
 
     /// The lines of the read-out at a place, empty outside the plot or without data.
     [[nodiscard]] QStringList readOut(const QPointF &place, const QRectF &plot) const;
+
+    /// Frequency and level of the marker, of the reference, and their difference, as far as they
+    /// are set.
+    [[nodiscard]] QStringList markerTexts() const;
 
 private:
     void paintSpectrum(QPainter &painter, const PixelGrid &pixels, const QRectF &area,

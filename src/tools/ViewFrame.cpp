@@ -271,6 +271,7 @@ void ViewFrame::moveCursor(qint64 step)
 
 void ViewFrame::clear()
 {
+    m_trace->setAccessibleDescription({});
     slot_stop();
     m_overviewTimer.stop();
     m_window.release();
@@ -454,6 +455,8 @@ void ViewFrame::state_position(bool dragging)
 void ViewFrame::set_csr_data(qlonglong sample, double i, double q)
 {
     setCursor(Measuring, m_window.first() + sample);
+    m_trace->setAccessibleDescription(
+        QString::asprintf("Cursor at sample %lld: I %.6f, Q %.6f", cursor(Measuring), i, q));
     emit cursorMoved(cursor(Measuring), i, q);
 }
 

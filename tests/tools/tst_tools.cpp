@@ -14,6 +14,7 @@
 
 #include "display/CWidgetIQTrace.h"
 #include "display/CWidgetOverview.h"
+#include "display/CWidgetSpectrum.h"
 #include "display/CWidgetTimeline.h"
 #include "display/QtNumericEdit.h"
 #include "wvfile/HvFileIO.h"
@@ -347,6 +348,13 @@ void TestTools::viewCursorsShowValuesAndDistance()
     QCOMPARE(textOf(view, "l_csr_phase"), QString("90.00 deg"));
     QCOMPARE(textOf(view, "l_delta_samples"), QString("2000"));
     QCOMPARE(textOf(view, "l_delta_time"), QString("2 ms"));
+    // Screen readers hear of it at the plots.
+    QCOMPARE(frameOf(view).trace().accessibleDescription(),
+             QString("Cursor at sample 3000: I 0.000000, Q 0.700000"));
+    auto *spectrum = child<CWidgetSpectrum>(view, "w_spectrum");
+    spectrum->markPeak();
+    (void)spectrum->picture();
+    QVERIFY(spectrum->accessibleDescription().startsWith("Mkr  "));
     auto *trace = child<CWidgetIQTrace>(view, "w_iqtrace");
     QTest::mouseClick(trace, Qt::LeftButton, {}, trace->rect().center());
     QVERIFY(textOf(view, "l_csr_sample") != "3000");
@@ -358,6 +366,7 @@ void TestTools::viewCursorsShowValuesAndDistance()
     QCOMPARE(timeline->scene().cursors, (std::array<qint64, 2>{-1, -1}));
     QCOMPARE(timeline->scene().total, 3);
     QCOMPARE(textOf(view, "l_csr_sample"), QString("---"));
+    QCOMPARE(trace->accessibleDescription(), QString());
     QCOMPARE(textOf(view, "l_delta_samples"), QString("---"));
     QCOMPARE(textOf(view, "l_file_time"), QString("3 us"));
     QVERIFY(!view.grab().isNull() && takeMessages(Tracer::Error).isEmpty());
