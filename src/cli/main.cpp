@@ -46,12 +46,27 @@ void logToolkitMessage(QtMsgType, const QMessageLogContext &, const QString &tex
     Tracer::Trace(Tracer::Debug, text);
 }
 
+/// ": a, b, c", the commands of which one must follow what was typed; empty where one does.
+QString missingCommands(const CLI::App &app)
+{
+    const CLI::App *typed = &app;
+    while (!typed->get_subcommands().empty()) {
+        typed = typed->get_subcommands().front();
+    }
+    QStringList names;
+    for (const CLI::App *command : typed->get_subcommands([](const CLI::App *) { return true; })) {
+        names.append(QString::fromStdString(command->get_name()));
+    }
+    return names.isEmpty() ? QString() : ": " + names.join(", ");
+}
+
 /// A mistyped command or option leaves another one missing; what was typed is the better hint.
 QString usageProblem(const CLI::App &app, const CLI::ParseError &problem)
 {
     const std::vector<std::string> unknown = app.remaining(true);
     if (unknown.empty()) {
-        return QString::fromLocal8Bit(problem.what());
+        const QString text = QString::fromLocal8Bit(problem.what());
+        return problem.get_name() == "RequiredError" ? text + missingCommands(app) : text;
     }
     const QString typed = QString::fromLocal8Bit(unknown.front());
     const QString nearest = nearestName(app, typed);
@@ -127,6 +142,9 @@ int run(int argc, char **argv)
             app.exit(problem, text);
             return console.print(QByteArray::fromStdString(text.str())) ? ExitDone
                                                                         : console.failed();
+        }
+        if (argc < 2) {
+            std::fputs(app.help().c_str(), stderr);
         }
         return console.wrongUsage(usageProblem(app, problem));
     }
