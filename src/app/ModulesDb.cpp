@@ -8,6 +8,7 @@
 #include "import/ui/DlgWvFromData.h"
 #include "import/ui/DlgWvFromMat.h"
 #include "import/ui/DlgWvFromRiq.h"
+#include "import/ui/DlgWvFromSigmf.h"
 #include "import/ui/DlgWvFromWav.h"
 #include "instrument/remotepaths.h"
 #include "instrument/ui/DlgSpaImport.h"
@@ -78,6 +79,8 @@ QList<ToolInfo> toolTable()
                                "import_matlab", "imports"),
         toolInfo<DlgWvFromRiq>("Import RIQ", "/Import/From RIQ", File, {"RIQ"}, "import_riq",
                                "imports"),
+        toolInfo<DlgWvFromSigmf>("Import SigMF", "/Import/From SigMF", File,
+                                 {"SIGMF-META", "SIGMF-DATA", "SIGMF"}, "import_sigmf", "imports"),
         toolInfo<DlgWvFromWav>("Import WAV", "/Import/From WAV", File, {"WAV"}, "import_wav",
                                "imports"),
         toolInfo<DlgSpaImport>("Import From Analyzer", "/Import/From Analyzer", FileOrFolder, {},

@@ -3,6 +3,7 @@
 #include "import/ui/DlgWvFromData.h"
 #include "import/ui/DlgWvFromMat.h"
 #include "import/ui/DlgWvFromRiq.h"
+#include "import/ui/DlgWvFromSigmf.h"
 #include "import/ui/DlgWvFromWav.h"
 #include "support/files.h"
 #include "support/logreader.h"
@@ -37,6 +38,10 @@ np.savetxt('tags.csv', np.c_[z.real, z.imag], delimiter=',',
            header='COMMENT=from text\nCLOCKRATE=2e6', comments='#')
 with wave.open('a.wav', 'wb') as f:
     f.setnchannels(2); f.setsampwidth(2); f.setframerate(48000); f.writeframes(w.tobytes())
+z.astype('<c8').tofile('a.sigmf-data')
+open('a.sigmf-meta', 'w').write('''{"global": {"core:datatype": "cf32_le", "core:version": "1.0.0",
+"core:sample_rate": 250000, "core:description": "a tone"}, "captures": [{"core:sample_start": 0}],
+"annotations": []}''')
 def block(rate):
     return (struct.pack('>ihhhhihhhbbI', 0xC4D70, 1, 0, 0, 0, 0, 901, 0, 1000, 0, 56, 0x80000000)
             + struct.pack('>hhiIihhhhqqIiq', 0, 4, rate, 100000000, 80000, 0, 0, 0, 0, 0, 0, 0, 0,
@@ -68,6 +73,7 @@ private slots:
     void importsMatlab();
     void importsRiq();
     void importsWav();
+    void importsSigmf();
     void tellsWhatCannotBeRead();
 
 private:
@@ -208,6 +214,18 @@ void TestImportWizards::importsWav()
     click(wizard, "rb_sc_auto");
     click(wizard, "pb_prev");
     runToTheEnd(wizard, "wav", 48000, 0);
+}
+
+void TestImportWizards::importsSigmf()
+{
+    DlgWvFromSigmf wizard;
+    openOn(wizard, "a.sigmf-meta");
+    QCOMPARE(child<QtNumericEdit>(wizard, "le_samples")->getValInt(), 1000);
+    QCOMPARE(child<QLabel>(wizard, "l_type")->text(), "cf32_le");
+    goOn(wizard);
+    click(wizard, "pb_prev");
+    runToTheEnd(wizard, "sigmf", 250e3, 6.0206);
+    QCOMPARE(child<QPlainTextEdit>(wizard, "te_comment")->toPlainText(), "a tone");
 }
 
 void TestImportWizards::tellsWhatCannotBeRead()

@@ -45,22 +45,6 @@ DlgWvFromWav::DlgWvFromWav(QWidget *parent)
     setUpWizard();
 }
 
-QtNumericEdit *DlgWvFromWav::addFact(QGridLayout &grid, const char *name, const QString &title,
-                                     const QString &unit, double min, double max)
-{
-    auto *edit = new QtNumericEdit;
-    edit->setObjectName(name);
-    edit->setReadOnly(true);
-    edit->setName(title);
-    edit->setUnit(unit);
-    edit->setScaled(!unit.isEmpty());
-    edit->setLowerPrefix(unit == "s");
-    edit->setMax(max);
-    edit->setMin(min);
-    addRow(grid, title, edit);
-    return edit;
-}
-
 void DlgWvFromWav::inputChanged()
 {
     WavFileAccess file;

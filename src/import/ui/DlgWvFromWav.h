@@ -20,9 +20,6 @@ protected:
     [[nodiscard]] bool isComplete(int page) const override;
 
 private:
-    [[nodiscard]] QtNumericEdit *addFact(QGridLayout &grid, const char *name, const QString &title,
-                                         const QString &unit, double min, double max);
-
     QtNumericEdit *m_dataClock = nullptr;
     QtNumericEdit *m_samples = nullptr;
     QtNumericEdit *m_playTime = nullptr;

@@ -85,6 +85,22 @@ void ImportWizard::addRow(QGridLayout &grid, const QString &label, QWidget *fiel
     grid.addWidget(field, row, 1, 1, 2);
 }
 
+QtNumericEdit *ImportWizard::addFact(QGridLayout &grid, const char *name, const QString &title,
+                                     const QString &unit, double min, double max)
+{
+    auto *edit = new QtNumericEdit;
+    edit->setObjectName(name);
+    edit->setReadOnly(true);
+    edit->setName(title);
+    edit->setUnit(unit);
+    edit->setScaled(!unit.isEmpty());
+    edit->setLowerPrefix(unit == "s");
+    edit->setMax(max);
+    edit->setMin(min);
+    addRow(grid, title, edit);
+    return edit;
+}
+
 QLineEdit *ImportWizard::addFileRow(QGridLayout &grid, const QString &label, const QString &number,
                                     const QString &dialogTitle, const QString &filter)
 {

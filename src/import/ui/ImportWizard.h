@@ -50,6 +50,11 @@ protected:
     static void addRow(QGridLayout &grid, const QString &label, QWidget *field,
                        const QString &toolTip = {});
 
+    /// Adds a row with a number that the input tells.
+    [[nodiscard]] static QtNumericEdit *addFact(QGridLayout &grid, const char *name,
+                                                const QString &title, const QString &unit,
+                                                double min, double max);
+
     /// Makes a file field and its button, which asks for a file to read, and returns the field.
     [[nodiscard]] QLineEdit *addFileRow(QGridLayout &grid, const QString &label,
                                         const QString &number, const QString &dialogTitle,
