@@ -41,7 +41,6 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
 {
     static const MemoryFile file;
     static MemoryStream samples;
-    constexpr qint64 SampleBytes = 4;
     file.write(data, size);
     samples.clear();
     WavFileAccess access;
@@ -52,12 +51,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
         return 0;
     }
     const WavHeader &header = access.header();
-    require(header.channels == 2 && header.bitsPerSample == 16 && header.playTime() >= 0);
+    require(header.blockAlignment > 0 && header.playTime() >= 0);
     const qint64 limit = size % 2 == 0 ? 0 : 3;
     const bool read = access.readSamples(&samples.stream, limit);
     require(read != takeErrors());
     const qint64 content = samples.contentSize() - BufferedIO::HeaderSize;
-    require(content >= 0 && content / 8 * SampleBytes <= static_cast<qint64>(size));
+    require(content >= 0 && content / 8 * header.blockAlignment <= static_cast<qint64>(size));
     if (read) {
         const qint64 expected = limit > 0 ? std::min(limit, header.samples()) : header.samples();
         require(content == 8 * expected);
