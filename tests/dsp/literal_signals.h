@@ -19,55 +19,38 @@ inline constexpr double T = 6.2831853;
 inline constexpr double P = 3.14159265;
 inline constexpr double H = 1.570796325;
 
+/// At the angle x, which is the part t of a turn, shifted by ph.
+inline double shape(FunctionKind kind, double x, double t, double ph)
+{
+    double value = 0;
+    switch (kind) {
+    case FunctionKind::Sine:
+        return std::sin(x + ph);
+    case FunctionKind::Square:
+        return std::sin(x + ph) < 0 ? -1 : 1;
+    case FunctionKind::Triangular:
+        value = 4 * (t + ph / T) - 1;
+        for (int fold = 0; fold < 2; ++fold) {
+            value = value > 1 ? 2 - value : value;
+            value = value < -1 ? -2 - value : value;
+        }
+        return value;
+    case FunctionKind::Sawtooth:
+        value = 2 * (t + ph / T) - 1;
+        value = value < -1 ? value + 2 : value;
+        return value > 1 ? value - 2 : value;
+    }
+    return value;
+}
+
 inline Vectors function(const FunctionSettings &s, const SignalFit &fit)
 {
     Vectors out;
     for (int i = 0; i < fit.samples; ++i) {
         const double x = T * i / fit.samples;
         const double t = static_cast<double>(i) / fit.samples;
-        const double ph = s.phaseQ / 360.0 * T;
-        double shapeI = 0;
-        double shapeQ = 0;
-        switch (s.kind) {
-        case FunctionKind::Sine:
-            shapeI = std::sin(x);
-            shapeQ = std::sin(x + ph);
-            break;
-        case FunctionKind::Square:
-            shapeI = std::sin(x) < 0 ? -1 : 1;
-            shapeQ = std::sin(x + ph) < 0 ? -1 : 1;
-            break;
-        case FunctionKind::Triangular:
-            shapeI = 4 * t - 1;
-            if (shapeI > 1) {
-                shapeI = 2 - shapeI;
-            }
-            shapeQ = 4 * (t + ph / T) - 1;
-            if (shapeQ > 1) {
-                shapeQ = 2 - shapeQ;
-            }
-            if (shapeQ < -1) {
-                shapeQ = -2 - shapeQ;
-            }
-            if (shapeQ > 1) {
-                shapeQ = 2 - shapeQ;
-            }
-            if (shapeQ < -1) {
-                shapeQ = -2 - shapeQ;
-            }
-            break;
-        case FunctionKind::Sawtooth:
-            shapeI = 2 * t - 1;
-            shapeQ = 2 * (t + ph / T) - 1;
-            if (shapeQ < -1) {
-                shapeQ = shapeQ + 2;
-            }
-            if (shapeQ > 1) {
-                shapeQ = shapeQ - 2;
-            }
-            break;
-        }
-        out.emplace_back(shapeI * s.amplitudeI + s.offsetI, shapeQ * s.amplitudeQ + s.offsetQ);
+        out.emplace_back(shape(s.kind, x, t, 0) * s.amplitudeI + s.offsetI,
+                         shape(s.kind, x, t, s.phaseQ / 360.0 * T) * s.amplitudeQ + s.offsetQ);
     }
     return out;
 }

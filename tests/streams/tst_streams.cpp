@@ -94,7 +94,6 @@ class TestStreams : public QObject
 
 private slots:
     void anyOrderOfCalls();
-    void headers();
     void modes();
     void refusedCalls();
     void failingDevice();
@@ -164,26 +163,6 @@ void TestStreams::anyOrderOfCalls()
                 plain.restart(-1);
                 QVERIFY(device.bytes == plain.file);
             });
-}
-
-void TestStreams::headers()
-{
-    TestDevice device;
-    BufferedIO stream(Buffer);
-    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
-    QVERIFY(!stream.checkHeader("IQF"));
-    QVERIFY(stream.writeHeader("IQ"));
-    QVERIFY(!stream.checkHeader("IQF"));
-    const float record[2] = {0.25F, -0.5F};
-    QVERIFY(stream.writeHeader("IQF"));
-    QVERIFY(stream.writeBytes(BufferedIO::RecordSize, record));
-    QVERIFY(stream.checkHeader("IQF"));
-    float back[2] = {};
-    QVERIFY(stream.readBytes(BufferedIO::RecordSize, back));
-    QCOMPARE(back[0], record[0]);
-    QCOMPARE(back[1], record[1]);
-    QCOMPARE(device.bytes.size(), qsizetype(BufferedIO::HeaderSize + BufferedIO::RecordSize));
-    QVERIFY(!stream.checkHeader("iqf"));
 }
 
 void TestStreams::modes()

@@ -1,10 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "support/files.h"
-#include "support/logreader.h"
 #include "support/modals.h"
 #include "support/rows.h"
-#include "support/seed.h"
-#include "support/wvbytes.h"
 
 #include <QInputDialog>
 #include <QMessageBox>
@@ -17,9 +14,7 @@ class TestSupport : public QObject
 
 private slots:
     void rows();
-    void logLines();
     void files();
-    void bytes();
     void modals();
 };
 
@@ -39,18 +34,6 @@ void TestSupport::rows()
     QCOMPARE(sum, 6);
 }
 
-void TestSupport::logLines()
-{
-    CapturedLog log(Tracer::DebugMask);
-    Tracer::Trace(Tracer::Error, "a  b");
-    Tracer::Trace(Tracer::Debug, "c");
-    QCOMPARE(log.take(), QStringList({"4|a  b", "16|c"}));
-    Tracer::Trace(Tracer::Error, "a");
-    Tracer::Trace(Tracer::Information, "b");
-    QCOMPARE(takeMessages(), QStringList("a"));
-    QCOMPARE(takeLog(), QStringList());
-}
-
 void TestSupport::files()
 {
     const TestFolder folder;
@@ -59,16 +42,6 @@ void TestSupport::files()
     QVERIFY(folder.store(".full", "abc"));
     QCOMPARE(folder.load(".full"), QByteArray("abc"));
     QCOMPARE(folder.entries(), QStringList({".full", "empty"}));
-}
-
-void TestSupport::bytes()
-{
-    const QByteArray file = wvFile("{CLOCK:5}", words({1, -2}));
-    QCOMPARE(file, QByteArray("{CLOCK:5}{WAVEFORM-5: #\1\0\xFE\xFF}", 28));
-    QCOMPARE(tag(file, "CLOCK"), QByteArray("5"));
-    QCOMPARE(sampleWords(file), words({1, -2}));
-    QCOMPARE(randomBytes(9, 3), randomBytes(9, 3));
-    QVERIFY(randomBytes(9, 3) != randomBytes(9, 4));
 }
 
 void TestSupport::modals()

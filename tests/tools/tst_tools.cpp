@@ -69,7 +69,6 @@ private slots:
     void cancelledConversionLeavesNothing();
     void creationOverwritesUnlessCancelled();
     void refusalKeepsTheFile();
-    void createRefusesTooManySamples();
     void createKeepsItsSettings();
     void viewMovesZoomsAndPlays();
     void viewCursorsShowValuesAndDistance();
@@ -236,23 +235,6 @@ void TestTools::refusalKeepsTheFile()
     click(dialog, "pb_next");
     QCOMPARE(takeMessages(Tracer::Error), QStringList("Output file name is empty."));
     QVERIFY(reportOf(dialog).toPlainText().isEmpty());
-}
-
-void TestTools::createRefusesTooManySamples()
-{
-    DlgWvCreate dialog;
-    dialog.show();
-    type(child<QtNumericEdit>(dialog, "le_minclock"), "10M");
-    type(child<QtNumericEdit>(dialog, "le_maxclock"), "600M");
-    child<QComboBox>(dialog, "cb_waveform")->setCurrentText("Noise");
-    click(dialog, "pb_next");
-    type(child<QtNumericEdit>(dialog, "le_noisebw"), "20M");
-    type(child<QtNumericEdit>(dialog, "le_noiseduration"), "1");
-    click(dialog, "pb_next"); // 30 million samples
-    QCOMPARE(child<QStackedWidget>(dialog, "sw_assist")->currentWidget()->objectName(),
-             QString("page_noise"));
-    QCOMPARE(takeMessages(Tracer::Error).constLast(),
-             QString("Cannot configure waveform creation. Check settings."));
 }
 
 void TestTools::createKeepsItsSettings()

@@ -3,12 +3,10 @@
 #include "support/rows.h"
 #include "wvfile/WvScanner.h"
 
-#include <QDate>
 #include <QTest>
 
 namespace {
 
-const QString tgxLine = "1|Waveform TYPE-tag : TGX Waveform File";
 const QString noLevels = "2|No LEVEL OFFS tag found in waveform file.";
 const QString noClock = "2|Invalid data in CLOCK tag.";
 const QByteArray levels = "{LEVEL OFFS:3.5,1.25}";
@@ -49,10 +47,8 @@ private slots:
     void accepted();
     void refused();
     void kinds();
-    void fields();
     void segments();
     void names();
-    void files();
     void samplesAreNotRead();
 };
 
@@ -135,33 +131,6 @@ void TestWvScanner::kinds()
             });
 }
 
-void TestWvScanner::fields()
-{
-    const Scan result =
-        scan("{TYPE: TGX-WV,0}{COMMENT:  a b}{COPYRIGHT:me}{DATE: 2011-04-18;09:30:00}"
-             "{CLOCK: 2000 }{LEVEL OFFS: 3.5 , 1.25}{SAMPLES:3}{MARKER LIST 1:0:1}" +
-             silentBlock(3));
-    QVERIFY(result.ok);
-    QCOMPARE(result.log, QStringList(tgxLine));
-    const WvFileSummary &summary = result.summary;
-    QCOMPARE(summary.comment, QString("a b"));
-    QCOMPARE(summary.copyright, QString("me"));
-    QCOMPARE(summary.date, QString("2011-04-18;09:30:00"));
-    QCOMPARE(summary.clock, 2000.0);
-    QCOMPARE(summary.samples, qint64(3));
-    QCOMPARE(summary.playTime, 0.0015);
-    QVERIFY(summary.levelsValid);
-    QCOMPARE(summary.rmsOffset, 3.5);
-    QCOMPARE(summary.peakOffset, 1.25);
-    QVERIFY(summary.hasMarkers);
-    QCOMPARE(summary.segmentCount, 0);
-    const WvFileSummary empty = scan("").summary;
-    QCOMPARE(empty.samples, qint64(-1));
-    QCOMPARE(empty.clock, -1.0);
-    QVERIFY(!empty.levelsValid);
-    QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
-}
-
 void TestWvScanner::segments()
 {
     const Scan result = scan(
@@ -173,6 +142,11 @@ void TestWvScanner::segments()
     QVERIFY2(result.ok, qPrintable(result.log.join('\n')));
     const WvFileSummary &summary = result.summary;
     QCOMPARE(summary.segmentCount, 3);
+    const WvFileSummary empty = scan("").summary;
+    QCOMPARE(empty.samples, qint64(-1));
+    QCOMPARE(empty.clock, -1.0);
+    QVERIFY(!empty.levelsValid);
+    QCOMPARE(scan("{SAMPLES:1000}{CLOCK:0}").summary.playTime, -1.0);
     QCOMPARE(summary.levelMode, QString("UNCHANGED"));
     QCOMPARE(summary.clockMode, QString("HIGHEST"));
     QCOMPARE(summary.settingsFile, QString("s.inf"));
@@ -200,26 +174,6 @@ void TestWvScanner::names()
                 QCOMPARE(result.log, QStringList());
                 QCOMPARE(result.summary.comment, QString("yes"));
             });
-}
-
-void TestWvScanner::files()
-{
-    const TestFolder folder;
-    CapturedLog log;
-    HvFileIO io;
-    WvFileSummary summary;
-    summary.comment = "old";
-    QVERIFY(!io.readWaveformInfo(folder.path("some.wv"), &summary));
-    QCOMPARE(log.take().last(), QString("4|File does not exist."));
-    QCOMPARE(summary.comment, QString());
-    QVERIFY(folder.store("some.wv", clocked));
-    const QDate before = QDate::currentDate();
-    QVERIFY(io.readWaveformInfo(folder.path("some.wv"), &summary));
-    QCOMPARE(log.take(), QStringList("1|Reading information from file: " + folder.path("some.wv")));
-    QCOMPARE(summary.fileName, QString("some.wv"));
-    QCOMPARE(summary.fileSize, qint64(clocked.size()));
-    const QDate created = QDate::fromString(summary.created, "yyyy-MM-dd");
-    QVERIFY(created.isValid() && created >= before.addDays(-1) && created <= QDate::currentDate());
 }
 
 /// However long the block and whatever it looks like, a scan reads the tags alone.
