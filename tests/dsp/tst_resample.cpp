@@ -125,6 +125,7 @@ private slots:
     void longRunsKeepTheirPlace();
     void threadsDontChangeTheResult();
     void filterMask();
+    void evenLengthLeadsByOneSample();
     void markers();
     void failures();
     void stepBeyondTheFilterFails();
@@ -234,6 +235,22 @@ void TestResample::filterMask()
     QVERIFY(std::abs(gain(0.1) - 0.5) < 0.01);
     for (double f = 0.15; f <= 0.5; f += 0.01) {
         QVERIFY2(gain(f) < 1e-3, qPrintable(QString::number(f)));
+    }
+}
+
+void TestResample::evenLengthLeadsByOneSample()
+{
+    Samples impulse(300);
+    impulse[100] = 1;
+    for (const int length : {51, 50}) {
+        Run run;
+        QVERIFY(run.prepare(impulse, 300));
+        run.apply({.length = length});
+        QVERIFY(run.resample.run());
+        const Samples result = readStream(*run.output.stream());
+        const auto top = std::max_element(result.begin(), result.end(),
+                                          [](auto a, auto b) { return std::abs(a) < std::abs(b); });
+        QCOMPARE(top - result.begin(), length == 51 ? 100 : 99);
     }
 }
 
