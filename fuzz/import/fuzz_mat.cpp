@@ -9,9 +9,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
 {
     static MemoryStream samples;
     samples.clear();
-    MemoryDevice file;
-    file.bytes = QByteArray(reinterpret_cast<const char *>(data), static_cast<qsizetype>(size));
-    require(file.open(QIODevice::ReadOnly));
+    MemoryDevice file(data, size);
     MatFileAccess access;
     access.open(file);
     const bool ok = access.readDirectory();

@@ -8,9 +8,7 @@
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
     static MemoryStream samples;
-    MemoryDevice file;
-    file.bytes = QByteArray(reinterpret_cast<const char *>(data), static_cast<qsizetype>(size));
-    require(file.open(QIODevice::ReadOnly));
+    MemoryDevice file(data, size);
     RiqFileAccess access;
     access.open(file);
     const bool ok = access.readDirectory();

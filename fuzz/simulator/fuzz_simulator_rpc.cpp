@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "protocols/RpcRecord.h"
 #include "simulator/rpcserver.h"
+#include "support/require.h"
 
 #include <algorithm>
 #include <array>
-#include <cstdlib>
 
 using namespace protocols;
 using namespace simulator;
@@ -54,14 +54,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const std::span<const std::uint8_t> bytes = reply.bytes();
     constexpr std::size_t SmallestReply = RecordMarkSize + 5 * 4;
     constexpr std::uint32_t LastFragment = 0x80000000U;
-    if (bytes.size() < SmallestReply || bytes.size() % 4 != 0) {
-        std::abort();
-    }
-    if (word(bytes, 0) != (LastFragment | (bytes.size() - RecordMarkSize))) {
-        std::abort();
-    }
-    if (word(bytes, RecordMarkSize) != word(call, 0) || word(bytes, RecordMarkSize + 4) != 1) {
-        std::abort();
-    }
+    require(bytes.size() >= SmallestReply && bytes.size() % 4 == 0);
+    require(word(bytes, 0) == (LastFragment | (bytes.size() - RecordMarkSize)));
+    require(word(bytes, RecordMarkSize) == word(call, 0) && word(bytes, RecordMarkSize + 4) == 1);
     return 0;
 }

@@ -2,10 +2,10 @@
 #include "simulator/ErrorQueue.h"
 #include "simulator/ProgramUnit.h"
 #include "simulator/ScpiParser.h"
+#include "support/require.h"
 
 #include <algorithm>
 #include <cmath>
-#include <cstdlib>
 #include <utility>
 
 using namespace simulator;
@@ -18,19 +18,13 @@ void parseUnit(std::string_view text)
     if (unit.parse(text) != NoError) {
         return;
     }
-    if (unit.nodes.empty()) {
-        std::abort();
-    }
+    require(!unit.nodes.empty());
     for (const std::string &node : unit.nodes) {
-        if (node.empty() || !matchesMnemonic(node, upperCase(node))) {
-            std::abort();
-        }
+        require(!node.empty() && matchesMnemonic(node, upperCase(node)));
     }
     for (const Parameter &parameter : unit.parameters) {
-        if (!std::isfinite(parameter.value) ||
-            !std::isfinite(suffixFactor(parameter.suffix, "HZ"))) {
-            std::abort();
-        }
+        require(std::isfinite(parameter.value) &&
+                std::isfinite(suffixFactor(parameter.suffix, "HZ")));
     }
 }
 
@@ -45,42 +39,33 @@ public:
 private:
     void onUnit(std::string_view text, bool hasBlock) override
     {
-        if (m_inBlock || text.size() > ScpiParser::MaxUnitLength + 1) {
-            std::abort();
-        }
+        require(!m_inBlock && text.size() <= ScpiParser::MaxUnitLength + 1);
         parseUnit(text);
         events.append(hasBlock ? "B" : "U").append(text).push_back('\0');
     }
     void onBlockBegin(std::string_view text, std::optional<std::uint64_t> size) override
     {
-        if (std::exchange(m_inBlock, true)) {
-            std::abort();
-        }
+        require(!std::exchange(m_inBlock, true));
         m_size = size;
         m_received = 0;
         events.append("b").append(text).append(size ? std::to_string(*size) : "?").push_back('\0');
     }
     void onBlockData(std::span<const char> bytes) override
     {
-        if (!m_inBlock) {
-            std::abort();
-        }
+        require(m_inBlock);
         m_received += bytes.size();
         events.append(bytes.data(), bytes.size());
     }
     void onBlockEnd(bool complete) override
     {
-        if (!std::exchange(m_inBlock, false) || (m_size && complete != (m_received == *m_size))) {
-            std::abort();
-        }
+        require(std::exchange(m_inBlock, false) &&
+                (!m_size || complete == (m_received == *m_size)));
         events.append(complete ? "e" : "i");
     }
     void onError(int number) override { events.append("E").append(std::to_string(number)); }
     void onMessageEnd() override
     {
-        if (m_inBlock) {
-            std::abort();
-        }
+        require(!m_inBlock);
         events.append("M");
     }
 
@@ -98,18 +83,12 @@ std::string eventsOf(std::span<const char> bytes, std::size_t pieceSize, bool ha
     while (!bytes.empty()) {
         const std::span<const char> piece = bytes.first(std::min(bytes.size(), pieceSize));
         const std::size_t taken = parser.feed(piece, hasEnd && piece.size() == bytes.size());
-        if (taken == 0 || taken > piece.size()) {
-            std::abort();
-        }
+        require(taken > 0 && taken <= piece.size());
         bytes = bytes.subspan(taken);
     }
-    if (hasEnd && !parser.isIdle()) {
-        std::abort();
-    }
+    require(!hasEnd || parser.isIdle());
     parser.clear();
-    if (!parser.isIdle() || recorder.isInBlock()) {
-        std::abort();
-    }
+    require(parser.isIdle() && !recorder.isInBlock());
     return recorder.events;
 }
 
@@ -126,9 +105,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const bool hasEnd = (data[1] & 1U) != 0;
     const bool lineFeedEnds = (data[1] & 2U) == 0 || !hasEnd;
     const std::span<const char> bytes(reinterpret_cast<const char *>(data) + 2, size - 2);
-    if (eventsOf(bytes, bytes.size() + 1, hasEnd, lineFeedEnds) !=
-        eventsOf(bytes, pieceSize, hasEnd, lineFeedEnds)) {
-        std::abort();
-    }
+    require(eventsOf(bytes, bytes.size() + 1, hasEnd, lineFeedEnds) ==
+            eventsOf(bytes, pieceSize, hasEnd, lineFeedEnds));
     return 0;
 }

@@ -5,6 +5,7 @@
 #include <QIODevice>
 
 #include <algorithm>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 
@@ -16,6 +17,15 @@ public:
     static constexpr qint64 Limit = 64 * 1024 * 1024;
 
     QByteArray bytes;
+
+    MemoryDevice() = default;
+
+    /// A file of a run's input, open for reading.
+    MemoryDevice(const std::uint8_t *data, std::size_t length)
+        : bytes(reinterpret_cast<const char *>(data), static_cast<qsizetype>(length))
+    {
+        (void)QIODevice::open(QIODevice::ReadOnly);
+    }
 
     [[nodiscard]] qint64 size() const override { return bytes.size(); }
 

@@ -2,17 +2,9 @@
 #pragma once
 
 #include "log/Tracer.h"
+#include "require.h"
 
 #include <algorithm>
-#include <cstdlib>
-
-/// Ends the run as a crash if what must hold doesn't.
-inline void require(bool holds)
-{
-    if (!holds) {
-        std::abort();
-    }
-}
 
 /// Takes the log. True if it tells an error.
 [[nodiscard]] inline bool takeErrors()

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "protocols/RpcRecord.h"
 #include "protocols/XdrValue.h"
+#include "support/require.h"
 #include "visa/MessageTracker.h"
 #include "visa/ReadReply.h"
 #include "visa/RpcReply.h"
@@ -8,7 +9,6 @@
 #include <vxi11.h>
 
 #include <algorithm>
-#include <cstdlib>
 #include <vector>
 
 using namespace protocols;
@@ -32,12 +32,8 @@ void decodeRecord(std::span<const std::uint8_t> record)
         transaction = transaction << 8U | byte;
     }
     const RpcReply reply = parseRpcReply(record, transaction);
-    if (reply.kind == RpcReplyKind::OtherCall && record.size() >= 4) {
-        std::abort();
-    }
-    if (reply.results.size() > record.size()) {
-        std::abort();
-    }
+    require(reply.kind != RpcReplyKind::OtherCall || record.size() < 4);
+    require(reply.results.size() <= record.size());
     if (reply.kind != RpcReplyKind::Accepted) {
         return;
     }
@@ -45,18 +41,13 @@ void decodeRecord(std::span<const std::uint8_t> record)
     // Exactly as large as the target, so that the sanitizer sees a byte behind it.
     std::vector<std::uint8_t> target(reply.results.size() / 2);
     XdrValue<ReadReply> read(decodeReadReply, {.target = target});
-    if (!read.decode(reply.results) && read->size != 0) {
-        std::abort();
-    }
-    if (read->size <= target.size() && read->size > reply.results.size()) {
-        std::abort();
-    }
+    require(read.decode(reply.results) || read->size == 0);
+    require(read->size > target.size() || read->size <= reply.results.size());
     XdrValue<Device_ReadResp> generated(xdr_Device_ReadResp);
-    if (generated.decode(reply.results) && generated->data.data_len <= target.size() &&
-        (read->size != generated->data.data_len ||
-         !std::equal(target.begin(), target.begin() + read->size,
-                     reinterpret_cast<const std::uint8_t *>(generated->data.data_val)))) {
-        std::abort();
+    if (generated.decode(reply.results) && generated->data.data_len <= target.size()) {
+        require(read->size == generated->data.data_len &&
+                std::equal(target.begin(), target.begin() + read->size,
+                           reinterpret_cast<const std::uint8_t *>(generated->data.data_val)));
     }
     (void)decodes(xdr_Device_WriteResp, reply.results);
     (void)decodes(xdr_Create_LinkResp, reply.results);
@@ -74,14 +65,10 @@ void trackMessages(std::span<const std::uint8_t> bytes, std::size_t pieceSize)
         do {
             const auto rest = bytes.subspan(done);
             const std::size_t size = cut.advance(rest.first(std::min(rest.size(), pieceSize)));
-            if (size == 0) {
-                std::abort();
-            }
+            require(size > 0);
             done += size;
         } while (!cut.endedMessage() && done < bytes.size());
-        if (done != end || whole.endedMessage() != cut.endedMessage()) {
-            std::abort();
-        }
+        require(done == end && whole.endedMessage() == cut.endedMessage());
         bytes = bytes.subspan(end);
     }
 }
@@ -102,9 +89,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     auto rest = stream;
     while (!rest.empty() && reader.state() != RpcRecordReader::State::Broken) {
         const std::size_t taken = reader.feed(rest.first(std::min(rest.size(), pieceSize)));
-        if (taken == 0 || reader.record().size() > LargestRecord) {
-            std::abort();
-        }
+        require(taken > 0 && reader.record().size() <= LargestRecord);
         rest = rest.subspan(taken);
         if (reader.state() == RpcRecordReader::State::Complete) {
             decodeRecord(reader.record());

@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/require.h"
 #include "visa/Configuration.h"
 #include "visa/FindExpression.h"
 #include "visa/ResourceName.h"
 #include "visa/formattext.h"
-
-#include <cstdlib>
 
 using namespace visa;
 
@@ -14,23 +13,17 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     const std::string text(reinterpret_cast<const char *>(data), size);
     std::string error;
     const auto configuration = parseConfiguration(text, error);
-    if (configuration.has_value() != error.empty()) {
-        std::abort();
-    }
+    require(configuration.has_value() == error.empty());
     if (const auto name = parseResourceName(text)) {
         const std::string full = resourceText(*name);
-        if (full.size() >= VI_FIND_BUFLEN || parseResourceName(full) != name) {
-            std::abort();
-        }
+        require(full.size() < VI_FIND_BUFLEN && parseResourceName(full) == name);
     }
     if (const auto pattern = FindExpression::parse(text)) {
         (void)pattern->matches("TCPIP0::192.168.1.20::inst0::INSTR");
     }
     if (const auto messages = formatMessages(text)) {
         for (const std::string &message : *messages) {
-            if (message.empty()) {
-                std::abort();
-            }
+            require(!message.empty());
         }
     }
     return 0;

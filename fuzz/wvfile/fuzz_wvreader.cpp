@@ -17,10 +17,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     samples.clear();
     markers.clear();
     tags.clear();
-    MemoryDevice device;
-    device.bytes =
-        QByteArray::fromRawData(reinterpret_cast<const char *>(data), static_cast<qsizetype>(size));
-    require(device.open(QIODevice::ReadOnly));
+    MemoryDevice device(data, size);
     WvFileInfo info;
     info.dataStream = &samples.stream;
     info.markerStream = &markers.stream;

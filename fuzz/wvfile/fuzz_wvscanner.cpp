@@ -8,10 +8,7 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size)
 {
-    MemoryDevice device;
-    device.bytes =
-        QByteArray::fromRawData(reinterpret_cast<const char *>(data), static_cast<qsizetype>(size));
-    require(device.open(QIODevice::ReadOnly));
+    MemoryDevice device(data, size);
     WvFileSummary summary;
     const bool ok = WvScanner(summary).scan(device);
     // A refusal has a reason; a list of segments is no longer than the text that it came from.
