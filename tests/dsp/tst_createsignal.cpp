@@ -55,6 +55,27 @@ std::vector<Case> allCases()
     return cases;
 }
 
+/// A signal made, and what is said of it.
+struct Made
+{
+    Samples samples;
+    int written = 0;
+    double rms = 0;
+    double peak = 0;
+};
+
+std::optional<Made> make(CreateSignal &signal)
+{
+    TempStream stream;
+    signal.setOutput(stream.open() ? stream.stream() : nullptr);
+    Made made;
+    if (!signal.generate() || !signal.statistics(&made.written, &made.rms, &made.peak)) {
+        return {};
+    }
+    made.samples = readStream(*stream.stream());
+    return made;
+}
+
 } // namespace
 
 class TestCreateSignal : public QObject
@@ -76,19 +97,13 @@ void TestCreateSignal::wordsEqualLiteral()
 {
     constexpr unsigned seed = 4711;
     forRows(allCases(), [&](const Case &test) {
-        TempStream stream;
-        QVERIFY(stream.open());
         CreateSignal signal;
         signal.setSeed(seed);
         signal.setSignalType(test.type);
         QVERIFY(test.configure(signal));
-        signal.setOutput(stream.stream());
-        QVERIFY(signal.generate());
-        int written = 0;
-        double rms = 0;
-        double peak = 0;
-        QVERIFY(signal.statistics(&written, &rms, &peak));
-        const Samples samples = readStream(*stream.stream());
+        const std::optional<Made> made = make(signal);
+        QVERIFY(made);
+        const auto &[samples, written, rms, peak] = *made;
         QCOMPARE(samples.size(), static_cast<size_t>(written));
         // Short loops are repeated, a pulse isn't.
         QVERIFY(written == signal.sampleCount() ||
@@ -143,8 +158,6 @@ void TestCreateSignal::refusals()
 void TestCreateSignal::manyCarriersEqualLiteral()
 {
     // The literal form of all samples takes minutes, so every 997th is judged.
-    TempStream stream;
-    QVERIFY(stream.open());
     CreateSignal signal;
     signal.setSeed(99);
     signal.setSignalType(SignalType::MultiCarrier);
@@ -152,10 +165,9 @@ void TestCreateSignal::manyCarriersEqualLiteral()
     const MultiCarrierSettings settings{600, 10000, 0, true};
     QVERIFY(signal.configureMultiCarrier(settings));
     QCOMPARE(signal.sampleCount(), 1000000);
-    signal.setOutput(stream.stream());
-    QVERIFY(signal.generate());
-    const Samples samples = readStream(*stream.stream());
-    QCOMPARE(samples.size(), size_t{1000000});
+    const std::optional<Made> made = make(signal);
+    QVERIFY(made && made->samples.size() == 1000000);
+    const Samples &samples = made->samples;
 
     std::srand(99);
     double phases[64] = {};
@@ -177,20 +189,15 @@ void TestCreateSignal::noiseEqualsLiteral()
 {
     forRows({{"white", 0}, {"pink", 1}, {"brown", 2}}, [&](int kind) {
         const NoiseSettings settings{static_cast<NoiseKind>(kind), 1e6, 0.01};
-        TempStream stream;
-        QVERIFY(stream.open());
         CreateSignal signal;
         signal.setSeed(7);
         signal.setSignalType(SignalType::Noise);
         QVERIFY(signal.configureNoise(settings));
         QCOMPARE(signal.sampleCount(), 15000);
         QCOMPARE(signal.clockRate(), 1.5e6);
-        signal.setOutput(stream.stream());
-        QVERIFY(signal.generate());
-        int written = 0;
-        double rms = 0;
-        double peak = 0;
-        QVERIFY(signal.statistics(&written, &rms, &peak));
+        const std::optional<Made> made = make(signal);
+        QVERIFY(made && made->samples.size() == 15000);
+        const auto &[samples, written, rms, peak] = *made;
         QCOMPARE(written, 15000);
 
         std::srand(7);
@@ -201,8 +208,6 @@ void TestCreateSignal::noiseEqualsLiteral()
         }
         const auto expected =
             literalResample({.length = 101, .rate = 1.5e6, .cutoff = 0.5e6}, raw, 15000);
-        const Samples samples = readStream(*stream.stream());
-        QCOMPARE(samples.size(), size_t{15000});
         double highest = 0;
         double sum = 0;
         for (size_t i = 0; i < samples.size(); ++i) {

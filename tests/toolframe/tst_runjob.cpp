@@ -6,7 +6,6 @@
 #include "support/modals.h"
 #include "toolframe/QtProgressDialog.h"
 #include "toolframe/QtProgressWidget.h"
-#include "toolframe/questions.h"
 #include "toolframe/runjob.h"
 
 #include <QApplication>
@@ -59,7 +58,6 @@ class TestRunJob : public QObject
 private slots:
     void reportKeepsItsLayout();
     void cancelButtonEndsTheJob();
-    void asksBeforeOverwriting();
     void shortJobsShowNothing();
     void appearsWithoutAnEventLoop();
     void inputIsKeptFromOtherWindowsMeanwhile();
@@ -96,22 +94,6 @@ void TestRunJob::cancelButtonEndsTheJob()
     QCOMPARE(runJob(job, nullptr, nullptr), JobOutcome::Cancelled);
     QCOMPARE(label, "Reading Waveform...");
     QCOMPARE(value, 10);
-}
-
-void TestRunJob::asksBeforeOverwriting()
-{
-    const TestFolder folder;
-    QVERIFY(folder.store("taken.wv", {}));
-    QVERIFY(confirmOverwrite(nullptr, folder.path("new.wv")));
-    for (const bool agreed : {true, false}) {
-        (void)takeLog();
-        Seen seen;
-        QVERIFY(
-            withModal([&] { QCOMPARE(confirmOverwrite(nullptr, folder.path("taken.wv")), agreed); },
-                      answer(agreed ? "Yes" : "No", seen)));
-        QCOMPARE(seen.title, "Overwrite File");
-        QCOMPARE(takeMessages(), agreed ? QStringList() : QStringList("User break."));
-    }
 }
 
 void TestRunJob::shortJobsShowNothing()

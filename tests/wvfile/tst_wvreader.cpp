@@ -39,7 +39,6 @@ private slots:
     void textTags();
     void levelsAreMeasured();
     void unknownTagsAreKept();
-    void badCalls();
     void progressAndCancel();
 };
 
@@ -260,26 +259,6 @@ void TestWvReader::unknownTagsAreKept()
     ReadRun cut(tgx + "{FREE:text", true);
     QVERIFY(!cut.read().ok);
     QCOMPARE(cut.log.last(), QString("4|Invalid tag. '}' is missing."));
-}
-
-void TestWvReader::badCalls()
-{
-    CapturedLog log;
-    WvFileInfo info;
-    BufferedIO notReady;
-    info.dataStream = info.markerStream = &notReady;
-    QVERIFY(!HvFileIO().readWaveform(nullptr));
-    QVERIFY(!HvFileIO().readWaveform(&info));
-    QCOMPARE(log.take(), QStringList({"4|Invalid input parameter.", "4|Library not initialized.",
-                                      "4|Temporary marker storage not accessible."}));
-    ReadRun full(tgx + one);
-    full.dataDevice.capacity = 0;
-    QVERIFY(!full.read().ok);
-    QCOMPARE(full.log.last(), QString("4|Cannot write to temporary file!"));
-    ReadRun noMarkers(tgx + one);
-    noMarkers.markerDevice.capacity = 0;
-    QVERIFY(!noMarkers.read().ok);
-    QCOMPARE(noMarkers.log.last(), QString("4|Writing to temporary data storage failed."));
 }
 
 void TestWvReader::progressAndCancel()
