@@ -5,6 +5,7 @@
 #include "processorcores.h"
 
 #include "base/ProgressClock.h"
+#include "base/freespace.h"
 #include "base/parallel.h"
 #include "log/Tracer.h"
 #include "streams/samplestream.h"
@@ -97,7 +98,7 @@ bool ComposerEngine::runComposer()
                 QStringLiteral("Will spawn up to %1 processes where possible.").arg(m_maxThreads));
         }
     }
-    bool done = true;
+    bool done = hasTemporaryRoom();
     for (int pass = 1; done && pass <= 3; ++pass) {
         done = runPass(pass);
         if (done) {
@@ -110,6 +111,19 @@ bool ComposerEngine::runComposer()
     cleanUp();
     emit headline(QStringLiteral("Job Completed at ") + now());
     return done;
+}
+
+/// For the samples of all segments that are read, and for those of the target.
+bool ComposerEngine::hasTemporaryRoom() const
+{
+    qint64 samples = m_composition.target.lSamples;
+    for (int track = 0; track < m_composition.trackCount(); ++track) {
+        const bool isRead = m_composition.tracks()[static_cast<std::size_t>(track)].bEnable;
+        for (int i = 0; isRead && i < m_composition.segmentCount(track); ++i) {
+            samples += m_composition.segment(track, i)->lSamples;
+        }
+    }
+    return hasTemporaryRoomFor(samples * BufferedIO::RecordSize);
 }
 
 void ComposerEngine::cleanUp()

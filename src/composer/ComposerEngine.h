@@ -77,6 +77,7 @@ private:
     [[nodiscard]] bool mixTracks(BufferedIO &data, BufferedIO &markers, LevelSums &levels);
     [[nodiscard]] bool scaleAndSave(BufferedIO &data, BufferedIO &markers, const LevelSums &levels);
     void reportClipping();
+    [[nodiscard]] bool hasTemporaryRoom() const;
     void cleanUp();
 
     Composition m_composition;

@@ -6,6 +6,7 @@
 
 #include "base/EngineeringNumber.h"
 #include "base/SideWorker.h"
+#include "base/freespace.h"
 #include "base/limits.h"
 #include "log/Tracer.h"
 #include "streams/samplestream.h"
@@ -328,6 +329,11 @@ bool DataFileAccess::readBinary(const WvImportJob &job, QIODevice &first, QIODev
         return whole;
     };
     const qint64 most = mostSamples(limit);
+    // What a pipe brings isn't known before.
+    const qint64 expected = first.isSequential() ? 0 : first.size() / size / (second ? 1 : 2);
+    if (!hasTemporaryRoomFor(std::min(expected, most) * BufferedIO::RecordSize)) {
+        return false;
+    }
     while (m_samples < most) {
         if (progress.shouldStop(first.pos(), first.size())) {
             return Tracer::fail("Action aborted by user.");

@@ -34,6 +34,9 @@ std::optional<qint64> RiqImportJob::readInput(TempStream &data, qint64 limit)
         Tracer::Trace(Tracer::Error, "Cannot open RIQ file.");
         return std::nullopt;
     }
+    if (limit == 0 && !hasTemporaryRoomFor(entry.samples * BufferedIO::RecordSize)) {
+        return std::nullopt;
+    }
     if (m_request.clockFromFile) {
         setClock(permittedClock(entry.sampleRate));
     }

@@ -49,7 +49,7 @@ void CaptureJob::say(const QString &text)
 bool CaptureJob::work()
 {
     m_capture = std::make_unique<Capture>();
-    if (!m_capture->data.open()) {
+    if (!m_capture->data.openFor(m_request.samples)) {
         m_capture.reset();
         return Tracer::fail("Cannot create temporary data buffer.");
     }
