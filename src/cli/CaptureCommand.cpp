@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "InstrumentArguments.h"
+#include "Presets.h"
 
 #include "jobs/instrument/CaptureJob.h"
 #include "jobs/instrument/CaptureSaveJob.h"
@@ -88,6 +89,20 @@ void addCaptureCommand(CLI::App &instr, CommandSet &commands)
     addChoice(command, "--scaling", state->scaling, {"none", "down", "auto"},
               "Level scaling (default: auto)");
     addOutputArguments(command, state->output);
+    // The dialog keeps the scaling as one bit of three.
+    commands.presets.add(
+        command, "SpaImport",
+        QList<PresetField>{
+            {.option = "--input", .key = "input", .names = {"rf", "aiq", "diq"}},
+            {.option = "--rate", .key = "samplerate", .unit = "Hz"},
+            {.option = "--samples", .key = "samples"},
+            {.option = "--rbw", .key = "rbw", .unit = "Hz"},
+            {.option = "--pretrigger", .key = "pretrigger"},
+            {.option = "--trigger", .key = "trgsrc", .names = {"imm", "ext", "ifp"}},
+            {.option = "--slope", .key = "trgslope", .names = {"pos", "neg"}},
+            {.option = "--level", .key = "trglevel", .unit = "dBm"},
+            {.option = "--scaling", .key = "scaling", .names = {"", "none", "down", "", "auto"}}} +
+            presetTexts());
     command.footer(
         "Example: corvane-cli instr capture 192.168.1.30 -o a.wv --rate 2M --samples 20000");
 }
