@@ -123,7 +123,19 @@ void DlgView::addSideColumn()
     scroll->setWidget(side);
     scroll->setFixedWidth(side->sizeHint().width() +
                           style()->pixelMetric(QStyle::PM_ScrollBarExtent) + 2);
-    m_ui->hl_main->addWidget(scroll);
+    m_ui->vl_side->removeItem(m_ui->hl_buttons);
+    m_ui->hl_buttons->setParent(nullptr);
+    auto *column = new QVBoxLayout;
+    column->addWidget(scroll, 1);
+    column->addLayout(m_ui->hl_buttons);
+    m_ui->hl_main->addLayout(column);
+    // From top to bottom, as they stand.
+    QWidget *before = m_ui->cb_SpectrumMode;
+    for (QWidget *next : std::initializer_list<QWidget *>{
+             m_average, m_length, m_window, m_saveSelection, m_ui->pb_fix_ref, m_ui->cb_close}) {
+        setTabOrder(before, next);
+        before = next;
+    }
 }
 
 void DlgView::addSpectrumChoices()

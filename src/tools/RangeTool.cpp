@@ -72,7 +72,8 @@ RangeTool::RangeTool(QString title, QString settingsGroup, QString suffix, QWidg
     m_report->setAccessibleName("Report");
     m_report->setReadOnly(true);
     constexpr int ReportHeight = 84;
-    m_report->setFixedHeight(ReportHeight);
+    m_report->setMinimumHeight(ReportHeight / 2); // on small screens
+    m_report->setMaximumHeight(ReportHeight);
 
     auto *lower = new QHBoxLayout;
     lower->addWidget(makeCursorBox());
@@ -166,6 +167,17 @@ QGroupBox *RangeTool::makeCursorBox()
 void RangeTool::addControls(QWidget *controls)
 {
     m_controls->addWidget(controls);
+    // They are made last, but stand before the report and the buttons.
+    QList<QWidget *> order = controls->findChildren<QWidget *>();
+    order.removeIf([](const QWidget *one) { return one->focusPolicy() == Qt::NoFocus; });
+    if (order.isEmpty()) {
+        return;
+    }
+    order.prepend(findChild<QWidget *>("pb_end_2"));
+    order.append({m_report, m_run, findChild<QWidget *>("cb_close")});
+    for (qsizetype i = 1; i < order.size(); ++i) {
+        setTabOrder(order.at(i - 1), order.at(i));
+    }
 }
 
 bool RangeTool::startModule(const QString &path)

@@ -56,7 +56,7 @@ ViewFrame::ViewFrame(QWidget *parent)
     , m_splitter(new QSplitter(Qt::Vertical))
 {
     m_trace->setObjectName("w_iqtrace");
-    m_trace->setMinimumSize(200, 160);
+    m_trace->setMinimumSize(200, 120);
     m_trace->setShowMarkers(true);
     m_timeline->setObjectName("w_timeline");
     m_timeline->setToolTip("The whole waveform; drag the visible range");

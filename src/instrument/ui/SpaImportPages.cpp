@@ -143,6 +143,9 @@ void SpaImportPages::addSettingsPage()
     form->addRow("&Device", cb_device);
     form->addRow("&Input", cb_input);
     form->addRow("Sample &Rate", le_samplerate);
+    for (QRadioButton *button : {rb_samples, rb_time}) { // level with their fields
+        button->setMinimumHeight(le_samples->sizeHint().height());
+    }
     form->addRow(rb_samples, le_samples);
     form->addRow(rb_time, le_time);
     form->addRow("Resolution &Bandwidth", le_rbw);
