@@ -45,13 +45,9 @@ void select(QComboBox &box, int value)
 } // namespace
 
 DlgWvFromData::DlgWvFromData(QWidget *parent)
-    : ImportWizard({.settingsGroup = "WvImport",
-                    .position = {200, 140},
-                    .size = {760, 560},
-                    .abortedText = "Import aborted"},
-                   "Create Waveform From Data", parent)
+    : ImportWizard("WvImport", "Create Waveform From Data", parent)
 {
-    addInputPage();
+    addFilesPage();
     addFormatPage();
     addSharedPages();
     setPreviewSamples(PreviewSamples);
@@ -60,7 +56,7 @@ DlgWvFromData::DlgWvFromData(QWidget *parent)
     enableChoices();
 }
 
-void DlgWvFromData::addInputPage()
+void DlgWvFromData::addFilesPage()
 {
     QVBoxLayout *column = addPage("page");
     auto *group = new QGroupBox("Input Files");

@@ -40,7 +40,7 @@ private slots:
     void slot_Save();
 
 private:
-    void addInputPage();
+    void addFilesPage();
     void addFormatPage();
     void fillPrecisions();
     void enableChoices();

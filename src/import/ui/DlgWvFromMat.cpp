@@ -7,26 +7,11 @@
 #include "jobs/DirectoryJob.h"
 #include "jobs/MatImportJob.h"
 
-#include <QGridLayout>
-#include <QGroupBox>
-#include <QVBoxLayout>
-
 DlgWvFromMat::DlgWvFromMat(QWidget *parent)
-    : ImportWizard({.settingsGroup = "Mat2Wv",
-                    .position = {200, 140},
-                    .size = {760, 560},
-                    .abortedText = "Import aborted"},
-                   "Create Waveform From MATLAB File", parent)
-    , m_tree(new ContentTree)
+    : ImportWizard("Mat2Wv", "Create Waveform From MATLAB File", parent)
 {
-    QVBoxLayout *column = addPage("page");
-    auto *input = new QGroupBox("Input File");
-    auto *grid = new QGridLayout(input);
-    addInputRow(*grid, "Select import file 1", "Data File (*.txt *.bin *.wfm *.i)");
-    column->addWidget(input);
-    m_tree->setObjectName("tw_content");
-    column->addWidget(m_tree, 1);
-    connect(m_tree, &ContentTree::checkChanged, this, [this] { updateButtons(); });
+    m_tree =
+        addContentTree(*addInputPage("Select import file 1", "Data File (*.txt *.bin *.wfm *.i)"));
     addSharedPages();
     setUpWizard();
 }

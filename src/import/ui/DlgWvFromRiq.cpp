@@ -6,27 +6,12 @@
 #include "jobs/DirectoryJob.h"
 #include "jobs/RiqImportJob.h"
 
-#include <QGridLayout>
-#include <QGroupBox>
 #include <QPlainTextEdit>
-#include <QVBoxLayout>
 
 DlgWvFromRiq::DlgWvFromRiq(QWidget *parent)
-    : ImportWizard({.settingsGroup = "Riq2Wv",
-                    .position = {200, 140},
-                    .size = {760, 560},
-                    .abortedText = "Import aborted"},
-                   "Create Waveform From RIQ File", parent)
-    , m_tree(new ContentTree)
+    : ImportWizard("Riq2Wv", "Create Waveform From RIQ File", parent)
 {
-    QVBoxLayout *column = addPage("page");
-    auto *input = new QGroupBox("Input File");
-    auto *grid = new QGridLayout(input);
-    addInputRow(*grid, "Select Import File", "RIQ File (*.riq)");
-    column->addWidget(input);
-    m_tree->setObjectName("tw_content");
-    column->addWidget(m_tree, 1);
-    connect(m_tree, &ContentTree::checkChanged, this, [this] { updateButtons(); });
+    m_tree = addContentTree(*addInputPage("Select Import File", "RIQ File (*.riq)"));
     addSharedPages();
     setUpWizard();
 }

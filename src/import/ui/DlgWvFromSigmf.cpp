@@ -20,31 +20,23 @@ constexpr double HighestRate = 1e12;
 } // namespace
 
 DlgWvFromSigmf::DlgWvFromSigmf(QWidget *parent)
-    : ImportWizard({.settingsGroup = "Sigmf2Wv",
-                    .position = {200, 140},
-                    .size = {760, 560},
-                    .abortedText = "Import aborted"},
-                   "Create Waveform From SigMF Recording", parent)
+    : ImportWizard("Sigmf2Wv", "Create Waveform From SigMF Recording", parent)
     , m_channel(new QtNumericEdit)
     , m_type(new QLabel)
     , m_error(new QLabel)
 {
-    QVBoxLayout *column = addPage("page");
-    auto *input = new QGroupBox("Input File");
-    auto *inputGrid = new QGridLayout(input);
-    addInputRow(*inputGrid, "Select Import File",
-                "SigMF Recording (*.sigmf-meta *.sigmf-data *.sigmf)");
+    QVBoxLayout *column =
+        addInputPage("Select Import File", "SigMF Recording (*.sigmf-meta *.sigmf-data *.sigmf)");
     m_channel->setObjectName("le_channel");
     m_channel->setName("Channel");
     m_channel->setMax(1);
     m_channel->setMin(1);
     m_channel->setVal(1);
     m_channel->setStep(1);
-    addRow(*inputGrid, "Channel", m_channel, "Channel that becomes the waveform, counted from 1");
-    column->addWidget(input);
     auto *metadata = new QGroupBox("Recording");
     auto *grid = new QGridLayout(metadata);
     m_type->setObjectName("l_type");
+    addRow(*grid, "Channel", m_channel, "Channel that becomes the waveform, counted from 1");
     addRow(*grid, "Datatype", m_type);
     m_sampleRate = addFact(*grid, "le_samplerate", "Sample Rate", "Hz", 0, HighestRate);
     m_samples = addFact(*grid, "le_samples", "Number of Samples", {}, 0, MostSamples);

@@ -17,18 +17,10 @@ constexpr double MostSamples = 1e9;
 } // namespace
 
 DlgWvFromWav::DlgWvFromWav(QWidget *parent)
-    : ImportWizard({.settingsGroup = "Wav2Wv",
-                    .position = {200, 140},
-                    .size = {760, 560},
-                    .abortedText = "Import aborted"},
-                   "Create Waveform From WAV File", parent)
+    : ImportWizard("Wav2Wv", "Create Waveform From WAV File", parent)
     , m_error(new QLabel)
 {
-    QVBoxLayout *column = addPage("page");
-    auto *input = new QGroupBox("Input File");
-    auto *inputGrid = new QGridLayout(input);
-    addInputRow(*inputGrid, "Select Import File", "WAV File (*.wav)");
-    column->addWidget(input);
+    QVBoxLayout *column = addInputPage("Select Import File", "WAV File (*.wav)");
     auto *header = new QGroupBox("   File Header Information");
     auto *grid = new QGridLayout(header);
     m_dataClock = addFact(*grid, "le_dataclock", "Data Clockrate", "Hz", ImportTarget::MinClockHz,

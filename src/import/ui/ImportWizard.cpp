@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "ImportWizard.h"
 
+#include "ContentTree.h"
+
 #include "display/CWidgetConstellation.h"
 #include "display/CWidgetIQTrace.h"
 #include "display/CWidgetSpectrum.h"
@@ -26,6 +28,9 @@
 
 namespace {
 
+constexpr QPoint StartPosition(200, 140);
+constexpr QSize StartSize(760, 560);
+
 template <typename Widget>
 Widget *named(const char *name)
 {
@@ -38,13 +43,17 @@ constexpr int PlotHeight = 120;
 
 } // namespace
 
-ImportWizard::ImportWizard(const Frame &frame, const QString &title, QWidget *parent)
-    : ToolWizard(frame, parent)
+ImportWizard::ImportWizard(const QString &settingsGroup, const QString &title, QWidget *parent)
+    : ToolWizard({.settingsGroup = settingsGroup,
+                  .position = StartPosition,
+                  .size = StartSize,
+                  .abortedText = "Import aborted"},
+                 parent)
     , m_stack(named<QStackedWidget>("sw_assist"))
     , m_problem(named<QLabel>("l_problem"))
 {
     setWindowTitle(title);
-    resize(frame.size);
+    resize(StartSize);
     auto *column = new QVBoxLayout(this);
     column->addWidget(m_stack, 1);
     m_problem->setWordWrap(true);
@@ -83,6 +92,23 @@ void ImportWizard::addRow(QGridLayout &grid, const QString &label, QWidget *fiel
     }
     grid.addWidget(title, row, 0);
     grid.addWidget(field, row, 1, 1, 2);
+}
+
+QVBoxLayout *ImportWizard::addInputPage(const QString &dialogTitle, const QString &filter)
+{
+    QVBoxLayout *column = addPage("page");
+    auto *group = new QGroupBox("Input File");
+    addInputRow(*new QGridLayout(group), dialogTitle, filter);
+    column->addWidget(group);
+    return column;
+}
+
+ContentTree *ImportWizard::addContentTree(QVBoxLayout &column)
+{
+    auto *tree = named<ContentTree>("tw_content");
+    column.addWidget(tree, 1);
+    connect(tree, &ContentTree::checkChanged, this, [this] { updateButtons(); });
+    return tree;
 }
 
 QtNumericEdit *ImportWizard::addFact(QGridLayout &grid, const char *name, const QString &title,

@@ -6,6 +6,7 @@
 #include "jobs/ImportJob.h"
 
 class CWidgetConstellation;
+class ContentTree;
 class CWidgetIQTrace;
 class CWidgetSpectrum;
 class QGridLayout;
@@ -29,7 +30,7 @@ public:
     [[nodiscard]] bool startModule(const QString &path) override;
 
 protected:
-    ImportWizard(const Frame &frame, const QString &title, QWidget *parent);
+    ImportWizard(const QString &settingsGroup, const QString &title, QWidget *parent);
 
     /// The job that the fields ask for; a preview is made by the same.
     [[nodiscard]] virtual std::unique_ptr<ImportJob> makeImportJob() const = 0;
@@ -42,6 +43,12 @@ protected:
 
     /// Adds a page, whose layout is returned.
     [[nodiscard]] QVBoxLayout *addPage(const QString &name);
+
+    /// Adds the first page with the input file alone; more goes below it in the layout returned.
+    [[nodiscard]] QVBoxLayout *addInputPage(const QString &dialogTitle, const QString &filter);
+
+    /// Adds the content of a file of several signals, which fills what is left of a page.
+    [[nodiscard]] ContentTree *addContentTree(QVBoxLayout &column);
 
     /// Adds a row with "le_infile1" and its button to a grid.
     void addInputRow(QGridLayout &grid, const QString &dialogTitle, const QString &filter);
