@@ -22,7 +22,6 @@ private slots:
     void init();
     void renders();
     void lists();
-    void refusals();
 
 private:
     TestFolder m_folder;
@@ -87,21 +86,6 @@ void tst_composecommand::lists()
     const CliRun plain = CliRun::in(m_folder.path(), {"compose", "a.cms", "--list"});
     QVERIFY(plain.output.contains("gone.wv (missing)"));
     QVERIFY(!QFile::exists(m_folder.path("out.wv")));
-}
-
-void tst_composecommand::refusals()
-{
-    forRows({{"no length", "lSamples='5000'", "", "a length of 0 samples"},
-             {"no folder", "'out.wv'", "'no/out.wv'", "its folder doesn't exist"},
-             {"broken", "</Settings>", "", "a.cms': line 1: "}},
-            [this](const QByteArray &from, const QByteArray &to, const QString &reason) {
-                init();
-                QVERIFY(m_folder.store("a.cms", m_folder.load("a.cms").replace(from, to)));
-                const CliRun run = CliRun::in(m_folder.path(), {"compose", "a.cms"});
-                QCOMPARE(run.exitCode, 1);
-                QVERIFY2(run.lastLine().startsWith("error: ") && run.lastLine().contains(reason),
-                         qPrintable(run.lines.join('\n')));
-            });
 }
 
 QTEST_GUILESS_MAIN(tst_composecommand)

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "jobrun.h"
-#include "jobs/DumpJob.h"
 #include "jobs/InfoReport.h"
 #include "jobs/LevelJob.h"
 #include "jobs/MeasureJob.h"
@@ -31,7 +30,6 @@ private slots:
     void importSetsTheClock();
     void measuresRanges();
     void cancelKeepsLaterStepsFromStarting();
-    void cancelAfterTheEndIsHarmless();
     void clippingIsTold();
     void levelCopyKeepsTheRest();
     void keepsEveryWord();
@@ -224,19 +222,6 @@ void TestJobs::cancelKeepsLaterStepsFromStarting()
                 QVERIFY(!QFile::exists(path("out.wv")));
                 QVERIFY(m_streams.isEmpty());
             });
-}
-
-void TestJobs::cancelAfterTheEndIsHarmless()
-{
-    QVERIFY(m_folder.store("in.wv", wvFile(plainTags, words({0, 1, 2, 3}))));
-    QByteArray dumped;
-    DumpJob job({path("in.wv"), 1, {}}, DumpFormat::Ci16, [&dumped](const QByteArray &bytes) {
-        dumped += bytes;
-        return true;
-    });
-    QCOMPARE(job.run(), JobOutcome::Finished);
-    job.cancel();
-    QCOMPARE(dumped, words({2, 3}));
 }
 
 void TestJobs::clippingIsTold()

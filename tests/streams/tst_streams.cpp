@@ -95,7 +95,6 @@ class TestStreams : public QObject
 private slots:
     void anyOrderOfCalls();
     void modes();
-    void refusedCalls();
     void failingDevice();
     void levelsInOrder();
 };
@@ -187,28 +186,6 @@ void TestStreams::modes()
                 QCOMPARE(device.bytes, (mode & BufferedIO::Write) != 0 ? "newtent" : "content");
                 QVERIFY2(!stream.initBuf(&device, mode), "a second time without a release");
             });
-}
-
-void TestStreams::refusedCalls()
-{
-    CapturedLog log;
-    TestDevice device;
-    BufferedIO stream(Buffer);
-    char byte = 0;
-    QVERIFY(!stream.readBytes(1, &byte) && !stream.writeBytes(1, &byte));
-    QVERIFY(!stream.writeBlock(1, &byte) && !stream.restartAtPosition(3));
-    QCOMPARE(log.take(), QStringList(4, "4|Library not initialized."));
-    QVERIFY(!stream.releaseBuf());
-    QCOMPARE(log.take(), QStringList("4|Buffer not initialized."));
-    // All other failures are the caller's to name.
-    QVERIFY(stream.initBuf(&device, BufferedIO::ReadWrite));
-    for (const int length : {0, -1, 4}) {
-        char *target = length > 0 ? nullptr : &byte;
-        QVERIFY(!stream.readBytes(length, target));
-        QVERIFY(!stream.writeBytes(length, target));
-        QVERIFY(!stream.writeBlock(length, target));
-    }
-    QCOMPARE(log.take(), QStringList());
 }
 
 void TestStreams::failingDevice()
