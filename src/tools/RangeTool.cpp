@@ -169,7 +169,9 @@ void RangeTool::addControls(QWidget *controls)
     m_controls->addWidget(controls);
     // They are made last, but stand before the report and the buttons.
     QList<QWidget *> order = controls->findChildren<QWidget *>();
-    order.removeIf([](const QWidget *one) { return one->focusPolicy() == Qt::NoFocus; });
+    order.removeIf([this](const QWidget *one) { // the list of a box of choices is another window
+        return one->focusPolicy() == Qt::NoFocus || one->window() != this;
+    });
     if (order.isEmpty()) {
         return;
     }
