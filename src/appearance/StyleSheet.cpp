@@ -182,6 +182,7 @@ const std::vector<Rule> &rules()
          "border-top-left-radius: 3px; border-top-right-radius: 3px; margin-right: 2px; }",
          {ButtonBase, AppText, Borders}},
         {"QTabBar::tab:selected { background-color: %1; }", {Selection}},
+        {"QTabBar::tab:focus { border-color: %1; }", {AppText}},
         {"QTabBar::tab:disabled { color: %1; }", {AppTextDisabled}},
         {"QSplitter::handle { background-color: %1; }", {WindowBackground}},
         {"QSplitter::handle:hover { background-color: %1; }", {Borders}},
