@@ -76,36 +76,32 @@ QLayout *DlgComposer::insertRow()
 QLayout *DlgComposer::viewRow()
 {
     auto *row = new QHBoxLayout;
-    addButton(row, "pb_start", "jump_start", "Start", "Show the Beginning",
+    addButton(row, "pb_start", "jump_start", "", "Show the Beginning",
               [this] { m_tracks->moveStart(); });
-    addButton(row, "pb_zoomin", "zoom_in", "Zoom In", "Zoom In", [this] { m_tracks->zoomIn(); });
-    addButton(row, "pb_zoomout", "zoom_out", "Zoom Out", "Zoom Out",
-              [this] { m_tracks->zoomOut(); });
-    addButton(row, "pb_zoomfit", "zoom_fit", "Fit", "Show All", [this] { m_tracks->zoomFit(); });
-    addButton(row, "pb_end", "jump_end", "End", "Show the End", [this] { m_tracks->moveEnd(); });
+    addButton(row, "pb_zoomin", "zoom_in", "", "Zoom In", [this] { m_tracks->zoomIn(); });
+    addButton(row, "pb_zoomout", "zoom_out", "", "Zoom Out", [this] { m_tracks->zoomOut(); });
+    addButton(row, "pb_zoomfit", "zoom_fit", "", "Show All", [this] { m_tracks->zoomFit(); });
+    addButton(row, "pb_end", "jump_end", "", "Show the End", [this] { m_tracks->moveEnd(); });
     row->addStretch(1);
     row->addWidget(l_duration);
     row->addSpacing(12);
     row->addWidget(l_rate);
     row->addStretch(1);
     row->addWidget(new QLabel(QStringLiteral("Cursor"), this));
-    addButton(row, "pb_csr_begin", "cursor_start", "", "Cursor to the Beginning", [this] {
-        m_tracks->setCsrBegin();
-    })->setMaximumWidth(36);
+    addButton(row, "pb_csr_begin", "cursor_start", "", "Cursor to the Beginning",
+              [this] { m_tracks->setCsrBegin(); });
     row->addWidget(le_csr_sample);
     row->addWidget(new QLabel(QStringLiteral("Cursor Time"), this));
     row->addWidget(le_csr_time);
-    addButton(row, "pb_csr_end", "cursor_end", "", "Cursor to the End", [this] {
-        m_tracks->setCsrEnd();
-    })->setMaximumWidth(36);
+    addButton(row, "pb_csr_end", "cursor_end", "", "Cursor to the End",
+              [this] { m_tracks->setCsrEnd(); });
     for (QtNumericEdit *field : {le_csr_sample, le_csr_time}) {
         field->setFixedWidth(fontMetrics().horizontalAdvance(QStringLiteral("888.888888 ms")) + 16);
     }
-    // The style makes buttons wider than their texts, which this row has no room for.
-    for (const char *name : {"pb_start", "pb_zoomin", "pb_zoomout", "pb_zoomfit", "pb_end"}) {
-        auto *button = findChild<QPushButton *>(QLatin1String(name));
-        button->setMaximumWidth(fontMetrics().horizontalAdvance(button->text()) +
-                                button->iconSize().width() + 28);
+    for (const char *name : {"pb_start", "pb_zoomin", "pb_zoomout", "pb_zoomfit", "pb_end",
+                             "pb_csr_begin", "pb_csr_end"}) {
+        constexpr int IconButtonWidth = 34;
+        findChild<QPushButton *>(QLatin1String(name))->setMaximumWidth(IconButtonWidth);
     }
     return row;
 }
