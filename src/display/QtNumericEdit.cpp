@@ -9,6 +9,7 @@
 #include <QKeyEvent>
 #include <QMenu>
 #include <QStyle>
+#include <QToolTip>
 #include <QWheelEvent>
 
 #include <cmath>
@@ -161,9 +162,22 @@ void QtNumericEdit::editingFinished()
         showText(m_lastText);
         markEdited(false);
         Tracer::Trace(Tracer::Warning, "  Invalid input. Restoring previous value.");
+        tell("That is no number; the value before is back.");
         return;
     }
     accept(parsed->value);
+    if (clamped(parsed->value) != parsed->value) {
+        tell(QString("Permitted: %1 to %2")
+                 .arg(formatNumber(m_min, format()), formatNumber(m_max, format())));
+    }
+}
+
+/// Beside the field, since what was typed stands there no more.
+void QtNumericEdit::tell(const QString &text)
+{
+    if (isVisible()) {
+        QToolTip::showText(mapToGlobal(QPoint(0, height())), text, this);
+    }
 }
 
 void QtNumericEdit::setEditMode(const QString &)

@@ -101,6 +101,7 @@ private:
     void store(double value);
     void accept(double value);
     void showText(const QString &text);
+    void tell(const QString &text);
     void showFormattedValue();
     void formatChanged();
     void markEdited(bool edited);

@@ -25,6 +25,7 @@ struct LogState
     // Recursive, since a slot that runs at once in the logging thread may log itself.
     QRecursiveMutex listenerMutex;
     std::vector<Tracer *> listeners;
+    std::vector<Tracer::ErrorWatch *> watches; // under the mutex of the queue
 };
 
 LogState &state()
@@ -60,8 +61,34 @@ void Tracer::Trace(int level, const char *text)
     }
 }
 
+Tracer::ErrorWatch::ErrorWatch()
+{
+    const QMutexLocker locker(&state().queueMutex);
+    state().watches.push_back(this);
+}
+
+Tracer::ErrorWatch::~ErrorWatch()
+{
+    const QMutexLocker locker(&state().queueMutex);
+    std::erase(state().watches, this);
+}
+
+QString Tracer::ErrorWatch::text() const
+{
+    const QMutexLocker locker(&state().queueMutex);
+    return m_text;
+}
+
 void Tracer::Trace(int level, const QString &text)
 {
+    if ((level & (Error | Severe)) != 0 && !text.isEmpty()) {
+        const QMutexLocker locker(&state().queueMutex);
+        for (ErrorWatch *watch : state().watches) {
+            if (watch->m_text.isEmpty()) {
+                watch->m_text = text;
+            }
+        }
+    }
     if (!isEnabled(level) || text.isEmpty()) {
         return;
     }

@@ -52,6 +52,24 @@ public:
     /// than 100 000 wait: the oldest are dropped first.
     [[nodiscard]] static QList<Entry> takeEntries();
 
+    /// Keeps the first error that is logged while it lives, by any thread and whatever the mask:
+    /// the reason why a piece of work has failed.
+    class ErrorWatch
+    {
+    public:
+        ErrorWatch();
+        ~ErrorWatch();
+        ErrorWatch(const ErrorWatch &) = delete;
+        ErrorWatch &operator=(const ErrorWatch &) = delete;
+
+        /// Empty if there was none.
+        [[nodiscard]] QString text() const;
+
+    private:
+        friend class Tracer;
+        QString m_text;
+    };
+
 signals:
     /// Lines wait to be taken. An earlier taker may have emptied the list meanwhile.
     void TraceDataAvailable();

@@ -3,6 +3,7 @@
 
 #include "appearance/lineicon.h"
 #include "jobs/ReportText.h"
+#include "log/Tracer.h"
 #include "questions.h"
 #include "runjob.h"
 #include "windowplace.h"
@@ -10,6 +11,7 @@
 #include <QBoxLayout>
 #include <QFileDialog>
 #include <QFileInfo>
+#include <QLabel>
 #include <QLineEdit>
 #include <QMenu>
 #include <QMessageBox>
@@ -52,6 +54,7 @@ void ToolWizard::setUpWizard()
     limitTagTexts();
     addPresetMenu();
     addResultButtons();
+    addProblemLine();
     connect(m_next, &QPushButton::clicked, this, &ToolWizard::goOn);
     connect(m_previous, &QPushButton::clicked, this, &ToolWizard::goBack);
     m_close->setIcon(lineIcon("close"));
@@ -114,6 +117,35 @@ void ToolWizard::addResultButtons()
                              "Copy the new file to the instrument that a pane shows");
     m_send->setIcon(lineIcon("copy_to"));
     connect(m_send, &QPushButton::clicked, this, [this] { emit sendRequested(m_result); });
+}
+
+/// Above the buttons, where the user looks after a press of "Next".
+void ToolWizard::addProblemLine()
+{
+    m_problem = new QLabel(this);
+    m_problem->setObjectName("l_problem");
+    m_problem->setTextFormat(Qt::PlainText);
+    m_problem->setWordWrap(true);
+    QFont font = m_problem->font();
+    font.setBold(true);
+    m_problem->setFont(font);
+    m_problem->hide();
+    auto *column = qobject_cast<QBoxLayout *>(layout());
+    for (int i = 0; column != nullptr && i < column->count(); ++i) {
+        const QLayout *row = column->itemAt(i)->layout();
+        const QWidget *box = column->itemAt(i)->widget();
+        if ((row != nullptr && row->indexOf(m_previous) >= 0) ||
+            (box != nullptr && box->isAncestorOf(m_previous))) {
+            column->insertWidget(i, m_problem);
+            return;
+        }
+    }
+}
+
+void ToolWizard::showProblem(const QString &text)
+{
+    m_problem->setText(text);
+    m_problem->setVisible(!text.isEmpty());
 }
 
 QPushButton *ToolWizard::addResultButton(const char *name, const QString &text, const QString &tip)
@@ -283,6 +315,7 @@ void ToolWizard::takeTypedValues() const
 void ToolWizard::goOn()
 {
     takeTypedValues();
+    showProblem({});
     const int page = currentPage();
     // The values that were just taken may not do.
     if (!isComplete(page)) {
@@ -297,6 +330,7 @@ void ToolWizard::goOn()
 void ToolWizard::goBack()
 {
     takeTypedValues();
+    showProblem({});
     showPage(pageBefore(currentPage()));
 }
 
@@ -328,7 +362,10 @@ void ToolWizard::run()
 
 JobOutcome ToolWizard::runInPlace(ToolJob &job)
 {
-    return runJob(job, this, nullptr);
+    const Tracer::ErrorWatch watch;
+    const JobOutcome outcome = runJob(job, this, nullptr);
+    showProblem(outcome == JobOutcome::Failed ? watch.text() : QString());
+    return outcome;
 }
 
 void ToolWizard::writeSettings(QSettings &settings)

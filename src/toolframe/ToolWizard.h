@@ -13,6 +13,7 @@
 
 #include <memory>
 
+class QLabel;
 class QPushButton;
 class QStackedWidget;
 class QTextEdit;
@@ -88,7 +89,11 @@ protected:
     /// File name, comment and copyright of the output page.
     [[nodiscard]] OutputOptions outputOptions() const;
 
-    /// Runs a job that belongs to a page, such as a preview; its report is dropped.
+    /// Tells above the buttons why the wizard doesn't go on, until it does; empty takes it away.
+    void showProblem(const QString &text);
+
+    /// Runs a job that belongs to a page, such as a preview; its report is dropped, the reason of a
+    /// failure is shown.
     [[nodiscard]] JobOutcome runInPlace(ToolJob &job);
 
 private:
@@ -98,6 +103,7 @@ private:
     void limitTagTexts();
     void addPresetMenu();
     void addResultButtons();
+    void addProblemLine();
     [[nodiscard]] QPushButton *addResultButton(const char *name, const QString &text,
                                                const QString &tip);
     void askAndLoad();
@@ -112,7 +118,8 @@ private:
     QPushButton *m_preset = nullptr; ///< null in a tool with buttons of its own
     QPushButton *m_view = nullptr;   ///< shown beside the report of a job that has ended well
     QPushButton *m_send = nullptr;
-    QString m_result; ///< what that job has written
+    QLabel *m_problem = nullptr; ///< why the wizard didn't go on
+    QString m_result;            ///< what that job has written
     QTextEdit *m_report = nullptr;
     bool m_isRunning = false;
 };

@@ -19,7 +19,6 @@
 #include <QPushButton>
 #include <QRadioButton>
 #include <QSignalSpy>
-#include <QStandardPaths>
 #include <QTest>
 #include <QTextEdit>
 #include <QUrl>
@@ -68,7 +67,8 @@ private:
 
 void tst_composerwindow::initTestCase()
 {
-    QStandardPaths::setTestModeEnabled(true);
+    // A folder of its own: another run on this machine keeps changes, too.
+    qputenv("XDG_DATA_HOME", m_folder.path("data").toLocal8Bit());
     QVERIFY(m_folder.store("short.wv", toneFile(1000)));
     QVERIFY(m_folder.store("long.wv", toneFile(4000)));
 }

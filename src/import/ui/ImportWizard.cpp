@@ -50,15 +50,11 @@ ImportWizard::ImportWizard(const QString &settingsGroup, const QString &title, Q
                   .abortedText = "Import aborted"},
                  parent)
     , m_stack(named<QStackedWidget>("sw_assist"))
-    , m_problem(named<QLabel>("l_problem"))
 {
     setWindowTitle(title);
     resize(StartSize);
     auto *column = new QVBoxLayout(this);
     column->addWidget(m_stack, 1);
-    m_problem->setWordWrap(true);
-    m_problem->setVisible(false);
-    column->addWidget(m_problem);
     auto *buttons = new QHBoxLayout;
     const auto addButton = [buttons](const char *name, const QString &text) {
         auto *button = named<QPushButton>(name);
@@ -261,7 +257,7 @@ void ImportWizard::slot_infile1()
         return;
     }
     m_shownInput = m_input->text();
-    m_problem->setVisible(false);
+    showProblem({});
     inputChanged();
     updateButtons();
 }
@@ -282,7 +278,6 @@ void ImportWizard::previewMade(const ImportJob & /*job*/) {}
 
 int ImportWizard::pageAfter(int page)
 {
-    m_problem->setVisible(false);
     return page + 1 == previewPage() && !preview() ? page : page + 1;
 }
 
@@ -294,13 +289,14 @@ bool ImportWizard::preview()
     m_info->clear();
     const std::unique_ptr<ImportJob> job = makeImportJob();
     job->setPreview(m_previewSamples);
-    QString words = "There is no preview. The log of the main window says why.";
+    QString words;
     connect(job.get(), &ToolJob::report, this, [&words](const ReportLine &line) {
         words = line.kind == ReportLine::Kind::Text ? line.text : words;
     });
     if (runInPlace(*job) != JobOutcome::Finished) {
-        m_problem->setText(words);
-        m_problem->setVisible(true);
+        if (!words.isEmpty()) {
+            showProblem(words);
+        }
         return false;
     }
     previewMade(*job);

@@ -111,7 +111,6 @@ private:
     CWidgetSpectrum *m_spectrum = nullptr;
     CWidgetConstellation *m_constellation = nullptr;
     QLabel *m_info = nullptr;
-    QLabel *m_problem = nullptr;
     QRadioButton *m_noScaling = nullptr;
     QRadioButton *m_scaleDown = nullptr;
     QRadioButton *m_autoScaling = nullptr;
