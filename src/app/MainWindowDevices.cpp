@@ -82,7 +82,8 @@ void MainWindow::newDeviceSelection(int /*iIndex*/)
 
 void MainWindow::selectDevice(Pane &pane)
 {
-    if (isSameInstrument(*pane.device, *otherPane(pane).device)) {
+    const bool isTaken = isSameInstrument(*pane.device, *otherPane(pane).device);
+    if (isTaken) {
         Tracer::Trace(Tracer::Warning, "Warning: The same device cannot be selected twice.");
         const QSignalBlocker blocker(pane.device);
         pane.device->setCurrentIndex(0);
@@ -98,6 +99,9 @@ void MainWindow::selectDevice(Pane &pane)
         showLocal(pane);
     } else {
         showInstrument(pane);
+    }
+    if (isTaken) {
+        errMsg("The other pane shows this instrument already.");
     }
 }
 

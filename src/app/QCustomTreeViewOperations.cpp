@@ -73,9 +73,11 @@ void QCustomTreeView::slot_rename()
         return;
     }
     const QString parent = parentFolder(path);
+    // The ending mostly stays.
+    const qsizetype ending = isFolderPath(path) ? -1 : entryName(path).lastIndexOf('.');
     const auto name =
         askText(this, "Rename entry", QString("Enter new name for\n'%1'").arg(entryName(path)),
-                entryName(path));
+                entryName(path), ending);
     if (name && acceptsName(parent, *name, "The new entry name contains invalid characters.") &&
         m_files->rename(path, *name)) {
         updateAndExpandTree(parent + *name);

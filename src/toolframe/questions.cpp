@@ -6,7 +6,9 @@
 #include <QFileInfo>
 #include <QInputDialog>
 #include <QLabel>
+#include <QLineEdit>
 #include <QMessageBox>
+#include <QTimer>
 
 bool askYesNo(QWidget *parent, const QString &title, const QString &text)
 {
@@ -17,7 +19,7 @@ bool askYesNo(QWidget *parent, const QString &title, const QString &text)
 }
 
 std::optional<QString> askText(QWidget *parent, const QString &title, const QString &label,
-                               const QString &initial)
+                               const QString &initial, qsizetype marked)
 {
     QInputDialog dialog(parent);
     dialog.setWindowTitle(title);
@@ -28,6 +30,11 @@ std::optional<QString> askText(QWidget *parent, const QString &title, const QStr
         shown->setTextFormat(Qt::PlainText);
     }
     dialog.resize(360, dialog.sizeHint().height());
+    if (auto *edit = dialog.findChild<QLineEdit *>(); edit != nullptr && marked > 0) {
+        // The dialog marks all when it is shown.
+        QTimer::singleShot(0, edit,
+                           [edit, marked] { edit->setSelection(0, static_cast<int>(marked)); });
+    }
     if (dialog.exec() != QDialog::Accepted) {
         return std::nullopt;
     }

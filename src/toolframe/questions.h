@@ -11,10 +11,11 @@ class QWidget;
 /// text is shown as it is: a "<" in a file name is no markup.
 [[nodiscard]] bool askYesNo(QWidget *parent, const QString &title, const QString &text);
 
-/// A modal question for a line of text, `initial` being preset and marked; nothing if the user
-/// cancels.
+/// A modal question for a line of text, `initial` being preset and its first `marked` characters,
+/// or all, marked; nothing if the user cancels.
 [[nodiscard]] std::optional<QString> askText(QWidget *parent, const QString &title,
-                                             const QString &label, const QString &initial);
+                                             const QString &label, const QString &initial,
+                                             qsizetype marked = -1);
 
 /// Whether a tool may write to this path: there is no such file, or the user agrees to overwrite
 /// it. A refusal is logged.
