@@ -41,7 +41,7 @@ class GuideBrowser : public QTextBrowser
 protected:
     QVariant loadResource(int type, const QUrl &name) override
     {
-        const QVariant resource = QTextBrowser::loadResource(type, name);
+        QVariant resource = QTextBrowser::loadResource(type, name);
         if (type != QTextDocument::ImageResource) {
             return resource;
         }

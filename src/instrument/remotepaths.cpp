@@ -209,7 +209,7 @@ QList<RemoteFileEntry> parseCatalogue(const QString &answer)
 
 QString resourceOf(const QString &text)
 {
-    const QString trimmed = text.trimmed();
+    QString trimmed = text.trimmed();
     const bool isAddress = QHostAddress(trimmed).protocol() == QAbstractSocket::IPv6Protocol ||
                            trimmed.startsWith('[');
     if (trimmed.isEmpty() || (trimmed.contains("::") && !isAddress)) {

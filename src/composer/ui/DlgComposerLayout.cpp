@@ -35,7 +35,7 @@ void DlgComposer::buildWindow()
     layout->addLayout(viewRow());
     layout->addLayout(documentRow());
     // The fields are made before the rows that they stand in.
-    const auto order = [this](const QList<QWidget *> &widgets) {
+    const auto order = [](const QList<QWidget *> &widgets) {
         for (int i = 1; i < widgets.size(); ++i) {
             setTabOrder(widgets.at(i - 1), widgets.at(i));
         }
