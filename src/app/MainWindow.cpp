@@ -282,6 +282,7 @@ void MainWindow::markActive(const Pane &active)
     for (const Pane &pane : m_panes) {
         pane.frame->update();
     }
+    announceSendTarget();
 }
 
 MainWindow::Pane &MainWindow::paneOf(const QObject *widget)

@@ -108,6 +108,8 @@ private:
     [[nodiscard]] bool openInstrument(Pane &pane);
     void showAgain(const QStringList &resources);
     void sendToInstrument(const QString &path);
+    [[nodiscard]] Pane *sendTarget();
+    void announceSendTarget();
     [[nodiscard]] QString defaultFolder(const Pane &pane) const;
     [[nodiscard]] bool mayClose();
     void markActive(const Pane &active);

@@ -73,6 +73,7 @@ void MainWindow::refresh(Pane &pane)
         pane.tree->updateAndExpandTree(shown);
     }
     pane.generator->showDevice(pane.instrument.get());
+    announceSendTarget();
 }
 
 void MainWindow::newDeviceSelection(int /*iIndex*/)
@@ -100,6 +101,7 @@ void MainWindow::selectDevice(Pane &pane)
     } else {
         showInstrument(pane);
     }
+    announceSendTarget();
     if (isTaken) {
         errMsg("The other pane shows this instrument already.");
     }
@@ -144,16 +146,32 @@ void MainWindow::showAgain(const QStringList &resources)
     }
 }
 
-/// That of the pane which isn't in use, or else of the other.
+/// The pane with a generator: the one that isn't in use if both show one. Null if none does.
+MainWindow::Pane *MainWindow::sendTarget()
+{
+    const auto takes = [](const Pane &pane) {
+        return !pane.resource.isEmpty() && pane.instrument->isOpen() &&
+               !pane.instrument->isAnalyzer();
+    };
+    Pane &active = m_activePane == &m_panes[1] ? m_panes[1] : m_panes[0];
+    Pane &other = otherPane(active);
+    return takes(other) ? &other : takes(active) ? &active : nullptr;
+}
+
+void MainWindow::announceSendTarget()
+{
+    const Pane *target = sendTarget();
+    m_modules.setSendTarget(target == nullptr ? QString()
+                                              : target->instrument->model() + ", " +
+                                                    target->instrument->serial());
+}
+
 void MainWindow::sendToInstrument(const QString &path)
 {
-    Pane &active = paneOf(m_activePane->tree);
-    Pane *target = &otherPane(active);
-    if (target->resource.isEmpty()) {
-        target = &active;
-    }
-    if (target->resource.isEmpty() || !target->instrument->isOpen()) {
-        slot_infoTextAvailable("No pane shows an instrument.\n"
+    Pane *target = sendTarget();
+    if (target == nullptr) {
+        announceSendTarget();
+        slot_infoTextAvailable("No pane shows a generator.\n"
                                "Choose one in the list above a pane first.");
         return;
     }

@@ -190,6 +190,7 @@ DlgBase &ModulesDb::dialog(const ToolInfo &info)
         tool->dialog = info.make();
         setGuidePage(*tool->dialog, info.guidePage);
         tool->dialog->instrumentsUpdated(m_instruments);
+        tool->dialog->sendTargetChanged(m_sendTarget);
         connect(tool->dialog.get(), &DlgBase::openRequested, this, &ModulesDb::open);
         connect(tool->dialog.get(), &DlgBase::sendRequested, this, &ModulesDb::sendRequested);
         if (!m_settingsFile.isEmpty()) {
@@ -260,6 +261,16 @@ void ModulesDb::updateInstruments(const QList<InstrConfigEntry> &instruments)
     for (const Tool &tool : m_tools) {
         if (tool.dialog) {
             tool.dialog->instrumentsUpdated(instruments);
+        }
+    }
+}
+
+void ModulesDb::setSendTarget(const QString &instrument)
+{
+    m_sendTarget = instrument;
+    for (const Tool &tool : m_tools) {
+        if (tool.dialog) {
+            tool.dialog->sendTargetChanged(instrument);
         }
     }
 }

@@ -75,6 +75,9 @@ public:
     void readAllSettings(QSettings &settings);
     void updateInstruments(const QList<InstrConfigEntry> &instruments);
 
+    /// Tells all dialogs where a file would be sent to; empty for nowhere.
+    void setSendTarget(const QString &instrument);
+
     void closeAll();
 
     /// Hides all tools; showAgain() brings those back that were visible.
@@ -100,5 +103,6 @@ private:
     QString m_selection;
     QString m_settingsFile;
     QList<InstrConfigEntry> m_instruments;
+    QString m_sendTarget;
     QList<ToolAction> m_menuActions;
 };

@@ -39,6 +39,10 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     addOperation("Rename", "rename", Qt::Key_F2, &QCustomTreeView::slot_rename);
     addOperation("Delete", "delete", QKeySequence::Delete, &QCustomTreeView::slot_remove);
     m_copyMenu->addAction(lineIcon("copy"), "Copy to", this, &QCustomTreeView::slot_copy);
+    m_copyRunAction =
+        m_copyMenu->addAction(lineIcon("run"), "Copy and Run!", this, &QCustomTreeView::copyAndRun);
+    m_copyMenu->addSeparator();
+    m_copyMenu->addAction(lineIcon("close"), "Cancel\tEsc");
     addKeys(Qt::Key_F5, &QCustomTreeView::copyToPeer);
     addKeys(Qt::ShiftModifier | Qt::Key_Delete, &QCustomTreeView::removeForGood);
     addKeys(QKeySequence::Copy, &QCustomTreeView::copyToClipboard);

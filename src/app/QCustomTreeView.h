@@ -3,6 +3,7 @@
 
 #include "ColumnWidths.h"
 #include "ModulesDb.h"
+#include "deviceactions.h"
 
 #include <QPersistentModelIndex>
 #include <QPoint>
@@ -10,6 +11,7 @@
 #include <QTreeView>
 
 #include <memory>
+#include <optional>
 
 class PaneFiles;
 class QMenu;
@@ -151,7 +153,9 @@ private:
     void copyToClipboard();
     void pasteFromClipboard();
     void setCopy(const QCustomTreeView &source, const QStringList &paths, const QString &target);
-    [[nodiscard]] QString copySources();
+    void copyAndRun();
+    [[nodiscard]] bool copyHere();
+    [[nodiscard]] CopyOutcome copySources();
     void removeSelected(bool forGood);
     [[nodiscard]] bool confirmRemoval(const QStringList &paths);
     [[nodiscard]] bool removeEntry(const QString &path, bool forGood);
@@ -167,6 +171,15 @@ private:
     void startFirstTool();
     [[nodiscard]] QString toolFile(const QDropEvent &event) const;
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
+    struct NameRequest
+    {
+        QString title;
+        QString label;
+        QString parent;        ///< folder of the entry that is named
+        QString forbiddenText; ///< refuses a name with a forbidden character
+    };
+    [[nodiscard]] std::optional<QString> askName(const NameRequest &request, const QString &initial,
+                                                 qsizetype marked = -1);
     [[nodiscard]] bool acceptsName(const QString &parent, const QString &name,
                                    const QString &forbiddenText);
 
@@ -176,6 +189,7 @@ private:
     QMenu *m_contextMenu;
     QMenu *m_copyMenu;
     QAction *m_runAction = nullptr;
+    QAction *m_copyRunAction = nullptr;
     QList<ModulesDb::ToolAction> m_toolActions;
     ColumnWidths m_columnWidths;
     QPoint m_dragStart;                   ///< in the viewport

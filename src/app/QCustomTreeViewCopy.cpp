@@ -126,6 +126,9 @@ void QCustomTreeView::offerCopy(const QCustomTreeView &source, const QStringList
                                 const QPoint &position)
 {
     setCopy(source, paths, m_files ? m_files->pathOf(indexAt(position)) : QString());
+    const bool isOneFile = m_dropSources.size() == 1;
+    m_copyRunAction->setVisible(isOneFile && isRunnable(m_dropSources.first().first, device()) &&
+                                !device()->isAnalyzer());
     m_copyMenu->popup(viewport()->mapToGlobal(position));
 }
 
@@ -185,17 +188,34 @@ bool QCustomTreeView::comesFromOtherPane(const QDropEvent &event) const
 
 void QCustomTreeView::slot_copy()
 {
+    (void)copyHere();
+}
+
+bool QCustomTreeView::copyHere()
+{
     if (isBusy()) {
-        return;
+        return false;
     }
     if (!isFolderPath(m_dropTarget)) {
         emit infoTextAvailable("The target location for the copy operation must be a folder.");
     } else if (!m_dropSourceDevice && isLocal()) {
         emit infoTextAvailable("Copy operations between local file systems are not supported.");
     } else {
-        const QString outcome = copySources();
+        const CopyOutcome outcome = copySources();
         updateAndExpandTree(m_dropTarget);
-        emit errMsg(outcome);
+        emit errMsg(outcome.words);
+        return outcome.isComplete;
+    }
+    return false;
+}
+
+void QCustomTreeView::copyAndRun()
+{
+    const QString copied = m_dropTarget + entryName(m_dropSources.first().first);
+    // Not what was there before, when the copy has failed.
+    if (copyHere()) {
+        updateAndExpandTree(copied);
+        slot_runwaveform();
     }
 }
 
@@ -208,11 +228,11 @@ bool QCustomTreeView::takeFile(const QString &localPath, const QString &defaultF
     m_dropSources = {{localPath, 0}};
     m_dropSourceDevice = nullptr;
     m_dropTarget = folderOf(current.isEmpty() ? defaultFolder : current);
-    const QString outcome = copySources();
+    const CopyOutcome outcome = copySources();
     const QString sent = m_dropTarget + entryName(localPath);
     updateAndExpandTree(sent);
-    emit errMsg(outcome);
-    if (currentPath() != sent) {
+    emit errMsg(outcome.words);
+    if (!outcome.isComplete || currentPath() != sent) {
         return false;
     }
     if (!device()->isAnalyzer() && isRunnable(sent, device()) &&
@@ -225,7 +245,7 @@ bool QCustomTreeView::takeFile(const QString &localPath, const QString &defaultF
 }
 
 /// One after the other; after one that fails the user is asked.
-QString QCustomTreeView::copySources()
+CopyOutcome QCustomTreeView::copySources()
 {
     CopyOutcome all;
     for (const auto &[path, bytes] : std::as_const(m_dropSources)) {
@@ -244,8 +264,10 @@ QString QCustomTreeView::copySources()
         all.isComplete = one.isComplete;
         all.words = one.words;
     }
-    return all.isComplete && m_dropSources.size() > 1 ? QString("%1 files copied.").arg(all.files)
-                                                      : all.words;
+    if (all.isComplete && m_dropSources.size() > 1) {
+        all.words = QString("%1 files copied.").arg(all.files);
+    }
+    return all;
 }
 
 void QCustomTreeView::slot_move() {}

@@ -47,16 +47,27 @@ bool QCustomTreeView::acceptsName(const QString &parent, const QString &name,
     return false;
 }
 
+/// A name that is refused stands again to be corrected.
+std::optional<QString> QCustomTreeView::askName(const NameRequest &request, const QString &initial,
+                                                qsizetype marked)
+{
+    auto name = askText(this, request.title, request.label, initial, marked);
+    while (name && !acceptsName(request.parent, *name, request.forbiddenText)) {
+        name = askText(this, request.title, request.label, *name);
+    }
+    return name;
+}
+
 void QCustomTreeView::slot_create()
 {
     const QString parent = folderOf(currentPath());
     if (parent.isEmpty()) {
         return;
     }
-    const auto name =
-        askText(this, "Create folder", QString("\nCreate new folder in\n'%1'").arg(parent), {});
-    if (name && acceptsName(parent, *name, "The new folder name contains invalid characters.") &&
-        m_files->createFolder(parent, *name)) {
+    const auto name = askName({"Create folder", QString("\nCreate new folder in\n'%1'").arg(parent),
+                               parent, "The new folder name contains invalid characters."},
+                              {});
+    if (name && m_files->createFolder(parent, *name)) {
         updateAndExpandTree(parent + *name + '/');
         emit errMsg(QString("Folder '%1' created.").arg(*name));
     }
@@ -76,10 +87,10 @@ void QCustomTreeView::slot_rename()
     // The ending mostly stays.
     const qsizetype ending = isFolderPath(path) ? -1 : entryName(path).lastIndexOf('.');
     const auto name =
-        askText(this, "Rename entry", QString("Enter new name for\n'%1'").arg(entryName(path)),
+        askName({"Rename entry", QString("Enter new name for\n'%1'").arg(entryName(path)), parent,
+                 "The new entry name contains invalid characters."},
                 entryName(path), ending);
-    if (name && acceptsName(parent, *name, "The new entry name contains invalid characters.") &&
-        m_files->rename(path, *name)) {
+    if (name && m_files->rename(path, *name)) {
         updateAndExpandTree(parent + *name);
         emit errMsg(QString("'%1' renamed to '%2'.").arg(entryName(path), *name));
     }

@@ -157,7 +157,18 @@ bool RemotePaneFiles::removeFile(const QString &path)
 bool RemotePaneFiles::removeEmptyFolder(const QString &path)
 {
     logStep("Deleting folder", path);
-    return run(EntryJob::Operation::RemoveFolder, path, {}, "Deleting folder failed.");
+    const QString words = "Deleting folder failed.";
+    EntryJob job({.device = device()}, EntryJob::Operation::RemoveFolder, path, {});
+    if (job.run() == JobOutcome::Finished) {
+        return true;
+    }
+    Tracer::Trace(Tracer::Error, words);
+    // The folder was empty as far as its list tells.
+    emit infoTextAvailable(
+        QString("%1 %2\nIt may hold files whose names begin with a dot, which the "
+                "program doesn't show.")
+            .arg(words, job.reported()));
+    return false;
 }
 
 bool RemotePaneFiles::removeTree(const QString &path, QWidget *parent)

@@ -33,6 +33,18 @@ QString proceedText(qsizetype files, qint64 bytes)
         .arg(size);
 }
 
+QString wayText(const CopyRequest &request)
+{
+    const auto place = [](const VisaDevice *device, const QString &path) {
+        return device != nullptr
+                   ? QString("%1 on %2, %3").arg(path, device->model(), device->serial())
+                   : path;
+    };
+    return QString("From: %1\nTo: %2")
+        .arg(place(request.sourceDevice, request.source),
+             place(request.targetDevice, request.targetFolder));
+}
+
 QString replaceText(const QStringList &paths)
 {
     return paths.size() == 1
@@ -74,13 +86,17 @@ CopyOutcome copyEntry(QWidget *parent, const CopyRequest &request)
     const CopyQuestions questions{
         .proceed =
             [&](qsizetype files, qint64 bytes) {
-                return askBetween(
-                    [&] { return askYesNo(parent, "Copy Folder", proceedText(files, bytes)); });
+                return askBetween([&] {
+                    return askYesNo(parent, "Copy Folder", proceedText(files, bytes),
+                                    wayText(request));
+                });
             },
         .replace =
             [&](const QStringList &paths) {
-                return askBetween(
-                    [&] { return askYesNo(parent, "Overwrite File", replaceText(paths)); });
+                return askBetween([&] {
+                    return askYesNo(parent, "Overwrite File", replaceText(paths),
+                                    fileDetails(paths));
+                });
             },
         .sendMisfits =
             [&](const QStringList &problems) {

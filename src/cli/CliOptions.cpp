@@ -12,11 +12,15 @@
 
 namespace {
 
+/// Heads the options that all commands have which write a waveform, in the help behind those of the
+/// command itself.
+constexpr const char *OutputGroup = "The new file";
+
 /// The permitted range as text. Whole numbers are told to the last digit.
 QString rangeText(const NumberRange &range, bool whole)
 {
     const auto text = [&](double value) {
-        return whole ? QString::number(value, 'f', 0) : engineeringText(value, range.unit);
+        return whole ? QString::number(value, 'f', 0) : numberText(value, range.unit);
     };
     if (range.max == std::numeric_limits<double>::max()) {
         return "at least " + text(range.min);
@@ -66,6 +70,12 @@ CLI::Option *addParsed(CLI::App &command, const std::string &name, const NumberR
 }
 
 } // namespace
+
+QString numberText(double value, const QString &unit)
+{
+    // A bare prefix letter would be taken for a unit.
+    return unit.isEmpty() ? QString::number(value) : engineeringText(value, unit);
+}
 
 std::optional<double> numberIn(const QString &text, const QString &unit)
 {
@@ -131,20 +141,26 @@ CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
         ->type_name(names.join('|').toStdString());
 }
 
-CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help)
+CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help, Dash dash)
 {
-    const auto take = [&value](const std::string &text) {
+    const auto take = [&value, dash](const std::string &text) {
         if (text.empty()) {
             throw CLI::ValidationError("--output: the file name is empty");
         }
-        value = QString::fromLocal8Bit(text);
+        if (text == "-" && dash == Dash::Refused) {
+            throw CLI::ValidationError("--output: '-' is no file, and only a dump can go to "
+                                       "standard output; permitted: a file name, also ./-");
+        }
+        value = text == "-" ? QString() : QString::fromLocal8Bit(text);
     };
     return command.add_option_function<std::string>("-o,--output", take, help)->type_name("FILE");
 }
 
 void addOutputArguments(CLI::App &command, OutputArguments &arguments)
 {
-    addOutputFile(command, arguments.options.fileName, "Waveform file to write")->required();
+    addOutputFile(command, arguments.options.fileName, "Waveform file to write")
+        ->required()
+        ->group(OutputGroup);
     addOutputTexts(command, arguments);
 }
 
@@ -156,13 +172,14 @@ void addOutputTexts(CLI::App &command, OutputArguments &arguments)
         command
             .add_option_function<std::string>(
                 name, [&tag](const std::string &text) { tag = QString::fromLocal8Bit(text); }, help)
-            ->type_name("TEXT");
+            ->type_name("TEXT")
+            ->group(OutputGroup);
     };
     addTag("--comment", options.comment, "Comment of the new file");
     addTag("--copyright", options.copyright, "Copyright note of the new file");
     options.overwrite = false;
     const auto force = [&arguments] { arguments.force = arguments.options.overwrite = true; };
-    command.add_flag_callback("--force", force, "Overwrite an existing file");
+    command.add_flag_callback("--force", force, "Overwrite an existing file")->group(OutputGroup);
 }
 
 bool mayWrite(Console &console, const QString &fileName, bool force)

@@ -29,6 +29,9 @@ struct NumberRange
 /// is told of both.
 [[nodiscard]] std::optional<double> numberIn(const QString &text, const QString &unit);
 
+/// A number in the words of the help: with prefix and unit, or plain where it has no unit.
+[[nodiscard]] QString numberText(double value, const QString &unit);
+
 /// Adds an option that takes a number in an engineering form: 10k, 1.5M, 1,5M, 10us, -3.
 CLI::Option *addNumber(CLI::App &command, const std::string &name, std::optional<double> &value,
                        const NumberRange &range, const std::string &help);
@@ -54,8 +57,12 @@ CLI::Option *addText(CLI::App &command, const std::string &name, QString &value,
 CLI::Option *addChoice(CLI::App &command, const std::string &name, int &index,
                        const QStringList &names, const std::string &help);
 
-/// Adds -o, --output, which takes no empty name.
-CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help);
+/// What "-" stands for as the name of an output.
+enum class Dash { Refused, StandardOutput };
+
+/// Adds -o, --output, which takes no empty name; standard output leaves `value` empty.
+CLI::Option *addOutputFile(CLI::App &command, QString &value, const std::string &help,
+                           Dash dash = Dash::Refused);
 
 /// The options of every command that writes a .wv file.
 struct OutputArguments

@@ -8,6 +8,7 @@
 #include <QSocketNotifier>
 
 #include <array>
+#include <cerrno>
 #include <csignal>
 #include <cstdio>
 #include <ctime>
@@ -74,7 +75,7 @@ Console::Console(QObject *parent)
             std::signal(signal, onInterrupt);
         }
     }
-    // A closed reader of standard output is to end in a message, not in a silent death.
+    // A closed reader of standard output ends the job, which tidies up, and not the program.
     std::signal(SIGPIPE, SIG_IGN);
 }
 
@@ -186,6 +187,9 @@ int Console::failed()
 
 int Console::failedWith(const QString &text)
 {
+    if (m_isUnread) {
+        return ExitUnread;
+    }
     const QString reason = "error: " + text;
     if (m_lastLine != reason) {
         printLine(reason);
@@ -204,6 +208,11 @@ bool Console::print(const QByteArray &bytes)
     if (std::fwrite(bytes.constData(), 1, static_cast<size_t>(bytes.size()), stdout) !=
             static_cast<size_t>(bytes.size()) ||
         std::fflush(stdout) != 0) {
+        // Who reads, such as "head", has had enough: that is no fault to tell of.
+        m_isUnread = errno == EPIPE;
+        if (m_isUnread) {
+            return false;
+        }
         error("Cannot write to standard output.");
         return false;
     }

@@ -17,6 +17,7 @@ enum ExitCode {
     ExitUsage = 2,
     ExitLimit = 3, ///< all done, but a limit isn't met
     ExitCancelled = 130,
+    ExitUnread = 141, ///< the reader of standard output has gone; as a shell tells of SIGPIPE
 };
 
 /// The terminal side of the program: prints the log and the report lines to standard error, draws
@@ -53,7 +54,8 @@ public:
     /// The text of the last error in the log; empty if there was none.
     [[nodiscard]] const QString &lastReason() const { return m_lastReason; }
 
-    /// Writes to standard output; false, with the reason logged, if that is closed or full.
+    /// Writes to standard output; false, with the reason logged, if that is closed or full. False
+    /// without a word if its reader has gone: failed() then says nothing either.
     [[nodiscard]] bool print(const QByteArray &bytes);
 
 private:
@@ -69,6 +71,7 @@ private:
     bool m_verbose = false;
     bool m_showProgress = false;
     bool m_progressDrawn = false;
+    bool m_isUnread = false; ///< the reader of standard output has gone
     QString m_stepLabel;
     QElapsedTimer m_jobTime;
     QString m_jobReason;

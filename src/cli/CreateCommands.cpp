@@ -4,7 +4,6 @@
 #include "Presets.h"
 #include "commands.h"
 
-#include "base/EngineeringNumber.h"
 #include "jobs/CreateJob.h"
 
 #include <limits>
@@ -96,26 +95,32 @@ public:
         , m_command(addCommand<CreateArguments>(create, name, help, commands.action, m_arguments,
                                                 runCreate))
     {
-        number("--min-clock", signalfields::minClock);
-        number("--max-clock", signalfields::maxClock);
+        number("--min-clock", signalfields::minClock, SharedGroup);
+        number("--max-clock", signalfields::maxClock, SharedGroup);
         addNumber(m_command, "--clock", m_arguments->numbers[&signalfields::clockRate],
                   rangeOf(signalfields::clockRate),
                   std::string("Clock written to the file (default: fitted). ") +
-                      signalfields::clockRate.help);
+                      signalfields::clockRate.help)
+            ->group(SharedGroup);
         addChoice(m_command, "--scaling", m_arguments->scaling, {"auto", "none"},
-                  "Level scaling (default: auto)");
-        m_command.add_flag("--zero-crest", m_arguments->zeroCrest,
-                           "State a peak to RMS ratio of 0 dB");
+                  "Level scaling (default: auto)")
+            ->group(SharedGroup);
+        m_command
+            .add_flag("--zero-crest", m_arguments->zeroCrest, "State a peak to RMS ratio of 0 dB")
+            ->group(SharedGroup);
         addInteger(m_command, "--seed", m_arguments->seed,
                    {"", 0, static_cast<double>(std::numeric_limits<unsigned>::max())},
-                   "Seed of random values, for repeatable signals");
+                   "Seed of random values, for repeatable signals (default: the time of day)")
+            ->group(SharedGroup);
         addOutputArguments(m_command, m_arguments->output);
     }
 
-    KindCommand &number(const std::string &name, const SignalField &field)
+    KindCommand &number(const std::string &name, const SignalField &field,
+                        const char *group = "Options")
     {
         keep(name, field);
-        addNumber(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field));
+        addNumber(m_command, name, m_arguments->numbers[&field], rangeOf(field), helpOf(field))
+            ->group(group);
         return *this;
     }
 
@@ -150,8 +155,9 @@ public:
 
     KindCommand &randomPhase()
     {
-        m_command.add_flag("--random-phase,!--no-random-phase", m_arguments->choices.randomPhase,
-                           "Give each carrier a random phase (default: yes)");
+        bool &isRandom = m_arguments->choices.randomPhase;
+        m_command.add_flag("--random-phase,!--no-random-phase", isRandom,
+                           "Give each carrier a random phase (default), or all the same one");
         m_kept.append(PresetField{.option = "--random-phase", .key = "mc.rndp"});
         return *this;
     }
@@ -168,6 +174,9 @@ public:
     }
 
 private:
+    /// Heads the options of all kinds.
+    static constexpr const char *SharedGroup = "All kinds of signals";
+
     void keep(const std::string &name, const SignalField &field)
     {
         if (field.key == nullptr) {
@@ -187,7 +196,7 @@ private:
 
     [[nodiscard]] static std::string helpOf(const SignalField &field)
     {
-        const QString start = engineeringText(field.start, field.unit);
+        const QString start = numberText(field.start, field.unit);
         const std::string text = field.help == nullptr ? field.text : field.help;
         return text + " (default: " + start.toStdString() + ")";
     }

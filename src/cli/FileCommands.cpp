@@ -181,7 +181,8 @@ void addFileCommands(CommandSet &commands)
     addRange(dumpCommand, dump->range);
     addChoice(dumpCommand, "--format", dump->format, {"csv", "cf32", "ci16"},
               "Form of the samples (default: csv)");
-    addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)");
+    addOutputFile(dumpCommand, dump->output, "File to write (default: standard output)",
+                  Dash::StandardOutput);
     dumpCommand.add_flag("--force", dump->force, "Overwrite an existing file");
     addExport(commands);
 }

@@ -81,11 +81,12 @@ void addFilter(CommandSet &commands)
         commands.action, filter, runFilter);
     addText(command, "file", filter->request.inputFile, "Waveform file to read")->required();
     addChoice(command, "--type", filter->kind, {"rectangular", "cosine", "root-cosine", "gauss"},
-              "Shape of the filter");
+              "Shape of the filter (default: rectangular)");
     addNumber(command, "--bandwidth", filter->request.bandwidthHz,
               {"Hz", FilterRequest::MinBandwidthHz, MaxClockHz / 2},
               "One-sided bandwidth (default: 0.4 of the clock)");
-    addChoice(command, "--window", filter->request.window, windowNames(), "Window over the filter");
+    addChoice(command, "--window", filter->request.window, windowNames(),
+              "Window over the filter (default: none)");
     addInteger(command, "--length", filter->length,
                {"", FilterRequest::MinLength, FilterRequest::MaxLength},
                "Length in samples (default: 150)");
@@ -143,9 +144,12 @@ void addPolar(CommandSet &commands)
         commands.app, "polar", "Split a waveform into one of its phase and one of its amplitude",
         commands.action, polar, runPolar);
     addText(command, "file", polar->request.inputFile, "Waveform file to read")->required();
-    addText(command, "--phase", polar->request.phase.fileName, "Phase file to write")->required();
+    addText(command, "--phase", polar->request.phase.fileName, "Phase file to write")
+        ->required()
+        ->type_name("FILE");
     addText(command, "--amplitude", polar->request.amplitude.fileName, "Amplitude file to write")
-        ->required();
+        ->required()
+        ->type_name("FILE");
     addNumber(command, "--offset", polar->offset, {"", -1, 1},
               "Offset of the amplitude (default: 0)");
     addNumber(command, "--gain", polar->gain, {"", -1, 1}, "Gain of the amplitude (default: 1)");

@@ -378,8 +378,14 @@ void addDataCommand(CLI::App &import, CommandSet &commands)
                                              "Signed numbers (the default of decimal text)");
     command.add_flag("--unsigned", data->isUnsigned, "Unsigned numbers")->excludes(isSigned);
     command.add_flag("--big-endian", data->bigEndian, "Binary: most significant byte first");
-    addText(command, "--preset", data->preset, "Settings as saved by the dialog");
-    addText(command, "--save-preset", data->savedPreset, "File to save the settings in");
+    addText(command, "--preset", data->preset,
+            "Settings as saved by the dialog or --save-preset; "
+            "options given win")
+        ->type_name("FILE")
+        ->group("Presets");
+    addText(command, "--save-preset", data->savedPreset, "File to save the settings in")
+        ->type_name("FILE")
+        ->group("Presets");
     addInteger(command, "--limit", data->limit,
                {{}, 1, static_cast<double>(std::numeric_limits<int>::max())},
                "Stop after this many samples");

@@ -105,11 +105,11 @@ void addBand(CLI::App &command, std::optional<FrequencyBand> &band)
 
 void addLimits(CLI::App &command, QList<FigureLimit> &limits)
 {
-    const auto take = [&limits](const std::vector<std::string> &texts) {
-        QStringList names;
-        for (const NamedFigure &figure : namedFigures({})) {
-            names += figure.name;
-        }
+    QStringList names;
+    for (const NamedFigure &figure : namedFigures({})) {
+        names += figure.name;
+    }
+    const auto take = [&limits, names](const std::vector<std::string> &texts) {
         for (const std::string &item : texts) {
             const QString text = QString::fromStdString(item);
             const auto sign = text.indexOf(QRegularExpression("[<>]"));
@@ -128,7 +128,8 @@ void addLimits(CLI::App &command, QList<FigureLimit> &limits)
         .add_option_function<std::vector<std::string>>(
             "--limit", take,
             "End with exit status 3 if the figure isn't below (<) or above (>) the value; may be "
-            "repeated")
+            "repeated. Figures: " +
+                names.join(", ").toStdString())
         ->type_name("NAME<VALUE")
         ->allow_extra_args(false);
 }

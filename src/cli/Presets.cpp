@@ -57,9 +57,11 @@ void Presets::add(CLI::App &command, const QString &group, const QList<PresetFie
     command
         .add_option("--preset", entry.loadFrom,
                     "Settings as saved by the dialog or --save-preset; options given win")
-        ->type_name("FILE");
+        ->type_name("FILE")
+        ->group("Presets");
     command.add_option("--save-preset", entry.saveTo, "File to save the settings in")
-        ->type_name("FILE");
+        ->type_name("FILE")
+        ->group("Presets");
 }
 
 void Presets::load()

@@ -18,7 +18,7 @@ struct Example
 constexpr Example Examples[] = {
     {"info", "*.wv --check"},
     {"dump", "fm.wv --from 1000 --count 10"},
-    {"measure", "fm.wv --band -100k,100k --limit crest<3"},
+    {"measure", "fm.wv --band -100k,100k --limit 'crest<3'"},
     {"plot", "fm.wv -o fm.png --view spectrum"},
     {"export", "fm.wv -o fm.sigmf-meta"},
     {"create function", "--shape sine --freq 100k -o tone.wv"},
@@ -122,7 +122,7 @@ void addExamples(CLI::App &app)
     for (const Example &example : Examples) {
         const QString path = example.command;
         if (CLI::App *command = findCommand(app, path.split(' '))) {
-            command->footer("\nExample: corvane-cli " + std::string(example.command) + ' ' +
+            command->footer("Example: corvane-cli " + std::string(example.command) + ' ' +
                             example.arguments + common);
         }
     }

@@ -16,6 +16,7 @@
 #include <sstream>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -45,6 +46,27 @@ void logToolkitMessage(QtMsgType, const QMessageLogContext &, const QString &tex
 {
     Tracer::Trace(Tracer::Debug, text);
 }
+
+/// The library writes what a flag stands for behind its negative name, and two empty lines between
+/// groups.
+class HelpFormatter : public CLI::Formatter
+{
+public:
+    std::string make_help(const CLI::App *app, std::string name,
+                          CLI::AppFormatMode mode) const override
+    {
+        QString help =
+            QString::fromStdString(CLI::Formatter::make_help(app, std::move(name), mode));
+        return help.replace("\n\n\n", "\n\n").toStdString();
+    }
+
+    std::string make_option_name(const CLI::Option *option, bool isPositional) const override
+    {
+        const QString name =
+            QString::fromStdString(CLI::Formatter::make_option_name(option, isPositional));
+        return QString(name).remove("{false}").toStdString();
+    }
+};
 
 /// ": a, b, c", the commands of which one must follow what was typed; empty where one does.
 QString missingCommands(const CLI::App &app)
@@ -107,6 +129,7 @@ int run(int argc, char **argv)
 
     CLI::App app("Workbench for the waveforms of arbitrary-waveform signal generators");
     app.name("corvane-cli");
+    app.formatter(std::make_shared<HelpFormatter>());
     app.set_version_flag("--version", std::string("corvane-cli ") + CORVANE_VERSION);
     app.require_subcommand(1);
     app.fallthrough();

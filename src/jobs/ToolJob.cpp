@@ -17,7 +17,10 @@ JobOutcome ToolJob::run()
         return JobOutcome::Finished;
     }
     if (!m_ending.failure.isEmpty()) {
-        emit report(ReportLine::failure(m_ending.failure));
+        const bool isPlain = m_cancelled && m_ending.cancelled.isEmpty();
+        emit report(isPlain
+                        ? ReportLine::plain("Cancelled")
+                        : ReportLine::failure(m_cancelled ? m_ending.cancelled : m_ending.failure));
     }
     return m_cancelled ? JobOutcome::Cancelled : JobOutcome::Failed;
 }

@@ -15,7 +15,8 @@ enum class JobOutcome { Finished, Failed, Cancelled };
 struct JobEnding
 {
     QString success;
-    QString failure; ///< also of a job that was cancelled
+    QString failure;
+    QString cancelled{}; ///< empty: that it was cancelled, in plain letters, which is no failure
 };
 
 /// One run of a tool: takes a request (a plain struct) in its constructor, does the work in steps,

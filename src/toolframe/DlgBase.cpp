@@ -11,6 +11,8 @@ DlgBase::DlgBase(QWidget *parent)
 
 void DlgBase::instrumentsUpdated(const QList<InstrConfigEntry> & /*instruments*/) {}
 
+void DlgBase::sendTargetChanged(const QString & /*instrument*/) {}
+
 void DlgBase::writeSettings(QSettings & /*settings*/) {}
 
 void DlgBase::readSettings(QSettings & /*settings*/) {}

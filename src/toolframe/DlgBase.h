@@ -24,6 +24,9 @@ public:
     /// The list of configured instruments has changed, or the dialog was just made.
     virtual void instrumentsUpdated(const QList<InstrConfigEntry> &instruments);
 
+    /// The instrument that sendRequested() would send to, as text for the user; empty for none.
+    virtual void sendTargetChanged(const QString &instrument);
+
 signals:
     /// The user wants to look at a file in the tool for its type.
     void openRequested(const QString &path);

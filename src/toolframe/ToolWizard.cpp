@@ -113,10 +113,19 @@ void ToolWizard::addResultButtons()
     m_view = addResultButton("pb_view", "&View", "Look at the new file");
     m_view->setIcon(lineIcon("view"));
     connect(m_view, &QPushButton::clicked, this, [this] { emit openRequested(m_result); });
-    m_send = addResultButton("pb_send", "&Send to Instrument",
-                             "Copy the new file to the instrument that a pane shows");
+    m_send = addResultButton("pb_send", "&Send to Instrument", {});
     m_send->setIcon(lineIcon("copy_to"));
+    sendTargetChanged({});
     connect(m_send, &QPushButton::clicked, this, [this] { emit sendRequested(m_result); });
+}
+
+void ToolWizard::sendTargetChanged(const QString &instrument)
+{
+    m_send->setEnabled(!instrument.isEmpty());
+    m_send->setToolTip(instrument.isEmpty()
+                           ? "No pane of the main window shows a generator. Choose one in the list "
+                             "above a pane to send the new file to it."
+                           : QString("Copy the new file to %1").arg(instrument));
 }
 
 /// Above the buttons, where the user looks after a press of "Next".

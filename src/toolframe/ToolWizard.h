@@ -37,6 +37,7 @@ public:
     /// Opens the group of settings, and lets the window place and the fields be written or read.
     void writeSettings(QSettings &settings) final;
     void readSettings(QSettings &settings) final;
+    void sendTargetChanged(const QString &instrument) final;
 
 protected:
     struct Frame

@@ -3,17 +3,23 @@
 
 #include "log/Tracer.h"
 
+#include <QDateTime>
+#include <QDir>
 #include <QFileInfo>
 #include <QInputDialog>
 #include <QLabel>
 #include <QLineEdit>
+#include <QLocale>
 #include <QMessageBox>
 #include <QTimer>
 
-bool askYesNo(QWidget *parent, const QString &title, const QString &text)
+#include <algorithm>
+
+bool askYesNo(QWidget *parent, const QString &title, const QString &text, const QString &details)
 {
     QMessageBox box(QMessageBox::Warning, title, text, QMessageBox::Yes | QMessageBox::No, parent);
     box.setTextFormat(Qt::PlainText);
+    box.setInformativeText(details);
     box.setDefaultButton(QMessageBox::No);
     return box.exec() == QMessageBox::Yes;
 }
@@ -41,11 +47,26 @@ std::optional<QString> askText(QWidget *parent, const QString &title, const QStr
     return dialog.textValue();
 }
 
+QString fileDetails(const QStringList &paths)
+{
+    constexpr qsizetype MostShown = 10;
+    const QLocale locale;
+    QStringList lines;
+    for (const QString &path : paths.first(std::min(paths.size(), MostShown))) {
+        const QFileInfo file(path);
+        lines.append(QString("%1 (%2, %3)")
+                         .arg(QDir::toNativeSeparators(path), locale.formattedDataSize(file.size()),
+                              locale.toString(file.lastModified(), QLocale::ShortFormat)));
+    }
+    return lines.join('\n') + (paths.size() > MostShown ? "\n..." : "");
+}
+
 bool confirmOverwrite(QWidget *parent, const QString &path)
 {
     const bool agreed =
         !QFileInfo::exists(path) ||
         askYesNo(parent, "Overwrite File",
-                 "The target file already exists.\nDo you want to overwrite this file?");
+                 "The target file already exists.\nDo you want to overwrite this file?",
+                 fileDetails({path}));
     return agreed || Tracer::fail("User break.");
 }

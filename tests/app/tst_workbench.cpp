@@ -453,7 +453,19 @@ void TestWorkbench::showsAndSetsTheGenerator()
     QVERIFY(withModal(copy, press("Yes")));
     QVERIFY(QFile::exists(unixFile("fast.wv")));
 
-    // A tool sends its result there, and starts it.
+    // A tool sends its result there, and starts it, while there is a generator.
+    DlgBase *tool = nullptr;
+    const auto sender = [&] { return tool->findChild<QAbstractButton *>("pb_send"); };
+    m_desk->select(1, "tone.wv");
+    ModulesDb &modules = m_desk->window()->modules();
+    for (const ToolInfo *one : modules.allAllowed(m_desk->path("tone.wv"), true)) {
+        tool = one->name == "Resample" ? &modules.dialog(*one) : tool;
+    }
+    QVERIFY(tool && sender()->isEnabled() && sender()->toolTip().contains("TGX-870, 100001"));
+    choose(2, "Local");
+    QVERIFY(!sender()->isEnabled() && sender()->toolTip().startsWith("No pane"));
+    choose(2, onUnix);
+    QVERIFY(sender()->isEnabled());
     m_desk->tree(1)->setFocus();
     QVERIFY(withModal(
         [this] { emit m_desk->window()->modules().sendRequested(m_desk->path("tone.wv")); },
@@ -487,7 +499,7 @@ void TestWorkbench::fileOperations()
     QVERIFY(writeText(unixFile("tones/b.wv"), "2"));
     selectRemote(2, "/var/user/tones/b.wv");
     QVERIFY(withModals([&] { pressKey(tree, Qt::Key_F2); },
-                       {typeName("50%.wv", seen), answer("OK", seen)}));
+                       {typeName("50%.wv", seen), answer("OK", seen), press("Cancel")}));
     QCOMPARE(seen.text, "The new entry name contains invalid characters.");
     QVERIFY(withModals([&] { pressKey(tree, Qt::Key_F2); }, {typeName("c.wv", seen)}));
     QVERIFY(QFileInfo::exists(unixFile("tones/c.wv")));

@@ -213,7 +213,7 @@ void TestInstrListEditing::showsEverything()
     }
     QCOMPARE(tree()->headerItem()->text(0) + '|' + tree()->headerItem()->text(1) + '|' +
                  tree()->headerItem()->text(2),
-             "Device||Comment");
+             "Device|Interface|Comment");
     const QFontMetrics metrics(tree()->font());
     for (int row = 0; row < 3; ++row) {
         for (const QString &texts : childRows(row)) {

@@ -205,13 +205,13 @@ void TestSignalJobs::stopsAndSparesTheTarget()
         QVERIFY(m_streams.isEmpty());
     };
     // The line of the log after which the stop comes: a cancel, or else a full disk.
-    forRows({{"create, filtering", true, "Buffering waveform tail...", true, "Creation failed"},
+    forRows({{"create, filtering", true, "Buffering waveform tail...", true, "Cancelled"},
              {"create, saving, full", true, "Samples   :", false, "Creation failed"},
-             {"resample, reading", false, "samples @ 16 bit", true, "Resampling failed"},
+             {"resample, reading", false, "samples @ 16 bit", true, "Cancelled"},
              // What is written first stays in the buffer of its stream.
              {"resample, converting, full", false, "Buffering waveform tail...", false,
               "Rescaling failed"},
-             {"resample, saving", false, "Samples   :", true, "Resampling failed"}},
+             {"resample, saving", false, "Samples   :", true, "Cancelled"}},
             check);
 }
 

@@ -68,7 +68,7 @@ DlgInstrConfig::DlgInstrConfig(bool noVisa, QWidget *parent)
     m_hint->setForegroundRole(QPalette::PlaceholderText);
     m_hint->setAttribute(Qt::WA_TransparentForMouseEvents);
     (new QVBoxLayout(m_ui->tw_instruments->viewport()))->addWidget(m_hint);
-    m_ui->tw_instruments->setHeaderLabels({"Device", QString(), "Comment"});
+    m_ui->tw_instruments->setHeaderLabels({"Device", "Interface", "Comment"});
     QHeaderView *header = m_ui->tw_instruments->header();
     header->setStretchLastSection(true);
     header->setSectionsMovable(false);

@@ -37,7 +37,8 @@ CaptureJob::CaptureJob(CaptureRequest request, QObject *parent)
     : ToolJob(parent)
     , m_request(std::move(request))
 {
-    setEnding({"Reading I/Q Data Complete.", "Reading I/Q Data Failed."});
+    setEnding({"Reading I/Q Data Complete.", "Reading I/Q Data Failed.",
+               "User Break. No Data Captured."});
 }
 
 void CaptureJob::say(const QString &text)
@@ -75,9 +76,6 @@ bool CaptureJob::work()
     device.closeResource();
     if (!done) {
         m_capture.reset();
-    }
-    if (isCancelled()) {
-        setFailureText("User Break. No Data Captured.");
     }
     return done;
 }
