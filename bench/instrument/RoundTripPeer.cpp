@@ -9,6 +9,14 @@
 
 namespace {
 
+void sendAtOnce(int socket)
+{
+    const int on = 1;
+    setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+}
+
+} // namespace
+
 bool sendAll(int socket, const std::vector<char> &bytes)
 {
     std::size_t sent = 0;
@@ -35,13 +43,30 @@ bool receiveAll(int socket, std::vector<char> &bytes)
     return true;
 }
 
-void sendAtOnce(int socket)
+LoopbackPair connectLoopback()
 {
-    const int on = 1;
-    setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+    LoopbackPair pair;
+    const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof address;
+    auto *generic = reinterpret_cast<sockaddr *>(&address);
+    if (bind(listener, generic, length) == 0 && listen(listener, 1) == 0 &&
+        getsockname(listener, generic, &length) == 0) {
+        pair.client = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        sendAtOnce(pair.client);
+        if (connect(pair.client, generic, length) == 0) {
+            pair.server = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
+            sendAtOnce(pair.server);
+        } else {
+            close(pair.client);
+            pair.client = -1;
+        }
+    }
+    close(listener);
+    return pair;
 }
-
-} // namespace
 
 void runOnProcessor(Side side)
 {
@@ -57,26 +82,11 @@ RoundTripPeer::RoundTripPeer(std::size_t requestBytes, std::size_t replyBytes,
     , m_reply(replyBytes)
     , m_delay(delay)
 {
-    const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    auto *generic = reinterpret_cast<sockaddr *>(&address);
-    if (bind(listener, generic, length) != 0 || listen(listener, 1) != 0 ||
-        getsockname(listener, generic, &length) != 0) {
-        close(listener);
-        return;
+    const LoopbackPair pair = connectLoopback();
+    m_socket = pair.client;
+    if (pair.server >= 0) {
+        m_server = std::thread([this, pair] { serve(pair.server); });
     }
-    m_socket = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sendAtOnce(m_socket);
-    if (connect(m_socket, generic, length) != 0) {
-        close(m_socket);
-        close(listener);
-        m_socket = -1;
-        return;
-    }
-    m_server = std::thread([this, listener] { serve(listener); });
 }
 
 RoundTripPeer::~RoundTripPeer()
@@ -89,12 +99,9 @@ RoundTripPeer::~RoundTripPeer()
     }
 }
 
-void RoundTripPeer::serve(int listener) const
+void RoundTripPeer::serve(int peer) const
 {
     runOnProcessor(Side::Instrument);
-    const int peer = accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
-    close(listener);
-    sendAtOnce(peer);
     std::vector<char> request(m_request.size());
     while (receiveAll(peer, request)) {
         if (m_delay.count() > 0) {

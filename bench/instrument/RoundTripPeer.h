@@ -13,6 +13,18 @@ enum class Side { Controller, Instrument };
 /// trip many times over.
 void runOnProcessor(Side side);
 
+/// Both ends of a TCP connection over loopback, -1 where it couldn't be made; small pieces are sent
+/// at once. The caller closes them.
+struct LoopbackPair
+{
+    int client = -1;
+    int server = -1;
+};
+[[nodiscard]] LoopbackPair connectLoopback();
+
+[[nodiscard]] bool sendAll(int socket, const std::vector<char> &bytes);
+[[nodiscard]] bool receiveAll(int socket, std::vector<char> &bytes);
+
 /// The least that a request and its reply over loopback can cost: a thread at the other end of a
 /// TCP connection takes a request of a fixed size and sends a reply of a fixed size, and neither
 /// side looks at a byte of them.
@@ -32,7 +44,7 @@ public:
     [[nodiscard]] bool exchange();
 
 private:
-    void serve(int listener) const;
+    void serve(int peer) const;
 
     std::vector<char> m_request;
     std::vector<char> m_reply;

@@ -1,11 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 // Files to and from a simulated instrument over loopback, beside two limits for the same blocks:
 // the bare calls of the VISA layer with the data in memory, and bare round trips over TCP of
-// requests and replies as large as those of VXI-11. Over networks with longer round trips only
-// where the ports 111 and 5025 may be opened, as in a namespace: unshare -Urn sh -c
-// "ip link set lo up; bench_transfer".
+// requests and replies as large as those of VXI-11; over HiSLIP beside a plain copy of the file
+// through a socket. HiSLIP, and networks with longer round trips, only where the ports 111, 4880
+// and 5025 may be opened, as in a namespace: unshare -Urn sh -c "ip link set lo up;
+// bench_transfer".
 #include "DelayedRoad.h"
 #include "RoundTripPeer.h"
+#include "SocketCopy.h"
 
 #include "instrument/VisaDevice.h"
 #include "simulator/SimulatorProcess.h"
@@ -36,6 +38,8 @@ const char *const Resource = "GPIB0::28::INSTR";
 constexpr ViUInt32 NetworkBlock = 64 * 1024;
 /// The simulator itself, and where a slower road to it begins.
 constexpr std::array NetworkHosts{"127.0.0.1", "127.0.0.3"};
+const char *const HislipHost = "127.0.0.4";
+const char *const HislipResource = "TCPIP0::127.0.0.4::hislip0::INSTR";
 const QString RemoteName = "/var/user/bench.wv";
 
 /// Record mark, RPC header and parameters of device_write and device_read, and of their replies.
@@ -113,6 +117,37 @@ void getStream(benchmark::State &state)
             state.SkipWithError("reading the block failed");
             return;
         }
+    }
+    countBytes(state);
+}
+
+/// Files over a bare TCP connection, which is all that HiSLIP needs of the network.
+void socketPut(benchmark::State &state)
+{
+    SocketCopy copy(folder->filePath("far.wv"));
+    bool done = true;
+    for (auto _ : state) {
+        done = done && copy.put(localName());
+    }
+    if (!done) {
+        state.SkipWithError("copy failed");
+    }
+    countBytes(state);
+}
+
+void socketGet(benchmark::State &state)
+{
+    SocketCopy copy(folder->filePath("far.wv"));
+    bool done = copy.put(localName());
+    const QString backName = folder->filePath("back.wv");
+    for (auto _ : state) {
+        state.PauseTiming();
+        QFile::remove(backName);
+        state.ResumeTiming();
+        done = done && copy.get(backName);
+    }
+    if (!done) {
+        state.SkipWithError("copy failed");
     }
     countBytes(state);
 }
@@ -339,6 +374,18 @@ int main(int argc, char **argv)
     add("get/roundtrips", [](benchmark::State &state) {
         roundTrips(state, ReadCallBytes, ReadReplyBytes + ReadBlock, ReadBlock);
     });
+    SimulatorProcess hislip;
+    runOnProcessor(Side::Instrument);
+    const bool hasHislip = hislip.start({"--address", HislipHost});
+    runOnProcessor(Side::Controller);
+    if (hasHislip) {
+        add("hislip/put", [](benchmark::State &state) { put(state, HislipResource); });
+        add("hislip/put/copy", socketPut);
+        add("hislip/get", [](benchmark::State &state) { get(state, HislipResource); });
+        add("hislip/get/copy", socketGet);
+    } else {
+        qWarning("Without HiSLIP: %s", qPrintable(hislip.errorOutput()));
+    }
     networks.addAll();
     benchmark::Initialize(&argc, argv);
     benchmark::RunSpecifiedBenchmarks();

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <array>
+#include <bit>
 #include <cmath>
 #include <cstring>
 
@@ -61,16 +62,39 @@ CORVANE_CLONES void encodeA(const float *values, qint16 *words, size_t count)
     }
 }
 
+/// Largest magnitude, NaN left out. Magnitudes order as their bits do, and whole numbers let the
+/// loop go by vectors where floating point may not change the order of its comparisons.
+CORVANE_CLONES float largestMagnitude(const float *values, size_t count)
+{
+    constexpr qint32 InfinityBits = 0x7F800000;
+    qint32 largest = 0;
+    for (size_t i = 0; i < count; ++i) {
+        const qint32 bits = std::bit_cast<qint32>(values[i]) & 0x7FFFFFFF;
+        const qint32 number = bits > InfinityBits ? 0 : bits;
+        largest = number > largest ? number : largest;
+    }
+    return std::bit_cast<float>(largest);
+}
+
 CORVANE_CLONES quint32 clippedAmong(const float *values, size_t count)
 {
-    quint32 clipped = 0;
+    quint32 fitting = 0;
     for (size_t i = 0; i < count; ++i) {
         const float scaled = values[i] * FullScale + 0.5F;
-        // Written so that a NaN, which compares false, counts.
-        const bool fits = scaled < FullScale + 1 && scaled > -(FullScale + 1);
-        clipped += fits ? 0U : 1U;
+        // Written so that a NaN, which compares false, counts as clipped; without a branch.
+        const quint32 isBelow = scaled < FullScale + 1 ? 1U : 0U;
+        const quint32 isAbove = scaled > -(FullScale + 1) ? 1U : 0U;
+        fitting += isBelow & isAbove;
     }
-    return clipped;
+    return static_cast<quint32>(count) - fitting;
+}
+
+CORVANE_CLONES void limit(float *values, size_t count)
+{
+    for (size_t i = 0; i < count; ++i) {
+        const float value = values[i] < -1.0F ? -1.0F : values[i];
+        values[i] = value > 1.0F ? 1.0F : value;
+    }
 }
 
 } // namespace
@@ -116,13 +140,16 @@ void encodeWords(std::span<const float> values, std::span<std::byte> words)
 void countClipped(std::span<const float> values, ClipCount &count)
 {
     const quint32 clipped = clippedAmong(values.data(), values.size());
-    if (clipped == 0) {
-        return;
+    if (clipped > 0) {
+        count.values += clipped;
+        count.largest = std::max(
+            count.largest, static_cast<double>(largestMagnitude(values.data(), values.size())));
     }
-    count.values += clipped;
-    for (const float value : values) {
-        count.largest = std::max(count.largest, static_cast<double>(std::fabs(value)));
-    }
+}
+
+void limitToFullScale(std::span<float> values)
+{
+    limit(values.data(), values.size());
 }
 
 qint16 encodeWord(float value)

@@ -36,5 +36,8 @@ struct ClipCount
 /// clipped. A NaN counts and doesn't change the largest magnitude.
 void countClipped(std::span<const float> values, ClipCount &count);
 
+/// Puts values beyond full scale at -1 or 1, as encodeWords() will.
+void limitToFullScale(std::span<float> values);
+
 /// Encodes one value by coding A.
 [[nodiscard]] qint16 encodeWord(float value);

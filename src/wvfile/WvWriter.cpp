@@ -274,8 +274,7 @@ bool WvWriter::writeSamples(OutputFile &file)
         const qint64 clippedBefore = clipped.values;
         countClipped(samples, clipped);
         if (clipped.values != clippedBefore) {
-            std::transform(samples.begin(), samples.end(), samples.begin(),
-                           [](float value) { return std::clamp(value, -1.0F, 1.0F); });
+            limitToFullScale(samples);
         }
         loop.add(samples);
         if (!put(file, {reinterpret_cast<const char *>(bytes.data()), bytes.size()})) {
