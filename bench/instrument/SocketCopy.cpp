@@ -53,7 +53,8 @@ bool sendFile(int socket, const QString &name, Direction direction)
     return true;
 }
 
-bool receiveFile(int socket, const QString &name, qint64 length)
+/// With `isDurable` the bytes are on the disk at the end, as those of a fetched waveform.
+bool receiveFile(int socket, const QString &name, qint64 length, bool isDurable)
 {
     QFile file(name);
     bool done = file.open(QIODevice::WriteOnly | QIODevice::Unbuffered);
@@ -64,7 +65,7 @@ bool receiveFile(int socket, const QString &name, qint64 length)
         done = count > 0 && file.write(block.data(), count) == count;
         length -= count;
     }
-    return done;
+    return done && (!isDurable || fdatasync(file.handle()) == 0);
 }
 
 } // namespace
@@ -95,8 +96,9 @@ void SocketCopy::serve(int peer) const
     Order order{};
     bool done = true;
     while (done && receiveOrder(peer, order)) {
-        done = order[0] == Put ? receiveFile(peer, m_farName, order[1]) && sendOrder(peer, order)
-                               : sendFile(peer, m_farName, Get);
+        done = order[0] == Put
+                   ? receiveFile(peer, m_farName, order[1], false) && sendOrder(peer, order)
+                   : sendFile(peer, m_farName, Get);
     }
     close(peer);
 }
@@ -111,5 +113,5 @@ bool SocketCopy::get(const QString &name)
 {
     Order answer{};
     return sendOrder(m_socket, {Get, 0}) && receiveOrder(m_socket, answer) &&
-           receiveFile(m_socket, name, answer[1]);
+           receiveFile(m_socket, name, answer[1], true);
 }
