@@ -14,6 +14,7 @@
 
 #include <QComboBox>
 #include <QMessageBox>
+#include <QStatusBar>
 #include <QSignalBlocker>
 
 #include <algorithm>
@@ -192,6 +193,8 @@ bool MainWindow::openInstrument(Pane &pane)
             Tracer::Trace(Tracer::Error, reported);
         }
         errMsg(QString("'%1' cannot be opened; see the log.").arg(pane.device->currentText()));
+    } else {
+        statusBar()->clearMessage(); // what it says of another one is over
     }
     return opened;
 }

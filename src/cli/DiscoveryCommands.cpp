@@ -37,10 +37,20 @@ QStringList textsOf(const InstrumentSummary &found)
     return {found.resource, found.model, found.serial, found.interfaceName};
 }
 
+/// Nothing on the standard output would leave one in doubt whether anything was asked.
+void tellIfNone(qsizetype found, int exitCode, const char *advice)
+{
+    if (found == 0 && exitCode == 0) {
+        Tracer::Trace(Tracer::Warning, QString("No instrument answered. %1").arg(advice));
+    }
+}
+
 int runLanScan(InstrumentArguments &arguments)
 {
     LanScanJob job(arguments.listenSeconds.value_or(LanScanJob::DefaultSeconds));
     const int exitCode = arguments.console.run(job);
+    tellIfNone(job.found().size(), exitCode,
+               "'corvane-cli instr doctor HOST' looks where the way to one ends.");
     QJsonArray objects;
     QString text;
     for (const LanInstrument &found : job.found()) {
@@ -64,6 +74,7 @@ int runScan(InstrumentArguments &arguments)
     }
     ScanJob job(arguments.scanKind);
     const int exitCode = arguments.console.run(job);
+    tellIfNone(job.found().size(), exitCode, "Check that it is on and its cable is plugged in.");
     QJsonArray objects;
     QString text;
     for (const InstrumentSummary &found : job.found()) {

@@ -30,6 +30,11 @@ enum Column { DeviceColumn, ValueColumn, CommentColumn };
 
 /// The VISA resource of a top item, by which its entry is found.
 constexpr int ResourceRole = Qt::UserRole;
+constexpr int BusyRole = Qt::UserRole + 1;
+constexpr const char *BusyIcon = "device_busy";
+constexpr const char *BusyText = "A pane works with the instrument.";
+constexpr const char *OnlineIcon = "device_online";
+constexpr const char *OnlineText = "The instrument answers.";
 
 QString itemResource(const QTreeWidgetItem &item)
 {
@@ -381,7 +386,7 @@ void DlgInstrConfig::showOnline(const InstrConfigEntry &entry, const InstrumentS
     shown.model = summary.model;
     shown.serial = summary.serial;
     shown.interface = summary.interfaceName;
-    QTreeWidgetItem *item = showItem(shown, "device_online", "The instrument answers.");
+    QTreeWidgetItem *item = showItem(shown, OnlineIcon, OnlineText);
     const auto rows = summaryRows(summary);
     for (const auto &[label, value] : rows) {
         new QTreeWidgetItem(item, QStringList{label, value});
@@ -393,10 +398,10 @@ void DlgInstrConfig::showOffline(const InstrConfigEntry &entry, bool busy)
     if (!isComplete(entry)) {
         return;
     }
-    const QString state = busy            ? "A pane works with the instrument."
+    const QString state = busy            ? QString(BusyText)
                           : entry.enabled ? "The instrument does not answer."
                                           : "The instrument is not checked and was not asked.";
-    QTreeWidgetItem *item = showItem(entry, busy ? "device_busy" : "device_offline", state);
+    QTreeWidgetItem *item = showItem(entry, busy ? BusyIcon : "device_offline", state);
     new QTreeWidgetItem(item, QStringList{"VISA resource", entry.resource});
 }
 
@@ -416,10 +421,9 @@ QTreeWidgetItem *DlgInstrConfig::showItem(const InstrConfigEntry &entry, const Q
     item->setText(DeviceColumn, instrumentName(entry.model, entry.serial));
     item->setText(ValueColumn, entry.interface);
     item->setText(CommentColumn, entry.comment);
-    item->setIcon(DeviceColumn, lineIcon(icon));
+    setState(*item, icon, state);
     item->setFlags(Qt::ItemIsEnabled | Qt::ItemIsSelectable | Qt::ItemIsUserCheckable);
     item->setCheckState(DeviceColumn, entry.enabled ? Qt::Checked : Qt::Unchecked);
-    item->setToolTip(DeviceColumn, state);
     return item;
 }
 
@@ -433,6 +437,33 @@ QTreeWidgetItem *DlgInstrConfig::itemOf(const QString &resource) const
         }
     }
     return nullptr;
+}
+
+void DlgInstrConfig::setState(QTreeWidgetItem &item, const QString &icon, const QString &state)
+{
+    // Only what the user changes is to reach instr_itemChanged.
+    const QSignalBlocker blocker(m_ui->tw_instruments);
+    item.setIcon(DeviceColumn, lineIcon(icon));
+    item.setToolTip(DeviceColumn, state);
+    item.setData(DeviceColumn, BusyRole, icon == BusyIcon);
+}
+
+/// Panes open and close instruments while the list is out of sight.
+void DlgInstrConfig::showEvent(QShowEvent *event)
+{
+    QDialog::showEvent(event);
+    const QList<InstrConfigEntry> entries = m_busy ? QList<InstrConfigEntry>() : m_list.entries();
+    for (const InstrConfigEntry &entry : entries) {
+        QTreeWidgetItem *item = itemOf(entry.resource);
+        if (item == nullptr) {
+            continue;
+        }
+        if (VisaDevice(m_noVisa).isOpenElsewhere(entry.model, entry.serial)) {
+            setState(*item, BusyIcon, BusyText);
+        } else if (item->data(DeviceColumn, BusyRole).toBool()) {
+            setState(*item, OnlineIcon, OnlineText);
+        }
+    }
 }
 
 void DlgInstrConfig::updateView()

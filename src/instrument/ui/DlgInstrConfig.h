@@ -69,6 +69,9 @@ signals:
     /// The list has changed, or what is known of its instruments.
     void updateInstruments();
 
+protected:
+    void showEvent(QShowEvent *event) override;
+
 private:
     void addActions();
     void scan(int kind, const QString &origin);
@@ -81,6 +84,7 @@ private:
     void showOffline(const InstrConfigEntry &entry, bool busy);
     QTreeWidgetItem *showItem(const InstrConfigEntry &entry, const QString &icon,
                               const QString &state);
+    void setState(QTreeWidgetItem &item, const QString &icon, const QString &state);
     [[nodiscard]] QTreeWidgetItem *itemOf(const QString &resource) const;
     void updateView();
     void fitColumns();
