@@ -5,6 +5,7 @@
 #include <QSettings>
 
 #include <algorithm>
+#include <iterator>
 
 namespace {
 
@@ -25,10 +26,13 @@ ColumnWidths::ColumnWidths()
 {
 }
 
-bool ColumnWidths::isUntouched(const QString &kind, const QHeaderView &header, int section)
+QList<int> ColumnWidths::untouched(const QString &kind) const
 {
-    return section < header.count() &&
-           header.sectionSize(section) == firstWidths().value(kind).value(section);
+    QList<int> first = firstWidths().value(kind);
+    const QList<int> widths = m_widths.value(kind);
+    const bool isFirst = widths.size() == first.size() &&
+                         std::equal(first.cbegin(), std::prev(first.cend()), widths.cbegin());
+    return isFirst ? first : QList<int>();
 }
 
 void ColumnWidths::keep(const QString &kind, const QHeaderView &header)

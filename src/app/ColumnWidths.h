@@ -20,9 +20,9 @@ public:
     /// Gives a header the widths of a kind.
     void apply(const QString &kind, QHeaderView &header) const;
 
-    /// Whether nobody has changed the width that a column has from the start.
-    [[nodiscard]] static bool isUntouched(const QString &kind, const QHeaderView &header,
-                                          int section);
+    /// The widths from the start, while the user has chosen no others; empty from then on. The last
+    /// column takes what is left and says nothing.
+    [[nodiscard]] QList<int> untouched(const QString &kind) const;
 
     /// Keys are "tree1.local.section0" and so on. A list that can't be read leaves the widths.
     void write(QSettings &settings, int pane) const;

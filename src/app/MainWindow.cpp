@@ -154,8 +154,14 @@ void MainWindow::connectPane(Pane &pane)
             [this, &pane] { otherPane(pane).tree->setFocus(Qt::TabFocusReason); });
     connect(pane.tree, &QCustomTreeView::generatorChanged, pane.generator, &GeneratorLine::refresh);
     connect(pane.generator, &GeneratorLine::said, this, &MainWindow::errMsg);
-    connect(pane.path, &PathBox::pathChosen, this,
-            [this, &pane](const QString &path) { goTo(pane, path); });
+    connect(pane.path, &PathBox::pathChosen, this, [this, &pane](const QString &path) {
+        goTo(pane, path);
+        if (pane.tree->currentPath() == path) {
+            // For the keys that come next; the list of completions gives the focus back to the
+            // field when it goes.
+            QTimer::singleShot(0, pane.tree, [&pane] { pane.tree->setFocus(); });
+        }
+    });
     connect(pane.path, &PathBox::upRequested, pane.tree, &QCustomTreeView::goUp);
     connect(pane.path, &PathBox::homeRequested, this, [this, &pane] { goHome(pane); });
 }

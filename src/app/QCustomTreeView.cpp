@@ -54,6 +54,10 @@ QCustomTreeView::QCustomTreeView(QWidget *parent)
     connect(&m_revealTimer, &QTimer::timeout, this, &QCustomTreeView::revealCurrent);
     connect(verticalScrollBar(), &QScrollBar::actionTriggered, this,
             [this] { m_revealedPath.clear(); });
+    // Not in the middle of a layout or of a change of the model.
+    m_fitTimer.setSingleShot(true);
+    m_fitTimer.setInterval(0);
+    connect(&m_fitTimer, &QTimer::timeout, this, &QCustomTreeView::fitColumns);
     constexpr int RepaintMs = 2000;
     connect(&m_repaintTimer, &QTimer::timeout, this, [this] {
         if (isLocal() && isVisible()) {
@@ -114,7 +118,7 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
     m_files = PaneFiles::create(model);
     if (m_files) {
         m_files->follow(*this);
-        connect(this, &QTreeView::expanded, m_files.get(), [this] { fitSizeColumn(); });
+        connect(this, &QTreeView::expanded, m_files.get(), [this] { m_fitTimer.start(); });
         connect(m_files.get(), &PaneFiles::failed, this, &QCustomTreeView::errMsg);
         connect(m_files.get(), &PaneFiles::infoTextAvailable, this,
                 &QCustomTreeView::infoTextAvailable);
@@ -123,6 +127,7 @@ void QCustomTreeView::setModel(QAbstractItemModel *model)
         connect(model, &QAbstractItemModel::layoutChanged, &m_revealTimer, reveal);
         connect(m_files.get(), &PaneFiles::folderLoaded, this, &QCustomTreeView::folderLoaded);
         m_columnWidths.apply(m_files->settingsName(), *header());
+        m_fitTimer.start();
     }
 }
 
@@ -157,9 +162,10 @@ void QCustomTreeView::readSettings(const QSettings &settings, int pane)
 
 void QCustomTreeView::keepColumnWidths()
 {
-    if (m_files) {
+    if (m_files && !isFitted()) {
         m_columnWidths.keep(m_files->settingsName(), *header());
     }
+    m_fittedWidths.clear();
 }
 
 void QCustomTreeView::updateAndExpandTree(const QString &sDir)
@@ -181,17 +187,44 @@ void QCustomTreeView::updateAndExpandTree(const QString &sDir)
     setCurrentIndex(target);
     m_revealedPath = m_files->pathOf(target);
     revealCurrent();
-    fitSizeColumn();
+    m_fitTimer.start();
 }
 
-void QCustomTreeView::fitSizeColumn()
+/// Until the user chooses widths, names get the room that the other columns leave.
+void QCustomTreeView::fitColumns()
 {
-    constexpr int SizeColumn = 1;
-    // The sizes of an instrument's files are longer than those of local ones.
-    if (!isLocal() && ColumnWidths::isUntouched(m_files->settingsName(), *header(), SizeColumn) &&
-        sizeHintForColumn(SizeColumn) > columnWidth(SizeColumn)) {
-        resizeColumnToContents(SizeColumn);
+    QList<int> widths = m_files ? m_columnWidths.untouched(m_files->settingsName()) : QList<int>();
+    if (widths.isEmpty() || header()->count() < widths.size() ||
+        (!m_fittedWidths.isEmpty() && !isFitted())) {
+        return;
     }
+    int others = 0;
+    for (int section = 1; section < widths.size(); ++section) {
+        widths[section] = std::max(widths.at(section), sizeHintForColumn(section));
+        others += widths.at(section);
+    }
+    widths[0] = std::max(widths.first(), viewport()->width() - others);
+    m_fittedWidths = widths;
+    for (int section = 0; section < widths.size(); ++section) {
+        setColumnWidth(section, widths.at(section));
+    }
+}
+
+bool QCustomTreeView::isFitted() const
+{
+    // The last one follows the width of the view by itself.
+    for (int section = 0; section + 1 < m_fittedWidths.size(); ++section) {
+        if (columnWidth(section) != m_fittedWidths.at(section)) {
+            return false;
+        }
+    }
+    return !m_fittedWidths.isEmpty();
+}
+
+void QCustomTreeView::resizeEvent(QResizeEvent *event)
+{
+    QTreeView::resizeEvent(event);
+    m_fitTimer.start();
 }
 
 QModelIndex QCustomTreeView::openAnew(const QString &path)

@@ -138,6 +138,7 @@ protected:
     void mouseMoveEvent(QMouseEvent *event) override;
     void mouseDoubleClickEvent(QMouseEvent *event) override;
     void keyPressEvent(QKeyEvent *event) override;
+    void resizeEvent(QResizeEvent *event) override;
     void focusInEvent(QFocusEvent *event) override;
     bool focusNextPrevChild(bool next) override;
     void startDrag(Qt::DropActions supportedActions) override;
@@ -167,7 +168,8 @@ private:
     [[nodiscard]] QModelIndex openAnew(const QString &path);
     void keepColumnWidths();
     void revealCurrent();
-    void fitSizeColumn();
+    void fitColumns();
+    [[nodiscard]] bool isFitted() const;
     void startFirstTool();
     [[nodiscard]] QString toolFile(const QDropEvent &event) const;
     [[nodiscard]] bool comesFromOtherPane(const QDropEvent &event) const;
@@ -192,10 +194,12 @@ private:
     QAction *m_copyRunAction = nullptr;
     QList<ModulesDb::ToolAction> m_toolActions;
     ColumnWidths m_columnWidths;
+    QList<int> m_fittedWidths;            ///< as fitColumns() has set them; empty for none
     QPoint m_dragStart;                   ///< in the viewport
     QPersistentModelIndex m_pressedEntry; ///< that may be dragged
     QString m_revealedPath; ///< kept in view while its folders load, until the user moves
     QTimer m_revealTimer;
+    QTimer m_fitTimer;
     QTimer m_repaintTimer;                       ///< sizes of files change without a word
     QList<QPair<QString, qint64>> m_dropSources; ///< paths and sizes
     QString m_dropTarget;

@@ -285,12 +285,17 @@ void ToolWizard::showPage(int page)
 {
     m_pages->setCurrentIndex(page);
     updateButtons();
-    // A field of the page, or else its default button, takes the next key.
-    QWidget *first = page == statusPage() ? m_close : m_pages->currentWidget()->nextInFocusChain();
-    while (first != m_close &&
-           (!m_pages->currentWidget()->isAncestorOf(first) ||
-            (first->focusPolicy() & Qt::TabFocus) == 0 || !first->isEnabled())) {
+    // A field of the page, or else the default button, takes the next key. Fields that were made
+    // after the buttons stand behind them in the chain.
+    QWidget *current = m_pages->currentWidget();
+    QWidget *first = page == statusPage() ? current : current->nextInFocusChain();
+    while (first != current &&
+           (!current->isAncestorOf(first) || (first->focusPolicy() & Qt::TabFocus) == 0 ||
+            !first->isEnabled() || !first->isVisibleTo(current))) {
         first = first->nextInFocusChain();
+    }
+    if (first == current) {
+        first = page == statusPage() ? m_close : m_next;
     }
     first->setFocus(Qt::TabFocusReason);
     pageShown(page);

@@ -2,6 +2,7 @@
 #include "DlgWvCreate.h"
 
 #include "CreateTypePages.h"
+#include "SignalSketch.h"
 #include "ui_DlgWvCreate.h"
 
 #include "jobs/CreateJob.h"
@@ -83,6 +84,7 @@ DlgWvCreate::DlgWvCreate(QWidget *parent)
     m_ui->le_outfile->setText(QDir::homePath() + "/NewSignal.wv");
     slot_waveform(0);
     slot_over_enable(m_pages->oversamplingBox().checkState());
+    addSketch();
     setUpWizard();
 }
 
@@ -195,6 +197,7 @@ void DlgWvCreate::enableSecondTone()
 
 bool DlgWvCreate::preview()
 {
+    m_sketch->cancel();
     m_ui->w_iq->clear();
     m_ui->w_spectrum->clear();
     m_ui->w_constellation->clear();
@@ -223,6 +226,35 @@ bool DlgWvCreate::preview()
     m_ui->le_crf->setVal(facts.rms > 0 ? 20 * std::log10(facts.peak / facts.rms) : 0.0);
     m_ui->le_clockrate->setVal(facts.clockHz);
     return true;
+}
+
+/// Every field of the kinds draws the sketch anew.
+void DlgWvCreate::addSketch()
+{
+    m_sketch = new SignalSketch([this] { return options(); }, this);
+    const auto draw = [this] { m_sketch->request(); };
+    for (int page = FirstTypePage; page < PreviewPage; ++page) {
+        const QWidget *fields = m_ui->sw_assist->widget(page);
+        for (const auto *edit : fields->findChildren<QtNumericEdit *>()) {
+            connect(edit, &QtNumericEdit::valueUpdated, m_sketch, draw);
+        }
+        for (const auto *box : fields->findChildren<QComboBox *>()) {
+            connect(box, &QComboBox::currentIndexChanged, m_sketch, draw);
+        }
+        for (const auto *box : fields->findChildren<QCheckBox *>()) {
+            connect(box, &QCheckBox::toggled, m_sketch, draw);
+        }
+    }
+}
+
+void DlgWvCreate::pageShown(int page)
+{
+    if (page < FirstTypePage || page >= PreviewPage) {
+        return;
+    }
+    static_cast<QBoxLayout *>(m_ui->sw_assist->widget(page)->layout())->addWidget(m_sketch, 1);
+    m_sketch->show();
+    m_sketch->request();
 }
 
 void DlgWvCreate::slot_scaling()

@@ -9,6 +9,7 @@
 
 class CreateTypePages;
 class QtNumericEdit;
+class SignalSketch;
 
 namespace Ui {
 class DlgWvCreate;
@@ -32,6 +33,7 @@ protected:
     [[nodiscard]] std::unique_ptr<ToolJob> makeJob() const override;
     [[nodiscard]] int pageAfter(int page) override;
     [[nodiscard]] int pageBefore(int page) override;
+    void pageShown(int page) override;
     void writeFields(QSettings &settings) const override;
     void readFields(const QSettings &settings) override;
 
@@ -48,8 +50,10 @@ private:
     [[nodiscard]] int subKind() const;
     void enableSecondTone();
     [[nodiscard]] bool preview();
+    void addSketch();
 
     std::unique_ptr<Ui::DlgWvCreate> m_ui;
     std::unique_ptr<CreateTypePages> m_pages;
-    unsigned m_seed = 0; ///< of the random values that the preview shows
+    SignalSketch *m_sketch = nullptr; ///< on the page of the kind that is set up
+    unsigned m_seed = 0;              ///< of the random values that the preview shows
 };

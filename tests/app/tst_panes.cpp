@@ -8,6 +8,7 @@
 #include <QApplication>
 #include <QDir>
 #include <QFileInfo>
+#include <QHeaderView>
 #include <QMenu>
 #include <QMouseEvent>
 #include <QSignalSpy>
@@ -35,6 +36,7 @@ private slots:
     void contextMenuFitsTheEntry();
     void doubleClickStartsTheFirstTool();
     void localCopyIsRefused();
+    void namesGetTheRoom();
     void largeFolderStaysInOrder();
     void dragsFromAnyModel();
 };
@@ -330,6 +332,27 @@ void TestPanes::localCopyIsRefused()
     QTRY_VERIFY(openMenu());
     QVERIFY(withModal(chooseFirst, answer("OK", seen)));
     QCOMPARE(seen.text, "The target location for the copy operation must be a folder.");
+}
+
+void TestPanes::namesGetTheRoom()
+{
+    Desk desk;
+    desk.open();
+    QCustomTreeView *tree = desk.tree(1);
+    const auto room = [tree] {
+        const QHeaderView &header = *tree->header();
+        return tree->viewport()->width() - header.sectionSize(1) - header.sectionSize(2) -
+               header.sectionSize(3);
+    };
+    desk.window()->resize(1500, 600);
+    QTRY_VERIFY(tree->columnWidth(0) > 300 && tree->columnWidth(0) == room());
+    // What the user chooses stays.
+    tree->setColumnWidth(0, 250);
+    const int before = tree->width();
+    desk.window()->resize(1600, 600);
+    QTRY_VERIFY(tree->width() > before);
+    QCoreApplication::processEvents();
+    QCOMPARE(tree->columnWidth(0), 250);
 }
 
 void TestPanes::largeFolderStaysInOrder()

@@ -70,6 +70,7 @@ private slots:
     void cancelledConversionLeavesNothing();
     void creationOverwritesUnlessCancelled();
     void refusalKeepsTheFile();
+    void createShowsWhatTheFieldsMake();
     void createKeepsItsSettings();
     void viewMovesZoomsAndPlays();
     void viewCursorsShowValuesAndDistance();
@@ -242,6 +243,22 @@ void TestTools::refusalKeepsTheFile()
     click(dialog, "pb_next");
     QCOMPARE(takeMessages(Tracer::Error), QStringList("Output file name is empty."));
     QVERIFY(reportOf(dialog).toPlainText().isEmpty());
+}
+
+void TestTools::createShowsWhatTheFieldsMake()
+{
+    DlgWvCreate dialog;
+    QVERIFY(dialog.startModule(path("tone.wv")));
+    dialog.show();
+    child<QComboBox>(dialog, "cb_waveform")->setCurrentText("FM");
+    click(dialog, "pb_next");
+    // Not a button, of which one closes.
+    QVERIFY(dialog.focusWidget() == child<QtNumericEdit>(dialog, "le_modfreq"));
+    const auto *facts = child<QLabel>(dialog, "l_sketch");
+    QTRY_COMPARE(facts->text(), "1024 samples at 1.024 MHz, peak / RMS 0.00 dB");
+    type(child<QtNumericEdit>(dialog, "le_dev"), "40M");
+    QTRY_COMPARE(facts->text(),
+                 "The required ARB clock rate exceeds the upper limit. Check settings.");
 }
 
 void TestTools::createKeepsItsSettings()
