@@ -21,7 +21,6 @@
 
 namespace {
 
-constexpr int ConnectTimeoutMs = 5000;
 constexpr int LookUpTimeoutMs = 5000;
 constexpr quint16 HislipPort = 4880;
 /// A name of many addresses is tried at the first ones.
@@ -105,7 +104,7 @@ QList<QHostAddress> addressesOf(const QString &host, const OperationControl &con
 }
 
 QList<bool> openPorts(const QList<QHostAddress> &addresses, const QList<quint16> &ports,
-                      const OperationControl &control)
+                      const OperationControl &control, int timeoutMs)
 {
     // All at once: a host that is switched off costs the time of one.
     std::vector<std::unique_ptr<QTcpSocket>> sockets;
@@ -117,7 +116,7 @@ QList<bool> openPorts(const QList<QHostAddress> &addresses, const QList<quint16>
             sockets.back()->connectToHost(address, port, QIODevice::ReadWrite);
         }
     }
-    const QDeadlineTimer deadline(ConnectTimeoutMs);
+    const QDeadlineTimer deadline(timeoutMs);
     const auto socketOf = [&](qsizetype address, qsizetype port) -> QTcpSocket & {
         return *sockets.at(static_cast<size_t>(address * ports.size() + port));
     };

@@ -18,9 +18,13 @@ struct OperationControl;
 [[nodiscard]] QList<QHostAddress> addressesOf(const QString &host, const OperationControl &control,
                                               QString &problem);
 
-/// Which of the ports take a connection at one of the addresses, one flag a port.
+/// How long a port may take to accept a connection.
+constexpr int ConnectTimeoutMs = 5000;
+
+/// Which of the ports take a connection at one of the addresses within the time, one flag a port.
 [[nodiscard]] QList<bool> openPorts(const QList<QHostAddress> &addresses,
-                                    const QList<quint16> &ports, const OperationControl &control);
+                                    const QList<quint16> &ports, const OperationControl &control,
+                                    int timeoutMs = ConnectTimeoutMs);
 
 /// The ports on which the instrument of a TCPIP resource string must answer.
 [[nodiscard]] QList<quint16> portsOf(const QString &resource);

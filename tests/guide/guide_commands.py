@@ -6,6 +6,7 @@ Each block fenced as "sh" is run by bash in a folder of its own, with the built 
 simulated instruments; a command that fails fails the test. Behind "sh" may stand "with NAME...",
 the files that the reader has and the test makes, or "hardware" for what can't run here."""
 
+import concurrent.futures
 import math
 import os
 import pathlib
@@ -110,9 +111,11 @@ def run_block(text, needed, environment):
         return problem and f"{problem}\n{output}"
 
 
-def main():
-    programs, library = sys.argv[1:3]
+def run_page(programs, library, path):
+    """Runs the blocks of a page beside instruments of its own. Gives their count, that of those
+    that failed, and what is to be said."""
     failures = ran = 0
+    said = []
     with tempfile.TemporaryDirectory() as name:
         home = pathlib.Path(name)
         (home / "bench.ini").write_text(BENCH)
@@ -127,22 +130,33 @@ def main():
                 port = re.match(r"ready 127\.0\.0\.1:(\d+) ", ready[0])[1]
                 (home / "visa.ini").write_text(
                     f"[GPIB0]\nhost=127.0.0.1\nport={port}\naddresses=20,28\n")
-                for path in map(pathlib.Path, sys.argv[3:]):
-                    for line, words, text in blocks(path):
-                        if words == ["hardware"]:
-                            continue
-                        if words and words[0] != "with":
-                            problem = f"unknown mark {' '.join(words)}"
-                        else:
-                            started = time.monotonic()
-                            problem = run_block(text, words[1:], environment)
-                            print(f"{path.name}:{line}: {time.monotonic() - started:.1f} s")
-                        ran += 1
-                        if problem:
-                            failures += 1
-                            print(f"{path}:{line}: {problem}\n{text}\n")
+                for line, words, text in blocks(path):
+                    if words == ["hardware"]:
+                        continue
+                    if words and words[0] != "with":
+                        problem = f"unknown mark {' '.join(words)}"
+                    else:
+                        started = time.monotonic()
+                        problem = run_block(text, words[1:], environment)
+                        said.append(f"{path.name}:{line}: {time.monotonic() - started:.1f} s")
+                    ran += 1
+                    if problem:
+                        failures += 1
+                        said.append(f"{path}:{line}: {problem}\n{text}\n")
             finally:
                 simulator.terminate()
+    return ran, failures, said
+
+
+def main():
+    programs, library = sys.argv[1:3]
+    # Together, since most of their time goes by while an instrument gets ready.
+    with concurrent.futures.ThreadPoolExecutor() as pool:
+        pages = list(pool.map(lambda path: run_page(programs, library, path),
+                              map(pathlib.Path, sys.argv[3:])))
+    for _, _, said in pages:
+        print("\n".join(said))
+    ran, failures = (sum(page[k] for page in pages) for k in range(2))
     print(f"{ran} blocks run, {failures} failed")
     return 1 if failures or not ran else 0
 
