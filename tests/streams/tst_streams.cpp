@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "streams/BufferedIO.h"
+#include "streams/RunLengthDevice.h"
 #include "streams/levels.h"
 #include "support/TestDevice.h"
 #include "support/logreader.h"
@@ -96,6 +97,7 @@ private slots:
     void anyOrderOfCalls();
     void modes();
     void failingDevice();
+    void runLengths();
     void levelsInOrder();
 };
 
@@ -186,6 +188,52 @@ void TestStreams::modes()
                 QCOMPARE(device.bytes, (mode & BufferedIO::Write) != 0 ? "newtent" : "content");
                 QVERIFY2(!stream.initBuf(&device, mode), "a second time without a release");
             });
+}
+
+/// Long stretches, changes at each byte, which go to the disk, and gaps, in any order.
+void TestStreams::runLengths()
+{
+    constexpr int Page = 65536;
+    std::mt19937 generator = randomGenerator();
+    const auto below = [&](int count) {
+        return static_cast<int>(generator() % static_cast<unsigned>(count));
+    };
+    for (int round = 0; round < 30; ++round) {
+        RunLengthDevice device;
+        QVERIFY(device.open(QIODevice::ReadWrite | QIODevice::Unbuffered));
+        QByteArray plain;
+        const auto extend = [&plain](qsizetype length) {
+            const char last = plain.isEmpty() ? '\0' : plain.back();
+            plain.append(std::max<qsizetype>(length - plain.size(), 0), last);
+        };
+        for (int call = 0; call < 20; ++call) {
+            const int size = below(4) == 0 ? Page : 1 + below(below(2) == 0 ? 10 : 2 * Page);
+            // Now and then a whole page, or up to the last byte of one.
+            const int position = below(3) == 0 ? Page * below(5) : below(5 * Page);
+            switch (below(4)) {
+            case 0:
+                device.extendTo(position);
+                extend(position);
+                break;
+            case 1:
+            case 2: {
+                const QByteArray bytes = below(3) == 0
+                                             ? randomBytes(size, static_cast<unsigned>(below(1000)))
+                                             : QByteArray(size, static_cast<char>(below(3)));
+                QVERIFY(device.seek(position));
+                QCOMPARE(device.write(bytes), size);
+                extend(position);
+                plain.replace(position, size, bytes);
+                break;
+            }
+            default:
+                QVERIFY(device.seek(position));
+                QVERIFY(device.read(size) == plain.mid(position, size));
+            }
+            QCOMPARE(device.size(), plain.size());
+        }
+        QVERIFY(device.seek(0) && device.readAll() == plain);
+    }
 }
 
 void TestStreams::failingDevice()

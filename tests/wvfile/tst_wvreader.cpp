@@ -2,6 +2,7 @@
 #include "WvTestFile.h"
 #include "support/rows.h"
 #include "support/seed.h"
+#include "wvfile/SampleDevice.h"
 
 #include <QSignalSpy>
 #include <QTest>
@@ -35,6 +36,7 @@ private slots:
     void refused();
     void codings();
     void blocksJoinSeamlessly();
+    void anyPosition();
     void recordAndPrefix();
     void textTags();
     void levelsAreMeasured();
@@ -175,6 +177,36 @@ void TestWvReader::blocksJoinSeamlessly()
 }
 
 /// What one file has left behind isn't the next one's.
+/// Without unpacking, each stretch of the file decodes to what the unpacked stream holds there.
+void TestWvReader::anyPosition()
+{
+    constexpr int Samples = 200'000;
+    ReadRun run("{TYPE: TGX-WV,0}{SAMPLES:200000}" + sampleBlock(randomBytes(4 * Samples)));
+    QVERIFY(run.read().ok);
+    const QByteArray unpacked = run.dataDevice.bytes;
+    SampleDevice device;
+    QVERIFY(device.setSource(run.info) && device.open(QIODevice::ReadOnly));
+    QCOMPARE(device.size(), unpacked.size());
+    for (const auto &[position, count] :
+         {std::pair{0, 2}, {1, 600'000}, {3 + 8 * 65'536 - 1, 9}, {3 + 8 * Samples - 5, 100}}) {
+        QVERIFY(device.seek(position));
+        QVERIFY2(device.read(count) == unpacked.mid(position, count),
+                 qPrintable(QString::number(position)));
+    }
+    // Cut off meanwhile: what is there comes, and then an error instead of a wait or of zeros.
+    QVERIFY(QFile::resize(run.info.fileName, QFileInfo(run.info.fileName).size() / 2));
+    SampleDevice cut;
+    QVERIFY(cut.setSource(run.info) && cut.open(QIODevice::ReadOnly | QIODevice::Unbuffered));
+    QByteArray got;
+    QByteArray piece(100'000, '\0');
+    qint64 count = 0;
+    while ((count = cut.read(piece.data(), got.isEmpty() ? piece.size() : 8)) > 0) {
+        got += piece.left(count);
+    }
+    QCOMPARE(count, -1);
+    QVERIFY(unpacked.startsWith(got) && std::abs(got.size() - unpacked.size() / 2) < 200);
+}
+
 void TestWvReader::recordAndPrefix()
 {
     // B counts from the first byte that is no blank: "12,#" and one sample.
