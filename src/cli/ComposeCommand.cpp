@@ -101,6 +101,7 @@ int runCompose(ComposeArguments &arguments)
     if (!mayWrite(console, request.composition.target.sName, arguments.force)) {
         return console.failed();
     }
+    request.overwrite = arguments.force;
     request.multiProcess = !arguments.singleProcess;
     ComposeJob job(std::move(request));
     return console.run(job);

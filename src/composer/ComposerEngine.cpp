@@ -376,6 +376,7 @@ bool ComposerEngine::scaleAndSave(BufferedIO &data, BufferedIO &markers, const L
     job.rmsOffset = levelOffset(scale * levels.rmsLevel(total), 1e-12);
     job.peakOffset = 0;
     job.levelsValid = true;
+    job.overwrite = m_overwrites;
     job.comment = QStringLiteral("Created with Corvane");
     job.copyright = QStringLiteral("Halvorn");
     HvFileIO file;

@@ -38,6 +38,9 @@ public:
     /// to MostThreads.
     void setMaxThreads(int count) { m_maxThreads = count; }
 
+    /// Without it a target that stands there already is left alone. At first it is replaced.
+    void setOverwrites(bool overwrites) { m_overwrites = overwrites; }
+
     /// The whole render. False, with the reason logged, on failure and cancel.
     [[nodiscard]] bool runComposer();
 
@@ -83,6 +86,7 @@ private:
     Composition m_composition;
     SegmentBufferMap m_buffers;
     int m_maxThreads = 0; ///< 0: not chosen yet
+    bool m_overwrites = true;
     ClipCount m_clipped;
     std::atomic<bool> m_cancelled{false};
 };

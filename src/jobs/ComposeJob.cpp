@@ -15,6 +15,7 @@ ComposeJob::ComposeJob(ComposeRequest request, QObject *parent)
     if (!m_request.multiProcess) {
         m_engine.setMaxThreads(1);
     }
+    m_engine.setOverwrites(m_request.overwrite);
     connect(this, &ToolJob::cancelRequested, &m_engine, &ComposerEngine::slot_cancel);
     connect(&m_engine, &ComposerEngine::overallProgress, this, &ToolJob::ProgressUpdate);
     const auto send = [this](auto signal, ReportLine (*line)(QString)) {

@@ -10,6 +10,7 @@ struct ComposeRequest
 {
     Composition composition;  ///< rendered as it stands
     bool multiProcess = true; ///< several segments at a time
+    bool overwrite = true;    ///< a file that stands under the target's name may be replaced
 };
 
 /// Renders a composition into its target file. What can be seen to fail is told before the work

@@ -4,6 +4,7 @@
 #include "log/Tracer.h"
 
 #include <QDir>
+#include <QFile>
 #include <QFileInfo>
 
 #include <utility>
@@ -52,8 +53,18 @@ bool PolarJob::edit()
     output().setLength(*clock, source().info().samples);
     m_amplitudeOutput.record() = output().record();
     PolarLevels levels;
-    return split(levels) && save(output(), *m_phase.stream(), levels.phase, "Phase") &&
-           save(m_amplitudeOutput, *m_amplitude.stream(), levels.amplitude, "Amplitude");
+    const bool isNew = !QFileInfo::exists(output().fileName());
+    if (!split(levels) || !save(output(), *m_phase.stream(), levels.phase, "Phase")) {
+        return false;
+    }
+    if (save(m_amplitudeOutput, *m_amplitude.stream(), levels.amplitude, "Amplitude")) {
+        return true;
+    }
+    // One file of the pair is of no use.
+    if (isNew) {
+        QFile::remove(output().fileName());
+    }
+    return false;
 }
 
 bool PolarJob::split(PolarLevels &levels)

@@ -7,6 +7,7 @@
 #include "jobs/PolarPreview.h"
 #include "jobs/ResampleJob.h"
 
+#include <QFileInfo>
 #include <QSettings>
 
 namespace {
@@ -130,6 +131,7 @@ PolarRequest DlgPolar::options() const
     request.phase = outputOptions();
     request.amplitude = request.phase;
     request.amplitude.fileName = m_ui->le_outfile_2->text();
+    request.amplitude.overwrite = QFileInfo::exists(request.amplitude.fileName);
     request.offset = m_ui->le_am_offset->getVal();
     request.gain = m_ui->le_am_amplitude->getVal();
     request.clockHz = wantedClockHz(*m_ui->page_phase);

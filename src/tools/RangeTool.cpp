@@ -269,10 +269,12 @@ void RangeTool::slot_run()
     if (!m_source) {
         return;
     }
-    const OutputOptions output{fileNameWithSuffix(m_file, m_suffix), {}, {}};
+    OutputOptions output{fileNameWithSuffix(m_file, m_suffix), {}, {}};
     if (!confirmOverwrite(this, output.fileName)) {
         return;
     }
+    // The user was asked about the file that stands there, not about one that appears later.
+    output.overwrite = QFileInfo::exists(output.fileName);
     const std::unique_ptr<EditJob> job = makeJob(m_file, output);
     job->useSource(*m_source);
     m_report->clear();

@@ -258,6 +258,14 @@ void TestEditJobs::polarFollowsTheFormula()
                     QVERIFY(std::abs(levelsOf(file).second - offset(peakOf(samples))) < 1e-3);
                     QCOMPARE(tag(file, "MARKER LIST 2"), QByteArray(" 0:0;3:1;9:0"));
                 }
+                // A name that is taken without leave is kept, and half of the pair doesn't stay.
+                QVERIFY(m_folder.store("taken.wv", "taken"));
+                request.phase = out("half.wv");
+                request.amplitude = out("taken.wv");
+                request.amplitude.overwrite = false;
+                QCOMPARE(PolarJob(request).run(), JobOutcome::Failed);
+                QCOMPARE(m_folder.load("taken.wv"), "taken");
+                QVERIFY(!QFile::exists(m_folder.path("half.wv")));
             });
 }
 

@@ -274,7 +274,8 @@ void DlgComposer::slot_create()
     progress->setAttribute(Qt::WA_DeleteOnClose);
     const bool single =
         QCoreApplication::arguments().contains(QStringLiteral("--no-multi-process"));
-    ComposeJob job({m_tracks->composition(), !single});
+    // The user was asked about the file that stands there, not about one that appears later.
+    ComposeJob job({m_tracks->composition(), !single, QFileInfo::exists(name)});
     connect(&job, &ToolJob::report, progress, &DlgProgress::addMessage);
     connect(&job.engine(), &ComposerEngine::overallProgress, progress,
             &DlgProgress::setOverallProgress);
