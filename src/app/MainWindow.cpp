@@ -74,6 +74,9 @@ MainWindow::MainWindow()
                   nullptr};
     m_log = new LogPanel(m_ui->lw_log);
     connect(&m_modules, &ModulesDb::sendRequested, this, &MainWindow::sendToInstrument);
+    // Not in the middle of a drop or of the start of the program.
+    connect(&m_modules, &ModulesDb::refused, this, &MainWindow::slot_infoTextAvailable,
+            Qt::QueuedConnection);
     buildMenus();
     for (Pane &pane : m_panes) {
         pane.frame->layout()->setContentsMargins(FrameWidth + 1, FrameWidth + 1, FrameWidth + 1,

@@ -14,8 +14,8 @@
 
 #include <QComboBox>
 #include <QMessageBox>
-#include <QStatusBar>
 #include <QSignalBlocker>
+#include <QStatusBar>
 
 #include <algorithm>
 

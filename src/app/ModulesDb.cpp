@@ -24,8 +24,10 @@
 #include "tools/DlgView.h"
 #include "tools/DlgWrapAround.h"
 #include "tools/DlgWvCreate.h"
+#include "wvfile/foreignfile.h"
 
 #include <QAction>
+#include <QFileInfo>
 #include <QMenu>
 #include <QMenuBar>
 #include <QSettings>
@@ -95,6 +97,19 @@ QList<ToolInfo> toolTable()
         toolInfo<DlgWrapAround>("Analyze Wraparound", "/Analyze/Wrap Around", File, {"WV"}, "wrap",
                                 "analyze-wraparound"),
     };
+}
+
+/// Why a tool doesn't open a file, for its user; empty where that was the user's own wish.
+QString refusalText(const ToolInfo &tool, const QString &path, const QString &reason)
+{
+    if (reason.endsWith("aborted by user.")) {
+        return {};
+    }
+    const QString kind = tool.extensions.contains("WV") ? foreignKind(path) : QString();
+    return QString("'%1' cannot be opened in %2.\n%3")
+        .arg(QFileInfo(path).fileName(), tool.name,
+             kind.isEmpty() ? reason : QString("This is no waveform file: it is %1.").arg(kind))
+        .trimmed();
 }
 
 } // namespace
@@ -205,7 +220,11 @@ bool ModulesDb::start(const ToolInfo &tool, const QString &path)
 {
     Tracer::Trace(Tracer::Debug, QString("Invoking %1.").arg(tool.name));
     DlgBase &window = dialog(tool);
+    const Tracer::ErrorWatch watch;
     if (!window.startModule(path)) {
+        if (const QString text = refusalText(tool, path, watch.text()); !text.isEmpty()) {
+            emit refused(text);
+        }
         return Tracer::fail("Cannot initialize module.");
     }
     window.setWindowState(window.windowState() & ~Qt::WindowMinimized);

@@ -91,6 +91,9 @@ signals:
     /// A tool's user wants a waveform file on an instrument.
     void sendRequested(const QString &path);
 
+    /// A tool can't open a file; says which and why.
+    void refused(const QString &text);
+
 private:
     struct Tool
     {

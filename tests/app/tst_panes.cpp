@@ -36,6 +36,7 @@ private slots:
     void contextMenuFitsTheEntry();
     void doubleClickStartsTheFirstTool();
     void localCopyIsRefused();
+    void tellsWhyAFileDoesNotOpen();
     void namesGetTheRoom();
     void largeFolderStaysInOrder();
     void dragsFromAnyModel();
@@ -332,6 +333,18 @@ void TestPanes::localCopyIsRefused()
     QTRY_VERIFY(openMenu());
     QVERIFY(withModal(chooseFirst, answer("OK", seen)));
     QCOMPARE(seen.text, "The target location for the copy operation must be a folder.");
+}
+
+void TestPanes::tellsWhyAFileDoesNotOpen()
+{
+    Desk desk;
+    QVERIFY(writeText(desk.path("notes.wv"), "no waveform"));
+    desk.open();
+    desk.select(1, "notes.wv");
+    Seen seen;
+    QVERIFY(withModal([&] { pressKey(desk.tree(1), Qt::Key_Return); }, answer("OK", seen)));
+    QCOMPARE(seen.text,
+             "'notes.wv' cannot be opened in View.\nThis is no waveform file: it is text.");
 }
 
 void TestPanes::namesGetTheRoom()
