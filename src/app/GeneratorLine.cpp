@@ -97,7 +97,9 @@ void GeneratorLine::showDevice(VisaDevice *device)
 
 void GeneratorLine::refresh()
 {
-    if (m_device && m_device->isOpen()) {
+    if (m_device && !m_device->isOpen()) {
+        showDevice(nullptr); // what it showed is known no more
+    } else if (m_device) {
         GeneratorJob job({.device = m_device}, GeneratorJob::Operation::Read);
         run(job, {});
     }

@@ -204,6 +204,9 @@ bool QCustomTreeView::copyHere()
         const CopyOutcome outcome = copySources();
         updateAndExpandTree(m_dropTarget);
         emit errMsg(outcome.words);
+        if (device() && !device()->isOpen()) {
+            emit generatorChanged(); // it has fallen silent
+        }
         return outcome.isComplete;
     }
     return false;

@@ -5,6 +5,7 @@
 #include "instrument/remotepaths.h"
 #include "jobs/instrument/CopyJob.h"
 #include "jobs/instrument/StartJob.h"
+#include "log/Tracer.h"
 #include "toolframe/QtProgressDialog.h"
 #include "toolframe/questions.h"
 #include "toolframe/runjob.h"
@@ -64,16 +65,22 @@ bool askMisfits(QWidget *parent, const QString &title, const QStringList &proble
                         (isCut ? "\n..." : "") + "\nDo you want to proceed all the same?");
 }
 
-QString outcomeText(const CopyJob &job, bool done)
+QString outcomeText(const CopyJob &job, bool done, const QString &reason)
 {
+    if (job.isCancelled()) {
+        return job.fileCount() <= 1 ? QString("The copy was cancelled.")
+                                    : QString("The copy was cancelled after %1 of %2 files.")
+                                          .arg(job.copiedCount())
+                                          .arg(job.fileCount());
+    }
     if (!done && job.fileCount() <= 1) {
-        return job.isCancelled() ? "The copy was cancelled." : "Nothing was copied; see the log.";
+        return QString("Nothing was copied: %1").arg(reason);
     }
     if (!done) {
-        return QString(job.isCancelled() ? "The copy was cancelled after %1 of %2 files."
-                                         : "%1 of %2 files copied; see the log.")
+        return QString("%1 of %2 files copied: %3")
             .arg(job.copiedCount())
-            .arg(job.fileCount());
+            .arg(job.fileCount())
+            .arg(reason);
     }
     return job.fileCount() == 1 ? QString("1 file copied.")
                                 : QString("%1 files copied.").arg(job.fileCount());
@@ -110,9 +117,10 @@ CopyOutcome copyEntry(QWidget *parent, const CopyRequest &request)
                                     "the next file?");
                 });
             }};
+    const Tracer::ErrorWatch watch;
     CopyJob job(request, questions);
     const bool isComplete = runJob(job, parent, nullptr) == JobOutcome::Finished;
-    return {job.copiedCount(), isComplete, outcomeText(job, isComplete)};
+    return {job.copiedCount(), isComplete, outcomeText(job, isComplete, watch.text())};
 }
 
 bool isRunnable(const QString &path, const VisaDevice *device)
@@ -127,9 +135,13 @@ QString runWaveform(QWidget *parent, VisaDevice &device, const QString &path)
     job.setQuestion([&](const QStringList &problems) {
         return askBetween([&] { return askMisfits(parent, "Run!", problems); });
     });
+    const Tracer::ErrorWatch watch;
     const bool started = runJob(job, parent, nullptr) == JobOutcome::Finished;
-    const char *words = !started            ? "'%1' was not started on %2, %3; see the log."
-                        : job.isOutputOff() ? "'%1' plays on %2, %3; its RF output is off."
-                                            : "'%1' plays on %2, %3.";
+    if (!started) {
+        return QString("'%1' was not started on %2, %3: %4")
+            .arg(entryName(path), device.model(), device.serial(), watch.text());
+    }
+    const char *words =
+        job.isOutputOff() ? "'%1' plays on %2, %3; its RF output is off." : "'%1' plays on %2, %3.";
     return QString(words).arg(entryName(path), device.model(), device.serial());
 }
