@@ -310,6 +310,11 @@ MainWindow::Pane &MainWindow::otherPane(const Pane &pane)
 void MainWindow::loadSettings()
 {
     const auto settings = openMainStore();
+    if (settings->status() == QSettings::FormatError) {
+        Tracer::Trace(Tracer::Warning, QString("The settings file '%1' is damaged. What can't be "
+                                               "read of it takes its first value again.")
+                                           .arg(settings->fileName()));
+    }
     readWindowPlace(*settings, *this, {50, 50}, {700, 500});
     readSplitter(*settings, "v", *m_ui->sp_dev);
     readSplitter(*settings, "h", *m_ui->sp_h);
@@ -344,8 +349,12 @@ void MainWindow::saveSettings()
     }
     m_modules.writeAllSettings(*settings);
     settings->sync();
-    if (settings->status() != QSettings::NoError) {
-        QMessageBox::critical(nullptr, windowTitle(), "The settings file cannot be written.\n");
+    // A damaged file was told of when it was read, and is a sound one by now.
+    if (settings->status() == QSettings::AccessError) {
+        QMessageBox box(QMessageBox::Critical, windowTitle(),
+                        "The settings file cannot be written.\n", QMessageBox::Ok);
+        box.setInformativeText(QString("No access to '%1'.").arg(settings->fileName()));
+        box.exec();
     }
 }
 
