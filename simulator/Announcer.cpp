@@ -117,23 +117,39 @@ std::uint16_t numberAt(std::span<const std::uint8_t> bytes, std::size_t place)
     return static_cast<std::uint16_t>((bytes[place] << 8U) | bytes[place + 1]);
 }
 
-/// A question's name in lower case, and the place behind it. Questions come first in a message and
-/// are written out; one that is compressed is none that is waited for.
+/// A question's name in lower case, and the place behind it. A name may end with a pointer to what
+/// stands before it, as queries for several services have it.
 std::optional<std::string> questionName(std::span<const std::uint8_t> query, std::size_t &place)
 {
+    constexpr int MostPointers = 16;
+    constexpr std::uint8_t PointerMark = 0xC0;
     std::string name;
-    while (place < query.size() && query[place] != 0) {
-        const std::size_t size = query[place];
-        if (size > LargestLabel || place + 1 + size > query.size()) {
+    std::size_t reader = place;
+    std::size_t end = 0; // behind the first pointer
+    for (int pointers = 0; reader < query.size() && query[reader] != 0;) {
+        const std::size_t size = query[reader];
+        if (size >= PointerMark) {
+            if (reader + 2 > query.size() || ++pointers > MostPointers) {
+                return std::nullopt;
+            }
+            const std::size_t target = numberAt(query, reader) & (0xFFFFU ^ (PointerMark << 8U));
+            if (target < HeaderSize || target >= reader) {
+                return std::nullopt;
+            }
+            end = end == 0 ? reader + 2 : end;
+            reader = target;
+            continue;
+        }
+        if (size > LargestLabel || reader + 1 + size > query.size()) {
             return std::nullopt;
         }
-        for (const std::uint8_t byte : query.subspan(place + 1, size)) {
+        for (const std::uint8_t byte : query.subspan(reader + 1, size)) {
             name.push_back(static_cast<char>(std::tolower(byte)));
         }
         name.push_back('.');
-        place += 1 + size;
+        reader += 1 + size;
     }
-    ++place;
+    place = end == 0 ? reader + 1 : end;
     return place + 4 <= query.size() ? std::optional(name) : std::nullopt;
 }
 
@@ -230,6 +246,10 @@ bool Announcer::open(Announcement instrument, std::string &error)
     ip_mreq membership{};
     (void)::inet_pton(AF_INET, Group, &membership.imr_multiaddr);
     (void)::inet_pton(AF_INET, m_instrument.address.c_str(), &membership.imr_interface);
+    // What came from another network would have a smaller one, and is dropped by some.
+    constexpr int TimeToLive = 255;
+    (void)::setsockopt(m_sender.get(), IPPROTO_IP, IP_MULTICAST_TTL, &TimeToLive,
+                       sizeof(TimeToLive));
     if (::setsockopt(m_socket.get(), IPPROTO_IP, IP_ADD_MEMBERSHIP, &membership,
                      sizeof(membership)) != 0 ||
         ::setsockopt(m_sender.get(), IPPROTO_IP, IP_MULTICAST_IF, &membership.imr_interface,

@@ -3,6 +3,7 @@
 
 #include "remotepaths.h"
 
+#include "AvahiSearch.h"
 #include "OperationControl.h"
 #include "portmapmessage.h"
 
@@ -73,6 +74,13 @@ bool LanSearch::run(int milliseconds, OperationControl &control)
     if (!openNetworks()) {
         return Tracer::fail("There is no network on which instruments could be looked for.");
     }
+    m_daemon =
+        AvahiSearch::open(services(), [this](const QHostAddress &host, const DnsRecord &record) {
+            addRecords(host, {record});
+        });
+    if (m_daemon) {
+        Tracer::Trace(Tracer::Debug, "The Avahi daemon looks for instruments by multicast DNS.");
+    }
     ProgressClock clock(control.report, control.cancelled);
     QElapsedTimer time;
     time.start();
@@ -135,12 +143,17 @@ void LanSearch::ask()
         if (!network->broadcast.isNull()) {
             network->socket.writeDatagram(call, network->broadcast, PortMapperPort);
         }
-        network->socket.writeDatagram(query, dnsGroup(), DnsPort);
+        if (!m_daemon) {
+            network->socket.writeDatagram(query, dnsGroup(), DnsPort);
+        }
     }
 }
 
 void LanSearch::takeAnswers()
 {
+    if (m_daemon) {
+        m_daemon->takeAnswers();
+    }
     for (const auto &network : m_networks) {
         while (network->socket.hasPendingDatagrams()) {
             const QNetworkDatagram datagram = network->socket.receiveDatagram();

@@ -10,6 +10,7 @@
 #include <memory>
 #include <vector>
 
+class AvahiSearch;
 class QUdpSocket;
 struct OperationControl;
 
@@ -23,8 +24,9 @@ struct LanFinding
 };
 
 /// Asks all networks of this machine at once for instruments: the port mappers by a broadcast for
-/// the VXI-11 core channel, and multicast DNS for the services that instruments announce. Sends two
-/// datagrams of each kind on each network and listens; nothing else is touched.
+/// the VXI-11 core channel, and multicast DNS for the services that instruments announce, by the
+/// daemon of this machine where one runs. Sends two datagrams of each kind on each network and
+/// listens; nothing else is touched.
 class LanSearch
 {
 public:
@@ -55,6 +57,7 @@ private:
     LanFinding &findingAt(const QHostAddress &address);
 
     std::vector<std::unique_ptr<Network>> m_networks;
+    std::unique_ptr<AvahiSearch> m_daemon; ///< null: this search asks by itself
     QList<LanFinding> m_found;
     quint32 m_id;
 };
