@@ -46,15 +46,7 @@ DlgPolar::DlgPolar(QWidget *parent)
     };
     setUpLevel(*m_ui->le_am_offset, "Offset", start.offset);
     setUpLevel(*m_ui->le_am_amplitude, "Amplitude", start.gain);
-    m_ui->le_target_samples->setMax(static_cast<double>(ResampleTarget::MaxSamples));
-    m_ui->le_target_samples->setName("Target File Samples");
-    QtNumericEdit &clock = *m_ui->le_target_clock;
-    clock.setName("Target File Clockrate");
-    clock.setUnit("Hz");
-    clock.setScaled(true);
-    clock.setMax(ResampleTarget::MaxClockHz);
-    clock.setMin(ResampleTarget::MinClockHz);
-    clock.setVal(ResampleTarget().clockHz);
+    setUpTarget(*m_ui->le_target_clock, *m_ui->le_target_samples);
     m_ui->page_phase->clockRate().setName("Target File Clockrate");
     m_ui->page_phase->findChild<QGroupBox *>("gb_page_output")->setTitle("Phase File");
     m_ui->w_compare->setSignals({"&Source", "P&hase", "&Amplitude"});

@@ -24,15 +24,8 @@ DlgResample::DlgResample(QWidget *parent)
 {
     m_ui->setupUi(this);
     QtNumericEdit &clock = *m_ui->le_target_clock;
-    clock.setName("Target File Clockrate");
-    clock.setUnit("Hz");
-    clock.setScaled(true);
-    clock.setMax(ResampleTarget::MaxClockHz);
-    clock.setMin(ResampleTarget::MinClockHz);
-    clock.setVal(ResampleTarget().clockHz);
     QtNumericEdit &samples = *m_ui->le_target_samples;
-    samples.setName("Target File Samples");
-    samples.setMax(static_cast<double>(ResampleTarget::MaxSamples));
+    setUpTarget(clock, samples);
     samples.setMin(1);
     roundInput(samples);
     QtNumericEdit &outputClock = m_ui->page_output->clockRate();

@@ -8,6 +8,27 @@
 
 #include "jobs/ResampleJob.h"
 
+namespace {
+
+void setUpClock(QtNumericEdit &clock)
+{
+    clock.setUnit("Hz");
+    clock.setScaled(true);
+    clock.setMax(ResampleTarget::MaxClockHz);
+    clock.setMin(ResampleTarget::MinClockHz);
+    clock.setVal(ResampleTarget().clockHz);
+}
+
+} // namespace
+
+void setUpTarget(QtNumericEdit &clock, QtNumericEdit &samples)
+{
+    clock.setName("Target File Clockrate");
+    setUpClock(clock);
+    samples.setName("Target File Samples");
+    samples.setMax(static_cast<double>(ResampleTarget::MaxSamples));
+}
+
 SourcePage::SourcePage(QWidget *parent)
     : QWidget(parent)
 {
@@ -18,12 +39,7 @@ OutputPage::OutputPage(QWidget *parent)
     : QWidget(parent)
 {
     Ui::OutputPage().setupUi(this);
-    QtNumericEdit &clock = clockRate();
-    clock.setUnit("Hz");
-    clock.setScaled(true);
-    clock.setMax(ResampleTarget::MaxClockHz);
-    clock.setMin(ResampleTarget::MinClockHz);
-    clock.setVal(ResampleTarget().clockHz);
+    setUpClock(clockRate());
 }
 
 QtNumericEdit &OutputPage::clockRate() const

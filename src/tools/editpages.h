@@ -8,6 +8,9 @@ class QtNumericEdit;
 /// The pages and the button row that wizards have alike. Their fields bear the names by which
 /// ToolWizard and EditWizard find them.
 
+/// The fields of the waveform that a tool writes: names, units and limits.
+void setUpTarget(QtNumericEdit &clock, QtNumericEdit &samples);
+
 class SourcePage : public QWidget
 {
     Q_OBJECT

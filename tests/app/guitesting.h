@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "support/modals.h"
+
 #include <QKeySequence>
 #include <QPointer>
 #include <QString>
 #include <QStringList>
 #include <QTemporaryDir>
-
-#include <functional>
 
 class MainWindow;
 class QCustomTreeView;
@@ -54,31 +54,6 @@ private:
 [[nodiscard]] bool writeTone(const QString &path, const QString &comment = "a tone");
 
 [[nodiscard]] bool writeText(const QString &path, const QByteArray &text);
-
-using Answer = std::function<void(QWidget &)>;
-
-/// Runs `action`, which opens modal windows one after the other, and has one answer act on each,
-/// which must close it. False when not all of them came, or more.
-bool withModals(const std::function<void()> &action, const QList<Answer> &answers);
-
-/// As above, for a single one.
-bool withModal(const std::function<void()> &action, const Answer &answer);
-
-/// An answer to a question or a box: presses the button with this text, mnemonics left out.
-[[nodiscard]] Answer press(const QString &button);
-
-/// What a modal box said.
-struct Seen
-{
-    QString title;
-    QString text;
-};
-
-/// As press(), noting what the box said.
-[[nodiscard]] Answer answer(const QString &button, Seen &seen);
-
-/// Answers a request for a name by typing it and Enter.
-[[nodiscard]] Answer typeName(const QString &name, Seen &seen);
 
 void pressKey(QWidget *widget, const QKeySequence &key);
 
