@@ -11,6 +11,7 @@
 #include <QApplication>
 #include <QComboBox>
 #include <QDir>
+#include <QEventLoop>
 #include <QFileInfo>
 #include <QPainter>
 #include <QPixmap>
@@ -28,6 +29,8 @@
 namespace {
 
 constexpr int TimeOutMs = 20000;
+constexpr int SketchMs = 600;
+constexpr int FieldsPage = 1; ///< where a tool with a sketch has its fields
 constexpr QSize PictureSize(1060, 640);
 
 void complain(const QString &text)
@@ -243,6 +246,13 @@ bool ScreenshotRun::saveTool(const ToolInfo &info) const
     const auto take = [&] {
         const int page = pages->currentIndex();
         taken.insert(page);
+        if (const auto *sketch = tool.findChild<QWidget *>("w_sketch");
+            page == FieldsPage && sketch != nullptr) {
+            // Drawn a moment after the last change of a field.
+            QEventLoop wait;
+            QTimer::singleShot(SketchMs, &wait, &QEventLoop::quit);
+            wait.exec();
+        }
         return save(tool, QString("%1-%2.png").arg(name).arg(page + 1, 2, 10, QChar('0')));
     };
     bool done = take();
