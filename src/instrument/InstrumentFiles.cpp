@@ -18,6 +18,7 @@ namespace {
 constexpr int MaxDepth = 64;
 /// One that lists two folders in themselves would have folders without end above that depth.
 constexpr qsizetype MaxEntries = 1'000'000;
+constexpr qint64 MostBytes = qint64{1} << 60; ///< of a tree
 
 bool tooDeep(const QString &directory)
 {
@@ -93,7 +94,9 @@ bool InstrumentFiles::listTree(QStringList &files, qint64 &totalSize, const QStr
     for (const RemoteFileEntry &entry : std::as_const(entries)) {
         if (!entry.isDirectory()) {
             files.append(directory + '/' + entry.name);
-            totalSize += entry.size;
+            // Two absurd sizes must not wrap around to a small sum.
+            totalSize =
+                std::min(totalSize + std::clamp<qint64>(entry.size, 0, MostBytes), MostBytes);
         }
     }
     return true;
